@@ -1,0 +1,75 @@
+// Text conversion between ISO/IEC 8859-15 bytes ("Latin-15"), 16-bit Unicode units ("PCode") and
+// UTF-8 as in RFC 3629 ("LCode").
+//
+// Every text ends in a 0 byte or 0 unit. One unit is one character from U+0001 to U+FFFF; surrogates
+// are not paired. Output buffers are the caller's. All operations may run in any thread and keep no
+// state; each failure is one trace.
+#ifndef VARNEK_LNGPACK_H
+#define VARNEK_LNGPACK_H
+
+#include "Varnek_Common.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+// Latin-15 to units. Control characters are dropped; the no-break space becomes a space.
+//   outBufSize  units of room, the terminator not counted: an input of exactly this many bytes fits
+//   returns     TRUE; FALSE for a null pointer or an input that is too long
+VARNEK_API BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize,
+                                           const char *szInText);
+
+//   returns  the units before the terminator; -1 for null
+VARNEK_API int WmStrlen(const unsigned short *mszText);
+
+// At most `nChar` units to UTF-8; the output takes up to three bytes a unit and one more.
+//   returns  TRUE, with an empty output for an `nChar` of 0; FALSE for a null pointer
+VARNEK_API BOOL WmConvertPCode2UTF(char *pszOutText, const unsigned short *mszInText, int nChar);
+
+// The encoder of WmConvertPCode2UTF.
+//   returns  the bytes written, without the terminator; -1 for a null pointer or an `nChar` of 0
+VARNEK_API int __WmLngUnicode2UTF(char *des, const unsigned short *src, int nChar);
+
+// A whole text of units to UTF-8.
+//   returns  TRUE, or FALSE
+VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInText);
+
+// UTF-8 to units, of at most `length` bytes of input; bytes beyond are never read. A byte that starts
+// no character gives its low seven bits. U+00A0 becomes a space. Four-byte forms are not decoded.
+//   outBufSize  bytes of room, the terminator counted
+//   returns     TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a null
+//               pointer or too little room
+VARNEK_API BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize,
+                                   const char *szInText, int length);
+
+//   returns  the bytes of room that WmConvertUTF2PCode needs for this input, terminator included
+VARNEK_API int __WmLngStrlenByByte(const char *szText, int length);
+
+// Compares a size with what is needed, and traces under `szName` when it is too small.
+//   returns  TRUE when `OutBuffer` is at least `RequiredBufSize`
+VARNEK_API BOOL __WmConvertCodeBufferSizeCheck(const char *szName, int OutBuffer,
+                                               int RequiredBufSize);
+
+// The decoder of WmConvertUTF2PCode.
+//   returns  the units written, without the terminator; -1 for a null pointer
+VARNEK_API int __WmLngUTF2Unicode(unsigned short *des, const char *src, int length);
+
+// One character of one, two and three bytes, taken to be well-formed.
+VARNEK_API unsigned short __WmLngConvert1ByteChar(unsigned char first);
+VARNEK_API unsigned short __WmLngConvert2ByteChar(unsigned char first, unsigned char second);
+VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned char second,
+                                                  unsigned char third);
+
+// Latin-15 to a new UTF-8 text.
+//   outputData   in: null or a block from malloc, which is freed; out: a block from malloc that the
+//                caller frees. Left alone when the result is FALSE or the converted text is empty
+//   szInputSize  length of the input in bytes
+//   returns      TRUE; FALSE for a null pointer, an input longer than its size or too little memory
+VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
+                                               unsigned int szInputSize);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif
