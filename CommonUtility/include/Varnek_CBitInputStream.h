@@ -19,7 +19,7 @@
 //   end, by bytes    uiBufLen           0                  1
 //   no source        0                  0                  1
 class VARNEK_API VarnekCBitInputStream {
-public:
+  public:
     // Starts at the first bit of `length` bytes. `copyMode` 1 keeps a private copy; any other value
     // reads the caller's array. A null or empty source gives a stream at its end.
     VarnekCBitInputStream(unsigned char *source, unsigned int length, unsigned char copyMode);
@@ -38,9 +38,9 @@ public:
     unsigned short ReadShort(int count, unsigned char &success);
     unsigned int ReadInt(int count, unsigned char &success);
 
-    // Copies `count` bytes from a byte boundary. Returns 0; -22 at the end of the stream, -1 when not
-    // on a boundary, -10 when fewer bytes remain, for a negative count and for a null destination:
-    // nothing moves then.
+    // Copies `count` bytes from a byte boundary. Returns 0; -22 at the end of the stream, -1 when
+    // not on a boundary, -10 when fewer bytes remain, for a negative count and for a null
+    // destination: nothing moves then.
     int GetByteArray(unsigned char *dest, int count);
     // Discards `count` bits, and stops at the end of the stream.
     void Skip(int count);
@@ -50,7 +50,7 @@ public:
     // Moves to the first bit. Returns 0.
     int RwindToFirst();
 
-private:
+  private:
     unsigned char bCopied;
     unsigned char bEndOfStream;
     int iCurByteIdx;

@@ -12,22 +12,23 @@
 extern "C" {
 #endif
 
-// Where the code that traces next stands. Every caller stores both before a trace or a panic report;
-// VARNEK_TRACE does so. When two threads trace at once, a line may show the other thread's place.
+// Where the code that traces next stands. Every caller stores both before a trace or a panic
+// report; VARNEK_TRACE does so. When two threads trace at once, a line may show the other thread's
+// place.
 extern VARNEK_API const char *gszVarnekDbgFilePath;
 extern VARNEK_API int32_t gVarnekDbgLineNum;
 
-// Stores the caller's place and traces. `mask` is one VARNEK_LEVEL_ bit with one VARNEK_MODULE_ bit;
-// a printf format and its arguments follow. The trace adds no line end.
-#define VARNEK_TRACE(mask, ...)                                           \
-    (__atomic_store_n(&gszVarnekDbgFilePath, __FILE__, __ATOMIC_RELAXED), \
-     __atomic_store_n(&gVarnekDbgLineNum, __LINE__, __ATOMIC_RELAXED),    \
+// Stores the caller's place and traces. `mask` is one VARNEK_LEVEL_ bit with one VARNEK_MODULE_
+// bit; a printf format and its arguments follow. The trace adds no line end.
+#define VARNEK_TRACE(mask, ...)                                               \
+    (__atomic_store_n(&gszVarnekDbgFilePath, &__FILE__[0], __ATOMIC_RELAXED), \
+     __atomic_store_n(&gVarnekDbgLineNum, __LINE__, __ATOMIC_RELAXED),        \
      VarnekPGL_TraceOut((mask), __VA_ARGS__))
 
 // Reports that a condition which must hold does not. Returns; the caller goes on with its fallback.
-#define VARNEK_PANIC()                                                    \
-    (VarnekPGL_CheckAndInitDebug(),                                       \
-     __atomic_store_n(&gszVarnekDbgFilePath, __FILE__, __ATOMIC_RELAXED), \
+#define VARNEK_PANIC()                                                        \
+    (VarnekPGL_CheckAndInitDebug(),                                           \
+     __atomic_store_n(&gszVarnekDbgFilePath, &__FILE__[0], __ATOMIC_RELAXED), \
      __atomic_store_n(&gVarnekDbgLineNum, __LINE__, __ATOMIC_RELAXED), (void)VarnekPGL_Panic())
 
 // Writes one line to the Android log, when the configuration enables it.

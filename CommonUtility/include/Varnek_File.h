@@ -1,10 +1,10 @@
-// Files by path and by stream handle, large files by descriptor, directories, and the copy, move and
-// permission commands.
+// Files by path and by stream handle, large files by descriptor, directories, and the copy, move
+// and permission commands.
 //
-// Failures are logged at error priority under the tag "SBTVD_File", whatever the debug configuration
-// says, and never through the trace. No operation keeps state: callers that share a handle between
-// threads take turns. A null path is refused like one that does not exist, a null buffer moves no
-// bytes.
+// Failures are logged at error priority under the tag "SBTVD_File", whatever the debug
+// configuration says, and never through the trace. No operation keeps state: callers that share a
+// handle between threads take turns. A null path is refused like one that does not exist, a null
+// buffer moves no bytes.
 #ifndef VARNEK_FILE_H
 #define VARNEK_FILE_H
 
@@ -80,7 +80,8 @@ VARNEK_API int32_t VarnekPGL_DeleteFile(const char *path);
 // write is one system call, unbuffered. A negative descriptor is logged and refused.
 
 // Opens a descriptor; nothing ever truncates.
-//   flags    READ; WRITE (write-only); APPEND (with WRITE or CREATE_RW); READ | WRITE (read-write, not
+//   flags    READ; WRITE (write-only); APPEND (with WRITE or CREATE_RW); READ | WRITE (read-write,
+//   not
 //            created, not appending); CREATE_RW (read-write, created with 0666 under the umask)
 //   returns  the descriptor, to be closed by the caller; a negative value on failure
 VARNEK_API int32_t VarnekPGL_OpenFile64Bits(const char *path, int32_t flags);
@@ -125,9 +126,9 @@ VARNEK_API int64_t VarnekPGL_GetFileSizeByHandle64Bits(int32_t hFile);
 
 // An entry as the library reads it; zero it before the first read.
 typedef struct PglDirEntry {
-    uint32_t type;           // PGL_ENTRY_FILE, PGL_ENTRY_DIR, or 0 for no entry
-    unsigned char area[292]; // neither read nor written here
-    char name[264];          // NUL-terminated
+    uint32_t type;            // PGL_ENTRY_FILE, PGL_ENTRY_DIR, or 0 for no entry
+    unsigned char area[292];  // neither read nor written here
+    char name[264];           // NUL-terminated
 } PglDirEntry;
 
 // An entry as callers read it.

@@ -1,9 +1,9 @@
 // Text conversion between ISO/IEC 8859-15 bytes ("Latin-15"), 16-bit Unicode units ("PCode") and
 // UTF-8 as in RFC 3629 ("LCode").
 //
-// Every text ends in a 0 byte or 0 unit. One unit is one character from U+0001 to U+FFFF; surrogates
-// are not paired. Output buffers are the caller's. All operations may run in any thread and keep no
-// state; each failure is one trace.
+// Every text ends in a 0 byte or 0 unit. One unit is one character from U+0001 to U+FFFF;
+// surrogates are not paired. Output buffers are the caller's. All operations may run in any thread
+// and keep no state; each failure is one trace.
 #ifndef VARNEK_LNGPACK_H
 #define VARNEK_LNGPACK_H
 
@@ -34,10 +34,12 @@ VARNEK_API int __WmLngUnicode2UTF(char *des, const unsigned short *src, int nCha
 //   returns  TRUE, or FALSE
 VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInText);
 
-// UTF-8 to units, of at most `length` bytes of input; bytes beyond are never read. A byte that starts
-// no character gives its low seven bits. U+00A0 becomes a space. Four-byte forms are not decoded.
+// UTF-8 to units, of at most `length` bytes of input; bytes beyond are never read. A byte that
+// starts no character gives its low seven bits. U+00A0 becomes a space. Four-byte forms are not
+// decoded.
 //   outBufSize  bytes of room, the terminator counted
-//   returns     TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a null
+//   returns     TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a
+//   null
 //               pointer or too little room
 VARNEK_API BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize,
                                    const char *szInText, int length);

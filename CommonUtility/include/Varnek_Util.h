@@ -23,13 +23,15 @@ VARNEK_API uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t leng
 //   returns  TRUE when the CRC is right; FALSE when not, and for null after a panic report
 VARNEK_API BOOL VarnekUtil_CheckSectionCRC32(const unsigned char *section);
 
-// Checks a file of at least 8 bytes whose last four are the CRC of the rest, most significant first.
+// Checks a file of at least 8 bytes whose last four are the CRC of the rest, most significant
+// first.
 //   returns  TRUE when they are equal; FALSE when not, or when the file is too small or unreadable
 VARNEK_API BOOL VarnekUtil_CheckFileCRC32(const char *path);
 
-// Appends the CRC of a file's whole content, of at least 4 bytes, to the file. Doing it twice appends
-// a CRC of content and first CRC.
-//   returns  TRUE once the append was issued, whatever became of it; FALSE when the file is too small
+// Appends the CRC of a file's whole content, of at least 4 bytes, to the file. Doing it twice
+// appends a CRC of content and first CRC.
+//   returns  TRUE once the append was issued, whatever became of it; FALSE when the file is too
+//   small
 //            or unreadable, and then unchanged
 VARNEK_API BOOL VarnekUtil_AppendCRC32ToFile(const char *path);
 

@@ -21,10 +21,10 @@ int __android_log_write(int priority, const char *tag, const char *text) {
     clock_gettime(CLOCK_REALTIME, &now);
     localtime_r(&now.tv_sec, &local);
     char header[128];
-    snprintf(header, sizeof header, "%02d-%02d %02d:%02d:%02d.%03ld %5d %5ld %c %s: ",
-             local.tm_mon + 1, local.tm_mday, local.tm_hour, local.tm_min, local.tm_sec,
-             now.tv_nsec / 1000000, (int)getpid(), syscall(SYS_gettid), PriorityLetter(priority),
-             tag ? tag : "");
+    snprintf(header, sizeof header,
+             "%02d-%02d %02d:%02d:%02d.%03ld %5d %5ld %c %s: ", local.tm_mon + 1, local.tm_mday,
+             local.tm_hour, local.tm_min, local.tm_sec, now.tv_nsec / 1000000, (int)getpid(),
+             syscall(SYS_gettid), PriorityLetter(priority), tag ? tag : "");
     int total = 0;
     const char *rest = text ? text : "";
     do {

@@ -1,0 +1,511 @@
+#include "Varnek_File.h"
+
+#include <fcntl.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <csignal>
+#include <cstring>
+#include <filesystem>
+#include <thread>
+
+#include "support/VarnekTest.h"
+
+namespace {
+
+using ::testing::AllOf;
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+using ::testing::IsEmpty;
+using ::testing::StartsWith;
+
+class File : public VarnekTest {};
+
+TEST_F(File, FlagsResolveInTheirOrder) {
+    const struct {
+        int32_t flags;
+        const char *result;  // of writing "new" over, or behind, "old"
+    } rows[] = {
+        {1, "new"}, {2, "old"},    {4, "new"},     {6, "new"},
+        {7, "new"}, {8, "oldnew"}, {10, "oldnew"}, {15, "oldnew"},
+    };
+    const std::string path = Path("file");
+    for (const auto &row : rows) {
+        WriteAll(path, "old");
+        const PglFileHandle file = VarnekPGL_OpenFile(path.c_str(), row.flags);
+        ASSERT_NE(file, -1);
+        VarnekPGL_WriteFileByHandle(file, "new", 3);
+        EXPECT_EQ(VarnekPGL_CloseFile(file), 0);
+        EXPECT_EQ(ReadAll(path), row.result) << row.flags;
+    }
+    for (int32_t flags : {0, 16, 32}) {
+        EXPECT_EQ(VarnekPGL_OpenFile(path.c_str(), flags), -1);
+    }
+    EXPECT_THAT(TakeLog(), IsEmpty());
+}
+
+TEST_F(File, PathsOf256CharactersAreRefused) {
+    std::string path = std::filesystem::absolute(Path("")).string();
+    const std::string folder = path + std::string(100, 'd');
+    std::filesystem::create_directory(folder);
+    path = folder + "/";
+    path += std::string(255 - path.size(), 'f');
+    EXPECT_EQ(VarnekPGL_WriteFile(path.c_str(), "x", 1), 1);
+    EXPECT_THAT(TakeLog(), IsEmpty());
+    path += "f";
+    EXPECT_EQ(VarnekPGL_OpenFile(path.c_str(), PGL_FILE_MODE_READ), -1);
+    EXPECT_THAT(TakeErrors(),
+                ElementsAre("VarnekPGL_OpenFile : file path(" + path + ") length over max size"));
+}
+
+TEST_F(File, FailuresHaveTheirLineAndResult) {
+    const std::string none = Path("none");
+    const std::string open = "VarnekPGL_OpenFile : NULL file pointer. szFilePath=[" + none + "]";
+    const PglFileHandle writer = VarnekPGL_OpenFile(Path("w").c_str(), PGL_FILE_MODE_WRITE);
+    const PglFileHandle full = VarnekPGL_OpenFile("/dev/full", PGL_FILE_MODE_WRITE);
+    char buffer[8] = {};
+    const auto hex = [](PglFileHandle handle) {
+        char text[16];
+        snprintf(text, sizeof text, "0x%x", static_cast<unsigned>(handle));
+        return std::string(text);
+    };
+    VarnekPGL_WriteFileByHandle(full, "data", 4);
+    const struct {
+        int64_t result;
+        int64_t expected;
+        std::vector<std::string> lines;
+    } rows[] = {
+        {VarnekPGL_OpenFile(nullptr, 2),
+         -1,
+         {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[(null)]"}},
+        {VarnekPGL_CloseFile(0), -1, {"VarnekPGL_CloseFile : NULL file pointer"}},
+        {VarnekPGL_CloseFile(-1), -1, {"VarnekPGL_CloseFile : NULL file pointer"}},
+        {VarnekPGL_SeekFile(0, 0, 3), 0, {"VarnekPGL_SeekFile : NULL file pointer"}},
+        {VarnekPGL_SeekFile(writer, 0, 3), -8, {"VarnekPGL_SeekFile : Invalid Seek base! base=3"}},
+        {VarnekPGL_SeekFile(writer, -1, 0),
+         -1,
+         {"VarnekPGL_SeekFile : fail handle = " + hex(writer)}},
+        {VarnekPGL_TellFile(0), -1, {"VarnekPGL_TellFile : NULL file pointer"}},
+        {VarnekPGL_FlushFile(0), -1, {"VarnekPGL_FlushFile : NULL file pointer"}},
+        {VarnekPGL_FlushFile(full), -1, {"VarnekPGL_FlushFile : fail"}},
+        {VarnekPGL_ReadFileByHandle(0, buffer, 1),
+         0,
+         {"VarnekPGL_ReadFileByHandle : NULL file pointer"}},
+        {VarnekPGL_WriteFileByHandle(0, buffer, 1),
+         0,
+         {"VarnekPGL_WriteFileByHandle : NULL file pointer"}},
+        {VarnekPGL_WriteFileByHandle(writer, nullptr, 1),
+         0,
+         {"VarnekPGL_WriteFileByHandle : NULL buffer"}},
+        {VarnekPGL_ReadFileByHandle(writer, buffer, 8), 0, {}},
+        {VarnekPGL_GetFileSizeByHandle(0),
+         -1,
+         {"VarnekPGL_TellFile : NULL file pointer", "VarnekPGL_SeekFile : NULL file pointer",
+          "VarnekPGL_TellFile : NULL file pointer"}},
+        {VarnekPGL_ReadFile(none.c_str(), buffer, 8),
+         -18,
+         {open, "VarnekPGL_ReadFile : File doesn't exist! file path=[" + none + "]"}},
+        {VarnekPGL_GetFileSize(none.c_str()),
+         0,
+         {open, "VarnekPGL_GetFileSize fail =[" + none + "]"}},
+        {VarnekPGL_CheckFile(none.c_str()), FALSE, {open, "VarnekPGL_CheckFile : fail " + none}},
+        {VarnekPGL_DeleteFile(none.c_str()), -1, {"VarnekPGL_DeleteFile : remove File[] Fail"}},
+        {VarnekPGL_WriteFile("/no/dir", "x", 1),
+         -18,
+         {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[/no/dir]",
+          "VarnekPGL_WriteFile : File doesn't exist! file path=[/no/dir]"}},
+        {VarnekPGL_AppendFile("/no/dir", "x", 1),
+         -18,
+         {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[/no/dir]",
+          "VarnekPGL_AppendFile : File doesn't exist! file path=[/no/dir]"}},
+        {VarnekPGL_WriteFile(Path("w").c_str(), nullptr, 1),
+         0,
+         {"VarnekPGL_WriteFile : NULL buffer"}},
+    };
+    std::vector<std::string> expected;
+    for (const auto &row : rows) {
+        EXPECT_EQ(row.result, row.expected) << ::testing::PrintToString(row.lines);
+        expected.insert(expected.end(), row.lines.begin(), row.lines.end());
+    }
+    EXPECT_EQ(TakeErrors(), expected);
+    VarnekPGL_CloseFile(full);
+    VarnekPGL_CloseFile(writer);
+}
+
+TEST_F(File, AFullDiskIsNotReportedAsStored) {
+    EXPECT_EQ(VarnekPGL_WriteFile("/dev/full", "abc", 3), 0);
+    EXPECT_EQ(VarnekPGL_AppendFile("/dev/full", "abc", 3), -1);
+    const auto lines = TakeErrors();
+    ASSERT_EQ(lines.size(), 3u);
+    EXPECT_THAT(lines[0], StartsWith("VarnekPGL_CloseFile : fail hFile = 0x"));
+    EXPECT_THAT(lines[1], StartsWith("VarnekPGL_CloseFile : fail hFile = 0x"));
+    EXPECT_EQ(lines[2],
+              "VarnekPGL_AppendFile : name = /dev/full: Fail! write size = 0, desired size = 3");
+    const std::string large(100000, 'x');
+    EXPECT_EQ(VarnekPGL_AppendFile("/dev/full", large.data(), 100000), -1);
+    EXPECT_THAT(TakeErrors()[0], HasSubstr("desired size = 100000"));
+}
+
+TEST_F(File, SizesAndPositions) {
+    const std::string path = Path("file");
+    EXPECT_EQ(VarnekPGL_AppendFile(path.c_str(), "", 0), 0);
+    EXPECT_EQ(VarnekPGL_GetFileSize(path.c_str()), 0);
+    EXPECT_EQ(VarnekPGL_AppendFile(path.c_str(), "0123456789", 10), 0);
+    EXPECT_EQ(VarnekPGL_GetFileSize(path.c_str()), 10);
+    const PglFileHandle file = VarnekPGL_OpenFile(path.c_str(), PGL_FILE_MODE_READ);
+    for (int32_t position : {0, 4, 10}) {
+        EXPECT_EQ(VarnekPGL_SeekFile(file, position, SEEK_SET), 0);
+        EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(file), 10);
+        EXPECT_EQ(VarnekPGL_TellFile(file), position);
+    }
+    char buffer[16];
+    EXPECT_EQ(VarnekPGL_SeekFile(file, -3, SEEK_END), 0);
+    EXPECT_EQ(VarnekPGL_ReadFileByHandle(file, buffer, 16), 3u);
+    VarnekPGL_CloseFile(file);
+    EXPECT_EQ(VarnekPGL_ReadFile(path.c_str(), buffer, 5), 5);
+    EXPECT_EQ(VarnekPGL_GetFileSize(Path("").c_str()), 0) << "a directory has no size";
+    EXPECT_THAT(TakeLog(), IsEmpty());
+}
+
+TEST_F(File, LogLinesOfThreadsAreCutAndNeverMix) {
+    std::vector<std::thread> threads;
+    for (char c = 'a'; c < 'e'; c++) {
+        threads.emplace_back([c] {
+            const std::string path(2000, c);
+            for (int i = 0; i < 200; i++) {
+                VarnekPGL_OpenFile(path.c_str(), PGL_FILE_MODE_READ);
+            }
+        });
+    }
+    for (std::thread &thread : threads) {
+        thread.join();
+    }
+    const std::string head = "VarnekPGL_OpenFile : file path(";
+    for (const LogLine &line : TakeLog()) {
+        ASSERT_EQ(line.tag, "SBTVD_File");
+        ASSERT_EQ(line.text, head + std::string(1023 - head.size(), line.text.back()));
+    }
+}
+
+class LargeFile : public VarnekTest {};
+
+TEST_F(LargeFile, FlagsGiveTheirAccess) {
+    const struct {
+        int32_t flags;
+        int access;
+        bool creates;
+    } rows[] = {
+        {2, O_RDONLY, false},
+        {4, O_WRONLY, false},
+        {8, O_RDONLY | O_APPEND, false},
+        {12, O_WRONLY | O_APPEND, false},
+        {6, O_RDWR, false},
+        {14, O_RDWR, false},
+        {1, O_RDWR, true},
+        {3, O_RDWR, true},
+        {5, O_RDWR, true},
+        {7, O_RDWR, true},
+        {9, O_RDWR | O_APPEND, true},
+        {15, O_RDWR, true},
+    };
+    const std::string path = Path("file");
+    for (const auto &row : rows) {
+        WriteAll(path, "kept");
+        const int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), row.flags);
+        EXPECT_EQ(fcntl(fd, F_GETFL) & (O_ACCMODE | O_APPEND), row.access) << row.flags;
+        VarnekPGL_CloseFile64Bits(fd);
+        EXPECT_EQ(ReadAll(path), "kept");
+        std::filesystem::remove(path);
+        const int32_t created = VarnekPGL_OpenFile64Bits(path.c_str(), row.flags);
+        EXPECT_EQ(created >= 0, row.creates) << row.flags;
+        if (created >= 0) {
+            struct stat status = {};
+            fstat(created, &status);
+            EXPECT_EQ(status.st_mode & 0777u, 0644u);
+            VarnekPGL_CloseFile64Bits(created);
+        }
+    }
+    EXPECT_THAT(TakeErrors()[0],
+                "[FULLSEG_64BIT_FILE]VarnekPGL_OpenFile64Bits: Invalid Hndl: -1 "
+                "Filename : [" +
+                    path + "]");
+}
+
+TEST_F(LargeFile, BeyondFourGiB) {
+    const std::string path = Path("sparse");
+    const int64_t end = (int64_t{5} << 30) + 7;
+    const int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_CREATE_RW);
+    EXPECT_EQ(VarnekPGL_SeekFile64Bits(fd, end - 3, SEEK_SET), 0);
+    EXPECT_EQ(VarnekPGL_WriteFileByHandle64Bits(fd, "end", 3), 3);
+    EXPECT_EQ(VarnekPGL_SeekFile64Bits(fd, -3, SEEK_CUR), 0);
+    char buffer[8] = {};
+    EXPECT_EQ(VarnekPGL_ReadFileByHandle64Bits(fd, buffer, 8), 3);
+    EXPECT_STREQ(buffer, "end");
+    EXPECT_EQ(VarnekPGL_SeekFile64Bits(fd, 5, SEEK_SET), 0);
+    EXPECT_EQ(VarnekPGL_GetFileSizeByHandle64Bits(fd), end);
+    EXPECT_EQ(VarnekPGL_TellFile64Bits(fd), 5);
+    EXPECT_EQ(VarnekPGL_FlushFile64Bits(fd), 0);
+    EXPECT_EQ(VarnekPGL_CloseFile64Bits(fd), 0);
+    EXPECT_EQ(VarnekPGL_GetFileSize64Bits(path.c_str()), end);
+    EXPECT_EQ(VarnekPGL_GetFileSize64Bits(Path("none").c_str()), 0);
+    EXPECT_THAT(TakeLog(), IsEmpty());
+}
+
+TEST_F(LargeFile, FailuresHaveTheirLineAndResult) {
+    const std::string mark = "[FULLSEG_64BIT_FILE]";
+    const std::string path = Path("limited");
+    const int32_t full = VarnekPGL_OpenFile64Bits("/dev/full", PGL_FILE_MODE_WRITE);
+    const int32_t limited = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_CREATE_RW);
+    const int32_t reader = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_READ);
+    signal(SIGXFSZ, SIG_IGN);
+    rlimit old = {};
+    getrlimit(RLIMIT_FSIZE, &old);
+    const rlimit small = {100, old.rlim_max};
+    setrlimit(RLIMIT_FSIZE, &small);
+    const std::string data(150, 'x');
+    const auto failure = [&mark](int32_t fd, const char *sizes, int error) {
+        return mark +
+               "VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : " + std::to_string(fd) +
+               ", Size : [ " + sizes + " ] " + strerror(error) + " ";
+    };
+    const struct {
+        int64_t result;
+        int64_t expected;
+        std::string line;
+    } rows[] = {
+        {VarnekPGL_WriteFileByHandle64Bits(full, "x", 1), -28,
+         failure(full, "1 4294967295", ENOSPC)},
+        {VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150), 100,
+         failure(limited, "150 100", 0)},
+        {VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150), -27,
+         failure(limited, "150 4294967295", EFBIG)},
+        {VarnekPGL_WriteFileByHandle64Bits(reader, "x", 1), -1,
+         failure(reader, "1 4294967295", EBADF)},
+        {VarnekPGL_WriteFileByHandle64Bits(-2, "x", 1), 0,
+         mark + "VarnekPGL_WriteFileByHandle64Bits: Write Failure Invalid Hndl : -2"},
+        {VarnekPGL_ReadFileByHandle64Bits(-1, nullptr, 1), 0,
+         mark + "VarnekPGL_ReadFileByHandle64Bits: Read Failure Invalid Hndl : -1"},
+        {VarnekPGL_SeekFile64Bits(-1, 0, 5), -8,
+         mark + " VarnekPGL_SeekFile64Bits Invalid Seek base! base=[5]"},
+        {VarnekPGL_SeekFile64Bits(-1, 0, 2), -1,
+         mark + "VarnekPGL_FSeek64Bits: Seek Failure Invalid Hndl : -1"},
+        {VarnekPGL_TellFile64Bits(-1), 0,
+         mark + "VarnekPGL_TellFile64Bits: Tell Failure Invalid Hndl : -1"},
+        {VarnekPGL_FlushFile64Bits(-1), -1,
+         mark + "VarnekPGL_FlushFile64Bits: Flush Failure Invalid Hndl : -1"},
+        {VarnekPGL_CloseFile64Bits(-1), -1,
+         mark + "VarnekPGL_CloseFile64Bits: Close Failure Invalid Hndl : -1"},
+    };
+    setrlimit(RLIMIT_FSIZE, &old);
+    std::vector<std::string> expected;
+    for (const auto &row : rows) {
+        EXPECT_EQ(row.result, row.expected) << row.line;
+        expected.push_back(row.line);
+    }
+    EXPECT_EQ(TakeErrors(), expected);
+    EXPECT_EQ(VarnekPGL_ReadFileByHandle64Bits(full + 500, nullptr, 1), -1);
+    EXPECT_EQ(VarnekPGL_GetFileSizeByHandle64Bits(-1), -1);
+    EXPECT_THAT(TakeLog(), IsEmpty());
+    for (int32_t fd : {full, limited, reader}) {
+        VarnekPGL_CloseFile64Bits(fd);
+    }
+}
+
+class Directory : public VarnekTest {};
+
+TEST_F(Directory, FailuresHaveTheirLineAndResult) {
+    const std::string none = Path("none");
+    const std::string present = Path("present");
+    const std::string tooLong(256, 'd');
+    ASSERT_EQ(VarnekPGL_MakeDir(present.c_str()), 0);
+    PglFmFileAttributes attributes;
+    PglDirEntryInfo info = {7, ""};
+    const std::string openFail = "VarnekPGL_OpenDir : pDir(" + none + ") = NULL";
+    const std::string gone = "VarnekPGL_DeleteDirEx : No Eixst Dir! [" + none + "]";
+    const struct {
+        int64_t result;
+        int64_t expected;
+        std::vector<std::string> lines;
+    } rows[] = {
+        {VarnekPGL_MakeDir(tooLong.c_str()),
+         -1,
+         {"VarnekPGL_MakeDir : exceed max file path length : " + tooLong}},
+        {VarnekPGL_DeleteDirEx((none + "/").c_str()), -1, {openFail, gone}},
+        {VarnekPGL_DeleteDirEx(""),
+         -1,
+         {"VarnekPGL_OpenDir : pDir() = NULL", "VarnekPGL_DeleteDirEx : No Eixst Dir! []"}},
+        {VarnekPGL_DeleteDirEx(nullptr), -1, {"VarnekPGL_DeleteDirEx : No Eixst Dir! [(null)]"}},
+        {VarnekPGL_ClearDir(none.c_str()),
+         -1,
+         {openFail, gone, "VarnekPGL_ClearDir : Directory Deletion Fail. Dir Path=[" + none + "]"}},
+        {VarnekPGL_CheckDir(none.c_str()), FALSE, {openFail}},
+        {__VarnekPGL_ReadDir(nullptr, nullptr), FALSE, {"__VarnekPGL_ReadDir : pEntry == NULL"}},
+        {VarnekPGL_ReadDir(PGL_INVALID_DIR_HANDLE, &info),
+         FALSE,
+         {"__VarnekPGL_ReadDir : return FALSE pDir = 0xffffffff"}},
+        {VarnekPGL_FmGetFileAttributes(none.c_str(), nullptr), FALSE, {}},
+        {VarnekPGL_FmGetFileAttributes(none.c_str(), &attributes),
+         FALSE,
+         {"VarnekPGL_FmGetFileAttributes : failed..." + none}},
+        {VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE), TRUE, {}},
+    };
+    std::vector<std::string> expected;
+    for (const auto &row : rows) {
+        EXPECT_EQ(row.result, row.expected) << ::testing::PrintToString(row.lines);
+        expected.insert(expected.end(), row.lines.begin(), row.lines.end());
+    }
+    EXPECT_EQ(TakeErrors(), expected);
+    EXPECT_EQ(info.type, 0u);
+    EXPECT_FALSE(std::filesystem::exists(none));
+
+    EXPECT_EQ(VarnekPGL_MakeDir(present.c_str()), -1);
+    const auto lines = TakeErrors();
+    ASSERT_EQ(lines.size(), 1u);
+    const std::string head = "VarnekPGL_MakeDir : [" + present + "] dir create failed! errno(" +
+                             std::to_string(EEXIST) + "),process(";
+    const std::string tail =
+        ") pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()) + ")";
+    EXPECT_THAT(lines[0],
+                AllOf(StartsWith(head), ::testing::EndsWith(tail), HasSubstr("unit_tests")));
+}
+
+TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
+    std::filesystem::create_directory(Path("sub"));
+    WriteAll(Path("file"), "");
+    std::filesystem::create_symlink("sub", Path("link"));
+    const uint32_t typeOf[] = {PGL_ENTRY_DIR, PGL_ENTRY_DIR, PGL_ENTRY_FILE, PGL_ENTRY_FILE,
+                               PGL_ENTRY_DIR};
+    const std::vector<std::string> names = {".", "..", "file", "link", "sub"};
+    void *dir = VarnekPGL_OpenDir(Path("").c_str());
+    PglDirEntryInfo info;
+    size_t count = 0;
+    while (VarnekPGL_ReadDir(dir, &info)) {
+        const auto found = std::find(names.begin(), names.end(), info.name);
+        ASSERT_NE(found, names.end()) << info.name;
+        EXPECT_EQ(info.type, typeOf[found - names.begin()]) << info.name;
+        count++;
+    }
+    EXPECT_EQ(count, names.size());
+    EXPECT_EQ(info.type, 0u);
+    EXPECT_THAT(TakeErrors(),
+                ElementsAre(StartsWith("__VarnekPGL_ReadDir : return FALSE pDir = 0x")));
+    EXPECT_EQ(VarnekPGL_CloseDir(dir), TRUE);
+    PglFmFileAttributes attributes;
+    memset(&attributes, 0xFF, sizeof attributes);
+    WriteAll(Path("file"), "12345");
+    EXPECT_TRUE(VarnekPGL_FmGetFileAttributes(Path("file").c_str(), &attributes));
+    PglFmFileAttributes expected = {};
+    expected.size = 5;
+    EXPECT_EQ(memcmp(&attributes, &expected, sizeof expected), 0);
+}
+
+TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
+    const std::string outside = Path("outside");
+    std::filesystem::create_directory(outside);
+    WriteAll(outside + "/kept", "kept");
+    for (const char *suffix : {"", "/", "\\", "//"}) {
+        const std::string tree = Path("tree");
+        std::string level = tree;
+        for (int depth = 0; depth < 60 && level.size() < 240; depth++) {
+            std::filesystem::create_directory(level);
+            WriteAll(level + "/f", "");
+            level += "/d";
+        }
+        std::filesystem::create_directory_symlink("../outside", tree + "/link");
+        std::filesystem::create_symlink("nowhere", tree + "/dangling");
+        EXPECT_EQ(VarnekPGL_DeleteDir((tree + suffix).c_str()), 0) << suffix;
+        EXPECT_FALSE(std::filesystem::exists(tree));
+        EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
+    }
+    std::filesystem::create_directory_symlink("outside", Path("root"));
+    EXPECT_EQ(VarnekPGL_DeleteDirEx((Path("root") + "/").c_str()), 0);
+    EXPECT_FALSE(std::filesystem::exists(std::filesystem::symlink_status(Path("root"))));
+    EXPECT_EQ(VarnekPGL_ClearDir(outside.c_str()), 0);
+    EXPECT_TRUE(std::filesystem::is_empty(outside));
+}
+
+TEST_F(Directory, WhatCannotBeDeletedStaysAndIsReported) {
+    const std::string tree = Path("tree");
+    std::filesystem::create_directory(tree);
+    WriteAll(tree + "/gone", "");
+    std::string deep = tree;
+    while (deep.size() + 60 < 256) {
+        deep += "/" + std::string(50, 'd');
+        std::filesystem::create_directory(deep);
+    }
+    const std::string kept = deep + "/" + std::string(100, 'k');
+    WriteAll(kept, "kept");
+    EXPECT_EQ(VarnekPGL_DeleteDirEx(tree.c_str()), -1);
+    EXPECT_EQ(ReadAll(kept), "kept");
+    EXPECT_FALSE(std::filesystem::exists(tree + "/gone"));
+    EXPECT_THAT(TakeErrors(),
+                ::testing::IsSupersetOf(
+                    {"VarnekPGL_DeleteDirEx : exceed max file path length : " + kept,
+                     "VarnekPGL_DeleteDirEx : rmdir[" + tree + "] Fail. return FALSE"}));
+}
+
+class Command : public VarnekTest {};
+
+TEST_F(Command, AnyPathIsOneWord) {
+    const std::filesystem::path home = std::filesystem::current_path();
+    std::filesystem::current_path(Path(""));
+    for (const char *name :
+         {"plain", "two words", "it's", "\"quoted\"", "semi;touch hurt", "`touch hurt`",
+          "$(touch hurt)", "$HOME", "new\nline", "-rf", "- x", "*", "~", "a\\b", "&", "#c",
+          "\xC3\xA9t\xC3\xA9", "'; touch hurt; '"}) {
+        WriteAll(name, "content");
+        EXPECT_EQ(VarnekPGL_CopyFile(name, "copy"), 0) << name;
+        EXPECT_EQ(ReadAll("copy"), "content") << name;
+        EXPECT_EQ(VarnekPGL_MoveFile(name, "moved"), 0) << name;
+        EXPECT_EQ(VarnekPGL_CopyFile("moved", name), 0) << name;
+        EXPECT_EQ(ReadAll(name), "content") << name;
+        EXPECT_EQ(VarnekPGL_Chmod(name, 755), 0) << name;
+        EXPECT_EQ(access(name, X_OK), 0) << name;
+        EXPECT_EQ(VarnekPGL_DeleteFile(name), 0) << name;
+    }
+    EXPECT_FALSE(std::filesystem::exists("hurt"));
+    EXPECT_THAT(TakeErrors(), IsEmpty());
+    std::filesystem::current_path(home);
+}
+
+TEST_F(Command, RefusalsKeepTheDestination) {
+    const std::string destination = Path("destination");
+    WriteAll(destination, "kept");
+    std::filesystem::create_hard_link(destination, Path("same"));
+    const std::string longPath(520, 'x');
+    for (const std::string &source :
+         {Path("none"), Path(""), Path("same"), destination, longPath, std::string()}) {
+        EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), destination.c_str()), -1) << source;
+        EXPECT_EQ(TakeErrors().back(),
+                  "VarnekPGL_CopyFile : fail src = " + source + " dest = " + destination);
+        EXPECT_EQ(ReadAll(destination), "kept");
+    }
+    EXPECT_EQ(VarnekPGL_CopyFile(destination.c_str(), longPath.c_str()), -1);
+    EXPECT_EQ(VarnekPGL_MoveFile(destination.c_str(), longPath.c_str()), -1);
+    EXPECT_EQ(VarnekPGL_MoveFile(nullptr, destination.c_str()), -1);
+    EXPECT_EQ(TakeErrors().back(), "VarnekPGL_MoveFile : fail src = (null) dest = " + destination);
+    EXPECT_EQ(ReadAll(destination), "kept");
+}
+
+TEST_F(Command, ChmodTakesThreeModesAndHandsBackTheStatus) {
+    const std::string path = Path("file");
+    WriteAll(path, "");
+    for (int32_t mode : {666, 755, 777}) {
+        EXPECT_EQ(VarnekPGL_Chmod(path.c_str(), mode), 0);
+        struct stat status = {};
+        stat(path.c_str(), &status);
+        EXPECT_EQ(status.st_mode & 0777u, std::stoul(std::to_string(mode), nullptr, 8));
+    }
+    EXPECT_EQ(VarnekPGL_Chmod(path.c_str(), 644), -1);
+    EXPECT_THAT(TakeLog(), IsEmpty());
+    EXPECT_EQ(VarnekPGL_Chmod(Path("none").c_str(), 666), 1 << 8)
+        << "exit status 1, as system() has it";
+    EXPECT_THAT(TakeErrors(),
+                ElementsAre("VarnekPGL_Chmod : Could not change permission [chmod 666 " +
+                            Path("none") + "]"));
+    EXPECT_EQ(VarnekPGL_Chmod(std::string(505, 'x').c_str(), 666), -1);
+}
+
+}  // namespace

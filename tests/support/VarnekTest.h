@@ -1,0 +1,54 @@
+// The fixture of the library's tests: captures what the library writes to the Android log, and
+// gives each test a folder of its own.
+#ifndef VARNEK_TESTS_SUPPORT_VARNEKTEST_H
+#define VARNEK_TESTS_SUPPORT_VARNEKTEST_H
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/types.h>
+
+#include <string>
+#include <vector>
+
+#include "Varnek_Debug.h"
+
+struct LogLine {
+    int priority;
+    std::string tag;
+    std::string text;
+    pid_t thread;
+
+    bool IsTrace() const { return tag.rfind("SBTVD_", 0) == 0 && tag != "SBTVD_File"; }
+    // The caller's text of a trace, without the prefix; other lines whole.
+    std::string Body() const;
+};
+
+// Every line since the last call. Lines of all threads, in the order of their writes.
+std::vector<LogLine> TakeLog();
+
+// The bodies of all lines since the last call; with a tag, only of lines under it.
+std::vector<std::string> TakeBodies(const std::string &tag = "");
+
+// The bodies of the Error traces and storage failures since the last call.
+std::vector<std::string> TakeErrors();
+
+// Called for each line before it is captured, without a lock; null for none.
+extern void (*gLogHook)(const LogLine &line);
+
+std::string ReadAll(const std::string &path);
+void WriteAll(const std::string &path, const std::string &content);
+
+// Tracing is on for every level and module, and the first load is behind us.
+class VarnekTest : public ::testing::Test {
+  protected:
+    void SetUp() override;
+    void TearDown() override;
+
+    // A path in this test's own folder.
+    std::string Path(const std::string &name) const { return folder_ + "/" + name; }
+
+  private:
+    std::string folder_;
+};
+
+#endif
