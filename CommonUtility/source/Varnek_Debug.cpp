@@ -288,8 +288,12 @@ void LoadConfigOnce(bool again) {
 
 // Composes and writes one line that the configuration lets through. Kept out of line, so that the
 // buffer costs nothing in a trace that is off.
-__attribute__((noinline)) void WriteTrace(uint32_t mask, const char *format, va_list args) {
+__attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, const char *format,
+                                                                va_list args) {
     const ErrnoKeeper keeper;
+    if (format == nullptr) {
+        format = "(null)";
+    }
     const LevelLook look = LookOfLevel(mask);
     char line[kTraceLineSize];
     const int written = snprintf(line, sizeof line, "[%c][%s-%4d] ", look.label, CallerFileName(),
@@ -298,8 +302,7 @@ __attribute__((noinline)) void WriteTrace(uint32_t mask, const char *format, va_
     if (prefix < sizeof line - 1) {
         const size_t room = sizeof line - prefix;
         line[prefix] = '\0';
-        vsnprintf(line + prefix, room < kTraceTextSize ? room : kTraceTextSize,
-                  format != nullptr ? format : "(null)", args);
+        vsnprintf(line + prefix, room < kTraceTextSize ? room : kTraceTextSize, format, args);
     }
     if ((gDebugState.load(std::memory_order_relaxed) & kOutputOn) != 0) {
         __android_log_write(look.priority, TagOfModule(mask), line);

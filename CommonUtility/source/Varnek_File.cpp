@@ -694,7 +694,7 @@ class ShellCommand {
         text_[length_] = '\0';
     }
 
-    char text_[size] = "";
+    char text_[size] = {};
     size_t length_ = 0;
     bool fits_ = true;
 };
