@@ -21,16 +21,19 @@
 class VARNEK_API VarnekCBitInputStream {
   public:
     // Starts at the first bit of `length` bytes. `copyMode` 1 keeps a private copy; any other value
-    // reads the caller's array. A null or empty source gives a stream at its end.
+    // reads the caller's array. A null or empty source gives a stream at its end, and so does a
+    // copy for which there is no memory. Bytes beyond 2 GiB are not read.
     VarnekCBitInputStream(unsigned char *source, unsigned int length, unsigned char copyMode);
-    // Takes the position; a private copy is copied, a borrowed array is shared.
+    // Takes the position; a private copy is copied, a borrowed array is shared. Without memory for
+    // the copy the stream is at its end, as without a source.
     VarnekCBitInputStream(const VarnekCBitInputStream &other);
     VarnekCBitInputStream &operator=(const VarnekCBitInputStream &other);
     ~VarnekCBitInputStream();
 
     // The next bit, 0 or 1.
     unsigned int ReadBit(unsigned char &success);
-    // `aNum` bits, 0 to 8, which must lie within the current byte.
+    // `aNum` bits, 0 to 8, which must lie within the current byte; otherwise nothing is read. Of
+    // the reads, only this one traces what it refuses.
     unsigned int GetBits(int aNum, unsigned char &success);
     // `count` bits, 0 to 8, 16 and 32. A count out of range reads nothing. When the stream ends
     // before the field does, the bits that are missing read as 0.
@@ -42,22 +45,24 @@ class VARNEK_API VarnekCBitInputStream {
     // not on a boundary, -10 when fewer bytes remain, for a negative count and for a null
     // destination: nothing moves then.
     int GetByteArray(unsigned char *dest, int count);
-    // Discards `count` bits, and stops at the end of the stream.
+    // Discards `count` bits, and stops at the end of the stream; each byte's worth beyond it is one
+    // trace.
     void Skip(int count);
-    // Moves back by `count` bytes; meant for byte boundaries. A step that would leave the buffer
-    // moves nothing. Returns 0.
+    // Moves back by `count` bytes; meant for byte boundaries: inside a byte, the next reads take
+    // the top bits of the byte it lands on. A step that would leave the buffer moves nothing.
+    // Returns 0.
     int RewindBytes(int count);
-    // Moves to the first bit. Returns 0.
+    // Moves to the first bit, if there is a source. Returns 0.
     int RwindToFirst();
 
   private:
-    unsigned char bCopied;
-    unsigned char bEndOfStream;
-    int iCurByteIdx;
-    unsigned char *pBuffer;
-    unsigned int uiBufLen;
-    unsigned char ucCurByte;  // the current byte, its consumed bits shifted out at the top
-    int iBitIdxInCurByte;
+    unsigned char bCopied = 0;
+    unsigned char bEndOfStream = 1;
+    int iCurByteIdx = 0;
+    unsigned char *pBuffer = nullptr;
+    unsigned int uiBufLen = 0;
+    unsigned char ucCurByte = 0;  // the current byte, its consumed bits shifted out at the top
+    int iBitIdxInCurByte = 0;
 };
 
 #endif

@@ -3,7 +3,7 @@
 //
 // Every text ends in a 0 byte or 0 unit. One unit is one character from U+0001 to U+FFFF;
 // surrogates are not paired. Output buffers are the caller's. All operations may run in any thread
-// and keep no state; each failure is one trace.
+// and keep no state; a failure is traced by every step it passes through.
 #ifndef VARNEK_LNGPACK_H
 #define VARNEK_LNGPACK_H
 
@@ -30,8 +30,8 @@ VARNEK_API BOOL WmConvertPCode2UTF(char *pszOutText, const unsigned short *mszIn
 //   returns  the bytes written, without the terminator; -1 for a null pointer or an `nChar` of 0
 VARNEK_API int __WmLngUnicode2UTF(char *des, const unsigned short *src, int nChar);
 
-// A whole text of units to UTF-8.
-//   returns  TRUE, or FALSE
+// A whole text of units to UTF-8; the output takes up to three bytes a unit and one more.
+//   returns  TRUE; FALSE for a null pointer
 VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInText);
 
 // UTF-8 to units, of at most `length` bytes of input; bytes beyond are never read. A byte that
@@ -39,12 +39,12 @@ VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInTex
 // decoded.
 //   outBufSize  bytes of room, the terminator counted
 //   returns     TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a
-//   null
-//               pointer or too little room
+//               null pointer or too little room
 VARNEK_API BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize,
                                    const char *szInText, int length);
 
-//   returns  the bytes of room that WmConvertUTF2PCode needs for this input, terminator included
+//   returns  the bytes of room that WmConvertUTF2PCode needs for this input, terminator included;
+//            that of an empty text for null
 VARNEK_API int __WmLngStrlenByByte(const char *szText, int length);
 
 // Compares a size with what is needed, and traces under `szName` when it is too small.
@@ -65,8 +65,8 @@ VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned 
 // Latin-15 to a new UTF-8 text.
 //   outputData   in: null or a block from malloc, which is freed; out: a block from malloc that the
 //                caller frees. Left alone when the result is FALSE or the converted text is empty
-//   szInputSize  length of the input in bytes
-//   returns      TRUE; FALSE for a null pointer, an input longer than its size or too little memory
+//   szInputSize  length of the input in bytes; up to three times as many and one are accepted
+//   returns      TRUE; FALSE for a null pointer, a longer input or too little memory
 VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
                                                unsigned int szInputSize);
 

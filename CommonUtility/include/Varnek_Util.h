@@ -15,7 +15,7 @@ extern "C" {
 // Computes the CRC of `length` bytes. Over data that ends in its own CRC, most significant byte
 // first, the result is 0.
 //   length   4 or more; less is reported by a panic report, and less than 1 reads nothing
-//   returns  the register; 0xFFFFFFFF when `length` is below 1
+//   returns  the register; 0xFFFFFFFF when `length` is below 1, and for null after a panic report
 VARNEK_API uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t length);
 
 // Checks a section whose last four bytes are its CRC_32.
@@ -23,7 +23,7 @@ VARNEK_API uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t leng
 //   returns  TRUE when the CRC is right; FALSE when not, and for null after a panic report
 VARNEK_API BOOL VarnekUtil_CheckSectionCRC32(const unsigned char *section);
 
-// Checks a file of at least 8 bytes whose last four are the CRC of the rest, most significant
+// Checks a file of at least 8 bytes whose last four are the CRC of the rest, most significant byte
 // first.
 //   returns  TRUE when they are equal; FALSE when not, or when the file is too small or unreadable
 VARNEK_API BOOL VarnekUtil_CheckFileCRC32(const char *path);
@@ -31,8 +31,7 @@ VARNEK_API BOOL VarnekUtil_CheckFileCRC32(const char *path);
 // Appends the CRC of a file's whole content, of at least 4 bytes, to the file. Doing it twice
 // appends a CRC of content and first CRC.
 //   returns  TRUE once the append was issued, whatever became of it; FALSE when the file is too
-//   small
-//            or unreadable, and then unchanged
+//            small or unreadable, and then unchanged
 VARNEK_API BOOL VarnekUtil_AppendCRC32ToFile(const char *path);
 
 #ifdef __cplusplus

@@ -1,0 +1,325 @@
+// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. One step of the decoder
+// tells the length of a character for the measuring and for the decoding, so the two cannot differ.
+#include "Varnek_LngPack.h"
+
+#include <limits.h>
+#include <stdlib.h>
+#include <string.h>
+
+#include "Varnek_Trace.h"
+
+namespace {
+
+constexpr int kFirstUpper = 0xA0;
+
+struct Latin15Row {
+    unsigned short byte;
+    unsigned short unicode;
+};
+
+struct Latin15Table {
+    Latin15Row row[0x100 - kFirstUpper];
+};
+
+constexpr Latin15Table MakeLatin15Table() {
+    // Where the code differs from Unicode, and the no-break space, which becomes a plain one.
+    constexpr Latin15Row different[] = {
+        {0xA0, 0x0020}, {0xA4, 0x20AC}, {0xA6, 0x0160}, {0xA8, 0x0161}, {0xB4, 0x017D},
+        {0xB8, 0x017E}, {0xBC, 0x0152}, {0xBD, 0x0153}, {0xBE, 0x0178},
+    };
+    Latin15Table table = {};
+    for (int byte = kFirstUpper; byte <= 0xFF; ++byte) {
+        const unsigned short same = static_cast<unsigned short>(byte);
+        table.row[byte - kFirstUpper] = {same, same};
+    }
+    for (const Latin15Row &row : different) {
+        table.row[row.byte - kFirstUpper] = row;
+    }
+    return table;
+}
+
+// The row of a byte is at its distance from 0xA0.
+constexpr Latin15Table gWmLatin15CodeTable = MakeLatin15Table();
+
+// Bytes of the character at `text`, of which `length` may be read, at least one; 0 when malformed.
+int CharLength(const unsigned char *text, int length) {
+    if (text[0] < 0x80) {
+        return 1;
+    }
+    if ((text[0] & 0xE0) == 0xC0 && length >= 2 && text[1] >= 0x80) {
+        return 2;
+    }
+    if (text[0] >= 0xE0 && length >= 3 && text[1] >= 0x80 && text[2] >= 0x80) {
+        return 3;
+    }
+    return 0;
+}
+
+}  // namespace
+
+BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize, const char *szInText) {
+    if (pmszOutText == nullptr || szInText == nullptr) {
+        VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL,
+                     "WmConvertLatin15Code2PCode() fail. pmszOutText == NULL ||  szInText  == "
+                     "NULL\n");
+        return FALSE;
+    }
+    const size_t strLen = strlen(szInText);
+    if (outBufSize < 0 || strLen > static_cast<size_t>(outBufSize)) {
+        VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL,
+                     "WmConvertLatin15Code2PCode() fail. outBufSize < strLen\n");
+        return FALSE;
+    }
+    for (size_t i = 0; i < strLen; ++i) {
+        const unsigned char byte = static_cast<unsigned char>(szInText[i]);
+        if (byte >= kFirstUpper) {
+            *pmszOutText++ = gWmLatin15CodeTable.row[byte - kFirstUpper].unicode;
+        } else if (byte >= 0x20 && byte <= 0x7E) {
+            *pmszOutText++ = byte;
+        }
+    }
+    *pmszOutText = 0;
+    return TRUE;
+}
+
+int WmStrlen(const unsigned short *mszText) {
+    if (mszText == nullptr) {
+        return -1;
+    }
+    int length = 0;
+    while (mszText[length] != 0) {
+        ++length;
+    }
+    return length;
+}
+
+BOOL WmConvertPCode2UTF(char *pszOutText, const unsigned short *mszInText, int nChar) {
+    if (pszOutText == nullptr) {
+        TRACE_HIGH("WmConvertPCode2UTF : pszOutText - null  !!");
+        return FALSE;
+    }
+    if (mszInText == nullptr) {
+        TRACE_HIGH(" WmConvertPCode2UTF : mszInText - 0  !!");
+        return FALSE;
+    }
+    if (nChar == 0) {
+        pszOutText[0] = '\0';
+        return TRUE;
+    }
+    if (__WmLngUnicode2UTF(pszOutText, mszInText, nChar) == -1) {
+        TRACE_HIGH("WmConvertPCode2UTF: __WmLngUnicode2UTF returns false!\n");
+        return FALSE;
+    }
+    return TRUE;
+}
+
+int __WmLngUnicode2UTF(char *des, const unsigned short *src, int nChar) {
+    if (des == nullptr) {
+        TRACE_HIGH(" __WmLngUnicode2UTF : des - null  !!");
+        return -1;
+    }
+    if (src == nullptr) {
+        TRACE_HIGH("__WmLngUnicode2UTF : src - null  !!");
+        return -1;
+    }
+    if (nChar == 0) {
+        TRACE_HIGH(" __WmLngUnicode2UTF : nChar - 0  !!");
+        return -1;
+    }
+    char *out = des;
+    for (int i = 0; i < nChar && src[i] != 0; ++i) {
+        const unsigned int unit = src[i];
+        if (unit < 0x80) {
+            *out++ = static_cast<char>(unit);
+        } else if (unit < 0x800) {
+            *out++ = static_cast<char>(0xC0 | unit >> 6);
+            *out++ = static_cast<char>(0x80 | (unit & 0x3F));
+        } else {
+            *out++ = static_cast<char>(0xE0 | unit >> 12);
+            *out++ = static_cast<char>(0x80 | (unit >> 6 & 0x3F));
+            *out++ = static_cast<char>(0x80 | (unit & 0x3F));
+        }
+    }
+    *out = '\0';
+    return static_cast<int>(out - des);
+}
+
+BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInText) {
+    const int nChar = WmStrlen(mszInText);
+    if (nChar == 0 && pszOutText != nullptr) {
+        pszOutText[0] = '\0';
+        return TRUE;
+    }
+    if (WmConvertPCode2UTF(pszOutText, mszInText, nChar) != TRUE) {
+        TRACE_HIGH("WmConvert2LCode: Converting Unicode(%x) to utf8 code failed\n",
+                   static_cast<unsigned int>(reinterpret_cast<uintptr_t>(mszInText)));
+        return FALSE;
+    }
+    return TRUE;
+}
+
+BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize, const char *szInText,
+                        int length) {
+    if (pmszOutText == nullptr) {
+        TRACE_HIGH("WmConvertUTF2PCode : pmszOutText - null  !!");
+        return FALSE;
+    }
+    if (szInText == nullptr) {
+        TRACE_HIGH("WmConvertUTF2PCode : szInText - null  !!");
+        return FALSE;
+    }
+    if (length == 0) {
+        pmszOutText[0] = 0;
+        return TRUE;
+    }
+    const int required = __WmLngStrlenByByte(szInText, length);
+    if (__WmConvertCodeBufferSizeCheck("pmszOutText", outBufSize, required) != TRUE) {
+        TRACE_HIGH("WmConvertUTF2PCode: Out buffer size seems to be small!\n");
+        return FALSE;
+    }
+    if (__WmLngUTF2Unicode(pmszOutText, szInText, length) == -1) {
+        TRACE_HIGH("WmConvertUTF2PCode: __WmLngUTF2Unicode returns false!\n");
+        return FALSE;
+    }
+    return TRUE;
+}
+
+int __WmLngStrlenByByte(const char *szText, int length) {
+    int count = 1;
+    if (length < 1 || szText == nullptr) {
+        return 2;
+    }
+    const unsigned char *text = reinterpret_cast<const unsigned char *>(szText);
+    // A text that needs 2 GiB of output or more gets the largest size there is.
+    while (length > 0 && *text != 0 && count < INT_MAX / 2) {
+        int step = CharLength(text, length);
+        if (step == 0) {
+            TRACE_HIGH("__WmLngStrlenByByte: utf8 incorrect range!\n");
+            step = 1;
+        }
+        text += step;
+        length -= step;
+        ++count;
+    }
+    return length > 0 && *text != 0 ? INT_MAX : count * 2;
+}
+
+BOOL __WmConvertCodeBufferSizeCheck(const char *szName, int OutBuffer, int RequiredBufSize) {
+    if (OutBuffer >= RequiredBufSize) {
+        return TRUE;
+    }
+    const char *name = szName != nullptr ? szName : "(null)";
+    if (OutBuffer == 4) {
+        TRACE_HIGH("__WmConvertCodeBufferSizeCheck: Out buffer size seems to be small (%s)\n",
+                   name);
+    } else {
+        TRACE_HIGH(
+            "__WmConvertCodeBufferSizeCheck: Buffer size is too small %s: OutBuffer(%d), "
+            "RequiredBufSize(%d)\n",
+            name, OutBuffer, RequiredBufSize);
+    }
+    return FALSE;
+}
+
+int __WmLngUTF2Unicode(unsigned short *des, const char *src, int length) {
+    if (des == nullptr) {
+        TRACE_HIGH("__WmLngUTF2Unicode : des - null  !!");
+        return -1;
+    }
+    if (src == nullptr) {
+        TRACE_HIGH("__WmLngUTF2Unicode : src - null  !!");
+        return -1;
+    }
+    const unsigned char *text = reinterpret_cast<const unsigned char *>(src);
+    unsigned short *out = des;
+    while (length > 0 && *text != 0) {
+        int step = CharLength(text, length);
+        if (step == 3) {
+            *out = __WmLngConvert3ByteChar(text[0], text[1], text[2]);
+        } else if (step == 2) {
+            const bool noBreakSpace = text[0] == 0xC2 && text[1] == 0xA0;
+            *out = noBreakSpace ? 0x0020 : __WmLngConvert2ByteChar(text[0], text[1]);
+        } else {
+            *out = __WmLngConvert1ByteChar(text[0]);
+        }
+        if (step == 0) {
+            TRACE_HIGH("__WmLngUTF2Unicode: utf8 incorrect range!\n");
+            step = 1;
+        }
+        ++out;
+        text += step;
+        length -= step;
+    }
+    *out = 0;
+    return static_cast<int>(out - des);
+}
+
+unsigned short __WmLngConvert1ByteChar(unsigned char first) {
+    return first & 0x7F;
+}
+
+unsigned short __WmLngConvert2ByteChar(unsigned char first, unsigned char second) {
+    return static_cast<unsigned short>((first & 0x1F) << 6 | (second & 0x3F));
+}
+
+unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned char second,
+                                       unsigned char third) {
+    return static_cast<unsigned short>(first << 12 | (second & 0x3F) << 6 | (third & 0x3F));
+}
+
+// The conversion within two work buffers that hold whatever `capacity` lets pass.
+static BOOL ConvertWithin(char **outputData, const char *szInput, unsigned int szInputSize,
+                          int capacity, unsigned short *pcode, char *utf8) {
+    TRACE_LOW("VarnekPGL_ConvertLatin15toUTF8: szInputSize is %d\t!\n",
+              static_cast<int>(szInputSize));
+    if (WmConvertLatin15Code2PCode(pcode, capacity, szInput) != TRUE) {
+        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: WmConvertLatin15Code2PCode. ERROR  !\n");
+        return FALSE;
+    }
+    if (WmConvert2LCode(utf8, pcode) != TRUE) {
+        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: WmConvert2LCode. ERROR  !\n");
+        return FALSE;
+    }
+    TRACE_LOW("VarnekPGL_ConvertLatin15toUTF8: Convert String => %s !\n", utf8);
+    const size_t textlen = strlen(utf8);
+    if (textlen == 0) {
+        return TRUE;
+    }
+    TRACE_LOW("VarnekPGL_ConvertLatin15toUTF8:textlen = %d !\n", static_cast<int>(textlen + 1));
+    char *text = static_cast<char *>(malloc(textlen + 1));
+    if (text == nullptr) {
+        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: memalloc failed  !\n");
+        return FALSE;
+    }
+    memcpy(text, utf8, textlen + 1);
+    free(*outputData);
+    *outputData = text;
+    TRACE_LOW("VarnekPGL_ConvertLatin15toUTF8 : VarnekPGL_Strlen(*outputData) = %d !\n",
+              static_cast<int>(textlen));
+    return TRUE;
+}
+
+BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
+                                    unsigned int szInputSize) {
+    if (outputData == nullptr || szInput == nullptr) {
+        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: outputData or szInput is NULL  !\n");
+        return FALSE;
+    }
+    // The bytes of input that are accepted: three times the stated size and one, as long as no size
+    // below overflows. The buffers follow the input itself, not what the caller says of it.
+    const uint64_t stated = 3 * static_cast<uint64_t>(szInputSize) + 1;
+    const int capacity = stated < INT_MAX / 4 ? static_cast<int>(stated) : INT_MAX / 4;
+    const size_t length = strnlen(szInput, static_cast<size_t>(capacity));
+    unsigned short *pcode =
+        static_cast<unsigned short *>(malloc((length + 1) * sizeof(unsigned short)));
+    char *utf8 = static_cast<char *>(malloc(length * 3 + 1));
+    BOOL done = FALSE;
+    if (pcode != nullptr && utf8 != nullptr) {
+        done = ConvertWithin(outputData, szInput, szInputSize, capacity, pcode, utf8);
+    } else {
+        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: memalloc failed  !\n");
+    }
+    free(pcode);
+    free(utf8);
+    return done;
+}
