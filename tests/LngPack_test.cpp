@@ -1,0 +1,153 @@
+// Text conversion: the code tables as text, every unit there and back, and malformed input.
+#include "Varnek_LngPack.h"
+
+#include <cstdlib>
+#include <cstring>
+
+#include "support/VarnekTest.h"
+
+namespace {
+
+using Units = std::vector<unsigned short>;
+
+class LngPack : public VarnekTest {};
+
+// A result and the lines that were traced on the way to it.
+std::string Said(int result) {
+    std::string all = std::to_string(result);
+    for (const std::string &line : TakeBodies()) {
+        all += "|" + line;
+    }
+    return all;
+}
+
+TEST_F(LngPack, Latin15BecomesUtf8) {
+    std::string every;
+    for (int byte = 1; byte < 256; ++byte) {
+        every.push_back(static_cast<char>(byte));
+    }
+    char *text = strdup("a block of the caller");
+    EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, every.c_str(), 255), TRUE);
+    EXPECT_STREQ(text,
+                 " !\"#$%&'()*+,-./0123456789:;<=>?@ABCDEFGHIJKLMNOPQRSTUVWXYZ[\\]^_"
+                 "`abcdefghijklmnopqrstuvwxyz{|}~"
+                 " ¡¢£€¥Š§š©ª«¬\u00AD®¯°±²³Žµ¶·ž¹º»ŒœŸ¿"
+                 "ÀÁÂÃÄÅÆÇÈÉÊËÌÍÎÏÐÑÒÓÔÕÖ×ØÙÚÛÜÝÞßàáâãäåæçèéêëìíîïðñòóôõö÷øùúûüýþÿ");
+    TakeLog();
+    EXPECT_EQ(Said(VarnekPGL_ConvertLatin15toUTF8(&text, "caf\xE9", 4)),
+              "1|VarnekPGL_ConvertLatin15toUTF8: szInputSize is 4\t!\n"
+              "|VarnekPGL_ConvertLatin15toUTF8: Convert String => café !\n"
+              "|VarnekPGL_ConvertLatin15toUTF8:textlen = 6 !\n"
+              "|VarnekPGL_ConvertLatin15toUTF8 : VarnekPGL_Strlen(*outputData) = 5 !\n");
+    // Nothing to convert, or far more than stated, leaves the text alone.
+    EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "", 0), TRUE);
+    EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\x09\x0A\x1B\x7F\x85", 5), TRUE);
+    TakeLog();
+    EXPECT_EQ(Said(VarnekPGL_ConvertLatin15toUTF8(&text, "12345", 1)),
+              "0|VarnekPGL_ConvertLatin15toUTF8: szInputSize is 1\t!\n"
+              "|WmConvertLatin15Code2PCode() fail. outBufSize < strLen\n"
+              "|VarnekPGL_ConvertLatin15toUTF8: WmConvertLatin15Code2PCode. ERROR  !\n");
+    EXPECT_STREQ(text, "café");
+    // A little more than stated does not outgrow the work buffers, nor does the largest statement.
+    EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4\xA4\xA4\xA4", 1), TRUE);
+    EXPECT_STREQ(text, "€€€€");
+    EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4", UINT32_MAX), TRUE);
+    EXPECT_STREQ(text, "€");
+    free(text);
+}
+
+TEST_F(LngPack, EveryUnitSurvivesUtf8) {
+    const Units edges = {0x7F, 0x80, 0x7FF, 0x800, 0xD800, 0xFFFF, 0};
+    char utf8[32];
+    EXPECT_EQ(__WmLngUnicode2UTF(utf8, edges.data(), 9), 14);
+    EXPECT_STREQ(utf8, "\x7F\xC2\x80\xDF\xBF\xE0\xA0\x80\xED\xA0\x80\xEF\xBF\xBF");
+    EXPECT_EQ(__WmLngUnicode2UTF(utf8, edges.data(), 2), 3);
+    EXPECT_EQ(__WmLngUnicode2UTF(utf8, edges.data(), -1), 0);
+    Units all, back(0x10000);
+    for (int unit = 1; unit <= 0x10000; ++unit) {
+        all.push_back(static_cast<unsigned short>(unit));
+    }
+    std::vector<char> text(all.size() * 3);
+    ASSERT_EQ(WmConvert2LCode(text.data(), all.data()), TRUE);
+    const int length = static_cast<int>(strlen(text.data()));
+    EXPECT_EQ(__WmLngStrlenByByte(text.data(), length), 0x20000);
+    EXPECT_EQ(Said(WmConvertUTF2PCode(back.data(), 0x20000, text.data(), length)), "1");
+    all[0xA0 - 1] = ' ';
+    EXPECT_TRUE(back == all);
+}
+
+TEST_F(LngPack, MalformedUtf8IsDecodedByteByByte) {
+    const struct {
+        std::string utf8;
+        Units units;
+        size_t malformed;
+    } rows[] = {
+        {"\xA9", {0x29}, 1},
+        {"\xF0\x9F\x98\x80", {0x07D8, 0}, 1},
+        {"a\xC2\xA0\xC2\xE0", {'a', ' ', 0xA0}, 0},
+        {"\xE2\x82", {0x62, 0x02}, 2},
+        {"\xDF", {0x5F}, 1},
+        {"\xE2\x82zz", {0x62, 0x02, 'z', 'z'}, 2},
+        {std::string("\xE2\x82\0\x80", 4), {0x62, 0x02}, 2},
+        {std::string("a\0b", 3), {'a'}, 0},
+    };
+    for (const auto &row : rows) {
+        SCOPED_TRACE(testing::PrintToString(row.utf8));
+        Units units(row.units.size() + 1, 0x5555), expected = row.units;
+        expected.push_back(0);
+        const int room = static_cast<int>(expected.size() * 2);
+        const int length = static_cast<int>(row.utf8.size());
+        const std::vector<char> exact(row.utf8.begin(), row.utf8.end());  // no terminator follows
+        EXPECT_EQ(WmConvertUTF2PCode(units.data(), room - 1, exact.data(), length), FALSE);
+        EXPECT_EQ(units[0], 0x5555);
+        TakeLog();
+        EXPECT_EQ(WmConvertUTF2PCode(units.data(), room, exact.data(), length), TRUE);
+        EXPECT_EQ(units, expected);
+        std::vector<std::string> lines(row.malformed,
+                                       "__WmLngStrlenByByte: utf8 incorrect range!\n");
+        lines.resize(2 * row.malformed, "__WmLngUTF2Unicode: utf8 incorrect range!\n");
+        EXPECT_EQ(TakeBodies(), lines);
+    }
+}
+
+TEST_F(LngPack, FailuresAreNamed) {
+    const unsigned short abc[] = {'a', 'b', 'c', 0};
+    unsigned short units[8];
+    char bytes[8] = "before";
+    char *text = nullptr;
+    EXPECT_EQ(Said(WmConvertLatin15Code2PCode(nullptr, 4, "a")),
+              "0|WmConvertLatin15Code2PCode() fail. pmszOutText == NULL ||  szInText  == NULL\n");
+    EXPECT_EQ(Said(WmConvertLatin15Code2PCode(units, 4, "12345")),
+              "0|WmConvertLatin15Code2PCode() fail. outBufSize < strLen\n");
+    EXPECT_EQ(Said(WmConvertLatin15Code2PCode(units, 5, "12345")), "1");
+    EXPECT_EQ(Said(__WmLngUnicode2UTF(nullptr, abc, 3)), "-1| __WmLngUnicode2UTF : des - null  !!");
+    EXPECT_EQ(Said(__WmLngUnicode2UTF(bytes, nullptr, 3)),
+              "-1|__WmLngUnicode2UTF : src - null  !!");
+    EXPECT_EQ(Said(__WmLngUnicode2UTF(bytes, abc, 0)), "-1| __WmLngUnicode2UTF : nChar - 0  !!");
+    EXPECT_EQ(Said(WmConvertPCode2UTF(bytes, abc, 0) + bytes[0]), "1");
+    EXPECT_EQ(Said(WmConvert2LCode(bytes, nullptr)),
+              "0| WmConvertPCode2UTF : mszInText - 0  !!"
+              "|WmConvert2LCode: Converting Unicode(0) to utf8 code failed\n");
+    EXPECT_EQ(Said(WmConvert2LCode(nullptr, abc + 3)).substr(0, 45),
+              "0|WmConvertPCode2UTF : pszOutText - null  !!|");
+    EXPECT_EQ(Said(__WmLngUTF2Unicode(nullptr, "a", 1)), "-1|__WmLngUTF2Unicode : des - null  !!");
+    EXPECT_EQ(Said(__WmLngUTF2Unicode(units, nullptr, 1)),
+              "-1|__WmLngUTF2Unicode : src - null  !!");
+    EXPECT_EQ(Said(WmConvertUTF2PCode(nullptr, 8, "a", 1)),
+              "0|WmConvertUTF2PCode : pmszOutText - null  !!");
+    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 8, nullptr, 1)),
+              "0|WmConvertUTF2PCode : szInText - null  !!");
+    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 4, "abc", 3)),
+              "0|__WmConvertCodeBufferSizeCheck: Out buffer size seems to be small (pmszOutText)\n"
+              "|WmConvertUTF2PCode: Out buffer size seems to be small!\n");
+    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 6, "abc", 3)),
+              "0|__WmConvertCodeBufferSizeCheck: Buffer size is too small pmszOutText: "
+              "OutBuffer(6), RequiredBufSize(8)\n"
+              "|WmConvertUTF2PCode: Out buffer size seems to be small!\n");
+    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 0, "abc", 0) + units[0]), "1");
+    EXPECT_EQ(Said(__WmLngStrlenByByte("abc", 0)), "2");
+    EXPECT_EQ(Said(VarnekPGL_ConvertLatin15toUTF8(&text, nullptr, 1)),
+              "0|VarnekPGL_ConvertLatin15toUTF8: outputData or szInput is NULL  !\n");
+}
+
+}  // namespace

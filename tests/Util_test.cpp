@@ -1,0 +1,123 @@
+// The CRC against the definition by bits, its check value, and its uses on sections and files.
+#include "Varnek_Util.h"
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <functional>
+#include <random>
+
+#include "support/VarnekTest.h"
+
+namespace {
+
+using ::testing::ElementsAre;
+using ::testing::SizeIs;
+using ::testing::StartsWith;
+
+class Util : public VarnekTest {};
+
+std::vector<unsigned char> Random(size_t size) {
+    static std::mt19937 random(13818);
+    std::vector<unsigned char> bytes(size);
+    std::generate(bytes.begin(), bytes.end(), std::ref(random));
+    return bytes;
+}
+
+uint32_t CrcByBits(const unsigned char *data, size_t length) {
+    uint32_t crc = 0xFFFFFFFF;
+    for (size_t bit = 0; bit < length * 8; ++bit) {
+        const uint32_t in = data[bit / 8] >> (7 - bit % 8) & 1;
+        crc = crc << 1 ^ ((crc >> 31 ^ in) != 0 ? 0x04C11DB7 : 0);
+    }
+    return crc;
+}
+
+TEST_F(Util, CrcIsTheDefinitionAtEveryLengthAndAlignment) {
+    const unsigned char digits[] = "123456789";
+    EXPECT_EQ(VarnekUtil_MakeCRC32(digits, 9), 0x0376E6E7u);
+    for (size_t length = 0; length <= 300; ++length) {
+        for (size_t offset = 0; offset < 16; ++offset) {
+            const auto bytes = Random(offset + length);
+            const unsigned char *data = bytes.data() + offset;
+            ASSERT_EQ(VarnekUtil_MakeCRC32(data, static_cast<int32_t>(length)),
+                      CrcByBits(data, length))
+                << length << " bytes at " << offset;
+            ASSERT_THAT(TakeBodies("Varnek"), SizeIs(length < 4 ? 1 : 0));
+        }
+    }
+    for (const int32_t length : {-5, 0, 100}) {
+        EXPECT_EQ(VarnekUtil_MakeCRC32(nullptr, length), 0xFFFFFFFFu);
+        EXPECT_THAT(TakeBodies("Varnek"), SizeIs(1));
+    }
+}
+
+TEST_F(Util, AFlippedBitInvalidatesASection) {
+    EXPECT_EQ(VarnekUtil_CheckSectionCRC32(nullptr), FALSE);
+    EXPECT_THAT(TakeBodies("Varnek"), SizeIs(1));
+    for (const size_t size : {7u, 40u, 4098u}) {
+        auto section = Random(size);
+        section[1] = static_cast<unsigned char>((section[1] & 0xF0) | (size - 3) >> 8);
+        section[2] = static_cast<unsigned char>(size - 3);
+        const uint32_t crc = CrcByBits(section.data(), size - 4);
+        for (size_t i = 0; i < 4; ++i) {
+            section[size - 4 + i] = static_cast<unsigned char>(crc >> (24 - 8 * i));
+        }
+        EXPECT_EQ(VarnekUtil_CheckSectionCRC32(section.data()), TRUE) << size;
+        for (size_t bit = 0; bit < size * 8; bit += size < 100 ? 1 : 499) {
+            if (bit >= 12 && bit < 24) {
+                continue;  // the length itself
+            }
+            auto broken = section;
+            broken[bit / 8] = static_cast<unsigned char>(broken[bit / 8] ^ 0x80 >> bit % 8);
+            EXPECT_EQ(VarnekUtil_CheckSectionCRC32(broken.data()), FALSE) << bit;
+            EXPECT_THAT(TakeBodies(),
+                        ElementsAre(StartsWith("CRC32 Invalid! calculated crc32=[0x")));
+        }
+    }
+}
+
+TEST_F(Util, AFileCarriesItsCrc) {
+    const std::string path = Path("file");
+    WriteAll(path, "1234");
+    EXPECT_EQ(VarnekUtil_AppendCRC32ToFile(path.c_str()), TRUE);
+    EXPECT_EQ(VarnekUtil_CheckFileCRC32(path.c_str()), TRUE);
+    EXPECT_EQ(ReadAll(path), "1234\xa6\x95\xc4\xaa");
+    EXPECT_THAT(TakeBodies(),
+                ElementsAre("Append CRC Value, File=[" + path + "], CRC32=[0xa695c4aa]\n",
+                            "Check CRC Value, File=[" + path +
+                                "], Calulated=[0xa695c4aa], Included=[0xa695c4aa]\n"));
+    EXPECT_EQ(VarnekUtil_AppendCRC32ToFile(path.c_str()), TRUE);
+    EXPECT_EQ(VarnekUtil_CheckFileCRC32(path.c_str()), TRUE);
+    EXPECT_EQ(ReadAll(path).substr(8), std::string(4, '\0'));
+    WriteAll(path, "1235\xa6\x95\xc4\xaa");
+    EXPECT_EQ(VarnekUtil_CheckFileCRC32(path.c_str()), FALSE);
+}
+
+TEST_F(Util, FilesThatCannotCarryACrcAreRefused) {
+    const auto said = [](BOOL result) {
+        return std::to_string(result) + "|" + TakeLog().back().Body();
+    };
+    const auto invalid = [](const std::string &operation, const std::string &path, int size) {
+        return "0|VarnekUtil_" + operation + ": Invalid File! file path=[" + path +
+               "], fileSize=[" + std::to_string(size) + "]\n";
+    };
+    const std::string path = Path("file");
+    EXPECT_EQ(said(VarnekUtil_CheckFileCRC32(path.c_str())), invalid("CheckFileCRC32", path, 0));
+    EXPECT_EQ(said(VarnekUtil_AppendCRC32ToFile(nullptr)),
+              invalid("AppendCRC32ToFile", "(null)", 0));
+    WriteAll(path, "1234567");
+    EXPECT_EQ(said(VarnekUtil_CheckFileCRC32(path.c_str())), invalid("CheckFileCRC32", path, 7));
+    WriteAll(path, "123");
+    EXPECT_EQ(said(VarnekUtil_AppendCRC32ToFile(path.c_str())),
+              invalid("AppendCRC32ToFile", path, 3));
+    EXPECT_EQ(ReadAll(path), "123");
+    // A file of the kernel that promises a page and holds a line.
+    const char *line = "/sys/devices/system/cpu/online";
+    if (access(line, R_OK) == 0) {
+        EXPECT_EQ(said(VarnekUtil_CheckFileCRC32(line)), "0|File Reading Fail!\n");
+        EXPECT_EQ(said(VarnekUtil_AppendCRC32ToFile(line)), "0|File Reading Fail!\n");
+    }
+}
+
+}  // namespace
