@@ -15,7 +15,7 @@
 #include <atomic>
 
 #include "Varnek_File.h"
-#include "Varnek_Trace.h"
+#include "Varnek_Support.h"
 
 extern "C" int __android_log_write(int priority, const char *tag, const char *text);
 
@@ -81,18 +81,6 @@ constexpr ConfigKey kConfigKeys[] = {
     {"CPRM", VARNEK_MODULE_CPRM},
     {"SMPlayer", VARNEK_MODULE_SM_PLAYER},
     {"GingaAppMgr", VARNEK_MODULE_GINGA},
-};
-
-// Leaves the caller's errno as it was, whatever the calls in between do to it.
-class ErrnoKeeper {
-  public:
-    ErrnoKeeper() : kept_(errno) {}
-    ~ErrnoKeeper() { errno = kept_; }
-    ErrnoKeeper(const ErrnoKeeper &) = delete;
-    ErrnoKeeper &operator=(const ErrnoKeeper &) = delete;
-
-  private:
-    int kept_;
 };
 
 struct LevelLook {

@@ -17,6 +17,7 @@
 #include <unistd.h>
 
 #include "Varnek_FileLog.h"
+#include "Varnek_Support.h"
 
 extern "C" int __android_log_write(int priority, const char *tag, const char *text);
 
@@ -40,11 +41,6 @@ constexpr int32_t kNotOpened = -18;
 constexpr int32_t kInvalidBase = -8;
 constexpr uint32_t kSeekBases = 3;  // SEEK_SET 0, SEEK_CUR 1, SEEK_END 2
 
-// What a log line shows of a path or name that may be null.
-const char *Shown(const char *text) {
-    return text != nullptr ? text : "(null)";
-}
-
 // The stream behind a handle, null for none. -1 is what a failed open gave the caller.
 FILE *StreamOf(PglFileHandle hFile) {
     return hFile != -1 ? reinterpret_cast<FILE *>(hFile) : nullptr;
@@ -66,14 +62,13 @@ bool IsTooLong(const char *path) {
 }  // namespace
 
 void __VarnekPGL_FileLog(const char *format, ...) {
-    const int kept = errno;
+    const ErrnoKeeper keeper;
     char line[kFileLogSize];
     va_list args;
     va_start(args, format);
     vsnprintf(line, sizeof line, format, args);
     va_end(args);
     __android_log_write(kLogError, "SBTVD_File", line);
-    errno = kept;
 }
 
 // Streams ----------------------------------------------------------------------------------------

@@ -1,0 +1,68 @@
+// Named mutexes and named counting semaphores, each kept in one process-wide table of 40.
+//
+// Handles start at 1, rise by one with every creation and are never given out twice; mutexes and
+// semaphores count apart. Names have 1 to 31 characters and compare exactly. Any thread may call
+// any operation, and no call is needed to set the tables up. Every failure is one Error trace.
+#ifndef VARNEK_SEMAPHORE_H
+#define VARNEK_SEMAPHORE_H
+
+#include "Varnek_Common.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+// Mutexes ----------------------------------------------------------------------------------------
+// Not recursive. A mutex is deleted only when no thread can still acquire or release it.
+
+// Creates a mutex. A live mutex of this name is deleted first; when a thread holds that one, the
+// creation fails and it stays.
+//   returns  the handle; -1 for a bad name, a full table or a failing OS call
+VARNEK_API int32_t VarnekPGL_CreateMutex(const char *szMutexName);
+
+//   returns  TRUE when the mutex is gone; FALSE for an unknown handle or a mutex that is held
+VARNEK_API BOOL VarnekPGL_DeleteMutex(int32_t hMutex);
+
+// Waits without limit until the calling thread holds the mutex. Traces nothing on success.
+//   returns  TRUE once it is held; FALSE for an unknown handle or a failing OS call
+VARNEK_API BOOL VarnekPGL_AcquireMutex(int32_t hMutex);
+
+// Gives up the mutex that the calling thread holds. Traces nothing on success.
+//   returns  TRUE; FALSE for an unknown handle or a failing OS call
+VARNEK_API BOOL VarnekPGL_ReleaseMutex(int32_t hMutex);
+
+//   returns  the handle of the live mutex of this name; -1 for none and for null. Traces nothing
+VARNEK_API int32_t VarnekPGL_GetMutexByName(const char *szMutexName);
+
+// Semaphores -------------------------------------------------------------------------------------
+// A semaphore is deleted only when no thread waits on it or can still signal it.
+
+// Creates a semaphore. A live semaphore of this name is deleted first.
+//   count    units at the start, at most what the system's semaphores hold
+//   returns  the handle; -1 for a bad name, a full table or a failing OS call
+VARNEK_API int32_t VarnekPGL_CreateSemaphore(const char *szSemName, uint32_t count);
+
+//   returns  TRUE when the slot is free, whatever the OS says; FALSE for an unknown handle
+VARNEK_API BOOL VarnekPGL_DeleteSemaphore(int32_t hSem);
+
+// Takes one unit, waiting up to `timeout`.
+//   timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
+//   returns  TRUE when a unit was taken; FALSE on time-out and on every failure alike. An
+//   interrupted
+//            wait is not resumed
+//   traces   Low on entry; Error for an unknown handle or a failing OS wait; nothing on time-out
+VARNEK_API BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout);
+
+// Adds one unit, which wakes one waiter.
+//   returns  TRUE; FALSE for an unknown handle or a failing OS call
+VARNEK_API BOOL VarnekPGL_SignalSemaphore(int32_t hSem);
+
+//   returns  the handle of the live semaphore of this name; -1 for none and for null. Traces
+//   nothing
+VARNEK_API int32_t VarnekPGL_SemaphoreByName(const char *szSemName);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

@@ -1,0 +1,62 @@
+// Named one-shot timers that call their owner back, and sleeps.
+//
+// 32 timers; a handle is the slot's index, 0 to 31, and comes back after a deletion. Names have 0
+// to 40 characters, compare exactly and are unique. A timer is created, then started and cancelled
+// any number of times, then deleted. Any thread may call any operation, a callback included.
+// Failures are traced at Error.
+#ifndef VARNEK_TIMER_H
+#define VARNEK_TIMER_H
+
+#include "Varnek_Common.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+// Runs on a thread of the OS timer service, with no lock held; callbacks of several timers may run
+// at once. A callback may use its own timer, start it again included.
+typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
+
+// Takes the lowest free slot; no OS timer exists before the first start.
+//   returns  the handle; -1 for null, a name that is too long or in use, or a full table
+VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
+
+// Arms the timer once.
+//   timeout   milliseconds from now on the wall clock, 1 or more
+//   userData  handed to `callback` unchanged; both stay until the next start
+//   returns   TRUE when armed; FALSE for an unknown handle, an armed timer, a null callback, a
+//   timeout
+//             of 0 or a failing OS call
+VARNEK_API BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc callback,
+                                     void *userData);
+
+// Disarms the timer. An expiry at the same moment may still call back.
+//   returns  TRUE when it is disarmed now, with an Error line when it was already; FALSE for an
+//   unknown
+//            handle, a timer never started or a failing OS call
+VARNEK_API BOOL VarnekPGL_CancelTimer(uint32_t timer);
+
+// Frees the slot, disarming the timer. An expiry at the same moment may still call back.
+//   returns  TRUE, whatever the OS says; FALSE for an unknown handle
+VARNEK_API BOOL VarnekPGL_DeleteTimer(uint32_t timer);
+
+//   returns  the handle of the timer of this name; -1 for none and for null
+VARNEK_API int32_t VarnekPGL_GetTimerByName(const char *szTmName);
+
+//   returns  TRUE while the timer is armed
+VARNEK_API BOOL VarnekPGL_IsTimerActive(uint32_t timer);
+
+// Sleeps for milliseconds. A signal ends the sleep early; a negative time returns at once.
+VARNEK_API void VarnekPGL_MSleep(int32_t msec);
+
+// Sleeps for whole seconds, whatever the name says. A signal ends the sleep early.
+VARNEK_API void VarnekPGL_USleep(uint32_t seconds);
+
+// Does nothing; the timers live as long as the process.
+VARNEK_API void VarnekPGL_DestoryTimerSystem(void);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

@@ -1,0 +1,121 @@
+// The linked list: nodes from malloc, one link step shared by every insertion and one by every
+// removal.
+#include "Varnek_List.h"
+
+#include <stdlib.h>
+
+namespace {
+
+// Links a new node for `data` before `next`, at the tail when that is null.
+void InsertBefore(list_t *list, list_node_t *next, void *data) {
+    list_node_t *node = static_cast<list_node_t *>(malloc(sizeof(list_node_t)));
+    if (node == nullptr) {
+        return;
+    }
+    list_node_t *prev = next != nullptr ? next->prev : list->tail;
+    *node = {data, prev, next};
+    (prev != nullptr ? prev->next : list->head) = node;
+    (next != nullptr ? next->prev : list->tail) = node;
+    list->count++;
+}
+
+// Unlinks a node of the list, frees it and hands back its data.
+void *Unlink(list_t *list, list_node_t *node) {
+    (node->prev != nullptr ? node->prev->next : list->head) = node->next;
+    (node->next != nullptr ? node->next->prev : list->tail) = node->prev;
+    list->count--;
+    void *data = node->data;
+    free(node);
+    return data;
+}
+
+// The node at a position, null outside the list.
+list_node_t *NodeAt(const list_t *list, int32_t position) {
+    if (position < 0 || position >= list->count) {
+        return nullptr;
+    }
+    list_node_t *node = list->head;
+    while (position-- > 0) {
+        node = node->next;
+    }
+    return node;
+}
+
+}  // namespace
+
+void list_initialize(list_t *list) {
+    if (list != nullptr) {
+        *list = {};
+    }
+}
+
+void list_insertHead(list_t *list, void *data) {
+    if (list != nullptr && data != nullptr) {
+        InsertBefore(list, list->head, data);
+    }
+}
+
+void list_insertTail(list_t *list, void *data) {
+    if (list != nullptr && data != nullptr) {
+        InsertBefore(list, nullptr, data);
+    }
+}
+
+void list_insert(list_t *list, void *data) {
+    list_insertTail(list, data);
+}
+
+void list_insertAt(list_t *list, int32_t position, void *data) {
+    if (list != nullptr && data != nullptr && position >= 0) {
+        InsertBefore(list, NodeAt(list, position), data);
+    }
+}
+
+void *list_element(list_t *list, int32_t position) {
+    return list_data(list != nullptr ? NodeAt(list, position) : nullptr);
+}
+
+void *list_removeHead(list_t *list) {
+    return list != nullptr && list->head != nullptr ? Unlink(list, list->head) : nullptr;
+}
+
+void *list_removeTail(list_t *list) {
+    return list != nullptr && list->tail != nullptr ? Unlink(list, list->tail) : nullptr;
+}
+
+void *list_remove(list_t *list, int32_t position) {
+    if (list == nullptr) {
+        return nullptr;
+    }
+    // The tail is known; everything else is a walk from the head.
+    list_node_t *node = position == list->count - 1 ? list->tail : NodeAt(list, position);
+    return node != nullptr ? Unlink(list, node) : nullptr;
+}
+
+void list_removeAll(list_t *list) {
+    while (void *data = list_removeHead(list)) {
+        free(data);
+    }
+}
+
+void list_remove_node(list_t *list, list_node_t *node) {
+    if (list != nullptr && node != nullptr) {
+        free(Unlink(list, node));
+    }
+}
+
+list_node_t *list_head(list_t *list) {
+    return list != nullptr ? list->head : nullptr;
+}
+
+list_node_t *list_tail(list_t *list) {
+    return list != nullptr ? list->tail : nullptr;
+}
+
+list_node_t *list_next(list_node_t *node) {
+    return node != nullptr ? node->next : nullptr;
+}
+
+void *list_data(list_node_t *node) {
+    return node != nullptr ? node->data : nullptr;
+}

@@ -1,0 +1,306 @@
+// Named mutexes and named semaphores. The two families repeat one design over the slot table, but
+// differ in words, in when they trace and in what a deletion may refuse; each stands on its own
+// here.
+#include "Varnek_Semaphore.h"
+
+#include <pthread.h>
+#include <semaphore.h>
+
+#include "Varnek_SlotTable.h"
+#include "Varnek_Support.h"
+#include "Varnek_Trace.h"
+
+namespace {
+
+constexpr int MAX_MUTEX_MGR_INFO_ARR_SIZE = 40;
+constexpr int MAX_SEM_MGR_INFO_ARR_SIZE = 40;
+
+struct MUTEX_MGR_INFO {
+    pthread_mutex_t linuxMutex;
+};
+
+struct SEM_MGR_INFO {
+    sem_t linuxSem;
+};
+
+// gMutexArrLock guards every change of the table and gNextMutexHandle; the count is read without.
+SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE> gMutexArr;
+std::atomic<int32_t> gMutexArrSize{0};
+int32_t gNextMutexHandle = 1;
+pthread_mutex_t gMutexArrLock = PTHREAD_MUTEX_INITIALIZER;
+
+// gSemArrLock likewise.
+SlotTable<SEM_MGR_INFO, MAX_SEM_MGR_INFO_ARR_SIZE> gSemArr;
+std::atomic<int32_t> gSemArrSize{0};
+int32_t gNextSemHandle = 1;
+pthread_mutex_t gSemArrLock = PTHREAD_MUTEX_INITIALIZER;
+
+// Mutexes ----------------------------------------------------------------------------------------
+
+int32_t __Varnek_create_mutex(const char *szMutexName) {
+    TRACE_LOW("***** START : __Varnek_create_mutex. szMutexName=[%s]", Shown(szMutexName));
+    if (szMutexName == nullptr) {
+        return VARNEK_FAIL(-1, "***** __Varnek_create_mutex : Mutex name is null!!");
+    }
+    const int len = static_cast<int>(strlen(szMutexName));
+    if (len == 0 || len >= static_cast<int>(kNameSize)) {
+        return VARNEK_FAIL(
+            -1, "***** __Varnek_create_mutex : Invalid Mutex Name. szMutexName = [%s], Len = [%d]",
+            szMutexName, len);
+    }
+    const int32_t count = gMutexArrSize.load(std::memory_order_relaxed);
+    if (count >= MAX_MUTEX_MGR_INFO_ARR_SIZE) {
+        return VARNEK_FAIL(
+            -1, "***** __Varnek_create_mutex : Mutex pool is full. gMutexArrSize = [%d]", count);
+    }
+    if (gMutexArr.FindByName(szMutexName) != kInvalidHandle) {
+        return VARNEK_FAIL(-1, "***** __Varnek_create_mutex : Duplicated Mutex. mutex name = [%s]",
+                           szMutexName);
+    }
+
+    pthread_mutex_lock(&gMutexArrLock);
+    const int slot = gMutexArr.FirstFree();
+    if (slot == -1) {
+        TRACE_ERROR("***** __Varnek_create_mutex : Can't find empty index!!!!");
+        pthread_mutex_unlock(&gMutexArrLock);
+        return -1;
+    }
+    pthread_mutex_t &linuxMutex = gMutexArr[slot].linuxMutex;
+    if (!Succeeded(pthread_mutex_init(&linuxMutex, nullptr))) {
+        TRACE_ERROR("***** __Varnek_create_mutex : Mutex creation FAIL!! errCode = [%d]",
+                    VarnekPGL_SysGetLastErro());
+        pthread_mutex_unlock(&gMutexArrLock);
+        return -1;
+    }
+    const int word = FirstWord(linuxMutex);  // before others can lock it
+    const int32_t hHandle = gNextMutexHandle++;
+    gMutexArr.Publish(slot, szMutexName, hHandle);
+    gMutexArrSize.fetch_add(1, std::memory_order_relaxed);
+    pthread_mutex_unlock(&gMutexArrLock);
+
+    TRACE_LOW("***** END : __Varnek_create_mutex mutex handle = %d, linuxMutex=[%d]\n", hHandle,
+              word);
+    return hHandle;
+}
+
+// Destroys a mutex that nobody holds. Some systems destroy a held mutex and some refuse; trying the
+// lock first makes it a refusal everywhere.
+bool DestroyMutex(pthread_mutex_t *mutex) {
+    if (!Succeeded(pthread_mutex_trylock(mutex))) {
+        return false;
+    }
+    pthread_mutex_unlock(mutex);
+    return Succeeded(pthread_mutex_destroy(mutex));
+}
+
+}  // namespace
+
+int32_t VarnekPGL_CreateMutex(const char *szMutexName) {
+    const int32_t hOld = gMutexArr.FindByName(szMutexName);
+    if (hOld != kInvalidHandle) {
+        TRACE_HIGH("szMutexName=[%s]. Duplicated Mutex. Old one will be destroyed!\n", szMutexName);
+        VarnekPGL_DeleteMutex(hOld);
+    }
+    return __Varnek_create_mutex(szMutexName);
+}
+
+BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
+    TRACE_LOW("***** START : VarnekPGL_DeleteMutex. hMutex=[%d]", hMutex);
+    pthread_mutex_lock(&gMutexArrLock);
+    const int slot = gMutexArr.FindByHandle(hMutex);
+    if (slot == -1) {
+        TRACE_ERROR("***** VarnekPGL_DeleteMutex : Can't find mutex info. mutex handle = [%d]",
+                    hMutex);
+        pthread_mutex_unlock(&gMutexArrLock);
+        return FALSE;
+    }
+    if (!DestroyMutex(&gMutexArr[slot].linuxMutex)) {
+        TRACE_ERROR("***** VarnekPGL_DeleteMutex : Mutex Destroy FAIL! errCode = [%d]",
+                    VarnekPGL_SysGetLastErro());
+        pthread_mutex_unlock(&gMutexArrLock);
+        return FALSE;
+    }
+    gMutexArr.Withdraw(slot);
+    gMutexArrSize.fetch_sub(1, std::memory_order_relaxed);
+    pthread_mutex_unlock(&gMutexArrLock);
+    TRACE_LOW("***** END : VarnekPGL_DeleteMutex");
+    return TRUE;
+}
+
+BOOL VarnekPGL_AcquireMutex(int32_t hMutex) {
+    const int slot = gMutexArr.FindByHandle(hMutex);
+    if (slot == -1) {
+        return VARNEK_FAIL(
+            FALSE, "***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [%d]",
+            hMutex);
+    }
+    if (!Succeeded(pthread_mutex_lock(&gMutexArr[slot].linuxMutex))) {
+        return VARNEK_FAIL(FALSE, "***** VarnekPGL_AcquireMutex : Mutex Lock FAIL! errCode = [%d]",
+                           VarnekPGL_SysGetLastErro());
+    }
+    return TRUE;
+}
+
+BOOL VarnekPGL_ReleaseMutex(int32_t hMutex) {
+    const int slot = gMutexArr.FindByHandle(hMutex);
+    if (slot == -1) {
+        return VARNEK_FAIL(
+            FALSE, "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [%d]",
+            hMutex);
+    }
+    if (!Succeeded(pthread_mutex_unlock(&gMutexArr[slot].linuxMutex))) {
+        return VARNEK_FAIL(FALSE,
+                           "***** VarnekPGL_ReleaseMutex : Mutex Unlock FAIL! errCode = [%d]",
+                           VarnekPGL_SysGetLastErro());
+    }
+    return TRUE;
+}
+
+int32_t VarnekPGL_GetMutexByName(const char *szMutexName) {
+    return gMutexArr.FindByName(szMutexName);
+}
+
+// Semaphores -------------------------------------------------------------------------------------
+
+namespace {
+
+int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
+    TRACE_LOW("***** START : __Varnek_create_semaphore. szSemName=[%s], count=[%d]",
+              Shown(szSemName), static_cast<int>(count));
+    if (szSemName == nullptr) {
+        return VARNEK_FAIL(-1, "__Varnek_create_semaphore: szSemName == NULL");
+    }
+    const int strLenTmp = static_cast<int>(strlen(szSemName));
+    if (strLenTmp == 0 || strLenTmp >= static_cast<int>(kNameSize)) {
+        return VARNEK_FAIL(-1, "__Varnek_create_semaphore: %d (strLenTmp == 0 || strLenTmp >= %d)",
+                           strLenTmp, static_cast<int>(kNameSize));
+    }
+    const int32_t size = gSemArrSize.load(std::memory_order_relaxed);
+    if (size >= MAX_SEM_MGR_INFO_ARR_SIZE) {
+        return VARNEK_FAIL(
+            -1, "__Varnek_create_semaphore: gSemArrSize(%d) >= MAX_SEM_MGR_INFO_ARR_SIZE(%d)", size,
+            MAX_SEM_MGR_INFO_ARR_SIZE);
+    }
+    if (gSemArr.FindByName(szSemName) != kInvalidHandle) {
+        return VARNEK_FAIL(-1, "__Varnek_create_semaphore: bDuplicatedSem == TRUE, %s, %d",
+                           szSemName, size);
+    }
+
+    pthread_mutex_lock(&gSemArrLock);
+    const int arrIdx = gSemArr.FirstFree();
+    if (arrIdx == -1) {
+        TRACE_ERROR("***** __Varnek_create_semaphore : Can't find empty index!!!!");
+        pthread_mutex_unlock(&gSemArrLock);
+        return -1;
+    }
+    sem_t &linuxSem = gSemArr[arrIdx].linuxSem;
+    if (sem_init(&linuxSem, 0, count) != 0) {
+        pthread_mutex_unlock(&gSemArrLock);
+        return VARNEK_FAIL(-1, "__Varnek_create_semaphore: retSem != 0. errCode = [%d]",
+                           VarnekPGL_SysGetLastErro());
+    }
+    const int word = FirstWord(linuxSem);  // before others can change it
+    const int32_t hHandle = gNextSemHandle++;
+    gSemArr.Publish(arrIdx, szSemName, hHandle);
+    const int32_t newSize = gSemArrSize.fetch_add(1, std::memory_order_relaxed) + 1;
+    pthread_mutex_unlock(&gSemArrLock);
+
+    TRACE_LOW("__Varnek_create_semaphore: ret [%d]. linux Semaphore=[%d],  size = [%d]\n", hHandle,
+              word, newSize);
+    return hHandle;
+}
+
+// The unlimited wait. An interruption ends it like any failure.
+BOOL WaitForever(int32_t hSem, int arrIdx) {
+    const int retSem = sem_wait(&gSemArr[arrIdx].linuxSem);
+    TRACE_LOW("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
+    if (retSem != 0) {
+        return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: retSem != 0, errCode = [%d]",
+                           VarnekPGL_SysGetLastErro());
+    }
+    return TRUE;
+}
+
+BOOL WaitUntilDeadline(int32_t hSem, uint32_t timeout) {
+    timespec curTime = {};
+    timespec semTimeOut = {};
+    int retSem = clock_gettime(CLOCK_REALTIME, &curTime);
+    if (retSem == 0) {
+        semTimeOut = DeadlineAfter(curTime, timeout);
+        const int arrIdx = gSemArr.FindByHandle(hSem);
+        if (arrIdx == -1) {
+            return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: arrIdx == -1, %d", hSem);
+        }
+        retSem = sem_timedwait(&gSemArr[arrIdx].linuxSem, &semTimeOut);
+    }
+    if (retSem == 0) {
+        return TRUE;
+    }
+    if (VarnekPGL_SysGetLastErro() == ETIMEDOUT) {
+        return FALSE;
+    }
+    TRACE_ERROR("VarnekPGL_WaitSemaphore: retSem [%d] != 0, timeout [%d] errCode = [%d]", retSem,
+                static_cast<int>(timeout), VarnekPGL_SysGetLastErro());
+    TRACE_ERROR("VarnekPGL_WaitSemaphore: curTime.tv_sec[%d] curTime.tv_nsec[%d]",
+                static_cast<int>(curTime.tv_sec), static_cast<int>(curTime.tv_nsec));
+    TRACE_ERROR("VarnekPGL_WaitSemaphore: semTimeOut.tv_sec[%d] semTimeOut.tv_nsec[%d]",
+                static_cast<int>(semTimeOut.tv_sec), static_cast<int>(semTimeOut.tv_nsec));
+    return FALSE;
+}
+
+}  // namespace
+
+int32_t VarnekPGL_CreateSemaphore(const char *szSemName, uint32_t count) {
+    const int32_t hOld = gSemArr.FindByName(szSemName);
+    if (hOld != kInvalidHandle) {
+        TRACE_HIGH("szSemName=[%s]. Duplicated Semaphore. Old one will be destroyed!\n", szSemName);
+        VarnekPGL_DeleteSemaphore(hOld);
+    }
+    return __Varnek_create_semaphore(szSemName, count);
+}
+
+BOOL VarnekPGL_DeleteSemaphore(int32_t hSem) {
+    pthread_mutex_lock(&gSemArrLock);
+    const int arrIdx = gSemArr.FindByHandle(hSem);
+    if (arrIdx == -1) {
+        pthread_mutex_unlock(&gSemArrLock);
+        return VARNEK_FAIL(FALSE, "Varnek_delete_semaphore: arrIdx == -1, %d", hSem);
+    }
+    gSemArr.Withdraw(arrIdx);
+    if (sem_destroy(&gSemArr[arrIdx].linuxSem) != 0) {
+        TRACE_ERROR("Varnek_delete_semaphore: retSem != 0, errCode = [%d]",
+                    VarnekPGL_SysGetLastErro());
+    }
+    const int32_t size = gSemArrSize.fetch_sub(1, std::memory_order_relaxed) - 1;
+    pthread_mutex_unlock(&gSemArrLock);
+    TRACE_LOW("Varnek_delete_semaphore: OK %d", size);
+    return TRUE;
+}
+
+BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout) {
+    const int arrIdx = gSemArr.FindByHandle(hSem);
+    TRACE_LOW("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]", hSem, arrIdx);
+    if (arrIdx == -1) {
+        return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: arrIdx == -1, %d", hSem);
+    }
+    return timeout == WAIT_FOREVER ? WaitForever(hSem, arrIdx) : WaitUntilDeadline(hSem, timeout);
+}
+
+BOOL VarnekPGL_SignalSemaphore(int32_t hSem) {
+    const int arrIdx = gSemArr.FindByHandle(hSem);
+    TRACE_LOW("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
+    if (arrIdx == -1) {
+        return VARNEK_FAIL(FALSE, "VarnekPGL_SignalSemaphore: arrIdx == -1, %d", hSem);
+    }
+    const int retSem = sem_post(&gSemArr[arrIdx].linuxSem);
+    TRACE_LOW("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
+    if (retSem != 0) {
+        return VARNEK_FAIL(FALSE, "VarnekPGL_SignalSemaphore: retSem != 0, errCode = [%d]",
+                           VarnekPGL_SysGetLastErro());
+    }
+    return TRUE;
+}
+
+int32_t VarnekPGL_SemaphoreByName(const char *szSemName) {
+    return gSemArr.FindByName(szSemName);
+}

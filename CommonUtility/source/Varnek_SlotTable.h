@@ -1,0 +1,139 @@
+// The table of named objects: slots, handles and names, and nothing else. Private.
+//
+// A handle is published once in the life of the process, so it is the one word that publishes a
+// slot: what belongs to it is complete before it is stored and untouched until it is withdrawn.
+// Lookups take no lock. They read the handle with acquire; for a name they read the handle again
+// after the name's words, and since no handle ever comes back, the same handle twice means that the
+// words in between were its own: a sequence lock whose number cannot repeat.
+//
+// Who changes the table holds the family's guard. The table is zero when the library is loaded.
+#ifndef VARNEK_SOURCE_SLOTTABLE_H
+#define VARNEK_SOURCE_SLOTTABLE_H
+
+#include <stdint.h>
+#include <string.h>
+
+#include <atomic>
+
+constexpr int32_t kInvalidHandle = -1;
+constexpr size_t kNameSize = 32;  // with the terminator
+
+template <typename Info, int capacity>
+class SlotTable {
+  public:
+    Info &operator[](int slot) { return slots_[slot].info; }
+
+    // The slot of a live handle, -1 for none. One look for every slot; a scan only when two live
+    // handles share their place among the hints.
+    int FindByHandle(int32_t handle) const {
+        if (handle <= kFree) {
+            return -1;
+        }
+        const int hint = HintOf(handle).load(std::memory_order_relaxed);
+        return IsLive(hint, handle) ? hint : ScanForHandle(handle);
+    }
+
+    // The handle of the lowest live slot of this name, kInvalidHandle for none and for null.
+    int32_t FindByName(const char *name) const {
+        if (name == nullptr || strnlen(name, kNameSize) >= kNameSize) {
+            return kInvalidHandle;
+        }
+        const PackedName wanted(name);
+        for (int slot = 0; slot < capacity; slot++) {
+            const int32_t handle = slots_[slot].handle.load(std::memory_order_acquire);
+            if (handle != kFree && HasName(slot, wanted) && IsLive(slot, handle)) {
+                return handle;
+            }
+        }
+        return kInvalidHandle;
+    }
+
+    // Whether the slot still belongs to this handle.
+    bool IsLive(int slot, int32_t handle) const {
+        return slots_[slot].handle.load(std::memory_order_acquire) == handle;
+    }
+
+    // The handle that the slot belongs to, 0 for none.
+    int32_t HandleOf(int slot) const { return slots_[slot].handle.load(std::memory_order_acquire); }
+
+    // The lowest slot without a handle, -1 for none.
+    int FirstFree() const {
+        for (int slot = 0; slot < capacity; slot++) {
+            if (HandleOf(slot) == kFree) {
+                return slot;
+            }
+        }
+        return -1;
+    }
+
+    // Makes the slot visible under a name of at most 31 characters and a handle above 0. The slot's
+    // Info is complete by now.
+    void Publish(int slot, const char *name, int32_t handle) {
+        StoreName(slot, PackedName(name));
+        HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
+        slots_[slot].handle.store(handle, std::memory_order_release);
+    }
+
+    // Makes the slot invisible; its Info may be taken apart now.
+    void Withdraw(int slot) {
+        slots_[slot].handle.store(kFree, std::memory_order_relaxed);
+        StoreName(slot, PackedName(""));
+    }
+
+  private:
+    static constexpr int32_t kFree = 0;
+    static constexpr size_t kNameWords = kNameSize / sizeof(uint32_t);
+    static constexpr size_t kHints = 256;
+    static_assert(capacity > 0 && capacity <= 256, "a hint is one byte");
+    static constexpr size_t kSlots = static_cast<size_t>(capacity);
+
+    struct PackedName {
+        explicit PackedName(const char *name) { memcpy(words, name, strnlen(name, kNameSize - 1)); }
+        uint32_t words[kNameWords] = {};
+    };
+
+    // A line of the cache each, so that threads at neighbouring slots do not slow each other.
+    struct alignas(64) Slot {
+        std::atomic<int32_t> handle;
+        Info info;
+    };
+
+    int ScanForHandle(int32_t handle) const {
+        for (int slot = 0; slot < capacity; slot++) {
+            if (IsLive(slot, handle)) {
+                return slot;
+            }
+        }
+        return -1;
+    }
+
+    // Acquire and release on the words order them before the second look at the handle: whoever
+    // reads a word of a later owner then finds that the earlier handle is gone.
+    bool HasName(int slot, const PackedName &wanted) const {
+        for (size_t i = 0; i < kNameWords; i++) {
+            if (names_[slot][i].load(std::memory_order_acquire) != wanted.words[i]) {
+                return false;
+            }
+        }
+        return true;
+    }
+
+    void StoreName(int slot, const PackedName &name) {
+        for (size_t i = 0; i < kNameWords; i++) {
+            names_[slot][i].store(name.words[i], std::memory_order_release);
+        }
+    }
+
+    std::atomic<uint8_t> &HintOf(int32_t handle) {
+        return hints_[static_cast<uint32_t>(handle) % kHints];
+    }
+    const std::atomic<uint8_t> &HintOf(int32_t handle) const {
+        return hints_[static_cast<uint32_t>(handle) % kHints];
+    }
+
+    Slot slots_[kSlots];
+    std::atomic<uint32_t> names_[kSlots][kNameWords];
+    std::atomic<uint8_t> hints_[kHints];
+};
+
+#endif

@@ -1,0 +1,58 @@
+// Small things that several areas share. Private.
+#ifndef VARNEK_SOURCE_SUPPORT_H
+#define VARNEK_SOURCE_SUPPORT_H
+
+#include <errno.h>
+#include <stdint.h>
+#include <string.h>
+#include <time.h>
+
+// What a log line shows of a text that may be null.
+inline const char *Shown(const char *text) {
+    return text != nullptr ? text : "(null)";
+}
+
+// Leaves the caller's errno as it was, whatever the calls in between do to it.
+class ErrnoKeeper {
+  public:
+    ErrnoKeeper() : kept_(errno) {}
+    ~ErrnoKeeper() { errno = kept_; }
+    ErrnoKeeper(const ErrnoKeeper &) = delete;
+    ErrnoKeeper &operator=(const ErrnoKeeper &) = delete;
+
+  private:
+    int kept_;
+};
+
+// Whether a pthread call succeeded. Such a call returns its error; afterwards errno holds it, as
+// the traces expect.
+inline bool Succeeded(int pthreadResult) {
+    if (pthreadResult != 0) {
+        errno = pthreadResult;
+    }
+    return pthreadResult == 0;
+}
+
+// The point in time `timeout` milliseconds after `now`.
+inline timespec DeadlineAfter(const timespec &now, uint32_t timeout) {
+    constexpr long kSecond = 1000000000;
+    timespec deadline = now;
+    deadline.tv_sec += static_cast<time_t>(timeout / 1000);
+    deadline.tv_nsec += static_cast<long>(timeout % 1000) * 1000000;
+    if (deadline.tv_nsec >= kSecond) {
+        deadline.tv_sec += deadline.tv_nsec / kSecond;
+        deadline.tv_nsec %= kSecond;
+    }
+    return deadline;
+}
+
+// The first 32-bit word of an OS object, which tells its state to a reader of the log.
+template <typename OsObject>
+int FirstWord(const OsObject &object) {
+    int32_t word = 0;
+    static_assert(sizeof object >= sizeof word, "an OS object has at least one word");
+    memcpy(&word, &object, sizeof word);
+    return word;
+}
+
+#endif
