@@ -9,7 +9,8 @@ enum { LINE_SIZE = 4096 };
 
 static char PriorityLetter(int priority) {
     static const char letters[] = "??VDIWEF";
-    return priority >= 0 && priority < (int)(sizeof letters - 1) ? letters[priority] : '?';
+    const int known = priority >= 0 && priority < (int)(sizeof letters - 1);
+    return letters[known ? priority : 0];
 }
 
 // Writes one log entry and returns the number of bytes of it that were written, or -1. As in

@@ -1,0 +1,35 @@
+# What the scripts share. They run from the top of the tree, in one locale, and keep the chatter of
+# the tools that they call in build/log/, to be seen when something fails.
+# shellcheck shell=bash
+cd -P -- "$(dirname -- "${BASH_SOURCE[0]}")/.." || exit
+export LC_ALL=C.UTF-8
+
+say() { printf '==> %s\n' "$*"; }
+
+die() {
+    printf '%s: %s\n' "$0" "$*" >&2
+    exit 1
+}
+
+# quietly NAME COMMAND...: runs a command with its output in build/log/NAME.log, and shows the end of
+# that when the command fails.
+quietly() {
+    local log=build/log/$1.log status=0
+    shift
+    mkdir -p build/log
+    "$@" >"$log" 2>&1 </dev/null || status=$?
+    [ "$status" = 0 ] && return
+    tail -n 40 "$log" >&2
+    die "'$1' failed with status $status; all it said is in $log"
+}
+
+# build PRESET [TARGET]: configures and builds. A tree that was copied here with its build directory
+# starts afresh, since CMake refuses a cache from another place.
+build() {
+    local preset=$1 target=${2:-all}
+    say "Building $target of build/$preset (log in build/log/)"
+    grep -qsxF "CMAKE_HOME_DIRECTORY:INTERNAL=$PWD" "build/$preset/CMakeCache.txt" ||
+        rm -rf "build/$preset"
+    quietly "configure-$preset" cmake --preset "$preset"
+    quietly "build-$preset" cmake --build --preset "$preset" --target "$target" -j "$(nproc)"
+}
