@@ -41,6 +41,10 @@ SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE> gThreadInfoArr;
 std::atomic<int32_t> gThreadInfoArrSize{0};
 int32_t gNextThreadHandle = 1;  // guarded by the registry's guard
 
+// Set while a thread exists, or is about to, whose record is not visible yet. Written by the holder
+// of the guard. Who reads it clear sees the record of every thread that was running by then.
+std::atomic<bool> gThreadStarting{false};
+
 // The handle of the guard "VarnekThreadMutex"; kNoGuard until the first creation makes it.
 constexpr int32_t kNoGuard = -1;
 constexpr int32_t kGuardInTheMaking = -2;
@@ -214,9 +218,11 @@ int32_t StartRecord(int slot, const char *szThreadName, int32_t priority, uint32
                            VarnekPGL_SysGetLastErro());
     }
     list_initialize(&info.MsgQ);
+    gThreadStarting.store(true, std::memory_order_relaxed);
     pthread_t linuxThread = {};
     const int result = StartThread(&linuxThread, priority, stackSize, function, argument);
     if (result != 0) {
+        gThreadStarting.store(false, std::memory_order_relaxed);
         TRACE_ERROR("***** __Varnek_create_thread : pthread creation FAIL!! errCode = [%d]",
                     result);
         sem_destroy(&info.msgQSem);
@@ -227,6 +233,7 @@ int32_t StartRecord(int slot, const char *szThreadName, int32_t priority, uint32
     info.linuxThread.store(linuxThread, std::memory_order_release);
     gThreadInfoArrSize.fetch_add(1, std::memory_order_relaxed);
     gThreadInfoArr.Publish(slot, szThreadName, hHandle);
+    gThreadStarting.store(false, std::memory_order_release);
     return hHandle;
 }
 
@@ -353,11 +360,13 @@ int32_t VarnekPGL_GetThreadByName(const char *szThreadName) {
 int32_t VarnekPGL_GetCurrentThread() {
     const pthread_t self = pthread_self();
     TRACE_LOW("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]", static_cast<int>(self));
-    int32_t hThread = HandleOfThread(self);
-    const int32_t guard = Guard();
-    if (hThread == kInvalidHandle && guard != kNoGuard) {
-        // A new thread may be here before its creator has published the record: that one holds the
-        // guard until it has.
+    int32_t hThread = kInvalidHandle;
+    if (!gThreadStarting.load(std::memory_order_acquire)) {
+        hThread = HandleOfThread(self);
+    } else {
+        // This may be the thread that is starting, and a record with its id may be left of a thread
+        // that ended: the creator holds the guard until the right one is visible.
+        const int32_t guard = Guard();
         VarnekPGL_AcquireMutex(guard);
         hThread = HandleOfThread(self);
         VarnekPGL_ReleaseMutex(guard);

@@ -6,6 +6,7 @@
 #include <stdlib.h>
 
 #include "Varnek_File.h"
+#include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
 namespace {
@@ -65,10 +66,6 @@ unsigned char *ReadWhole(const char *path, int32_t size) {
     return nullptr;
 }
 
-const char *Printable(const char *path) {
-    return path != nullptr ? path : "(null)";
-}
-
 }  // namespace
 
 uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t length) {
@@ -111,7 +108,7 @@ BOOL VarnekUtil_CheckFileCRC32(const char *path) {
     if (size < kMinPayload + kTrailer) {
         VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_DSMCC_DC,
                      "VarnekUtil_CheckFileCRC32: Invalid File! file path=[%s], fileSize=[%d]\n",
-                     Printable(path), size);
+                     Shown(path), size);
         return FALSE;
     }
     unsigned char *buffer = ReadWhole(path, size);
@@ -131,7 +128,7 @@ BOOL VarnekUtil_AppendCRC32ToFile(const char *path) {
     if (size < kMinPayload) {
         VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_DSMCC_DC,
                      "VarnekUtil_AppendCRC32ToFile: Invalid File! file path=[%s], fileSize=[%d]\n",
-                     Printable(path), size);
+                     Shown(path), size);
         return FALSE;
     }
     unsigned char *buffer = ReadWhole(path, size);

@@ -7,7 +7,9 @@
 #include <gtest/gtest.h>
 #include <sys/types.h>
 
+#include <chrono>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "Varnek_Debug.h"
@@ -37,6 +39,19 @@ extern void (*gLogHook)(const LogLine &line);
 
 std::string ReadAll(const std::string &path);
 void WriteAll(const std::string &path, const std::string &content);
+
+// Waits until `condition` holds, for twenty seconds at most. Whether it did.
+template <typename Condition>
+bool Eventually(Condition condition) {
+    const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+    while (!condition()) {
+        if (std::chrono::steady_clock::now() > end) {
+            return false;
+        }
+        std::this_thread::sleep_for(std::chrono::microseconds(100));
+    }
+    return true;
+}
 
 // Tracing is on for every level and module, and the first load is behind us.
 class VarnekTest : public ::testing::Test {

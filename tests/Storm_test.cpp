@@ -1,0 +1,302 @@
+// Storms: for a second and a half each, threads do to one table at once whatever races could break,
+// and each result is held against what must be true at any moment.
+#include <atomic>
+#include <chrono>
+#include <cstring>
+#include <ctime>
+#include <memory>
+#include <random>
+#include <thread>
+
+#include "Varnek_Semaphore.h"
+#include "Varnek_Thread.h"
+#include "Varnek_Timer.h"
+#include "support/VarnekTest.h"
+
+namespace {
+
+constexpr char kConfigPath[] = VARNEK_DATA_DIR "debug_ltn.ini";
+constexpr int kHandles = 4000000;
+
+int64_t WallClock() {
+    timespec now = {};
+    clock_gettime(CLOCK_REALTIME, &now);
+    return now.tv_sec * int64_t{1000000000} + now.tv_nsec;
+}
+
+// Runs `work(index, random)` in each of `count` threads, again and again for that time.
+template <typename Work>
+void Storm(int count, Work work) {
+    const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(1500);
+    std::vector<std::thread> threads;
+    for (int i = 0; i < count; i++) {
+        threads.emplace_back([i, end, &work] {
+            std::mt19937 random(static_cast<unsigned>(i));
+            while (std::chrono::steady_clock::now() < end && !::testing::Test::HasFailure()) {
+                work(i, random);
+            }
+        });
+    }
+    for (std::thread &thread : threads) {
+        thread.join();
+    }
+}
+
+class StormAlone : public VarnekTest {
+  protected:
+    void SetUp() override {
+        VarnekTest::SetUp();
+        WriteAll(kConfigPath, "# off");
+        VarnekPGL_InitializeDebug();
+    }
+};
+
+// Every character of a name tells whose it is, so that half a name is none.
+std::string NameOf(int id) {
+    return std::string(31, static_cast<char>('a' + id));
+}
+
+// Creation, deletion and lookups of the three families, at once.
+struct Family {
+    const char *what;
+    int32_t (*create)(const char *name);
+    BOOL (*remove)(int32_t handle);
+    int32_t (*find)(const char *name);
+    BOOL (*use)(int32_t handle);
+};
+
+void *Nothing(void *) {
+    return nullptr;
+}
+
+const Family kFamilies[] = {
+    {"mutex", VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex, VarnekPGL_GetMutexByName,
+     [](int32_t h) {
+         return VarnekPGL_AcquireMutex(h) && VarnekPGL_ReleaseMutex(h) ? TRUE : FALSE;
+     }},
+    {"semaphore", [](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); },
+     VarnekPGL_DeleteSemaphore, VarnekPGL_SemaphoreByName,
+     [](int32_t h) {
+         return VarnekPGL_SignalSemaphore(h) && VarnekPGL_WaitSemaphore(h, 1000) ? TRUE : FALSE;
+     }},
+    {"thread",
+     [](const char *name) { return VarnekPGL_CreateThread(name, 1, 16384, Nothing, nullptr); },
+     VarnekPGL_DeleteThread, VarnekPGL_GetThreadByName,
+     [](int32_t h) {
+         const THREAD_MSG message = {};
+         return VarnekPGL_SendMessage(h, &message);
+     }},
+};
+
+TEST_F(StormAlone, LookupsDuringCreationsAndDeletions) {
+    constexpr int kNames = 4;
+    for (const Family &family : kFamilies) {
+        // Whose handle it is, 0 while its creation has not returned.
+        const auto owners = std::make_unique<std::atomic<int8_t>[]>(kHandles);
+        std::atomic<int> found{0};
+        Storm(2 * kNames, [&](int thread, std::mt19937 &random) {
+            if (thread < kNames) {
+                const int32_t handle = family.create(NameOf(thread).c_str());
+                ASSERT_GT(handle, 0);
+                ASSERT_LT(handle, kHandles);
+                ASSERT_EQ(
+                    owners[static_cast<size_t>(handle)].exchange(static_cast<int8_t>(thread + 1)),
+                    0)
+                    << family.what << ": a handle came back";
+                ASSERT_EQ(family.find(NameOf(thread).c_str()), handle) << family.what;
+                ASSERT_TRUE(family.use(handle)) << family.what;
+                ASSERT_TRUE(family.remove(handle)) << family.what;
+                ASSERT_FALSE(family.use(handle)) << family.what;
+                return;
+            }
+            const int name = static_cast<int>(random() % kNames);
+            const int32_t handle = family.find(NameOf(name).c_str());
+            if (handle != -1) {
+                found++;
+                const int owner = owners[static_cast<size_t>(handle)];
+                ASSERT_TRUE(owner == 0 || owner == name + 1)
+                    << family.what << ": the handle of another name";
+            }
+        });
+        EXPECT_GT(found, 0) << family.what;
+    }
+}
+
+// What a worker of the message storm is told, and what it is meant for.
+struct Content {
+    int32_t destination;
+    int32_t sender;
+    int32_t number;
+    int32_t last;
+};
+
+THREAD_MSG Pack(const Content &content) {
+    THREAD_MSG message = {};
+    memcpy(message.data, &content, sizeof content);
+    return message;
+}
+
+constexpr int kSenders = 3;
+
+struct Totals {
+    std::atomic<int> alive{0};
+    std::atomic<int> received{0};
+};
+
+// Receives until its record is gone or the last message is here. What it gets was sent to it, and
+// is in order.
+void *Receiver(void *argument) {
+    Totals &totals = *static_cast<Totals *>(argument);
+    const int32_t self = VarnekPGL_GetCurrentThread();
+    int32_t next[kSenders] = {};
+    THREAD_MSG message;
+    int32_t count = 0;
+    // A removal before the first look is no error: a removed thread has no handle.
+    while (self != -1 && VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count)) {
+        Content content;
+        memcpy(&content, message.data, sizeof content);
+        EXPECT_EQ(content.destination, self) << "a message for another record";
+        EXPECT_EQ(content.number, next[content.sender]++)
+            << "a message lost, doubled or out of order";
+        totals.received++;
+        if (content.last != 0) {
+            break;
+        }
+    }
+    totals.alive--;
+    return nullptr;
+}
+
+TEST_F(StormAlone, MessagesToRecordsThatComeAndGo) {
+    Totals totals;
+    std::atomic<int32_t> current{-1};  // the record that everyone sends to
+    std::atomic<int> sent{0};
+    std::atomic<int> waited{0};
+    Storm(kSenders + 1, [&](int thread, std::mt19937 &random) {
+        if (thread < kSenders) {
+            const int32_t handle = current;
+            for (int32_t number = 0; handle != -1 && number < 2000 && current == handle; number++) {
+                const THREAD_MSG message = Pack({handle, thread, number, 0});
+                if (!VarnekPGL_SendMessage(handle, &message)) {
+                    break;
+                }
+                sent++;
+            }
+            // Each sender counts from 0 once for each record.
+            while (current == handle && handle != -1 && !HasFailure()) {
+                std::this_thread::yield();
+            }
+            return;
+        }
+        totals.alive++;
+        const int32_t handle = VarnekPGL_CreateThread("receiver", 1, 65536, Receiver, &totals);
+        ASSERT_NE(handle, -1);
+        current = handle;
+        if (random() % 2 != 0) {
+            std::this_thread::sleep_for(std::chrono::microseconds(random() % 300));
+        }
+        waited++;
+        ASSERT_TRUE(VarnekPGL_DeleteThread(handle));
+        current = -1;
+    });
+    EXPECT_TRUE(Eventually([&] { return totals.alive == 0; })) << "a waiter was not woken";
+    EXPECT_GT(waited, 0);
+    EXPECT_GT(sent, totals.received) << "no record went with messages unread";
+}
+
+TEST_F(StormAlone, NoMessageIsLost) {
+    Totals totals[2];
+    std::atomic<int> sent{0};
+    Storm(2, [&](int thread, std::mt19937 &) {
+        totals[thread].alive = 1;
+        const int32_t handle =
+            VarnekPGL_CreateThread(NameOf(thread).c_str(), 1, 65536, Receiver, &totals[thread]);
+        std::thread senders[kSenders];
+        for (int sender = 0; sender < kSenders; sender++) {
+            senders[sender] = std::thread([&sent, handle, sender] {
+                for (int32_t number = 0; number < 200; number++) {
+                    const THREAD_MSG message = Pack({handle, sender, number, 0});
+                    ASSERT_TRUE(VarnekPGL_SendMessage(handle, &message));
+                    sent++;
+                }
+            });
+        }
+        for (std::thread &sender : senders) {
+            sender.join();
+        }
+        const THREAD_MSG last = Pack({handle, 0, 200, 1});
+        ASSERT_TRUE(VarnekPGL_SendMessage(handle, &last));
+        sent++;
+        ASSERT_TRUE(Eventually([&] { return totals[thread].alive == 0; })) << "a message was lost";
+        ASSERT_TRUE(VarnekPGL_DeleteThread(handle));
+    });
+    EXPECT_GT(sent, 0);
+    EXPECT_EQ(totals[0].received + totals[1].received, sent);
+}
+
+// One start of a timer: when it is due, and whether it was called off. An expiry that meets the
+// cancellation may still call back, be it of an earlier start.
+struct Start {
+    std::atomic<int64_t> due{0};
+    std::atomic<bool> cancelled{false};
+};
+
+constexpr int kTimers = 4;
+Start gStarts[kTimers][1024];  // outlives late callbacks
+std::atomic<int> gExpiries{0};
+
+// A callback never comes before its start is due.
+void ExpectDue(uint32_t, void *userData) {
+    const int64_t now = WallClock();
+    const Start &start = *static_cast<Start *>(userData);
+    EXPECT_TRUE(now >= start.due || start.cancelled) << "a callback came early";
+    gExpiries++;
+}
+
+// Does to its own timer what a callback may do.
+void UseOwnTimer(uint32_t timer, void *userData) {
+    switch (++gExpiries % 4) {
+        case 0:
+            VarnekPGL_StartTimer(timer, 1, UseOwnTimer, userData);
+            break;
+        case 1:
+            VarnekPGL_CancelTimer(timer);
+            break;
+        case 2:
+            VarnekPGL_DeleteTimer(timer);
+            break;
+        default:
+            break;
+    }
+}
+
+TEST_F(StormAlone, ExpiriesThatMeetCancelsAndStarts) {
+    Storm(kTimers, [](int thread, std::mt19937 &random) {
+        thread_local int next = 0;
+        const std::string name = NameOf(thread);
+        int32_t timer = VarnekPGL_GetTimerByName(name.c_str());
+        if (timer == -1) {
+            timer = VarnekPGL_CreateTimer(name.c_str());
+        }
+        ASSERT_GE(timer, 0);
+        const auto handle = static_cast<uint32_t>(timer);
+        // A short start that may be expiring while it is cancelled, then a long one.
+        for (uint32_t timeout : {1u, 20u}) {
+            Start &start = gStarts[thread][next++ % 1024];
+            start.due = WallClock() + timeout * int64_t{1000000};
+            start.cancelled = false;
+            VarnekPGL_StartTimer(handle, timeout, thread % 2 != 0 ? ExpectDue : UseOwnTimer,
+                                 &start);
+            std::this_thread::sleep_for(std::chrono::microseconds(900 + random() % 200));
+            start.cancelled = true;
+            VarnekPGL_CancelTimer(handle);
+        }
+    });
+    EXPECT_GT(gExpiries, 0);
+    for (uint32_t timer = 0; timer < 32; timer++) {
+        VarnekPGL_DeleteTimer(timer);
+    }
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+}
+
+}  // namespace

@@ -1,0 +1,316 @@
+#include "Varnek_Thread.h"
+
+#include <pthread.h>
+#include <sched.h>
+
+#include <atomic>
+#include <chrono>
+#include <functional>
+#include <future>
+#include <thread>
+
+#include "Varnek_Semaphore.h"
+#include "support/VarnekTest.h"
+
+namespace {
+
+using ::testing::Contains;
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+using ::testing::IsEmpty;
+using ::testing::MatchesRegex;
+using ::testing::Not;
+
+THREAD_MSG Message(char text) {
+    THREAD_MSG message;
+    memset(message.data, text, sizeof message.data);
+    return message;
+}
+
+// A registered thread that carries out one piece of work; Wait gives the time when it is done.
+class Worker {
+  public:
+    explicit Worker(std::function<void()> work, const char *name = "worker")
+        : work_(std::move(work)),
+          handle_(VarnekPGL_CreateThread(name, 50, 256 * 1024, Run, this)) {}
+    ~Worker() { Wait(); }
+
+    int32_t Handle() const { return handle_; }
+    void Wait() {
+        if (handle_ != -1) {
+            done_.get_future().wait();
+            handle_ = -1;
+        }
+    }
+
+  private:
+    static void *Run(void *self) {
+        auto *worker = static_cast<Worker *>(self);
+        worker->work_();
+        worker->done_.set_value();
+        return nullptr;
+    }
+
+    std::function<void()> work_;
+    std::promise<void> done_;
+    int32_t handle_;
+};
+
+void *Nothing(void *) {
+    return nullptr;
+}
+
+class Thread : public VarnekTest {};
+class MessageQueue : public VarnekTest {};
+
+TEST_F(Thread, HandlesNamesAndTheThreadsOwnView) {
+    std::atomic<int32_t> seen{0};
+    const std::string k31 = "a name of thirty-one characters";
+    Worker first([&seen] { seen = VarnekPGL_GetCurrentThread(); }, k31.c_str());
+    EXPECT_EQ(first.Handle(), 1);
+    first.Wait();
+    EXPECT_EQ(seen, 1);
+    EXPECT_EQ(VarnekPGL_CreateThread("second", 1, 0, Nothing, nullptr), 2);
+    EXPECT_EQ(VarnekPGL_GetThreadByName(k31.c_str()), 1);
+    EXPECT_EQ(VarnekPGL_GetThreadByName("First"), -1);
+    EXPECT_EQ(VarnekPGL_GetThreadByName(nullptr), -1);
+    EXPECT_TRUE(VarnekPGL_DeleteThread(1));
+    EXPECT_FALSE(VarnekPGL_DeleteThread(1));
+    TakeLog();
+    EXPECT_EQ(VarnekPGL_CreateThread("third", 99, 65536, Nothing, nullptr), 3);
+    EXPECT_THAT(
+        TakeBodies(),
+        ElementsAre("***** START : __Varnek_get_thread_by_name, szThreadName=[third]",
+                    "***** START : __Varnek_create_thread. Thread Name=[third]",
+                    MatchesRegex("\\*\\*\\*\\*\\* END : __Varnek_create_thread thread handle = 3, "
+                                 "linuxThread=\\[.*\\]\n"),
+                    "Thread Succefully Created! ThreadName=[third], Created Handle=[3]\n"));
+    EXPECT_EQ(VarnekPGL_GetCurrentThread(), -1);
+    EXPECT_THAT(TakeErrors(), ElementsAre(HasSubstr("Can't find thread Info. pthreadID = [")));
+}
+
+TEST_F(Thread, FailuresHaveTheirLineAndResult) {
+    TakeLog();
+    EXPECT_FALSE(VarnekPGL_DeleteThread(1));
+    EXPECT_THAT(
+        TakeErrors(),
+        ElementsAre("***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [-1]",
+                    "***** VarnekPGL_DeleteThread : Can't find thread info. thread handle = [1]",
+                    "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [-1]"))
+        << "there is no guard before the first thread";
+    const std::string k32(32, 'n');
+    const std::string create = "***** __Varnek_create_thread : ";
+    const struct {
+        const char *name;
+        int32_t priority;
+        void *(*function)(void *);
+        std::string line;
+    } rows[] = {
+        {nullptr, 50, Nothing, create + "Thread name is null!!"},
+        {"", 50, Nothing, create + "Invalid Thread Name. szThreadName = [], Len = [0]"},
+        {k32.c_str(), 50, Nothing,
+         create + "Invalid Thread Name. szThreadName = [" + k32 + "], Len = [32]"},
+        {"x", 0, nullptr, create + "Invalid argument. priority=[0], pFunc=[0]"},
+        {"x", 100, nullptr, create + "Invalid argument. priority=[100], pFunc=[0]"},
+        {"x", 50, nullptr, create + "Invalid argument. priority=[50], pFunc=[0]"},
+    };
+    for (const auto &row : rows) {
+        EXPECT_EQ(VarnekPGL_CreateThread(row.name, row.priority, 0, row.function, nullptr), -1);
+        EXPECT_THAT(TakeErrors(),
+                    ElementsAre(row.line, std::string("Thread Creation Fail! szThreadName=[") +
+                                              (row.name != nullptr ? row.name : "(null)") + "]\n"));
+    }
+    for (int i = 1; i <= 20; i++) {
+        EXPECT_EQ(VarnekPGL_CreateThread(std::to_string(i).c_str(), 1, 0, Nothing, nullptr), i);
+    }
+    EXPECT_EQ(VarnekPGL_CreateThread("21", 1, 0, Nothing, nullptr), -1);
+    EXPECT_EQ(TakeErrors()[0], create + "Thread pool is full. gThreadInfoArrSize = [20]");
+    EXPECT_TRUE(VarnekPGL_DeleteThread(20));
+    EXPECT_EQ(VarnekPGL_CreateThread("21", 1, 0, Nothing, nullptr), 21);
+}
+
+TEST_F(Thread, ADuplicateTakesTheRecord) {
+    const int32_t old = VarnekPGL_CreateThread("same", 1, 0, Nothing, nullptr);
+    const THREAD_MSG message = Message('m');
+    EXPECT_TRUE(VarnekPGL_SendMessage(old, &message));
+    EXPECT_TRUE(VarnekPGL_SendMessage(old, &message));
+    TakeLog();
+    EXPECT_EQ(VarnekPGL_CreateThread("same", 1, 0, Nothing, nullptr), old + 1);
+    const auto log = TakeLog();
+    const std::string expected[] = {
+        "***** START : __Varnek_get_thread_by_name, szThreadName=[same]",
+        "***** END : __Varnek_get_thread_by_name. thread handle = [1]\n",
+        "szThreadName=[same]. Duplicated Thread. Old one will be destroyed!\n",
+        "***** START : __Varnek_delete_thread_info. thread handle=[1]",
+        "***** __Varnek_delete_thread_info : MsgQ is not empty!!size = [2]",
+        "***** END : __Varnek_delete_thread_info, 0",
+        "***** START : __Varnek_create_thread. Thread Name=[same]",
+    };
+    for (size_t i = 0; i < std::size(expected); i++) {
+        EXPECT_EQ(log[i].Body(), expected[i]);
+        EXPECT_EQ(log[i].priority, i == 2 ? 6 : 2) << "Error for the duplicate, Low for the rest";
+    }
+    EXPECT_FALSE(VarnekPGL_SendMessage(old, &message));
+    VarnekPGL_SendMessage(old + 1, &message);
+    TakeLog();
+    EXPECT_TRUE(VarnekPGL_DeleteThread(old + 1));
+    EXPECT_THAT(TakeBodies(),
+                ElementsAre("***** START : VarnekPGL_DeleteThread. thread handle=[2]",
+                            "***** VarnekPGL_DeleteThread : MsgQ is not empty!!size = [1]",
+                            "***** END : VarnekPGL_DeleteThread, 0"));
+}
+
+TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
+    std::atomic<int> waiting{8};
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 8; i++) {
+        threads.emplace_back([&waiting, i] {
+            waiting--;
+            while (waiting > 0) {
+            }
+            VarnekPGL_CreateThread(("t" + std::to_string(i)).c_str(), 1, 0, Nothing, nullptr);
+        });
+    }
+    for (std::thread &thread : threads) {
+        thread.join();
+    }
+    EXPECT_THAT(TakeErrors(), IsEmpty());
+    EXPECT_EQ(VarnekPGL_GetMutexByName("VarnekThreadMutex"), 1);
+    for (int i = 0; i < 8; i++) {
+        EXPECT_NE(VarnekPGL_GetThreadByName(("t" + std::to_string(i)).c_str()), -1);
+    }
+}
+
+TEST_F(MessageQueue, UrgentMessagesOvertake) {
+    std::string received;
+    std::promise<void> sent;
+    Worker worker([&] {
+        sent.get_future().wait();
+        THREAD_MSG message;
+        int32_t count = -1;
+        for (int32_t left : {3, 2, 1, 0}) {
+            EXPECT_TRUE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count));
+            EXPECT_EQ(count, left);
+            received.append(reinterpret_cast<char *>(message.data), sizeof message.data);
+        }
+        EXPECT_FALSE(VarnekPGL_ReceiveMessage(0, &message, &count));
+    });
+    const struct {
+        BOOL (*send)(int32_t, const THREAD_MSG *);
+        char text;
+    } rows[] = {
+        {VarnekPGL_SendMessage, 'a'},
+        {VarnekPGL_SendMessage, 'b'},
+        {VarnekPGL_SendUrgentMessage, '1'},
+        {VarnekPGL_SendUrgentMessage, '2'},
+    };
+    TakeLog();
+    for (const auto &row : rows) {
+        THREAD_MSG message = Message(row.text);
+        EXPECT_TRUE(row.send(worker.Handle(), &message));
+        message = Message('x');
+    }
+    EXPECT_THAT(TakeBodies(), ElementsAre("***** START : VarnekPGL_SendMessage. hThread = 1",
+                                          "***** VarnekPGL_SendMessage: ThreadMgr arrIdx = 0",
+                                          "***** VarnekPGL_SendMessage: semCount = 1",
+                                          "***** START : VarnekPGL_SendMessage. hThread = 1",
+                                          "***** VarnekPGL_SendMessage: ThreadMgr arrIdx = 0",
+                                          "***** VarnekPGL_SendMessage: semCount = 2"));
+    sent.set_value();
+    worker.Wait();
+    EXPECT_EQ(received, std::string(40, '2') + std::string(40, '1') + std::string(40, 'a') +
+                            std::string(40, 'b'));
+    EXPECT_THAT(
+        TakeErrors(),
+        ElementsAre("***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [110]"));
+}
+
+TEST_F(MessageQueue, APeekLeavesASignalBehind) {
+    Worker worker([] {
+        const THREAD_MSG sent = Message('m');
+        THREAD_MSG message;
+        int32_t count = -1;
+        EXPECT_FALSE(VarnekPGL_PeekMessage(&message, &count));
+        EXPECT_TRUE(VarnekPGL_SendMessage(VarnekPGL_GetCurrentThread(), &sent));
+        EXPECT_TRUE(VarnekPGL_PeekMessage(&message, &count));
+        EXPECT_EQ(message.data[39], 'm');
+        EXPECT_EQ(count, 0);
+        TakeLog();
+        EXPECT_FALSE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count));
+        EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_ReceiveMessage: Msg is NULL"));
+        EXPECT_FALSE(VarnekPGL_ReceiveMessage(20, &message, &count));
+    });
+}
+
+TEST_F(MessageQueue, FailuresHaveTheirLineAndResult) {
+    THREAD_MSG message = Message('m');
+    int32_t count = 77;
+    const struct {
+        BOOL result;
+        std::string line;
+    } rows[] = {
+        {VarnekPGL_SendMessage(-1, &message),
+         "***** VarnekPGL_SendMessage. Can't find thread info. thread = [-1]"},
+        {VarnekPGL_SendMessage(1, nullptr), "***** VarnekPGL_SendMessage: message is NULL"},
+        {VarnekPGL_SendUrgentMessage(0, &message),
+         "***** VarnekPGL_SendUrgentMessage. Can't find thread info. thread = [0]"},
+        {VarnekPGL_SendUrgentMessage(1, nullptr),
+         "***** VarnekPGL_SendUrgentMessage: message is NULL"},
+        {VarnekPGL_ReceiveMessage(0, &message, &count),
+         "***** VarnekPGL_ReceiveMessage. Can't find current thread handle"},
+        {VarnekPGL_PeekMessage(&message, &count),
+         "***** VarnekPGL_PeekMessage. Can't find current thread handle"},
+        {VarnekPGL_ReceiveMessage(0, nullptr, &count),
+         "***** VarnekPGL_ReceiveMessage: message or count is NULL"},
+        {VarnekPGL_PeekMessage(&message, nullptr),
+         "***** VarnekPGL_PeekMessage: message or count is NULL"},
+    };
+    const auto errors = TakeErrors();
+    for (const auto &row : rows) {
+        EXPECT_FALSE(row.result) << row.line;
+        EXPECT_THAT(errors, Contains(row.line));
+    }
+    EXPECT_EQ(count, 77);
+}
+
+TEST_F(MessageQueue, ARemovalWakesTheWaiterAndNothingIsDestroyedUnderIt) {
+    for (uint32_t timeout : {WAIT_FOREVER, 20000u}) {
+        std::promise<void> waiting;
+        Worker worker([&] {
+            THREAD_MSG message;
+            int32_t count = 77;
+            waiting.set_value();
+            EXPECT_FALSE(VarnekPGL_ReceiveMessage(timeout, &message, &count));
+            EXPECT_EQ(count, 77);
+        });
+        const int32_t handle = worker.Handle();
+        waiting.get_future().wait();
+        EXPECT_TRUE(VarnekPGL_DeleteThread(handle));
+        const int32_t next = VarnekPGL_CreateThread("next", 1, 0, Nothing, nullptr);
+        EXPECT_EQ(next, handle + 1);
+        const THREAD_MSG message = Message('n');
+        EXPECT_TRUE(VarnekPGL_SendMessage(next, &message)) << "meant for the next owner alone";
+        worker.Wait();
+        TakeLog();
+        VarnekPGL_DeleteThread(next);
+        EXPECT_THAT(TakeErrors(),
+                    ElementsAre("***** VarnekPGL_DeleteThread : MsgQ is not empty!!size = [1]"));
+    }
+}
+
+TEST_F(MessageQueue, AMessageEndsATimedWait) {
+    Worker worker([] {
+        THREAD_MSG message;
+        int32_t count = -1;
+        const auto start = std::chrono::steady_clock::now();
+        EXPECT_FALSE(VarnekPGL_ReceiveMessage(50, &message, &count));
+        EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(45));
+        EXPECT_TRUE(VarnekPGL_ReceiveMessage(20000, &message, &count));
+        EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(15));
+    });
+    const THREAD_MSG message = Message('m');
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
+    EXPECT_TRUE(VarnekPGL_SendMessage(worker.Handle(), &message));
+}
+
+}  // namespace

@@ -1,0 +1,170 @@
+#include "Varnek_Timer.h"
+
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <chrono>
+#include <thread>
+
+#include "support/VarnekTest.h"
+
+namespace {
+
+using ::testing::ElementsAre;
+using ::testing::IsEmpty;
+using Clock = std::chrono::steady_clock;
+
+// What a callback leaves behind.
+struct Expiries {
+    std::atomic<int> count{0};
+    std::atomic<uint32_t> timer{99};
+    std::atomic<pid_t> thread{0};
+};
+
+void CountExpiry(uint32_t timer, void *userData) {
+    auto *expiries = static_cast<Expiries *>(userData);
+    expiries->timer = timer;
+    expiries->thread = static_cast<pid_t>(syscall(SYS_gettid));
+    expiries->count++;
+}
+
+class Timer : public VarnekTest {};
+
+TEST_F(Timer, HandlesAreSlotsAndNamesAreUnique) {
+    const std::string k40(40, 'n');
+    EXPECT_EQ(VarnekPGL_GetTimerByName(""), -1) << "free slots have no name";
+    EXPECT_EQ(VarnekPGL_CreateTimer(k40.c_str()), 0);
+    EXPECT_EQ(VarnekPGL_CreateTimer(""), 1);
+    EXPECT_EQ(VarnekPGL_GetTimerByName(""), 1);
+    Expiries expiries;
+    EXPECT_TRUE(VarnekPGL_StartTimer(0, 60000, CountExpiry, &expiries));
+    EXPECT_EQ(VarnekPGL_GetTimerByName(k40.c_str()), 0);
+    TakeLog();
+    EXPECT_EQ(VarnekPGL_CreateTimer(k40.c_str()), -1);
+    EXPECT_EQ(VarnekPGL_CreateTimer((k40 + "n").c_str()), -1);
+    EXPECT_EQ(VarnekPGL_CreateTimer(nullptr), -1);
+    EXPECT_EQ(VarnekPGL_GetTimerByName(nullptr), -1);
+    EXPECT_THAT(TakeErrors(),
+                ElementsAre("VarnekPGL_CreateTimer. Duplicated Timer!! timer name = [" + k40 + "]!",
+                            "VarnekPGL_CreateTimer. Invalid Timer Name=[" + k40 + "n]",
+                            "VarnekPGL_CreateTimer. Invalid Timer Name=[(null)]",
+                            "VarnekPGL_GetTimerByName: Timer Name is NULL!"));
+    EXPECT_TRUE(VarnekPGL_IsTimerActive(0)) << "the duplicate left it alone";
+    EXPECT_TRUE(VarnekPGL_DeleteTimer(0));
+    EXPECT_EQ(VarnekPGL_CreateTimer("again"), 0);
+    for (int i = 2; i < 32; i++) {
+        EXPECT_EQ(VarnekPGL_CreateTimer(std::to_string(i).c_str()), i);
+    }
+    TakeLog();
+    EXPECT_EQ(VarnekPGL_CreateTimer("one more"), -1);
+    EXPECT_THAT(TakeErrors(), ElementsAre("VarnekPGL_CreateTimer. Timer pool is Full!"));
+    VarnekPGL_DestoryTimerSystem();
+    EXPECT_EQ(VarnekPGL_GetTimerByName("again"), 0);
+}
+
+TEST_F(Timer, BadHandlesAndArgumentsHaveTheirLine) {
+    const int32_t timer = VarnekPGL_CreateTimer("never started");
+    Expiries expiries;
+    for (uint32_t handle : {32u, 0xFFFFFFFFu, 5u}) {
+        const std::string shown = std::to_string(static_cast<int>(handle));
+        TakeLog();
+        EXPECT_FALSE(VarnekPGL_StartTimer(handle, 1, CountExpiry, &expiries));
+        EXPECT_FALSE(VarnekPGL_CancelTimer(handle));
+        EXPECT_FALSE(VarnekPGL_DeleteTimer(handle));
+        EXPECT_FALSE(VarnekPGL_IsTimerActive(handle));
+        EXPECT_THAT(
+            TakeErrors(),
+            ElementsAre("VarnekPGL_StartTimer. Invalid Timer Handle=[" + shown + "]!",
+                        "VarnekPGL_CancelTimer. Invalid Timer Handle=[" + shown + "]..name = ",
+                        "VarnekPGL_DeleteTimer. Invalid Timer Handle=[" + shown + "]!",
+                        "VarnekPGL_IsTimerActive. Invalid Timer Handle=[" + shown + "]!"));
+    }
+    EXPECT_FALSE(VarnekPGL_StartTimer(0, 0, CountExpiry, &expiries));
+    EXPECT_FALSE(VarnekPGL_StartTimer(0, 1, nullptr, &expiries));
+    EXPECT_FALSE(VarnekPGL_CancelTimer(0));
+    EXPECT_FALSE(VarnekPGL_IsTimerActive(static_cast<uint32_t>(timer)));
+    EXPECT_THAT(
+        TakeErrors(),
+        ElementsAre("VarnekPGL_StartTimer. timeout is less than 0=[0]",
+                    "VarnekPGL_StartTimer. No timer callback!",
+                    "VarnekPGL_CancelTimer. Timer(never started) hasn't been started! timer=[0]!"));
+}
+
+TEST_F(Timer, ExpiresOnceOnAnotherThreadAndStartsAgain) {
+    VarnekPGL_CreateTimer("other");
+    const auto timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("timer"));
+    Expiries expiries;
+    for (int round = 1; round <= 2; round++) {
+        const auto start = Clock::now();
+        EXPECT_TRUE(VarnekPGL_StartTimer(timer, 60, CountExpiry, &expiries));
+        EXPECT_TRUE(VarnekPGL_IsTimerActive(timer));
+        TakeLog();
+        EXPECT_FALSE(VarnekPGL_StartTimer(timer, 1, CountExpiry, &expiries));
+        EXPECT_THAT(TakeErrors(), ElementsAre("VarnekPGL_StartTimer. Timer is armed!!. Call "
+                                              "VarnekPGL_CancelTimer first!"));
+        EXPECT_TRUE(Eventually([&] { return expiries.count == round; }));
+        EXPECT_GE(Clock::now() - start, std::chrono::milliseconds(55));
+        EXPECT_FALSE(VarnekPGL_IsTimerActive(timer));
+    }
+    EXPECT_EQ(expiries.timer, timer);
+    EXPECT_NE(expiries.thread, static_cast<pid_t>(syscall(SYS_gettid)));
+    TakeLog();
+    EXPECT_TRUE(VarnekPGL_CancelTimer(timer)) << "an expired timer is disarmed already";
+    EXPECT_THAT(TakeErrors(),
+                ElementsAre("VarnekPGL_CancelTimer. This timer(timer) is disarmed currently"));
+    EXPECT_TRUE(VarnekPGL_DeleteTimer(timer));
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
+    EXPECT_EQ(expiries.count, 2);
+}
+
+TEST_F(Timer, ACancelledStartNeverCallsBack) {
+    const auto timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("timer"));
+    Expiries first;
+    Expiries second;
+    EXPECT_TRUE(VarnekPGL_StartTimer(timer, 30, CountExpiry, &first));
+    EXPECT_TRUE(VarnekPGL_CancelTimer(timer));
+    EXPECT_TRUE(VarnekPGL_StartTimer(timer, 60, CountExpiry, &second));
+    EXPECT_TRUE(Eventually([&] { return second.count == 1; }));
+    EXPECT_EQ(first.count, 0);
+    EXPECT_THAT(TakeErrors(), IsEmpty());
+}
+
+TEST_F(Timer, ACallbackMayUseItsOwnTimer) {
+    static std::atomic<int> rounds{0};
+    VarnekPGL_CreateTimer("timer");
+    const TimerCallbackFunc again = [](uint32_t timer, void *userData) {
+        if (++rounds < 3) {
+            EXPECT_TRUE(VarnekPGL_StartTimer(
+                timer, 1, reinterpret_cast<TimerCallbackFunc>(userData), userData));
+            return;
+        }
+        EXPECT_TRUE(VarnekPGL_CancelTimer(timer));
+        EXPECT_TRUE(VarnekPGL_DeleteTimer(timer));
+        rounds++;
+    };
+    EXPECT_TRUE(VarnekPGL_StartTimer(0, 1, again, reinterpret_cast<void *>(again)));
+    EXPECT_TRUE(Eventually([] { return rounds == 4; }));
+    EXPECT_EQ(VarnekPGL_GetTimerByName("timer"), -1);
+}
+
+TEST_F(Timer, SleepsLast) {
+    const struct {
+        std::function<void()> sleep;
+        int least;
+        int most;
+    } rows[] = {
+        {[] { VarnekPGL_MSleep(30); }, 30, 10000},
+        {[] { VarnekPGL_MSleep(0); }, 0, 10000},
+        {[] { VarnekPGL_MSleep(-100000); }, 0, 10000},
+        {[] { VarnekPGL_USleep(1); }, 1000, 10000},
+    };
+    for (const auto &row : rows) {
+        const auto start = Clock::now();
+        row.sleep();
+        EXPECT_GE(Clock::now() - start, std::chrono::milliseconds(row.least));
+        EXPECT_LT(Clock::now() - start, std::chrono::milliseconds(row.most));
+    }
+}
+
+}  // namespace
