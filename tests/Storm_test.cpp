@@ -113,7 +113,7 @@ TEST_F(StormAlone, LookupsDuringCreationsAndDeletions) {
             const int32_t handle = family.find(NameOf(name).c_str());
             if (handle != -1) {
                 found++;
-                const int owner = owners[static_cast<size_t>(handle)];
+                const int8_t owner = owners[static_cast<size_t>(handle)];
                 ASSERT_TRUE(owner == 0 || owner == name + 1)
                     << family.what << ": the handle of another name";
             }

@@ -19,7 +19,6 @@ using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using ::testing::MatchesRegex;
-using ::testing::Not;
 
 THREAD_MSG Message(char text) {
     THREAD_MSG message;

@@ -360,7 +360,7 @@ int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer, uin
         "[FULLSEG_64BIT_FILE]VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : %d, Size : [ "
         "%u "
         "%u ] %s ",
-        hFile, length, static_cast<unsigned>(written), strerror(error));
+        hFile, length, static_cast<unsigned>(written), ErrorText(error));
     switch (error) {
         case EFBIG:
             return -27;

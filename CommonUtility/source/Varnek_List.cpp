@@ -93,8 +93,16 @@ void *list_remove(list_t *list, int32_t position) {
 }
 
 void list_removeAll(list_t *list) {
-    while (void *data = list_removeHead(list)) {
-        free(data);
+    if (list == nullptr) {
+        return;
+    }
+    list_node_t *node = list->head;
+    list_initialize(list);
+    while (node != nullptr) {
+        list_node_t *next = node->next;
+        free(node->data);
+        free(node);
+        node = next;
     }
 }
 

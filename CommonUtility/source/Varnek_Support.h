@@ -12,6 +12,11 @@ inline const char *Shown(const char *text) {
     return text != nullptr ? text : "(null)";
 }
 
+// The system's text for an error number, the calling thread's until it asks again.
+inline const char *ErrorText(int error) {
+    return strerror(error);  // NOLINT(concurrency-mt-unsafe): a buffer per thread on every target
+}
+
 // Leaves the caller's errno as it was, whatever the calls in between do to it.
 class ErrnoKeeper {
   public:

@@ -237,7 +237,7 @@ BOOL VarnekPGL_CancelTimer(uint32_t timer) {
     } else if (SetTime(*info, 0) != 0) {
         const int error = VarnekPGL_SysGetLastErro();
         return VARNEK_FAIL(FALSE, "VarnekPGL_CancelTimer. Set Timer FAIL. errCode = [%d][%s]",
-                           error, strerror(error));
+                           error, ErrorText(error));
     }
     guard.Release();
     TRACE_MID("END: VarnekPGL_CancelTimer. timer=[%d]", static_cast<int>(timer));

@@ -7,6 +7,7 @@
 #include <chrono>
 #include <condition_variable>
 #include <mutex>
+#include <new>
 #include <thread>
 
 namespace {
@@ -48,7 +49,10 @@ Timer *Of(timer_t id) {
 extern "C" {
 
 int timer_create(clockid_t, sigevent *event, timer_t *id) {
-    Timer *timer = new Timer;
+    Timer *timer = new (std::nothrow) Timer;
+    if (timer == nullptr) {
+        return -1;
+    }
     timer->event = *event;
     *id = timer;
     std::thread(&Timer::Run, timer).detach();
