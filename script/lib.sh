@@ -19,7 +19,7 @@ quietly() {
     mkdir -p build/log
     "$@" >"$log" 2>&1 </dev/null || status=$?
     [ "$status" = 0 ] && return
-    tail -n 40 "$log" >&2
+    tail -n 30 "$log" >&2
     die "'$1' failed with status $status; all it said is in $log"
 }
 
