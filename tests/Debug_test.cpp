@@ -9,12 +9,8 @@
 
 namespace {
 
-using ::testing::Contains;
 using ::testing::ElementsAre;
-using ::testing::EndsWith;
-using ::testing::HasSubstr;
 using ::testing::IsEmpty;
-using ::testing::Not;
 
 constexpr char kWorking[] = VARNEK_DATA_DIR "debug_ltn.ini";
 constexpr char kDefault[] = VARNEK_SYSTEM_DIR "debug_ltn.ini";
