@@ -19,17 +19,19 @@ quietly() {
     mkdir -p build/log
     "$@" >"$log" 2>&1 </dev/null || status=$?
     [ "$status" = 0 ] && return
-    tail -n 40 "$log" >&2
+    tail -n 30 "$log" >&2
     die "'$1' failed with status $status; all it said is in $log"
 }
 
-# build PRESET [TARGET]: configures and builds. A tree that was copied here with its build directory
+# build PRESET [TARGET...]: configures and builds. A tree that was copied here with its build directory
 # starts afresh, since CMake refuses a cache from another place.
 build() {
-    local preset=$1 target=${2:-all}
-    say "Building $target of build/$preset (log in build/log/)"
+    local preset=$1
+    shift
+    [ $# != 0 ] || set -- all
+    say "Building $* in build/$preset (log in build/log/)"
     grep -qsxF "CMAKE_HOME_DIRECTORY:INTERNAL=$PWD" "build/$preset/CMakeCache.txt" ||
         rm -rf "build/$preset"
     quietly "configure-$preset" cmake --preset "$preset"
-    quietly "build-$preset" cmake --build --preset "$preset" --target "$target" -j "$(nproc)"
+    quietly "build-$preset" cmake --build --preset "$preset" -j "$(nproc)" --target "$@"
 }
