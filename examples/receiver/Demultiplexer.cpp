@@ -1,0 +1,176 @@
+// Packet header, continuity, section assembly and CRC, in this order. The PMT PIDs are taken from
+// the PAT here and not where tables are understood, so that no packet between the two is missed.
+#include "Demultiplexer.h"
+
+#include <utility>
+
+#include "FieldReader.h"
+#include "Ids.h"
+#include "PacketSource.h"
+#include "Tables.h"
+#include "Varnek_Util.h"
+
+namespace receiver {
+namespace {
+
+constexpr size_t kPidCount = 8192;
+constexpr size_t kSmallestCheckedSection = 7;  // a header and a CRC
+
+// Time and date, running status, stuffing and discontinuity information end without a CRC.
+bool CarriesCrc(unsigned char table_id) {
+    return table_id != kTableTdt && table_id != 0x71 && table_id != 0x72 && table_id != 0x7E;
+}
+
+}  // namespace
+
+struct Demultiplexer::Header {
+    bool transport_error;
+    bool unit_start;
+    uint16_t pid;
+    bool scrambled;
+    bool reserved;  // an adaptation_field_control that no packet may have
+    bool has_payload;
+    uint8_t counter;
+    bool discontinuity;
+    size_t payload;  // offset, kPacketSize when there is none or it cannot be found
+};
+
+Demultiplexer::Demultiplexer(Handler handler)
+    : handler_(std::move(handler)), continuity_(kPidCount), names_(kPidCount) {
+    for (const uint16_t pid : kTablePids) {
+        AddName(pid);
+    }
+}
+
+void Demultiplexer::Push(const unsigned char *packet) {
+    const Header header = ParseHeader(packet);
+    if (header.transport_error) {
+        ++counters_.transport_errors;
+        return;
+    }
+    if (header.scrambled) {
+        ++counters_.scrambled;
+    }
+    if (header.pid == kPidNull || header.reserved) {
+        return;
+    }
+    const Order order = Follow(header);
+    if (order == Order::kBroken) {
+        ++counters_.continuity_errors;
+    }
+    const auto found = assemblers_.find(header.pid);
+    if (found == assemblers_.end() || order == Order::kRepeated) {
+        return;
+    }
+    SectionAssembler &assembler = found->second;
+    const bool unusable = header.has_payload && (header.scrambled || header.payload == kPacketSize);
+    if (order != Order::kNext || unusable) {
+        counters_.incomplete += static_cast<unsigned>(assembler.Drop());
+    }
+    if (!header.has_payload || unusable) {
+        return;
+    }
+    const int given_up =
+        assembler.Push(packet + header.payload, kPacketSize - header.payload, header.unit_start,
+                       [this, &header](const unsigned char *section, size_t size) {
+                           OnSection(header.pid, section, size);
+                       });
+    counters_.incomplete += static_cast<unsigned>(given_up);
+}
+
+Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
+    FieldReader fields(packet, kPacketSize);
+    Header header{};
+    fields.Skip(8);
+    header.transport_error = fields.U8(1) != 0;
+    header.unit_start = fields.U8(1) != 0;
+    fields.Skip(1);
+    header.pid = fields.U16(13);
+    header.scrambled = fields.U8(2) != 0;
+    const bool has_adaptation = fields.U8(1) != 0;
+    header.has_payload = fields.U8(1) != 0;
+    header.reserved = !has_adaptation && !header.has_payload;
+    header.counter = fields.U8(4);
+    header.payload = kPacketSize - static_cast<size_t>(fields.BytesLeft());
+    if (has_adaptation) {
+        const uint8_t length = fields.U8();
+        FieldReader adaptation = fields.Enter(length);
+        header.discontinuity = length > 0 && adaptation.U8(1) != 0;
+        header.payload =
+            fields.Ok() ? kPacketSize - static_cast<size_t>(fields.BytesLeft()) : kPacketSize;
+    }
+    return header;
+}
+
+// Where a packet stands behind the latest one of its PID. Only a payload moves the counter on; a
+// packet with one may be sent twice, and a counter may jump where the packet announces it.
+Demultiplexer::Order Demultiplexer::Follow(const Header &header) {
+    Continuity &state = continuity_[header.pid];
+    const Continuity before = state;
+    state = {header.counter, header.has_payload};
+    const int expected = header.has_payload ? (before.last + 1) & 0x0F : before.last;
+    if (before.last < 0 || header.counter == expected) {
+        return Order::kNext;
+    }
+    if (header.discontinuity) {
+        return Order::kRestarted;
+    }
+    if (header.counter != before.last) {
+        return Order::kBroken;
+    }
+    state.repeatable = false;
+    return header.has_payload && before.repeatable ? Order::kRepeated : Order::kBroken;
+}
+
+void Demultiplexer::OnSection(uint16_t pid, const unsigned char *section, size_t size) {
+    const unsigned char table_id = section[0];
+    if (CarriesCrc(table_id) &&
+        (size < kSmallestCheckedSection || VarnekUtil_CheckSectionCRC32(section) == FALSE)) {
+        ++counters_.bad_crc;
+        return;
+    }
+    ++counters_.good;
+    ++counters_.tables[table_id];
+    if (pid == kPidPat && table_id == kTablePat) {
+        FollowPat(section, size);
+    }
+    handler_(pid, section, size);
+}
+
+// A PID that the PAT no longer names may carry anything, so its assembler goes. New names come
+// before old ones go: a repeated PAT must not disturb the section in progress on a PID that it
+// keeps.
+void Demultiplexer::FollowPat(const unsigned char *section, size_t size) {
+    Pat pat;
+    SectionHeader header{};
+    if (!ParsePat(section, size, header, pat)) {
+        return;
+    }
+    std::vector<uint16_t> pids;
+    for (const Program &program : pat) {
+        pids.push_back(program.pmt_pid);
+        AddName(program.pmt_pid);
+    }
+    pids.swap(pat_sections_[header.number]);
+    RemoveNames(pids);
+    const auto beyond = pat_sections_.upper_bound(header.last);
+    for (auto it = beyond; it != pat_sections_.end(); ++it) {
+        RemoveNames(it->second);
+    }
+    pat_sections_.erase(beyond, pat_sections_.end());
+}
+
+void Demultiplexer::AddName(uint16_t pid) {
+    ++names_[pid];
+    assemblers_[pid];
+}
+
+void Demultiplexer::RemoveNames(const std::vector<uint16_t> &pids) {
+    for (const uint16_t pid : pids) {
+        if (--names_[pid] == 0) {
+            assemblers_.erase(pid);
+        }
+    }
+}
+
+}  // namespace receiver

@@ -1,0 +1,64 @@
+// Follows every PID's packets and brings out the sections of the tables: those on the PIDs that are
+// fixed, and those on the PMT PIDs that the PAT names at that point of the stream.
+#ifndef RECEIVER_DEMULTIPLEXER_H
+#define RECEIVER_DEMULTIPLEXER_H
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <vector>
+
+#include "SectionAssembler.h"
+
+namespace receiver {
+
+struct DemultiplexerCounters {
+    uint64_t continuity_errors = 0;
+    uint64_t transport_errors = 0;  // packets that the demodulator marked; nothing in them is used
+    uint64_t scrambled = 0;         // packets
+    uint64_t good = 0;              // sections that are whole, with a right CRC or none to check
+    uint64_t bad_crc = 0;           // sections that are whole, but damaged
+    uint64_t incomplete = 0;        // sections that were given up
+    std::array<uint64_t, 256> tables{};  // good sections of each table_id
+};
+
+class Demultiplexer {
+  public:
+    // Called with a good section, valid during the call.
+    using Handler = std::function<void(uint16_t pid, const unsigned char *section, size_t size)>;
+
+    explicit Demultiplexer(Handler handler);
+
+    // Takes the 188 bytes of the stream's next packet.
+    void Push(const unsigned char *packet);
+
+    const DemultiplexerCounters &Counters() const { return counters_; }
+
+  private:
+    struct Header;
+    struct Continuity {
+        int last = -1;            // counter of the PID's latest packet, -1 before the first
+        bool repeatable = false;  // that packet had a payload and may come once more
+    };
+    enum class Order { kNext, kRepeated, kBroken, kRestarted };
+
+    static Header ParseHeader(const unsigned char *packet);
+    Order Follow(const Header &header);
+    void OnSection(uint16_t pid, const unsigned char *section, size_t size);
+    void FollowPat(const unsigned char *section, size_t size);
+    void AddName(uint16_t pid);
+    void RemoveNames(const std::vector<uint16_t> &pids);
+
+    Handler handler_;
+    DemultiplexerCounters counters_;
+    std::vector<Continuity> continuity_;                     // one for each PID
+    std::map<uint16_t, SectionAssembler> assemblers_;        // by PID, where names_ is not 0
+    std::vector<unsigned> names_;                            // for each PID, fixed and PAT entries
+    std::map<uint8_t, std::vector<uint16_t>> pat_sections_;  // PMT PIDs, by section_number
+};
+
+}  // namespace receiver
+
+#endif

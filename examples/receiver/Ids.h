@@ -1,0 +1,37 @@
+// The PIDs and table_ids that the receiver tells apart.
+#ifndef RECEIVER_IDS_H
+#define RECEIVER_IDS_H
+
+#include <cstdint>
+
+namespace receiver {
+
+constexpr uint16_t kPidPat = 0x0000;
+constexpr uint16_t kPidNit = 0x0010;
+constexpr uint16_t kPidSdt = 0x0011;
+constexpr uint16_t kPidEit = 0x0012;
+constexpr uint16_t kPidTime = 0x0014;
+constexpr uint16_t kPidEitMobile = 0x0026;  // events of portable reception
+constexpr uint16_t kPidEitOneSeg = 0x0027;
+constexpr uint16_t kPidNull = 0x1FFF;
+
+// Sections are assembled on these wherever they come: the above, and conditional access (0x0001)
+// and broadcaster information (0x0024), which are only counted.
+constexpr uint16_t kTablePids[] = {kPidPat,  0x0001, kPidNit,       kPidSdt,      kPidEit,
+                                   kPidTime, 0x0024, kPidEitMobile, kPidEitOneSeg};
+
+constexpr uint8_t kTablePat = 0x00;
+constexpr uint8_t kTablePmt = 0x02;
+constexpr uint8_t kTableNitActual = 0x40;
+constexpr uint8_t kTableSdtActual = 0x42;
+constexpr uint8_t kTableEitActual = 0x4E;          // present and following
+constexpr uint8_t kTableEitOther = 0x4F;           // of another transport stream
+constexpr uint8_t kTableEitActualSchedule = 0x50;  // to 0x5F
+constexpr uint8_t kTableEitOtherSchedule = 0x60;   // to 0x6F
+constexpr uint8_t kTableEitLast = 0x6F;
+constexpr uint8_t kTableTdt = 0x70;
+constexpr uint8_t kTableTot = 0x73;
+
+}  // namespace receiver
+
+#endif

@@ -1,0 +1,48 @@
+// Writes JSON text (RFC 8259): each member of the outermost object on a line, and each element of
+// an array there; what lies deeper stays on its line.
+#ifndef RECEIVER_JSONWRITER_H
+#define RECEIVER_JSONWRITER_H
+
+#include <cstdint>
+#include <optional>
+#include <string>
+
+namespace receiver {
+
+class JsonWriter {
+  public:
+    // `key` is null for the elements of an array and for the outermost object.
+    void BeginObject(const char *key) { Begin(key, '{'); }
+    void EndObject() { End('}'); }
+    void BeginArray(const char *key) { Begin(key, '['); }
+    void EndArray() { End(']'); }
+    // Text must be well-formed UTF-8.
+    void Text(const char *key, const std::string &value);
+    void Number(const char *key, int64_t value);
+    template <typename Integer>
+    void Number(const char *key, const std::optional<Integer> &value) {
+        if (value) {
+            Number(key, int64_t{*value});
+        } else {
+            Member(key);
+            out_ += "null";
+        }
+    }
+
+    const std::string &Out() const { return out_; }
+
+  private:
+    void Begin(const char *key, char open);
+    void End(char close);
+    void Member(const char *key);
+    void Quote(const std::string &text);
+    bool OwnLines() const;
+
+    std::string out_;
+    std::string open_;   // brackets that are open
+    bool first_ = true;  // nothing yet within the innermost
+};
+
+}  // namespace receiver
+
+#endif

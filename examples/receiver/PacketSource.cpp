@@ -1,0 +1,113 @@
+// Two states: locked, where each packet ends where the next sync byte must be, and searching, byte
+// by byte, with a bounded look ahead. Both only move forward, so any input takes linear time.
+#include "PacketSource.h"
+
+namespace receiver {
+namespace {
+
+constexpr size_t kTimestampedSize = 192;
+constexpr size_t kTimestampSize = 4;
+constexpr size_t kDistances[] = {kPacketSize, kTimestampedSize, 204};
+constexpr size_t kLargestDistance = 204;
+
+// Sync bytes in a row that make a start. The first byte of a stream and the distance already in use
+// need few, so that short stretches between losses count. Anywhere else it takes more, and headers
+// that packets may have: tables in all kinds of files hold a byte of this value at even distances.
+constexpr size_t kSyncsToFind = 8;
+constexpr size_t kSyncsToResume = 3;
+constexpr size_t kLookAhead = (kSyncsToFind - 1) * kLargestDistance + 4;
+
+// Bytes in front of the first sync byte of a stream that is cut at a packet.
+constexpr size_t Lead(size_t distance) {
+    return distance == kTimestampedSize ? kTimestampSize : 0;
+}
+
+}  // namespace
+
+void PacketSource::Feed(const unsigned char *bytes, size_t count) {
+    pending_.insert(pending_.end(), bytes, bytes + count);
+    counters_.bytes += count;
+    Run(false);
+}
+
+void PacketSource::Finish() {
+    Run(true);
+}
+
+void PacketSource::Run(bool at_end) {
+    while (locked_ || Search(at_end)) {
+        if (next_ >= pending_.size()) {
+            break;
+        }
+        if (pending_[next_] != kSyncByte) {
+            ++counters_.sync_losses;
+            locked_ = false;
+            continue;
+        }
+        if (pending_.size() - next_ < kPacketSize) {
+            break;
+        }
+        ++counters_.packets;
+        handler_(&pending_[next_]);
+        next_ += counters_.packet_size;
+    }
+    const size_t used = next_ < pending_.size() ? next_ : pending_.size();
+    pending_.erase(pending_.begin(), pending_.begin() + static_cast<std::ptrdiff_t>(used));
+    pending_offset_ += used;
+    next_ -= used;
+}
+
+// Moves next_ to a byte where packets start, as far as the bytes at hand can tell.
+bool PacketSource::Search(bool at_end) {
+    for (; next_ < pending_.size(); ++next_) {
+        if (!at_end && pending_.size() - next_ < kLookAhead) {
+            return false;
+        }
+        if (pending_[next_] != kSyncByte) {
+            continue;
+        }
+        for (const size_t distance : kDistances) {
+            if (!StartsPackets(next_, distance)) {
+                continue;
+            }
+            if (counters_.packet_size == 0 && pending_offset_ + next_ > Lead(distance)) {
+                ++counters_.sync_losses;
+            }
+            counters_.packet_size = static_cast<unsigned>(distance);
+            locked_ = true;
+            return true;
+        }
+    }
+    return false;
+}
+
+// Away from the end of the stream the look ahead holds every sync byte asked for. Near the end as
+// many as remain must do, but where nothing else speaks for packets, not fewer than three.
+bool PacketSource::StartsPackets(size_t at, size_t distance) const {
+    const uint64_t offset = pending_offset_ + at;
+    const size_t room = pending_.size() - at;
+    const bool known = distance == counters_.packet_size;
+    const bool expected = known || offset == Lead(distance);
+    if (offset < Lead(distance) || room + Lead(distance) < (known ? kPacketSize : distance)) {
+        return false;
+    }
+    const size_t wanted = expected ? kSyncsToResume : kSyncsToFind;
+    size_t found = 0;
+    while (found < wanted && found * distance < room) {
+        const size_t start = at + found * distance;
+        if (pending_[start] != kSyncByte || (!expected && !MayBeHeader(start))) {
+            return false;
+        }
+        ++found;
+    }
+    return expected || found >= kSyncsToResume;
+}
+
+// Whether the header, as far as it is at hand, has no transport error and a valid
+// adaptation_field_control.
+bool PacketSource::MayBeHeader(size_t at) const {
+    return at + 3 >= pending_.size() ||
+           ((pending_[at + 1] & 0x80) == 0 && (pending_[at + 3] & 0x30) != 0);
+}
+
+}  // namespace receiver

@@ -1,0 +1,404 @@
+// Joins the tables into services and events, then writes them out, once for people and once for
+// programs. Nothing here changes what was read.
+#include "Presentation.h"
+
+#include <algorithm>
+#include <cstdarg>
+#include <cstdio>
+
+#include "Ids.h"
+#include "JsonWriter.h"
+
+namespace receiver {
+namespace {
+
+struct Service {
+    std::optional<uint16_t> pmt_pid;
+    const ServiceInfo *info = nullptr;  // null without an SDT entry
+    const ProgramMap *map = nullptr;    // null without a PMT
+};
+
+struct Named {
+    uint8_t value;
+    const char *name;
+};
+
+constexpr Named kStreamTypes[] = {
+    {0x01, "MPEG-1 video"},  {0x02, "MPEG-2 video"},     {0x03, "MPEG-1 audio"},
+    {0x04, "MPEG-2 audio"},  {0x05, "private sections"}, {0x06, "private data"},
+    {0x07, "MHEG"},          {0x0A, "DSM-CC type A"},    {0x0B, "DSM-CC type B"},
+    {0x0C, "DSM-CC type C"}, {0x0D, "DSM-CC type D"},    {0x0F, "AAC audio (ADTS)"},
+    {0x10, "MPEG-4 video"},  {0x11, "AAC audio (LATM)"}, {0x1B, "H.264 video"},
+    {0x24, "HEVC video"},    {0x33, "VVC video"},        {0x81, "AC-3 audio"},
+    {0x87, "E-AC-3 audio"},
+};
+
+constexpr Named kPrivateData[] = {
+    {0x56, "teletext"},  {0x59, "subtitles"}, {0x6A, "AC-3 audio"},       {0x7A, "E-AC-3 audio"},
+    {0x7B, "DTS audio"}, {0x7C, "AAC audio"}, {0xFD, "captions or data"},
+};
+
+constexpr Named kServiceTypes[] = {
+    {0x01, "television"},    {0x02, "radio"},         {0x03, "teletext"},
+    {0x0A, "radio"},         {0x0C, "data"},          {0x11, "HD television"},
+    {0x16, "television"},    {0x19, "HD television"}, {0x1F, "HEVC television"},
+    {0xA1, "special video"}, {0xA4, "engineering"},   {0xA8, "prior storage data"},
+    {0xC0, "data"},
+};
+
+constexpr Named kTables[] = {
+    {0x00, "PAT"},           {0x01, "CAT"}, {0x02, "PMT"},       {0x03, "TSDT"}, {0x40, "NIT"},
+    {0x41, "NIT other"},     {0x42, "SDT"}, {0x46, "SDT other"}, {0x4A, "BAT"},  {0x4E, "EIT p/f"},
+    {0x4F, "EIT p/f other"}, {0x70, "TDT"}, {0x71, "RST"},       {0x72, "ST"},   {0x73, "TOT"},
+    {0xC3, "SDTT"},          {0xC4, "BIT"},
+};
+
+constexpr size_t kEventsShown = 12;
+constexpr size_t kLineWidth = 100;
+
+std::string Format(const char *format, ...) __attribute__((format(printf, 1, 2)));
+
+// For short texts of bounded size; names are appended as they are.
+std::string Format(const char *format, ...) {
+    char text[160];
+    va_list arguments;
+    va_start(arguments, format);
+    std::vsnprintf(text, sizeof text, format, arguments);
+    va_end(arguments);
+    return text;
+}
+
+template <size_t Count>
+const char *NameOf(const Named (&names)[Count], uint8_t value) {
+    const auto found = std::find_if(std::begin(names), std::end(names),
+                                    [value](const Named &entry) { return entry.value == value; });
+    return found == std::end(names) ? nullptr : found->name;
+}
+
+std::string NameOfComponent(const Component &component) {
+    const bool is_private = component.stream_type == 0x05 || component.stream_type == 0x06;
+    const char *name = is_private ? NameOf(kPrivateData, component.descriptor) : nullptr;
+    if (name == nullptr) {
+        name = NameOf(kStreamTypes, component.stream_type);
+    }
+    return name != nullptr ? name : Format("stream type 0x%02X", component.stream_type);
+}
+
+// Services that the PAT or the SDT names, by service_id. A PMT counts only when it came where the
+// PAT says.
+std::map<uint16_t, Service> JoinServices(const Model &model) {
+    std::map<uint16_t, Service> services;
+    for (const auto &section : model.pat) {
+        for (const Program &program : section.second) {
+            services[program.service_id].pmt_pid = program.pmt_pid;
+        }
+    }
+    for (const auto &section : model.sdt) {
+        for (const ServiceInfo &info : section.second) {
+            services[info.service_id].info = &info;
+        }
+    }
+    for (auto &entry : services) {
+        const auto map = model.pmts.find(entry.first);
+        if (map != model.pmts.end() && entry.second.pmt_pid == map->second.pmt_pid) {
+            entry.second.map = &map->second;
+        }
+    }
+    return services;
+}
+
+using EventEntry = const std::pair<const std::pair<uint16_t, uint16_t>, Event> *;
+
+// By start; those whose start is not known come last.
+std::vector<EventEntry> SortEvents(const Model &model) {
+    std::vector<EventEntry> events;
+    for (const auto &entry : model.events) {
+        events.push_back(&entry);
+    }
+    std::stable_sort(events.begin(), events.end(), [](EventEntry left, EventEntry right) {
+        const auto &first = left->second.start;
+        const auto &second = right->second.start;
+        return first && (!second || *first < *second);
+    });
+    return events;
+}
+
+std::string ToOffsetText(int minutes) {
+    const int size = minutes < 0 ? -minutes : minutes;
+    return Format("%c%02d:%02d", minutes < 0 ? '-' : '+', size / 60, size % 60);
+}
+
+// Columns that a text takes: its characters, which are its bytes but for continuation bytes.
+size_t WidthOf(const std::string &text) {
+    return static_cast<size_t>(std::count_if(text.begin(), text.end(), [](char c) {
+        return (static_cast<unsigned char>(c) & 0xC0) != 0x80;
+    }));
+}
+
+std::string Padded(const std::string &text, size_t width) {
+    const size_t used = WidthOf(text);
+    return used < width ? text + std::string(width - used, ' ') : text;
+}
+
+std::string NameOrDash(const std::string &name) {
+    return name.empty() ? "-" : name;
+}
+
+void AppendStream(const Report &report, std::string &out) {
+    const Model &model = report.model;
+    out += "Stream    ";
+    out += model.transport_stream_id
+               ? Format("transport stream 0x%04X, ", *model.transport_stream_id)
+               : std::string();
+    out +=
+        Format("%llu packets of %u bytes\n",
+               static_cast<unsigned long long>(report.packets.packets), report.packets.packet_size);
+    out += "Network   " + NameOrDash(model.network_name);
+    out += model.network_id ? Format(" (0x%04X)\n", *model.network_id) : "\n";
+    out += "Clock     ";
+    out += model.utc_time ? ToText(model.utc_time) + " UTC" : "-";
+    for (const LocalOffset &offset : model.local_offsets) {
+        out += ", " + offset.country;
+        out += offset.region != 0 ? Format(" region %d ", offset.region) : " ";
+        out += ToOffsetText(offset.minutes);
+    }
+    out += '\n';
+}
+
+// "one, two, three" over as many lines as it takes.
+void AppendWrapped(const std::vector<std::string> &items, size_t margin, std::string &out) {
+    const std::string indent(margin, ' ');
+    std::string line = indent;
+    for (size_t i = 0; i < items.size(); ++i) {
+        const std::string item = items[i] + (i + 1 < items.size() ? "," : "");
+        if (line.size() > indent.size() && line.size() + 1 + item.size() > kLineWidth) {
+            out += line + '\n';
+            line = indent;
+        }
+        line += (line.size() > indent.size() ? " " : "") + item;
+    }
+    out += line + '\n';
+}
+
+void AppendComponents(const ProgramMap &map, std::string &out) {
+    std::vector<std::string> items;
+    for (const Component &component : map.components) {
+        items.push_back(Format("0x%04X ", component.pid) + NameOfComponent(component));
+    }
+    AppendWrapped(items.empty() ? std::vector<std::string>{"no components"} : items, 10, out);
+}
+
+void AppendServices(const std::map<uint16_t, Service> &services, std::string &out) {
+    out += services.empty() ? "\nServices  none named\n" : "\nServices\n";
+    size_t width = 0;
+    for (const auto &entry : services) {
+        width =
+            std::max(width, entry.second.info != nullptr ? WidthOf(entry.second.info->name) : 0);
+    }
+    for (const auto &entry : services) {
+        const Service &service = entry.second;
+        out += Format("  0x%04X  ", entry.first);
+        out += Padded(service.info != nullptr ? NameOrDash(service.info->name) : "-", width);
+        if (service.info != nullptr && service.info->type) {
+            const char *type = NameOf(kServiceTypes, *service.info->type);
+            out += "  ";
+            out += type != nullptr ? type : Format("service type 0x%02X", *service.info->type);
+            out += service.info->provider.empty() ? "" : ", " + service.info->provider;
+        }
+        out +=
+            service.pmt_pid ? Format("  (PMT 0x%04X)\n", *service.pmt_pid) : "  (not in the PAT)\n";
+        if (service.map != nullptr) {
+            AppendComponents(*service.map, out);
+        }
+    }
+}
+
+void AppendEvents(const Model &model, const std::map<uint16_t, Service> &services,
+                  std::string &out) {
+    const std::vector<EventEntry> events = SortEvents(model);
+    std::vector<EventEntry> shown;
+    for (const EventEntry entry : events) {
+        if (services.count(entry->first.first) != 0 && shown.size() < kEventsShown) {
+            shown.push_back(entry);
+        }
+    }
+    if (events.empty()) {
+        out += "\nEvents    none\n";
+        return;
+    }
+    const auto name_of = [&services](EventEntry entry) {
+        const ServiceInfo *info = services.at(entry->first.first).info;
+        return info != nullptr && !info->name.empty() ? info->name
+                                                      : Format("0x%04X", entry->first.first);
+    };
+    size_t width = 0;
+    for (const EventEntry entry : shown) {
+        width = std::max(width, WidthOf(name_of(entry)));
+    }
+    out += "\nEvents (UTC)\n";
+    for (const EventEntry entry : shown) {
+        const Event &event = entry->second;
+        out += "  " + Padded(event.start ? ToText(event.start) : "start not known", 19) + "  ";
+        out += Padded(NameOrDash(ToText(event.duration)), 8) + "  ";
+        out += Padded(name_of(entry), width) + "  " + NameOrDash(event.name) + '\n';
+    }
+    if (events.size() > shown.size()) {
+        out += Format("  and %zu more\n", events.size() - shown.size());
+    }
+    if (model.events_left_out != 0) {
+        out += Format("  %llu times an event was left out for lack of room\n",
+                      static_cast<unsigned long long>(model.events_left_out));
+    }
+}
+
+void AppendCounters(const Report &report, std::string &out) {
+    const struct {
+        const char *name;
+        uint64_t value;
+    } counters[] = {
+        {"sync losses", report.packets.sync_losses},
+        {"continuity errors", report.sections.continuity_errors},
+        {"transport errors", report.sections.transport_errors},
+        {"scrambled packets", report.sections.scrambled},
+        {"good sections", report.sections.good},
+        {"sections with a bad CRC", report.sections.bad_crc},
+        {"incomplete sections", report.sections.incomplete},
+    };
+    out += "\nCounters\n";
+    for (const auto &counter : counters) {
+        out +=
+            Format("  %-24s %9llu\n", counter.name, static_cast<unsigned long long>(counter.value));
+    }
+}
+
+void AppendTables(const DemultiplexerCounters &sections, std::string &out) {
+    std::vector<std::string> items;
+    for (size_t table = 0; table < sections.tables.size(); ++table) {
+        if (sections.tables[table] == 0) {
+            continue;
+        }
+        const char *name = NameOf(kTables, static_cast<uint8_t>(table));
+        if (table >= kTableEitActualSchedule && table <= kTableEitLast) {
+            name = table < kTableEitOtherSchedule ? "EIT schedule" : "EIT schedule other";
+        }
+        items.push_back(Format("0x%02X %s: %llu", static_cast<unsigned>(table),
+                               name != nullptr ? name
+                               : table < 0x80  ? "other"
+                                               : "private",
+                               static_cast<unsigned long long>(sections.tables[table])));
+    }
+    if (!items.empty()) {
+        out += "\nGood sections by table\n";
+        AppendWrapped(items, 2, out);
+    }
+}
+
+void WriteServices(const Model &model, JsonWriter &json) {
+    json.BeginArray("services");
+    for (const auto &entry : JoinServices(model)) {
+        const Service &service = entry.second;
+        const ServiceInfo *info = service.info;
+        json.BeginObject(nullptr);
+        json.Number("id", entry.first);
+        json.Text("name", info != nullptr ? info->name : "");
+        json.Text("provider", info != nullptr ? info->provider : "");
+        json.Number("type", info != nullptr ? info->type : std::nullopt);
+        json.Number("pmt_pid", service.pmt_pid);
+        json.Number("pcr_pid",
+                    service.map != nullptr ? std::optional(service.map->pcr_pid) : std::nullopt);
+        json.BeginArray("components");
+        if (service.map != nullptr) {
+            for (const Component &component : service.map->components) {
+                json.BeginObject(nullptr);
+                json.Number("pid", component.pid);
+                json.Number("type", component.stream_type);
+                json.EndObject();
+            }
+        }
+        json.EndArray();
+        json.EndObject();
+    }
+    json.EndArray();
+}
+
+void WriteEvents(const Model &model, JsonWriter &json) {
+    json.BeginArray("events");
+    for (const EventEntry entry : SortEvents(model)) {
+        const Event &event = entry->second;
+        json.BeginObject(nullptr);
+        json.Number("service_id", entry->first.first);
+        json.Number("event_id", entry->first.second);
+        json.Text("start", ToText(event.start));
+        json.Text("duration", ToText(event.duration));
+        json.Text("name", event.name);
+        json.Text("text", event.text);
+        json.EndObject();
+    }
+    json.EndArray();
+}
+
+void WriteLocalOffsets(const Model &model, JsonWriter &json) {
+    json.BeginArray("local_time_offsets");
+    for (const LocalOffset &offset : model.local_offsets) {
+        json.BeginObject(nullptr);
+        json.Text("country", offset.country);
+        json.Number("region", offset.region);
+        json.Text("offset", ToOffsetText(offset.minutes));
+        json.Text("change", ToText(offset.change));
+        json.Text("next_offset", ToOffsetText(offset.next_minutes));
+        json.EndObject();
+    }
+    json.EndArray();
+}
+
+}  // namespace
+
+std::string ToSummary(const Report &report) {
+    const std::map<uint16_t, Service> services = JoinServices(report.model);
+    std::string out;
+    AppendStream(report, out);
+    AppendServices(services, out);
+    AppendEvents(report.model, services, out);
+    AppendCounters(report, out);
+    AppendTables(report.sections, out);
+    return out;
+}
+
+std::string ToJson(const Report &report) {
+    const DemultiplexerCounters &sections = report.sections;
+    const Model &model = report.model;
+    const auto count = [](uint64_t value) { return static_cast<int64_t>(value); };
+    JsonWriter json;
+    json.BeginObject(nullptr);
+    json.Number("packets", count(report.packets.packets));
+    json.Number("packet_size", report.packets.packet_size);
+    json.Number("sync_losses", count(report.packets.sync_losses));
+    json.Number("continuity_errors", count(sections.continuity_errors));
+    json.Number("transport_errors", count(sections.transport_errors));
+    json.Number("scrambled", count(sections.scrambled));
+    json.BeginObject("sections");
+    json.Number("good", count(sections.good));
+    json.Number("bad_crc", count(sections.bad_crc));
+    json.Number("incomplete", count(sections.incomplete));
+    json.EndObject();
+    json.BeginObject("tables");
+    for (size_t table = 0; table < sections.tables.size(); ++table) {
+        if (sections.tables[table] != 0) {
+            json.Number(Format("0x%02X", static_cast<unsigned>(table)).c_str(),
+                        count(sections.tables[table]));
+        }
+    }
+    json.EndObject();
+    json.Number("transport_stream_id", model.transport_stream_id);
+    json.Number("network_id", model.network_id);
+    json.Text("network_name", model.network_name);
+    json.Text("utc_time", ToText(model.utc_time));
+    WriteLocalOffsets(model, json);
+    WriteServices(model, json);
+    WriteEvents(model, json);
+    json.Number("events_left_out", count(model.events_left_out));
+    json.EndObject();
+    return json.Out() + '\n';
+}
+
+}  // namespace receiver

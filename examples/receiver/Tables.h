@@ -1,0 +1,52 @@
+// Understands the sections of program and service information tables.
+#ifndef RECEIVER_TABLES_H
+#define RECEIVER_TABLES_H
+
+#include <cstddef>
+#include <cstdint>
+#include <vector>
+
+#include "FieldReader.h"
+#include "Model.h"
+
+namespace receiver {
+
+// The fields that follow section_length in most tables.
+struct SectionHeader {
+    uint16_t extension;  // transport_stream_id, service_id, ...
+    bool current;        // false: announces what will apply later
+    uint8_t number;
+    uint8_t last;
+};
+
+using Pat = std::vector<Program>;
+
+// Takes the programs from a PAT section with a right CRC, without the entry for the network.
+//   returns  false when the section does not apply now, or is too short for its header
+bool ParsePat(const unsigned char *section, size_t size, SectionHeader &header, Pat &pat);
+
+// Fills a model from sections, in the order in which they come. Sections and tables that it does
+// not understand change nothing; a loop that leads outside its section ends there.
+class TableParser {
+  public:
+    // The model must outlive the parser.
+    explicit TableParser(Model &model) : model_(model) {}
+
+    // Takes a whole section with a right CRC, or none to check.
+    void Push(uint16_t pid, const unsigned char *section, size_t size);
+
+  private:
+    void OnPat(const unsigned char *section, size_t size);
+    void OnPmt(uint16_t pid, const SectionHeader &header, FieldReader &fields);
+    void OnNit(const SectionHeader &header, FieldReader &fields);
+    void OnSdt(const SectionHeader &header, FieldReader &fields);
+    void OnEit(uint8_t table_id, const SectionHeader &header, FieldReader &fields);
+    void OnTime(uint8_t table_id, FieldReader &fields);
+    void KeepEvent(uint16_t service_id, uint16_t event_id, Event event);
+
+    Model &model_;
+};
+
+}  // namespace receiver
+
+#endif
