@@ -76,7 +76,6 @@ void *list_element(list_t *list, int32_t position) {
 }
 
 void *list_removeHead(list_t *list) {
-    // The analyser cannot know that a head has no prev. NOLINTNEXTLINE(clang-analyzer-unix.Malloc)
     return list != nullptr && list->head != nullptr ? Unlink(list, list->head) : nullptr;
 }
 
