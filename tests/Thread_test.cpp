@@ -160,6 +160,12 @@ TEST_F(Thread, ADuplicateTakesTheRecord) {
 }
 
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
+    // Gives every thread the time to find that there is no guard yet.
+    gLogHook = [](const LogLine &line) {
+        if (line.text.find("START : __Varnek_create_mutex") != std::string::npos) {
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        }
+    };
     std::atomic<int> waiting{8};
     std::vector<std::thread> threads;
     for (int i = 0; i < 8; i++) {
@@ -173,6 +179,7 @@ TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
     for (std::thread &thread : threads) {
         thread.join();
     }
+    gLogHook = nullptr;
     EXPECT_THAT(TakeErrors(), IsEmpty());
     EXPECT_EQ(VarnekPGL_GetMutexByName("VarnekThreadMutex"), 1);
     for (int i = 0; i < 8; i++) {
