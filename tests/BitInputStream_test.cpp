@@ -97,9 +97,7 @@ class BitInputStream : public VarnekTest {};
 
 TEST_F(BitInputStream, BehavesLikeTheModel) {
     std::mt19937 random(20070212);
-    const auto pick = [&random](int low, int high) {
-        return std::uniform_int_distribution<int>(low, high)(random);
-    };
+    const auto pick = [&random](int low, int high) { return std::uniform_int_distribution<int>(low, high)(random); };
     for (int round = 0; round < 600; ++round) {
         std::vector<unsigned char> bytes(static_cast<size_t>(pick(1, 14)));
         std::generate(bytes.begin(), bytes.end(), random);

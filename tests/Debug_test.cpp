@@ -40,11 +40,10 @@ class DebugAlone : public ::testing::Test {
 };
 
 TEST_F(DebugAlone, EveryLevelAndModuleHasItsLook) {
-    WriteAll(
-        kWorking,
-        "LogToUSB=1\nError=1\r\nHigh=1\r\rMid=1\nLow=1\nCommon=1\nJNI=1\nMainControl=1\nESG=1\n"
-        "SessionManager=1\nSectionParser=1\nDsmccDC=1\nDsmccOC=1\nTsDemux=1\nCPRM=1\n"
-        "SMPlayer=1\nGingaAppMgr=1");
+    WriteAll(kWorking,
+             "LogToUSB=1\nError=1\r\nHigh=1\r\rMid=1\nLow=1\nCommon=1\nJNI=1\nMainControl=1\nESG=1\n"
+             "SessionManager=1\nSectionParser=1\nDsmccDC=1\nDsmccOC=1\nTsDemux=1\nCPRM=1\n"
+             "SMPlayer=1\nGingaAppMgr=1");
     VarnekPGL_InitializeDebug();
     TakeLog();
     const struct {
@@ -94,8 +93,8 @@ TEST_F(DebugAlone, ALineEnablesByTheFirstKeyInIt) {
         {"LogToUSB=1\nError=1\nGingaAppMgr=1", 0x80000400, 0x80000800},
         {"LogToUSB=1\nError=1\nSMPlayer=1", 0x80000800, 0x80000400},
         // Cut at 51 characters: the key before counts, the '1' behind does not.
-        {"LogToUSB=1\nCommon=1\nError=1\nHigh                                              0  1",
-         0x80000001, 0x40000001},
+        {"LogToUSB=1\nCommon=1\nError=1\nHigh                                              0  1", 0x80000001,
+         0x40000001},
     };
     for (const auto &row : rows) {
         WriteAll(kWorking, row.file);
@@ -119,8 +118,8 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
         std::string("Default Log Configuration file doesn't exit! File Path=[") + kDefault + "]\n";
 
     VARNEK_TRACE(0x80000001, "the first trace loads");
-    EXPECT_THAT(TakeBodies("SBTVD"), ElementsAre(noDefault, missing, offLines[0], offLines[1],
-                                                 offLines[2], offLines[3]));
+    EXPECT_THAT(TakeBodies("SBTVD"),
+                ElementsAre(noDefault, missing, offLines[0], offLines[1], offLines[2], offLines[3]));
     WriteAll(kDefault, "LogToUSB=1\nError=1\nCommon=1\n");
     VARNEK_TRACE(0x80000001, "a failed load is not tried again");
     EXPECT_THAT(TakeLog(), IsEmpty());

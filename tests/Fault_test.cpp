@@ -19,13 +19,11 @@ using ::testing::ElementsAreArray;
 
 class Fault : public VarnekTest {};
 
-void *Nothing(void *) {
-    return nullptr;
-}
+void *Nothing(void *) { return nullptr; }
 
 // A call of the library, made once while a call of the C library fails. Every operation runs again
 // afterwards, and then succeeds.
-struct Row {
+struct FaultRow {
     const char *call;
     int error;
     std::function<int64_t()> operation;
@@ -33,8 +31,8 @@ struct Row {
     std::vector<std::string> lines;
 };
 
-void ExpectRows(const std::vector<Row> &rows) {
-    for (const Row &row : rows) {
+void ExpectFaults(const std::vector<FaultRow> &rows) {
+    for (const FaultRow &row : rows) {
         TakeLog();
         FailCall(row.call, 1, row.error);
         EXPECT_EQ(row.operation(), row.expected) << row.call;
@@ -46,7 +44,7 @@ void ExpectRows(const std::vector<Row> &rows) {
 TEST_F(Fault, MutexesAndSemaphores) {
     const int32_t mutex = VarnekPGL_CreateMutex("mutex");
     const int32_t sem = VarnekPGL_CreateSemaphore("sem", 2);
-    ExpectRows({
+    ExpectFaults({
         {"pthread_mutex_init",
          ENOMEM,
          [] { return VarnekPGL_CreateMutex("new"); },
@@ -98,11 +96,11 @@ TEST_F(Fault, MutexesAndSemaphores) {
     EXPECT_TRUE(VarnekPGL_AcquireMutex(mutex) && VarnekPGL_ReleaseMutex(mutex));
     EXPECT_TRUE(VarnekPGL_DeleteMutex(mutex));
     EXPECT_TRUE(VarnekPGL_WaitSemaphore(sem, 0) && VarnekPGL_WaitSemaphore(sem, 0));
-    ExpectRows({{"sem_destroy",
-                 EINVAL,
-                 [=] { return VarnekPGL_DeleteSemaphore(sem); },
-                 TRUE,
-                 {"Varnek_delete_semaphore: retSem != 0, errCode = [22]"}}});
+    ExpectFaults({{"sem_destroy",
+                   EINVAL,
+                   [=] { return VarnekPGL_DeleteSemaphore(sem); },
+                   TRUE,
+                   {"Varnek_delete_semaphore: retSem != 0, errCode = [22]"}}});
     EXPECT_EQ(VarnekPGL_CreateSemaphore("new", 0), sem + 1);
 }
 
@@ -110,7 +108,7 @@ TEST_F(Fault, Threads) {
     const auto create = [] { return VarnekPGL_CreateThread("new", 1, 0, Nothing, nullptr); };
     const std::string end = "***** END : __Varnek_create_thread, thread creation failed";
     const std::string fail = "Thread Creation Fail! szThreadName=[new]\n";
-    ExpectRows({
+    ExpectFaults({
         {"pthread_mutex_init",
          ENOMEM,
          create,
@@ -130,11 +128,11 @@ TEST_F(Fault, Threads) {
     });
     EXPECT_EQ(VarnekPGL_GetThreadByName("new"), -1);
     EXPECT_EQ(create(), 1) << "a failure gives its handle back";
-    ExpectRows({{"sem_destroy",
-                 EINVAL,
-                 [] { return VarnekPGL_DeleteThread(1); },
-                 TRUE,
-                 {"***** VarnekPGL_DeleteThread : semaphore destroy FAIL!! errCode = [22]"}}});
+    ExpectFaults({{"sem_destroy",
+                   EINVAL,
+                   [] { return VarnekPGL_DeleteThread(1); },
+                   TRUE,
+                   {"***** VarnekPGL_DeleteThread : semaphore destroy FAIL!! errCode = [22]"}}});
     EXPECT_EQ(create(), 2);
 }
 
@@ -150,20 +148,14 @@ void *UseOwnQueue(void *done) {
     const auto urgent = [&] { return VarnekPGL_SendUrgentMessage(self, &message); };
     THREAD_MSG received;
     int32_t count = -1;
-    const auto receive = [&](uint32_t timeout) {
-        return VarnekPGL_ReceiveMessage(timeout, &received, &count);
-    };
+    const auto receive = [&](uint32_t timeout) { return VarnekPGL_ReceiveMessage(timeout, &received, &count); };
     const std::string sendLine = "***** VarnekPGL_SendMessage: ";
     const std::string urgentLine = "***** VarnekPGL_SendUrgentMessage: ";
     const std::string receiveLine = "***** VarnekPGL_ReceiveMessage: ";
-    ExpectRows({
+    ExpectFaults({
         {"malloc", ENOMEM, send, FALSE, {sendLine + "memalloc failed"}},
         {"malloc", ENOMEM, urgent, FALSE, {urgentLine + "memalloc failed"}},
-        {"sem_getvalue",
-         EINVAL,
-         send,
-         TRUE,
-         {sendLine + "Semaphore Get Value FAIL. errCode = [22]"}},
+        {"sem_getvalue", EINVAL, send, TRUE, {sendLine + "Semaphore Get Value FAIL. errCode = [22]"}},
         {"sem_getvalue",
          EINVAL,
          [&] { return receive(0); },
@@ -178,13 +170,9 @@ void *UseOwnQueue(void *done) {
     TakeLog();
     EXPECT_FALSE(receive(0)) << "a failed send leaves neither a message nor a signal";
     EXPECT_EQ(TakeErrors()[0], receiveLine + "Semaphore wait FAIL. errCode = [110]");
-    ExpectRows({
+    ExpectFaults({
         {"sem_post", EOVERFLOW, send, FALSE, {sendLine + "Semaphore Post FAIL. errCode = [75]"}},
-        {"sem_post",
-         EOVERFLOW,
-         urgent,
-         FALSE,
-         {urgentLine + "Semaphore Post FAIL. errCode = [75]"}},
+        {"sem_post", EOVERFLOW, urgent, FALSE, {urgentLine + "Semaphore Post FAIL. errCode = [75]"}},
         {"sem_wait",
          EINTR,
          [&] { return receive(WAIT_FOREVER); },
@@ -196,8 +184,7 @@ void *UseOwnQueue(void *done) {
          FALSE,
          {receiveLine + "Semaphore wait FAIL. errCode = [14]"}},
     });
-    EXPECT_TRUE(VarnekPGL_PeekMessage(&received, &count))
-        << "what a failed post queued stays queued";
+    EXPECT_TRUE(VarnekPGL_PeekMessage(&received, &count)) << "what a failed post queued stays queued";
     EXPECT_EQ(count, 1);
     static_cast<Done *>(done)->promise.set_value();
     return nullptr;
@@ -216,27 +203,15 @@ TEST_F(Fault, Timers) {
     const TimerCallbackFunc callback = [](uint32_t, void *) {};
     ASSERT_EQ(VarnekPGL_CreateTimer("timer"), 0);
     const auto start = [=] { return VarnekPGL_StartTimer(0, 60000, callback, nullptr); };
-    const std::vector<Row> creations = {
-        {"timer_create",
-         EAGAIN,
-         start,
-         FALSE,
-         {"VarnekPGL_StartTimer. Linux Timer Creation FAIL. errCode = [-1]!"}},
-        {"timer_settime",
-         EINVAL,
-         start,
-         FALSE,
-         {"VarnekPGL_StartTimer. Set Timer is FAIL. errCode = [-1]!"}},
+    const std::vector<FaultRow> creations = {
+        {"timer_create", EAGAIN, start, FALSE, {"VarnekPGL_StartTimer. Linux Timer Creation FAIL. errCode = [-1]!"}},
+        {"timer_settime", EINVAL, start, FALSE, {"VarnekPGL_StartTimer. Set Timer is FAIL. errCode = [-1]!"}},
     };
-    ExpectRows(creations);
+    ExpectFaults(creations);
     EXPECT_FALSE(VarnekPGL_CancelTimer(0)) << "a failed start leaves the timer as created";
     EXPECT_TRUE(start());
-    ExpectRows({
-        {"timer_gettime",
-         EINVAL,
-         start,
-         FALSE,
-         {"VarnekPGL_StartTimer. Get Timer info is FAIL. errCode = [-1]!"}},
+    ExpectFaults({
+        {"timer_gettime", EINVAL, start, FALSE, {"VarnekPGL_StartTimer. Get Timer info is FAIL. errCode = [-1]!"}},
         {"timer_gettime",
          EINVAL,
          [] { return VarnekPGL_CancelTimer(0); },
@@ -255,13 +230,13 @@ TEST_F(Fault, Timers) {
     });
     EXPECT_TRUE(VarnekPGL_IsTimerActive(0));
     EXPECT_TRUE(VarnekPGL_CancelTimer(0));
-    ExpectRows({{"timer_settime", EINVAL, start, FALSE, creations[1].lines}});
+    ExpectFaults({{"timer_settime", EINVAL, start, FALSE, creations[1].lines}});
     EXPECT_TRUE(start()) << "a timer whose arming failed is made anew";
-    ExpectRows({{"timer_delete",
-                 EINVAL,
-                 [] { return VarnekPGL_DeleteTimer(0); },
-                 TRUE,
-                 {"VarnekPGL_DeleteTimer. Delete Timer is FAIL. errCode = [-1]!"}}});
+    ExpectFaults({{"timer_delete",
+                   EINVAL,
+                   [] { return VarnekPGL_DeleteTimer(0); },
+                   TRUE,
+                   {"VarnekPGL_DeleteTimer. Delete Timer is FAIL. errCode = [-1]!"}}});
     EXPECT_EQ(VarnekPGL_CreateTimer("timer"), 0);
 }
 
@@ -309,7 +284,7 @@ TEST_F(Fault, BlocksThatCannotBeAllocated) {
     const auto check = [&] { return VarnekUtil_CheckFileCRC32(path.c_str()); };
     const auto append = [&] { return VarnekUtil_AppendCRC32ToFile(path.c_str()); };
     const auto convert = [&] { return VarnekPGL_ConvertLatin15toUTF8(&output, "text", 4); };
-    ExpectRows({
+    ExpectFaults({
         {"malloc", ENOMEM, check, FALSE, {"File Reading Fail!\n"}},
         {"malloc", ENOMEM, append, FALSE, {"File Reading Fail!\n"}},
     });

@@ -28,8 +28,7 @@ TEST_F(File, FlagsResolveInTheirOrder) {
         int32_t flags;
         const char *result;  // of writing "new" over, or behind, "old"
     } rows[] = {
-        {1, "new"}, {2, "old"},    {4, "new"},     {6, "new"},
-        {7, "new"}, {8, "oldnew"}, {10, "oldnew"}, {15, "oldnew"},
+        {1, "new"}, {2, "old"}, {4, "new"}, {6, "new"}, {7, "new"}, {8, "oldnew"}, {10, "oldnew"}, {15, "oldnew"},
     };
     const std::string path = Path("file");
     for (const auto &row : rows) {
@@ -56,8 +55,7 @@ TEST_F(File, PathsOf256CharactersAreRefused) {
     EXPECT_THAT(TakeLog(), IsEmpty());
     path += "f";
     EXPECT_EQ(VarnekPGL_OpenFile(path.c_str(), PGL_FILE_MODE_READ), -1);
-    EXPECT_THAT(TakeErrors(),
-                ElementsAre("VarnekPGL_OpenFile : file path(" + path + ") length over max size"));
+    EXPECT_THAT(TakeErrors(), ElementsAre("VarnekPGL_OpenFile : file path(" + path + ") length over max size"));
 }
 
 TEST_F(File, FailuresHaveTheirLineAndResult) {
@@ -72,33 +70,19 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
         return std::string(text);
     };
     VarnekPGL_WriteFileByHandle(full, "data", 4);
-    const struct {
-        int64_t result;
-        int64_t expected;
-        std::vector<std::string> lines;
-    } rows[] = {
-        {VarnekPGL_OpenFile(nullptr, 2),
-         -1,
-         {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[(null)]"}},
+    ExpectRows({
+        {VarnekPGL_OpenFile(nullptr, 2), -1, {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[(null)]"}},
         {VarnekPGL_CloseFile(0), -1, {"VarnekPGL_CloseFile : NULL file pointer"}},
         {VarnekPGL_CloseFile(-1), -1, {"VarnekPGL_CloseFile : NULL file pointer"}},
         {VarnekPGL_SeekFile(0, 0, 3), 0, {"VarnekPGL_SeekFile : NULL file pointer"}},
         {VarnekPGL_SeekFile(writer, 0, 3), -8, {"VarnekPGL_SeekFile : Invalid Seek base! base=3"}},
-        {VarnekPGL_SeekFile(writer, -1, 0),
-         -1,
-         {"VarnekPGL_SeekFile : fail handle = " + hex(writer)}},
+        {VarnekPGL_SeekFile(writer, -1, 0), -1, {"VarnekPGL_SeekFile : fail handle = " + hex(writer)}},
         {VarnekPGL_TellFile(0), -1, {"VarnekPGL_TellFile : NULL file pointer"}},
         {VarnekPGL_FlushFile(0), -1, {"VarnekPGL_FlushFile : NULL file pointer"}},
         {VarnekPGL_FlushFile(full), -1, {"VarnekPGL_FlushFile : fail"}},
-        {VarnekPGL_ReadFileByHandle(0, buffer, 1),
-         0,
-         {"VarnekPGL_ReadFileByHandle : NULL file pointer"}},
-        {VarnekPGL_WriteFileByHandle(0, buffer, 1),
-         0,
-         {"VarnekPGL_WriteFileByHandle : NULL file pointer"}},
-        {VarnekPGL_WriteFileByHandle(writer, nullptr, 1),
-         0,
-         {"VarnekPGL_WriteFileByHandle : NULL buffer"}},
+        {VarnekPGL_ReadFileByHandle(0, buffer, 1), 0, {"VarnekPGL_ReadFileByHandle : NULL file pointer"}},
+        {VarnekPGL_WriteFileByHandle(0, buffer, 1), 0, {"VarnekPGL_WriteFileByHandle : NULL file pointer"}},
+        {VarnekPGL_WriteFileByHandle(writer, nullptr, 1), 0, {"VarnekPGL_WriteFileByHandle : NULL buffer"}},
         {VarnekPGL_ReadFileByHandle(writer, buffer, 8), 0, {}},
         {VarnekPGL_GetFileSizeByHandle(0),
          -1,
@@ -107,9 +91,7 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
         {VarnekPGL_ReadFile(none.c_str(), buffer, 8),
          -18,
          {open, "VarnekPGL_ReadFile : File doesn't exist! file path=[" + none + "]"}},
-        {VarnekPGL_GetFileSize(none.c_str()),
-         0,
-         {open, "VarnekPGL_GetFileSize fail =[" + none + "]"}},
+        {VarnekPGL_GetFileSize(none.c_str()), 0, {open, "VarnekPGL_GetFileSize fail =[" + none + "]"}},
         {VarnekPGL_CheckFile(none.c_str()), FALSE, {open, "VarnekPGL_CheckFile : fail " + none}},
         {VarnekPGL_DeleteFile(none.c_str()), -1, {"VarnekPGL_DeleteFile : remove File[] Fail"}},
         {VarnekPGL_WriteFile("/no/dir", "x", 1),
@@ -120,16 +102,8 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
          -18,
          {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[/no/dir]",
           "VarnekPGL_AppendFile : File doesn't exist! file path=[/no/dir]"}},
-        {VarnekPGL_WriteFile(Path("w").c_str(), nullptr, 1),
-         0,
-         {"VarnekPGL_WriteFile : NULL buffer"}},
-    };
-    std::vector<std::string> expected;
-    for (const auto &row : rows) {
-        EXPECT_EQ(row.result, row.expected) << ::testing::PrintToString(row.lines);
-        expected.insert(expected.end(), row.lines.begin(), row.lines.end());
-    }
-    EXPECT_EQ(TakeErrors(), expected);
+        {VarnekPGL_WriteFile(Path("w").c_str(), nullptr, 1), 0, {"VarnekPGL_WriteFile : NULL buffer"}},
+    });
     VarnekPGL_CloseFile(full);
     VarnekPGL_CloseFile(writer);
 }
@@ -141,8 +115,7 @@ TEST_F(File, AFullDiskIsNotReportedAsStored) {
     ASSERT_EQ(lines.size(), 3u);
     EXPECT_THAT(lines[0], StartsWith("VarnekPGL_CloseFile : fail hFile = 0x"));
     EXPECT_THAT(lines[1], StartsWith("VarnekPGL_CloseFile : fail hFile = 0x"));
-    EXPECT_EQ(lines[2],
-              "VarnekPGL_AppendFile : name = /dev/full: Fail! write size = 0, desired size = 3");
+    EXPECT_EQ(lines[2], "VarnekPGL_AppendFile : name = /dev/full: Fail! write size = 0, desired size = 3");
     const std::string large(100000, 'x');
     EXPECT_EQ(VarnekPGL_AppendFile("/dev/full", large.data(), 100000), -1);
     EXPECT_THAT(TakeErrors()[0], HasSubstr("desired size = 100000"));
@@ -266,45 +239,29 @@ TEST_F(LargeFile, FailuresHaveTheirLineAndResult) {
     setrlimit(RLIMIT_FSIZE, &small);
     const std::string data(150, 'x');
     const auto failure = [&mark](int32_t fd, const char *sizes, int error) {
-        return mark +
-               "VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : " + std::to_string(fd) +
-               ", Size : [ " + sizes + " ] " + strerror(error) + " ";
+        return mark + "VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : " + std::to_string(fd) + ", Size : [ " +
+               sizes + " ] " + strerror(error) + " ";
     };
-    const struct {
-        int64_t result;
-        int64_t expected;
-        std::string line;
-    } rows[] = {
-        {VarnekPGL_WriteFileByHandle64Bits(full, "x", 1), -28,
-         failure(full, "1 4294967295", ENOSPC)},
-        {VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150), 100,
-         failure(limited, "150 100", 0)},
-        {VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150), -27,
-         failure(limited, "150 4294967295", EFBIG)},
-        {VarnekPGL_WriteFileByHandle64Bits(reader, "x", 1), -1,
-         failure(reader, "1 4294967295", EBADF)},
-        {VarnekPGL_WriteFileByHandle64Bits(-2, "x", 1), 0,
-         mark + "VarnekPGL_WriteFileByHandle64Bits: Write Failure Invalid Hndl : -2"},
-        {VarnekPGL_ReadFileByHandle64Bits(-1, nullptr, 1), 0,
-         mark + "VarnekPGL_ReadFileByHandle64Bits: Read Failure Invalid Hndl : -1"},
-        {VarnekPGL_SeekFile64Bits(-1, 0, 5), -8,
-         mark + " VarnekPGL_SeekFile64Bits Invalid Seek base! base=[5]"},
-        {VarnekPGL_SeekFile64Bits(-1, 0, 2), -1,
-         mark + "VarnekPGL_FSeek64Bits: Seek Failure Invalid Hndl : -1"},
-        {VarnekPGL_TellFile64Bits(-1), 0,
-         mark + "VarnekPGL_TellFile64Bits: Tell Failure Invalid Hndl : -1"},
-        {VarnekPGL_FlushFile64Bits(-1), -1,
-         mark + "VarnekPGL_FlushFile64Bits: Flush Failure Invalid Hndl : -1"},
-        {VarnekPGL_CloseFile64Bits(-1), -1,
-         mark + "VarnekPGL_CloseFile64Bits: Close Failure Invalid Hndl : -1"},
-    };
+    ExpectRows({
+        {VarnekPGL_WriteFileByHandle64Bits(full, "x", 1), -28, {failure(full, "1 4294967295", ENOSPC)}},
+        {VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150), 100, {failure(limited, "150 100", 0)}},
+        {VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150),
+         -27,
+         {failure(limited, "150 4294967295", EFBIG)}},
+        {VarnekPGL_WriteFileByHandle64Bits(reader, "x", 1), -1, {failure(reader, "1 4294967295", EBADF)}},
+        {VarnekPGL_WriteFileByHandle64Bits(-2, "x", 1),
+         0,
+         {mark + "VarnekPGL_WriteFileByHandle64Bits: Write Failure Invalid Hndl : -2"}},
+        {VarnekPGL_ReadFileByHandle64Bits(-1, nullptr, 1),
+         0,
+         {mark + "VarnekPGL_ReadFileByHandle64Bits: Read Failure Invalid Hndl : -1"}},
+        {VarnekPGL_SeekFile64Bits(-1, 0, 5), -8, {mark + " VarnekPGL_SeekFile64Bits Invalid Seek base! base=[5]"}},
+        {VarnekPGL_SeekFile64Bits(-1, 0, 2), -1, {mark + "VarnekPGL_FSeek64Bits: Seek Failure Invalid Hndl : -1"}},
+        {VarnekPGL_TellFile64Bits(-1), 0, {mark + "VarnekPGL_TellFile64Bits: Tell Failure Invalid Hndl : -1"}},
+        {VarnekPGL_FlushFile64Bits(-1), -1, {mark + "VarnekPGL_FlushFile64Bits: Flush Failure Invalid Hndl : -1"}},
+        {VarnekPGL_CloseFile64Bits(-1), -1, {mark + "VarnekPGL_CloseFile64Bits: Close Failure Invalid Hndl : -1"}},
+    });
     setrlimit(RLIMIT_FSIZE, &old);
-    std::vector<std::string> expected;
-    for (const auto &row : rows) {
-        EXPECT_EQ(row.result, row.expected) << row.line;
-        expected.push_back(row.line);
-    }
-    EXPECT_EQ(TakeErrors(), expected);
     EXPECT_EQ(VarnekPGL_ReadFileByHandle64Bits(full + 500, nullptr, 1), -1);
     EXPECT_EQ(VarnekPGL_GetFileSizeByHandle64Bits(-1), -1);
     EXPECT_THAT(TakeLog(), IsEmpty());
@@ -324,14 +281,8 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     PglDirEntryInfo info = {7, ""};
     const std::string openFail = "VarnekPGL_OpenDir : pDir(" + none + ") = NULL";
     const std::string gone = "VarnekPGL_DeleteDirEx : No Eixst Dir! [" + none + "]";
-    const struct {
-        int64_t result;
-        int64_t expected;
-        std::vector<std::string> lines;
-    } rows[] = {
-        {VarnekPGL_MakeDir(tooLong.c_str()),
-         -1,
-         {"VarnekPGL_MakeDir : exceed max file path length : " + tooLong}},
+    ExpectRows({
+        {VarnekPGL_MakeDir(tooLong.c_str()), -1, {"VarnekPGL_MakeDir : exceed max file path length : " + tooLong}},
         {VarnekPGL_DeleteDirEx((none + "/").c_str()), -1, {openFail, gone}},
         {VarnekPGL_DeleteDirEx(""),
          -1,
@@ -350,33 +301,24 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
          FALSE,
          {"VarnekPGL_FmGetFileAttributes : failed..." + none}},
         {VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE), TRUE, {}},
-    };
-    std::vector<std::string> expected;
-    for (const auto &row : rows) {
-        EXPECT_EQ(row.result, row.expected) << ::testing::PrintToString(row.lines);
-        expected.insert(expected.end(), row.lines.begin(), row.lines.end());
-    }
-    EXPECT_EQ(TakeErrors(), expected);
+    });
     EXPECT_EQ(info.type, 0u);
     EXPECT_FALSE(std::filesystem::exists(none));
 
     EXPECT_EQ(VarnekPGL_MakeDir(present.c_str()), -1);
     const auto lines = TakeErrors();
     ASSERT_EQ(lines.size(), 1u);
-    const std::string head = "VarnekPGL_MakeDir : [" + present + "] dir create failed! errno(" +
-                             std::to_string(EEXIST) + "),process(";
-    const std::string tail =
-        ") pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()) + ")";
-    EXPECT_THAT(lines[0],
-                AllOf(StartsWith(head), ::testing::EndsWith(tail), HasSubstr("unit_tests")));
+    const std::string head =
+        "VarnekPGL_MakeDir : [" + present + "] dir create failed! errno(" + std::to_string(EEXIST) + "),process(";
+    const std::string tail = ") pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()) + ")";
+    EXPECT_THAT(lines[0], AllOf(StartsWith(head), ::testing::EndsWith(tail), HasSubstr("unit_tests")));
 }
 
 TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
     std::filesystem::create_directory(Path("sub"));
     WriteAll(Path("file"), "");
     std::filesystem::create_symlink("sub", Path("link"));
-    const uint32_t typeOf[] = {PGL_ENTRY_DIR, PGL_ENTRY_DIR, PGL_ENTRY_FILE, PGL_ENTRY_FILE,
-                               PGL_ENTRY_DIR};
+    const uint32_t typeOf[] = {PGL_ENTRY_DIR, PGL_ENTRY_DIR, PGL_ENTRY_FILE, PGL_ENTRY_FILE, PGL_ENTRY_DIR};
     const std::vector<std::string> names = {".", "..", "file", "link", "sub"};
     void *dir = VarnekPGL_OpenDir(Path("").c_str());
     PglDirEntryInfo info;
@@ -389,8 +331,7 @@ TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
     }
     EXPECT_EQ(count, names.size());
     EXPECT_EQ(info.type, 0u);
-    EXPECT_THAT(TakeErrors(),
-                ElementsAre(StartsWith("__VarnekPGL_ReadDir : return FALSE pDir = 0x")));
+    EXPECT_THAT(TakeErrors(), ElementsAre(StartsWith("__VarnekPGL_ReadDir : return FALSE pDir = 0x")));
     EXPECT_EQ(VarnekPGL_CloseDir(dir), TRUE);
     PglFmFileAttributes attributes;
     memset(&attributes, 0xFF, sizeof attributes);
@@ -441,9 +382,8 @@ TEST_F(Directory, WhatCannotBeDeletedStaysAndIsReported) {
     EXPECT_EQ(ReadAll(kept), "kept");
     EXPECT_FALSE(std::filesystem::exists(tree + "/gone"));
     EXPECT_THAT(TakeErrors(),
-                ::testing::IsSupersetOf(
-                    {"VarnekPGL_DeleteDirEx : exceed max file path length : " + kept,
-                     "VarnekPGL_DeleteDirEx : rmdir[" + tree + "] Fail. return FALSE"}));
+                ::testing::IsSupersetOf({"VarnekPGL_DeleteDirEx : exceed max file path length : " + kept,
+                                         "VarnekPGL_DeleteDirEx : rmdir[" + tree + "] Fail. return FALSE"}));
 }
 
 class Command : public VarnekTest {};
@@ -452,9 +392,8 @@ TEST_F(Command, AnyPathIsOneWord) {
     const std::filesystem::path home = std::filesystem::current_path();
     std::filesystem::current_path(Path(""));
     for (const char *name :
-         {"plain", "two words", "it's", "\"quoted\"", "semi;touch hurt", "`touch hurt`",
-          "$(touch hurt)", "$HOME", "new\nline", "-rf", "- x", "*", "~", "a\\b", "&", "#c",
-          "\xC3\xA9t\xC3\xA9", "'; touch hurt; '"}) {
+         {"plain", "two words", "it's", "\"quoted\"", "semi;touch hurt", "`touch hurt`", "$(touch hurt)", "$HOME",
+          "new\nline", "-rf", "- x", "*", "~", "a\\b", "&", "#c", "\xC3\xA9t\xC3\xA9", "'; touch hurt; '"}) {
         WriteAll(name, "content");
         EXPECT_EQ(VarnekPGL_CopyFile(name, "copy"), 0) << name;
         EXPECT_EQ(ReadAll("copy"), "content") << name;
@@ -475,11 +414,9 @@ TEST_F(Command, RefusalsKeepTheDestination) {
     WriteAll(destination, "kept");
     std::filesystem::create_hard_link(destination, Path("same"));
     const std::string longPath(520, 'x');
-    for (const std::string &source :
-         {Path("none"), Path(""), Path("same"), destination, longPath, std::string()}) {
+    for (const std::string &source : {Path("none"), Path(""), Path("same"), destination, longPath, std::string()}) {
         EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), destination.c_str()), -1) << source;
-        EXPECT_EQ(TakeErrors().back(),
-                  "VarnekPGL_CopyFile : fail src = " + source + " dest = " + destination);
+        EXPECT_EQ(TakeErrors().back(), "VarnekPGL_CopyFile : fail src = " + source + " dest = " + destination);
         EXPECT_EQ(ReadAll(destination), "kept");
     }
     EXPECT_EQ(VarnekPGL_CopyFile(destination.c_str(), longPath.c_str()), -1);
@@ -500,11 +437,9 @@ TEST_F(Command, ChmodTakesThreeModesAndHandsBackTheStatus) {
     }
     EXPECT_EQ(VarnekPGL_Chmod(path.c_str(), 644), -1);
     EXPECT_THAT(TakeLog(), IsEmpty());
-    EXPECT_EQ(VarnekPGL_Chmod(Path("none").c_str(), 666), 1 << 8)
-        << "exit status 1, as system() has it";
+    EXPECT_EQ(VarnekPGL_Chmod(Path("none").c_str(), 666), 1 << 8) << "exit status 1, as system() has it";
     EXPECT_THAT(TakeErrors(),
-                ElementsAre("VarnekPGL_Chmod : Could not change permission [chmod 666 " +
-                            Path("none") + "]"));
+                ElementsAre("VarnekPGL_Chmod : Could not change permission [chmod 666 " + Path("none") + "]"));
     EXPECT_EQ(VarnekPGL_Chmod(std::string(505, 'x').c_str(), 666), -1);
 }
 

@@ -103,8 +103,7 @@ TEST_F(LngPack, MalformedUtf8IsDecodedByteByByte) {
         TakeLog();
         EXPECT_EQ(WmConvertUTF2PCode(units.data(), room, exact.data(), length), TRUE);
         EXPECT_EQ(units, expected);
-        std::vector<std::string> lines(row.malformed,
-                                       "__WmLngStrlenByByte: utf8 incorrect range!\n");
+        std::vector<std::string> lines(row.malformed, "__WmLngStrlenByByte: utf8 incorrect range!\n");
         lines.resize(2 * row.malformed, "__WmLngUTF2Unicode: utf8 incorrect range!\n");
         EXPECT_EQ(TakeBodies(), lines);
     }
@@ -121,22 +120,17 @@ TEST_F(LngPack, FailuresAreNamed) {
               "0|WmConvertLatin15Code2PCode() fail. outBufSize < strLen\n");
     EXPECT_EQ(Said(WmConvertLatin15Code2PCode(units, 5, "12345")), "1");
     EXPECT_EQ(Said(__WmLngUnicode2UTF(nullptr, abc, 3)), "-1| __WmLngUnicode2UTF : des - null  !!");
-    EXPECT_EQ(Said(__WmLngUnicode2UTF(bytes, nullptr, 3)),
-              "-1|__WmLngUnicode2UTF : src - null  !!");
+    EXPECT_EQ(Said(__WmLngUnicode2UTF(bytes, nullptr, 3)), "-1|__WmLngUnicode2UTF : src - null  !!");
     EXPECT_EQ(Said(__WmLngUnicode2UTF(bytes, abc, 0)), "-1| __WmLngUnicode2UTF : nChar - 0  !!");
     EXPECT_EQ(Said(WmConvertPCode2UTF(bytes, abc, 0) + bytes[0]), "1");
     EXPECT_EQ(Said(WmConvert2LCode(bytes, nullptr)),
               "0| WmConvertPCode2UTF : mszInText - 0  !!"
               "|WmConvert2LCode: Converting Unicode(0) to utf8 code failed\n");
-    EXPECT_EQ(Said(WmConvert2LCode(nullptr, abc + 3)).substr(0, 45),
-              "0|WmConvertPCode2UTF : pszOutText - null  !!|");
+    EXPECT_EQ(Said(WmConvert2LCode(nullptr, abc + 3)).substr(0, 45), "0|WmConvertPCode2UTF : pszOutText - null  !!|");
     EXPECT_EQ(Said(__WmLngUTF2Unicode(nullptr, "a", 1)), "-1|__WmLngUTF2Unicode : des - null  !!");
-    EXPECT_EQ(Said(__WmLngUTF2Unicode(units, nullptr, 1)),
-              "-1|__WmLngUTF2Unicode : src - null  !!");
-    EXPECT_EQ(Said(WmConvertUTF2PCode(nullptr, 8, "a", 1)),
-              "0|WmConvertUTF2PCode : pmszOutText - null  !!");
-    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 8, nullptr, 1)),
-              "0|WmConvertUTF2PCode : szInText - null  !!");
+    EXPECT_EQ(Said(__WmLngUTF2Unicode(units, nullptr, 1)), "-1|__WmLngUTF2Unicode : src - null  !!");
+    EXPECT_EQ(Said(WmConvertUTF2PCode(nullptr, 8, "a", 1)), "0|WmConvertUTF2PCode : pmszOutText - null  !!");
+    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 8, nullptr, 1)), "0|WmConvertUTF2PCode : szInText - null  !!");
     EXPECT_EQ(Said(WmConvertUTF2PCode(units, 4, "abc", 3)),
               "0|__WmConvertCodeBufferSizeCheck: Out buffer size seems to be small (pmszOutText)\n"
               "|WmConvertUTF2PCode: Out buffer size seems to be small!\n");

@@ -29,18 +29,13 @@ Bytes operator+(Bytes left, const Bytes &right) {
     return left;
 }
 
-Bytes Fill(size_t size, unsigned char value) {
-    return Bytes(size, value);
-}
+Bytes Fill(size_t size, unsigned char value) { return Bytes(size, value); }
 
-unsigned char Low(size_t value) {
-    return static_cast<unsigned char>(value);
-}
+unsigned char Low(size_t value) { return static_cast<unsigned char>(value); }
 
 // A packet whose payload is filled up with stuffing. `flags` or-ed into bytes 1 and 3: unit start
 // 0x40, transport error 0x80; scrambled 0x80, adaptation field 0x20, payload 0x10.
-Bytes Packet(uint16_t pid, unsigned counter, const Bytes &payload, unsigned flags1 = 0,
-             unsigned flags3 = 0x10) {
+Bytes Packet(uint16_t pid, unsigned counter, const Bytes &payload, unsigned flags1 = 0, unsigned flags3 = 0x10) {
     Bytes packet = {0x47, Low(flags1 | pid >> 8), Low(pid), Low(flags3 | counter)};
     packet = packet + payload;
     packet.resize(188, 0xFF);
@@ -60,10 +55,8 @@ Bytes Numbered(size_t first, size_t count, size_t lead = 0, size_t trail = 0) {
 Bytes Section(unsigned char table, uint16_t extension, const Bytes &body, unsigned char number = 0,
               unsigned char last = 0, unsigned char version = 0xC1) {
     const size_t length = body.size() + 9;
-    Bytes section = {table,          Low(0xB0 | length >> 8),
-                     Low(length),    Low(extension >> 8u),
-                     Low(extension), version,
-                     number,         last};
+    Bytes section = {table, Low(0xB0 | length >> 8), Low(length), Low(extension >> 8u), Low(extension), version, number,
+                     last};
     section = section + body;
     const uint32_t crc = VarnekUtil_MakeCRC32(section.data(), static_cast<int32_t>(section.size()));
     return section + Bytes{Low(crc >> 24), Low(crc >> 16), Low(crc >> 8), Low(crc)};
@@ -85,9 +78,7 @@ Report ReadStream(const Bytes &stream, size_t block = 4096) {
     return report;
 }
 
-std::string SampleText() {
-    return ReadAll(VARNEK_SAMPLE);
-}
+std::string SampleText() { return ReadAll(VARNEK_SAMPLE); }
 
 Bytes Sample() {
     const std::string text = SampleText();
@@ -139,8 +130,7 @@ TEST(Receiver, FindsPacketsInAnyCompany) {
          9, 0, 192},
         {"garbage in front", noise + Numbered(0, 20), 20, 1, 188},
         {"garbage in front of 192", noise + Numbered(0, 20, 4, 0), 20, 1, 192},
-        {"garbage between, twice",
-         Numbered(0, 9) + noise + Numbered(9, 4) + noise + Numbered(13, 5), 18, 2, 188},
+        {"garbage between, twice", Numbered(0, 9) + noise + Numbered(9, 4) + noise + Numbered(13, 5), 18, 2, 188},
         {"garbage soon", Numbered(0, 3) + noise + Numbered(3, 17), 20, 1, 188},
         {"a table with even strides", noise + table, 0, 0, 0},
         {"garbage before the last packet", Numbered(0, 9) + noise + Numbered(9, 1), 10, 1, 188},
@@ -199,18 +189,8 @@ TEST(Receiver, FollowsContinuity) {
     } cases[] = {
         {"in order", {{14, plain}, {15, plain}, {0, plain}, {1, plain}}, 0, 0, 0, 0x100},
         {"one lost", {{1, plain}, {3, plain}, {4, plain}}, 1, 0, 0, 0x100},
-        {"sent twice",
-         {{1, plain}, {1, plain}, {2, plain}, {2, plain}, {3, plain}},
-         0,
-         0,
-         0,
-         0x100},
-        {"sent four times",
-         {{1, plain}, {1, plain}, {1, plain}, {1, plain}, {2, plain}},
-         2,
-         0,
-         0,
-         0x100},
+        {"sent twice", {{1, plain}, {1, plain}, {2, plain}, {2, plain}, {3, plain}}, 0, 0, 0, 0x100},
+        {"sent four times", {{1, plain}, {1, plain}, {1, plain}, {1, plain}, {2, plain}}, 2, 0, 0, 0x100},
         {"without payload", {{1, plain}, {1, empty}, {1, empty}, {2, plain}}, 0, 0, 0, 0x100},
         {"counted without payload", {{1, plain}, {2, empty}, {3, plain}}, 1, 0, 0, 0x100},
         {"announced jump", {{1, plain}, {9, jump}, {10, plain}}, 0, 0, 0, 0x100},
@@ -255,8 +235,7 @@ TEST(Receiver, AssemblesSections) {
     };
     const struct {
         const char *name;
-        std::vector<std::pair<unsigned, Bytes>>
-            payloads;  // unit start 0x40; steps of the counter beside 1
+        std::vector<std::pair<unsigned, Bytes>> payloads;  // unit start 0x40; steps of the counter beside 1
         uint64_t good, bad_crc, incomplete;
     } cases[] = {
         {"two in a packet", {{0x40, Bytes{0} + small + small}}, 2, 0, 0},
@@ -266,9 +245,7 @@ TEST(Receiver, AssemblesSections) {
         {"too long", whole(Section(0x50, 1, Fill(4085, 3))), 0, 0, 1},
         {"too long for its table", whole(Section(0x42, 1, Fill(1013, 3))), 0, 0, 1},
         {"end, pointer and next",
-         {{0x40, Bytes{0} + part(0, 183)},
-          {0, part(183, 184)},
-          {0x40, Bytes{33} + part(367, 33) + small}},
+         {{0x40, Bytes{0} + part(0, 183)}, {0, part(183, 184)}, {0x40, Bytes{33} + part(367, 33) + small}},
          2,
          0,
          0},
@@ -280,40 +257,21 @@ TEST(Receiver, AssemblesSections) {
          2,
          0,
          0},
-        {"start in mid-stream",
-         {{0, part(183, 184)}, {0x40, Bytes{33} + part(367, 33) + small}},
-         1,
-         0,
-         0},
-        {"a lost packet",
-         {{0x40, Bytes{0} + part(0, 183)}, {1, part(183, 184)}, {0, part(183, 184)}},
-         0,
-         0,
-         1},
+        {"start in mid-stream", {{0, part(183, 184)}, {0x40, Bytes{33} + part(367, 33) + small}}, 1, 0, 0},
+        {"a lost packet", {{0x40, Bytes{0} + part(0, 183)}, {1, part(183, 184)}, {0, part(183, 184)}}, 0, 0, 1},
         {"a packet sent twice",
-         {{0x40, Bytes{0} + part(0, 183)},
-          {0, part(183, 184)},
-          {15, part(183, 184)},
-          {0, part(367, 33)}},
+         {{0x40, Bytes{0} + part(0, 183)}, {0, part(183, 184)}, {15, part(183, 184)}, {0, part(367, 33)}},
          1,
          0,
          0},
-        {"cut short by the next",
-         {{0x40, Bytes{0} + part(0, 183)}, {0x40, Bytes{5} + part(183, 5) + small}},
-         1,
-         0,
-         1},
+        {"cut short by the next", {{0x40, Bytes{0} + part(0, 183)}, {0x40, Bytes{5} + part(183, 5) + small}}, 1, 0, 1},
         {"pointer beyond the packet",
          {{0x40, Bytes{0} + part(0, 183)}, {0x40, Bytes{184} + small}, {0, small}},
          0,
          0,
          1},
         {"no room for a CRC", {{0x40, Bytes{0, 0x4E, 0xB0, 0, 0x4E, 0xB0, 3, 1, 2, 3}}}, 0, 2, 0},
-        {"no CRC to check",
-         {{0x40, Bytes{0, 0x70, 0x70, 5, 0, 0, 0, 0, 0, 0x72, 0x70, 0, 0x71, 0x70, 0}}},
-         3,
-         0,
-         0},
+        {"no CRC to check", {{0x40, Bytes{0, 0x70, 0x70, 5, 0, 0, 0, 0, 0, 0x72, 0x70, 0, 0x71, 0x70, 0}}}, 3, 0, 0},
         {"nothing but stuffing", {{0x40, Bytes{0}}, {0, {}}}, 0, 0, 0},
     };
     for (const auto &c : cases) {
@@ -394,10 +352,8 @@ Report ReadSections(const std::vector<std::pair<uint16_t, Bytes>> &sections) {
     std::map<uint16_t, unsigned> counters;
     std::pair<uint16_t, Bytes> rest;
     for (const auto &[pid, section] : sections) {
-        const auto split = section.begin() + std::min<std::ptrdiff_t>(
-                                                 183, static_cast<std::ptrdiff_t>(section.size()));
-        stream = stream +
-                 Packet(pid, counters[pid]++ % 16, Bytes{0} + Bytes(section.begin(), split), 0x40);
+        const auto split = section.begin() + std::min<std::ptrdiff_t>(183, static_cast<std::ptrdiff_t>(section.size()));
+        stream = stream + Packet(pid, counters[pid]++ % 16, Bytes{0} + Bytes(section.begin(), split), 0x40);
         if (!rest.second.empty()) {
             stream = stream + Packet(rest.first, counters[rest.first]++ % 16, rest.second);
         }
@@ -414,16 +370,13 @@ Bytes Pat(const std::vector<std::pair<uint16_t, uint16_t>> &programs) {
     return body;
 }
 
-Bytes Pmt(unsigned char type) {
-    return {0xE1, 0x00, 0xF0, 0, type, 0xE1, 0x00, 0xF0, 0};
-}
+Bytes Pmt(unsigned char type) { return {0xE1, 0x00, 0xF0, 0, type, 0xE1, 0x00, 0xF0, 0}; }
 
 const Bytes kSdtStart = {0, 1, 0xFF};
 
 Bytes Sdt(uint16_t id, const std::string &name) {
     const size_t size = name.size();
-    return Bytes{Low(id >> 8), Low(id),       0xFC, 0x80, Low(size + 5),
-                 0x48,         Low(size + 3), 1,    0,    Low(size)} +
+    return Bytes{Low(id >> 8), Low(id), 0xFC, 0x80, Low(size + 5), 0x48, Low(size + 3), 1, 0, Low(size)} +
            Bytes(name.begin(), name.end());
 }
 
@@ -450,8 +403,7 @@ TEST(Receiver, KeepsWhatApplies) {
     overrun[9] = 10;  // the name's length
     Bytes loop_overrun = Sdt(6, "whole");
     loop_overrun[4] = 250;
-    const Bytes long_pmt =
-        Bytes{0xE1, 0, 0xF0, 200, 0x80, 198} + Fill(198, 0) + Bytes{0x1B, 0xE1, 0, 0xF0, 0};
+    const Bytes long_pmt = Bytes{0xE1, 0, 0xF0, 200, 0x80, 198} + Fill(198, 0) + Bytes{0x1B, 0xE1, 0, 0xF0, 0};
     Bytes loop_in_pmt = Pmt(0x1B);
     loop_in_pmt[3] = 200;
     const struct {
@@ -466,8 +418,7 @@ TEST(Receiver, KeepsWhatApplies) {
           {0, Section(0, 7, Pat({{2, 0x102}}), 1, 1)},
           {0x101, Section(2, 1, Pmt(0x02))}},
          {R"("pmt_pid": 257, "pcr_pid": 256, "components": [{"pid": 256, "type": 2}])",
-          R"("pmt_pid": 258, "pcr_pid": 256, "components": [{"pid": 256, "type": 27}])",
-          R"("transport_stream_id": 7)"},
+          R"("pmt_pid": 258, "pcr_pid": 256, "components": [{"pid": 256, "type": 27}])", R"("transport_stream_id": 7)"},
          {R"("id": 0,)"}},
         {"a new PAT moves a service, drops another and stops its PMT",
          {{0, Section(0, 7, Pat({{1, 0x101}, {2, 0x102}}))},
@@ -488,8 +439,7 @@ TEST(Receiver, KeepsWhatApplies) {
           {0x11, Section(0x46, 8, kSdtStart + Sdt(1, "other"))},
           {0x10, Section(0x40, 9, {0xF0, 5, 0x40, 3, 'n', 'e', 't', 0xF0, 0})},
           {0x10, Section(0x41, 8, {0xF0, 5, 0x40, 3, 'o', 't', 'h', 0xF0, 0})}},
-         {R"("name": "\"new\\")", R"([{"pid": 256, "type": 36}])", R"("network_name": "net")",
-          R"("network_id": 9)"},
+         {R"("name": "\"new\\")", R"([{"pid": 256, "type": 36}])", R"("network_name": "net")", R"("network_id": 9)"},
          {"old", "gone", "later", "other", "oth\""}},
         {"events once each, by start, latest wins, not for another stream",
          {{0x12, Section(0x50, 1, Eit(2, 0x20, "second"))},
@@ -512,10 +462,8 @@ TEST(Receiver, KeepsWhatApplies) {
         {"lengths that lead outside",
          {{0, Section(0, 7, Pat({{1, 0x101}}))},
           {0x101, Section(2, 1, loop_in_pmt)},
-          {0x11,
-           Section(0x42, 7, kSdtStart + Sdt(2, "kept") + overrun + Sdt(4, "next") + loop_overrun)},
-          {0x12,
-           Section(0x4E, 1, {0, 1, 0, 1, 0, 0x4E, 0, 1, 0xC0, 0x79, 0, 0, 0, 0, 0, 0, 0x8F, 0xFF})},
+          {0x11, Section(0x42, 7, kSdtStart + Sdt(2, "kept") + overrun + Sdt(4, "next") + loop_overrun)},
+          {0x12, Section(0x4E, 1, {0, 1, 0, 1, 0, 0x4E, 0, 1, 0xC0, 0x79, 0, 0, 0, 0, 0, 0, 0x8F, 0xFF})},
           {0x10, Section(0x40, 9, {0xFF, 0xFF, 0x40, 200, 'n'})},
           {0x14, {0x70, 0x70, 3, 0xC0, 0x79, 0x12}}},
          {"kept", "next", "whole", R"("id": 3, "name": "", "provider": "")", R"("utc_time": "")"},
@@ -576,8 +524,7 @@ TEST(Receiver, ReadsTheSample) {
           "  0xC858  TV Ipê Móvel  television, Ipê Comunicação  (PMT 0x1FC8)\n",
           "          0x0181 H.264 video, 0x0182 AAC audio (ADTS)\n",
           "  2024-06-15 22:30:00  00:30:00  TV Ipê Móvel  Notícias em um Minuto\n",
-          "  start not known      -         TV Ipê HD     -\n",
-          "  sections with a bad CRC          1\n"}) {
+          "  start not known      -         TV Ipê HD     -\n", "  sections with a bad CRC          1\n"}) {
         EXPECT_THAT(summary, HasSubstr(line));
     }
 }
@@ -644,10 +591,7 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
 bool IsUtf8(const std::string &text) {
     for (size_t i = 0; i < text.size();) {
         const unsigned char c = static_cast<unsigned char>(text[i]);
-        const size_t more = c < 0x80                ? 0
-                            : c >= 0xC2 && c < 0xE0 ? 1
-                            : c >= 0xE0 && c < 0xF0 ? 2
-                                                    : 9;
+        const size_t more = c < 0x80 ? 0 : c >= 0xC2 && c < 0xE0 ? 1 : c >= 0xE0 && c < 0xF0 ? 2 : 9;
         if (more == 9 || i + more >= text.size()) {
             return false;
         }

@@ -28,14 +28,12 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
     EXPECT_EQ(VarnekPGL_CreateMutex("one"), 3);
     TakeLog();
     EXPECT_EQ(VarnekPGL_CreateMutex("one"), 4);
-    EXPECT_THAT(
-        TakeBodies(),
-        ElementsAre("szMutexName=[one]. Duplicated Mutex. Old one will be destroyed!\n",
-                    "***** START : VarnekPGL_DeleteMutex. hMutex=[3]",
-                    "***** END : VarnekPGL_DeleteMutex",
-                    "***** START : __Varnek_create_mutex. szMutexName=[one]",
-                    MatchesRegex("\\*\\*\\*\\*\\* END : __Varnek_create_mutex mutex handle = 4, "
-                                 "linuxMutex=\\[.*\\]\n")));
+    EXPECT_THAT(TakeBodies(),
+                ElementsAre("szMutexName=[one]. Duplicated Mutex. Old one will be destroyed!\n",
+                            "***** START : VarnekPGL_DeleteMutex. hMutex=[3]", "***** END : VarnekPGL_DeleteMutex",
+                            "***** START : __Varnek_create_mutex. szMutexName=[one]",
+                            MatchesRegex("\\*\\*\\*\\*\\* END : __Varnek_create_mutex mutex handle = 4, "
+                                         "linuxMutex=\\[.*\\]\n")));
     // Handles that share a place among the lookup's hints.
     for (int handle = 5; handle < 300; handle++) {
         EXPECT_EQ(VarnekPGL_CreateMutex("again"), handle);
@@ -48,21 +46,14 @@ TEST_F(Mutex, FailuresHaveTheirLineAndResult) {
     const int32_t held = VarnekPGL_CreateMutex("held");
     VarnekPGL_AcquireMutex(held);
     TakeLog();
-    const struct {
-        int32_t result;
-        int32_t expected;
-        std::vector<std::string> lines;
-    } rows[] = {
-        {VarnekPGL_CreateMutex(nullptr),
-         -1,
-         {"***** __Varnek_create_mutex : Mutex name is null!!"}},
+    ExpectRows({
+        {VarnekPGL_CreateMutex(nullptr), -1, {"***** __Varnek_create_mutex : Mutex name is null!!"}},
         {VarnekPGL_CreateMutex(""),
          -1,
          {"***** __Varnek_create_mutex : Invalid Mutex Name. szMutexName = [], Len = [0]"}},
         {VarnekPGL_CreateMutex(k32.c_str()),
          -1,
-         {"***** __Varnek_create_mutex : Invalid Mutex Name. szMutexName = [" + k32 +
-          "], Len = [32]"}},
+         {"***** __Varnek_create_mutex : Invalid Mutex Name. szMutexName = [" + k32 + "], Len = [32]"}},
         {VarnekPGL_CreateMutex("held"),
          -1,
          {"***** VarnekPGL_DeleteMutex : Mutex Destroy FAIL! errCode = [16]",
@@ -78,13 +69,7 @@ TEST_F(Mutex, FailuresHaveTheirLineAndResult) {
          {"***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [2147483647]"}},
         {VarnekPGL_GetMutexByName(nullptr), -1, {}},
         {VarnekPGL_GetMutexByName(""), -1, {}},
-    };
-    std::vector<std::string> expected;
-    for (const auto &row : rows) {
-        EXPECT_EQ(row.result, row.expected) << ::testing::PrintToString(row.lines);
-        expected.insert(expected.end(), row.lines.begin(), row.lines.end());
-    }
-    EXPECT_EQ(TakeErrors(), expected);
+    });
     EXPECT_EQ(VarnekPGL_GetMutexByName("held"), held) << "a held mutex survives";
     EXPECT_TRUE(VarnekPGL_ReleaseMutex(held));
     EXPECT_TRUE(VarnekPGL_DeleteMutex(held));
@@ -132,15 +117,13 @@ TEST_F(Semaphore, HandlesCountApartAndUnitsAreKept) {
     EXPECT_TRUE(VarnekPGL_WaitSemaphore(sem, WAIT_FOREVER));
     TakeLog();
     EXPECT_EQ(VarnekPGL_CreateSemaphore(k31.c_str(), 0), 2);
-    EXPECT_THAT(
-        TakeBodies(),
-        ElementsAre("szSemName=[" + k31 +
-                        "]. Duplicated Semaphore. Old one will be "
-                        "destroyed!\n",
-                    "Varnek_delete_semaphore: OK 0",
-                    "***** START : __Varnek_create_semaphore. szSemName=[" + k31 + "], count=[0]",
-                    MatchesRegex("__Varnek_create_semaphore: ret \\[2\\]. linux "
-                                 "Semaphore=\\[.*\\],  size = \\[1\\]\n")));
+    EXPECT_THAT(TakeBodies(), ElementsAre("szSemName=[" + k31 +
+                                              "]. Duplicated Semaphore. Old one will be "
+                                              "destroyed!\n",
+                                          "Varnek_delete_semaphore: OK 0",
+                                          "***** START : __Varnek_create_semaphore. szSemName=[" + k31 + "], count=[0]",
+                                          MatchesRegex("__Varnek_create_semaphore: ret \\[2\\]. linux "
+                                                       "Semaphore=\\[.*\\],  size = \\[1\\]\n")));
     EXPECT_EQ(VarnekPGL_SemaphoreByName(k31.c_str()), 2);
     EXPECT_TRUE(VarnekPGL_SignalSemaphore(2));
     EXPECT_THAT(TakeBodies(), ElementsAre("VarnekPGL_SignalSemaphore: hSem[2], arrIdx[0]\n",
@@ -152,40 +135,22 @@ TEST_F(Semaphore, HandlesCountApartAndUnitsAreKept) {
 
 TEST_F(Semaphore, FailuresHaveTheirLineAndResult) {
     const std::string lookup = "VarnekPGL_WaitSemaphore: arrIdx == -1, ";
-    const struct {
-        int32_t result;
-        int32_t expected;
-        std::vector<std::string> lines;
-    } rows[] = {
-        {VarnekPGL_CreateSemaphore(nullptr, 0),
-         -1,
-         {"__Varnek_create_semaphore: szSemName == NULL"}},
-        {VarnekPGL_CreateSemaphore("", 0),
-         -1,
-         {"__Varnek_create_semaphore: 0 (strLenTmp == 0 || strLenTmp >= 32)"}},
+    ExpectRows({
+        {VarnekPGL_CreateSemaphore(nullptr, 0), -1, {"__Varnek_create_semaphore: szSemName == NULL"}},
+        {VarnekPGL_CreateSemaphore("", 0), -1, {"__Varnek_create_semaphore: 0 (strLenTmp == 0 || strLenTmp >= 32)"}},
         {VarnekPGL_CreateSemaphore(k32.c_str(), 0),
          -1,
          {"__Varnek_create_semaphore: 32 (strLenTmp == 0 || strLenTmp >= 32)"}},
-        {VarnekPGL_CreateSemaphore("much", 0xFFFFFFFF),
-         -1,
-         {"__Varnek_create_semaphore: retSem != 0. errCode = [22]"}},
+        {VarnekPGL_CreateSemaphore("much", 0xFFFFFFFF), -1, {"__Varnek_create_semaphore: retSem != 0. errCode = [22]"}},
         {VarnekPGL_DeleteSemaphore(1), FALSE, {"Varnek_delete_semaphore: arrIdx == -1, 1"}},
         {VarnekPGL_WaitSemaphore(-1, 0), FALSE, {lookup + "-1"}},
         {VarnekPGL_WaitSemaphore(0, WAIT_FOREVER), FALSE, {lookup + "0"}},
         {VarnekPGL_SignalSemaphore(9), FALSE, {"VarnekPGL_SignalSemaphore: arrIdx == -1, 9"}},
         {VarnekPGL_SemaphoreByName(nullptr), -1, {}},
         {VarnekPGL_CreateSemaphore("brimful", 0x7FFFFFFF), 1, {}},
-        {VarnekPGL_SignalSemaphore(1),
-         FALSE,
-         {"VarnekPGL_SignalSemaphore: retSem != 0, errCode = [75]"}},
+        {VarnekPGL_SignalSemaphore(1), FALSE, {"VarnekPGL_SignalSemaphore: retSem != 0, errCode = [75]"}},
         {VarnekPGL_DeleteSemaphore(1), TRUE, {}},
-    };
-    std::vector<std::string> expected;
-    for (const auto &row : rows) {
-        EXPECT_EQ(row.result, row.expected) << ::testing::PrintToString(row.lines);
-        expected.insert(expected.end(), row.lines.begin(), row.lines.end());
-    }
-    EXPECT_EQ(TakeErrors(), expected);
+    });
     for (int i = 0; i < 40; i++) {
         EXPECT_EQ(VarnekPGL_CreateSemaphore(std::to_string(i).c_str(), 0), i + 2);
     }

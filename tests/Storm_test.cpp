@@ -52,9 +52,7 @@ class StormAlone : public VarnekTest {
 };
 
 // Every character of a name tells whose it is, so that half a name is none.
-std::string NameOf(int id) {
-    return std::string(31, static_cast<char>('a' + id));
-}
+std::string NameOf(int id) { return std::string(31, static_cast<char>('a' + id)); }
 
 // Creation, deletion and lookups of the three families, at once.
 struct Family {
@@ -65,22 +63,15 @@ struct Family {
     BOOL (*use)(int32_t handle);
 };
 
-void *Nothing(void *) {
-    return nullptr;
-}
+void *Nothing(void *) { return nullptr; }
 
 const Family kFamilies[] = {
     {"mutex", VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex, VarnekPGL_GetMutexByName,
-     [](int32_t h) {
-         return VarnekPGL_AcquireMutex(h) && VarnekPGL_ReleaseMutex(h) ? TRUE : FALSE;
-     }},
-    {"semaphore", [](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); },
-     VarnekPGL_DeleteSemaphore, VarnekPGL_SemaphoreByName,
-     [](int32_t h) {
-         return VarnekPGL_SignalSemaphore(h) && VarnekPGL_WaitSemaphore(h, 1000) ? TRUE : FALSE;
-     }},
-    {"thread",
-     [](const char *name) { return VarnekPGL_CreateThread(name, 1, 16384, Nothing, nullptr); },
+     [](int32_t h) { return VarnekPGL_AcquireMutex(h) && VarnekPGL_ReleaseMutex(h) ? TRUE : FALSE; }},
+    {"semaphore", [](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); }, VarnekPGL_DeleteSemaphore,
+     VarnekPGL_SemaphoreByName,
+     [](int32_t h) { return VarnekPGL_SignalSemaphore(h) && VarnekPGL_WaitSemaphore(h, 1000) ? TRUE : FALSE; }},
+    {"thread", [](const char *name) { return VarnekPGL_CreateThread(name, 1, 16384, Nothing, nullptr); },
      VarnekPGL_DeleteThread, VarnekPGL_GetThreadByName,
      [](int32_t h) {
          const THREAD_MSG message = {};
@@ -99,9 +90,7 @@ TEST_F(StormAlone, LookupsDuringCreationsAndDeletions) {
                 const int32_t handle = family.create(NameOf(thread).c_str());
                 ASSERT_GT(handle, 0);
                 ASSERT_LT(handle, kHandles);
-                ASSERT_EQ(
-                    owners[static_cast<size_t>(handle)].exchange(static_cast<int8_t>(thread + 1)),
-                    0)
+                ASSERT_EQ(owners[static_cast<size_t>(handle)].exchange(static_cast<int8_t>(thread + 1)), 0)
                     << family.what << ": a handle came back";
                 ASSERT_EQ(family.find(NameOf(thread).c_str()), handle) << family.what;
                 ASSERT_TRUE(family.use(handle)) << family.what;
@@ -114,8 +103,7 @@ TEST_F(StormAlone, LookupsDuringCreationsAndDeletions) {
             if (handle != -1) {
                 found++;
                 const int8_t owner = owners[static_cast<size_t>(handle)];
-                ASSERT_TRUE(owner == 0 || owner == name + 1)
-                    << family.what << ": the handle of another name";
+                ASSERT_TRUE(owner == 0 || owner == name + 1) << family.what << ": the handle of another name";
             }
         });
         EXPECT_GT(found, 0) << family.what;
@@ -156,8 +144,7 @@ void *Receiver(void *argument) {
         Content content;
         memcpy(&content, message.data, sizeof content);
         EXPECT_EQ(content.destination, self) << "a message for another record";
-        EXPECT_EQ(content.number, next[content.sender]++)
-            << "a message lost, doubled or out of order";
+        EXPECT_EQ(content.number, next[content.sender]++) << "a message lost, doubled or out of order";
         totals.received++;
         if (content.last != 0) {
             break;
@@ -207,8 +194,7 @@ TEST_F(StormAlone, NoMessageIsLost) {
     std::atomic<int> sent{0};
     Storm(2, [&](int thread, std::mt19937 &) {
         totals[thread].alive = 1;
-        const int32_t handle =
-            VarnekPGL_CreateThread(NameOf(thread).c_str(), 1, 65536, Receiver, &totals[thread]);
+        const int32_t handle = VarnekPGL_CreateThread(NameOf(thread).c_str(), 1, 65536, Receiver, &totals[thread]);
         std::thread senders[kSenders];
         for (int sender = 0; sender < kSenders; sender++) {
             senders[sender] = std::thread([&sent, handle, sender] {
@@ -283,8 +269,7 @@ TEST_F(StormAlone, ExpiriesThatMeetCancelsAndStarts) {
             Start &start = gStarts[thread][next++ % 1024];
             start.due = WallClock() + timeout * int64_t{1000000};
             start.cancelled = false;
-            VarnekPGL_StartTimer(handle, timeout, thread % 2 != 0 ? ExpectDue : UseOwnTimer,
-                                 &start);
+            VarnekPGL_StartTimer(handle, timeout, thread % 2 != 0 ? ExpectDue : UseOwnTimer, &start);
             std::this_thread::sleep_for(std::chrono::microseconds(900 + random() % 200));
             start.cancelled = true;
             VarnekPGL_CancelTimer(handle);

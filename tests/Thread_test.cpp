@@ -30,8 +30,7 @@ THREAD_MSG Message(char text) {
 class Worker {
   public:
     explicit Worker(std::function<void()> work, const char *name = "worker")
-        : work_(std::move(work)),
-          handle_(VarnekPGL_CreateThread(name, 50, 256 * 1024, Run, this)) {}
+        : work_(std::move(work)), handle_(VarnekPGL_CreateThread(name, 50, 256 * 1024, Run, this)) {}
     ~Worker() { Wait(); }
 
     int32_t Handle() const { return handle_; }
@@ -55,9 +54,7 @@ class Worker {
     int32_t handle_;
 };
 
-void *Nothing(void *) {
-    return nullptr;
-}
+void *Nothing(void *) { return nullptr; }
 
 class Thread : public VarnekTest {};
 class MessageQueue : public VarnekTest {};
@@ -77,13 +74,12 @@ TEST_F(Thread, HandlesNamesAndTheThreadsOwnView) {
     EXPECT_FALSE(VarnekPGL_DeleteThread(1));
     TakeLog();
     EXPECT_EQ(VarnekPGL_CreateThread("third", 99, 65536, Nothing, nullptr), 3);
-    EXPECT_THAT(
-        TakeBodies(),
-        ElementsAre("***** START : __Varnek_get_thread_by_name, szThreadName=[third]",
-                    "***** START : __Varnek_create_thread. Thread Name=[third]",
-                    MatchesRegex("\\*\\*\\*\\*\\* END : __Varnek_create_thread thread handle = 3, "
-                                 "linuxThread=\\[.*\\]\n"),
-                    "Thread Succefully Created! ThreadName=[third], Created Handle=[3]\n"));
+    EXPECT_THAT(TakeBodies(),
+                ElementsAre("***** START : __Varnek_get_thread_by_name, szThreadName=[third]",
+                            "***** START : __Varnek_create_thread. Thread Name=[third]",
+                            MatchesRegex("\\*\\*\\*\\*\\* END : __Varnek_create_thread thread handle = 3, "
+                                         "linuxThread=\\[.*\\]\n"),
+                            "Thread Succefully Created! ThreadName=[third], Created Handle=[3]\n"));
     EXPECT_EQ(VarnekPGL_GetCurrentThread(), -1);
     EXPECT_THAT(TakeErrors(), ElementsAre(HasSubstr("Can't find thread Info. pthreadID = [")));
 }
@@ -91,11 +87,9 @@ TEST_F(Thread, HandlesNamesAndTheThreadsOwnView) {
 TEST_F(Thread, FailuresHaveTheirLineAndResult) {
     TakeLog();
     EXPECT_FALSE(VarnekPGL_DeleteThread(1));
-    EXPECT_THAT(
-        TakeErrors(),
-        ElementsAre("***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [-1]",
-                    "***** VarnekPGL_DeleteThread : Can't find thread info. thread handle = [1]",
-                    "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [-1]"))
+    EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [-1]",
+                                          "***** VarnekPGL_DeleteThread : Can't find thread info. thread handle = [1]",
+                                          "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [-1]"))
         << "there is no guard before the first thread";
     const std::string k32(32, 'n');
     const std::string create = "***** __Varnek_create_thread : ";
@@ -107,17 +101,15 @@ TEST_F(Thread, FailuresHaveTheirLineAndResult) {
     } rows[] = {
         {nullptr, 50, Nothing, create + "Thread name is null!!"},
         {"", 50, Nothing, create + "Invalid Thread Name. szThreadName = [], Len = [0]"},
-        {k32.c_str(), 50, Nothing,
-         create + "Invalid Thread Name. szThreadName = [" + k32 + "], Len = [32]"},
+        {k32.c_str(), 50, Nothing, create + "Invalid Thread Name. szThreadName = [" + k32 + "], Len = [32]"},
         {"x", 0, nullptr, create + "Invalid argument. priority=[0], pFunc=[0]"},
         {"x", 100, nullptr, create + "Invalid argument. priority=[100], pFunc=[0]"},
         {"x", 50, nullptr, create + "Invalid argument. priority=[50], pFunc=[0]"},
     };
     for (const auto &row : rows) {
         EXPECT_EQ(VarnekPGL_CreateThread(row.name, row.priority, 0, row.function, nullptr), -1);
-        EXPECT_THAT(TakeErrors(),
-                    ElementsAre(row.line, std::string("Thread Creation Fail! szThreadName=[") +
-                                              (row.name != nullptr ? row.name : "(null)") + "]\n"));
+        EXPECT_THAT(TakeErrors(), ElementsAre(row.line, std::string("Thread Creation Fail! szThreadName=[") +
+                                                            (row.name != nullptr ? row.name : "(null)") + "]\n"));
     }
     for (int i = 1; i <= 20; i++) {
         EXPECT_EQ(VarnekPGL_CreateThread(std::to_string(i).c_str(), 1, 0, Nothing, nullptr), i);
@@ -153,10 +145,9 @@ TEST_F(Thread, ADuplicateTakesTheRecord) {
     VarnekPGL_SendMessage(old + 1, &message);
     TakeLog();
     EXPECT_TRUE(VarnekPGL_DeleteThread(old + 1));
-    EXPECT_THAT(TakeBodies(),
-                ElementsAre("***** START : VarnekPGL_DeleteThread. thread handle=[2]",
-                            "***** VarnekPGL_DeleteThread : MsgQ is not empty!!size = [1]",
-                            "***** END : VarnekPGL_DeleteThread, 0"));
+    EXPECT_THAT(TakeBodies(), ElementsAre("***** START : VarnekPGL_DeleteThread. thread handle=[2]",
+                                          "***** VarnekPGL_DeleteThread : MsgQ is not empty!!size = [1]",
+                                          "***** END : VarnekPGL_DeleteThread, 0"));
 }
 
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
@@ -216,19 +207,16 @@ TEST_F(MessageQueue, UrgentMessagesOvertake) {
         EXPECT_TRUE(row.send(worker.Handle(), &message));
         message = Message('x');
     }
-    EXPECT_THAT(TakeBodies(), ElementsAre("***** START : VarnekPGL_SendMessage. hThread = 1",
-                                          "***** VarnekPGL_SendMessage: ThreadMgr arrIdx = 0",
-                                          "***** VarnekPGL_SendMessage: semCount = 1",
-                                          "***** START : VarnekPGL_SendMessage. hThread = 1",
-                                          "***** VarnekPGL_SendMessage: ThreadMgr arrIdx = 0",
-                                          "***** VarnekPGL_SendMessage: semCount = 2"));
+    EXPECT_THAT(
+        TakeBodies(),
+        ElementsAre("***** START : VarnekPGL_SendMessage. hThread = 1",
+                    "***** VarnekPGL_SendMessage: ThreadMgr arrIdx = 0", "***** VarnekPGL_SendMessage: semCount = 1",
+                    "***** START : VarnekPGL_SendMessage. hThread = 1",
+                    "***** VarnekPGL_SendMessage: ThreadMgr arrIdx = 0", "***** VarnekPGL_SendMessage: semCount = 2"));
     sent.set_value();
     worker.Wait();
-    EXPECT_EQ(received, std::string(40, '2') + std::string(40, '1') + std::string(40, 'a') +
-                            std::string(40, 'b'));
-    EXPECT_THAT(
-        TakeErrors(),
-        ElementsAre("***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [110]"));
+    EXPECT_EQ(received, std::string(40, '2') + std::string(40, '1') + std::string(40, 'a') + std::string(40, 'b'));
+    EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [110]"));
 }
 
 TEST_F(MessageQueue, APeekLeavesASignalBehind) {
@@ -255,21 +243,16 @@ TEST_F(MessageQueue, FailuresHaveTheirLineAndResult) {
         BOOL result;
         std::string line;
     } rows[] = {
-        {VarnekPGL_SendMessage(-1, &message),
-         "***** VarnekPGL_SendMessage. Can't find thread info. thread = [-1]"},
+        {VarnekPGL_SendMessage(-1, &message), "***** VarnekPGL_SendMessage. Can't find thread info. thread = [-1]"},
         {VarnekPGL_SendMessage(1, nullptr), "***** VarnekPGL_SendMessage: message is NULL"},
         {VarnekPGL_SendUrgentMessage(0, &message),
          "***** VarnekPGL_SendUrgentMessage. Can't find thread info. thread = [0]"},
-        {VarnekPGL_SendUrgentMessage(1, nullptr),
-         "***** VarnekPGL_SendUrgentMessage: message is NULL"},
+        {VarnekPGL_SendUrgentMessage(1, nullptr), "***** VarnekPGL_SendUrgentMessage: message is NULL"},
         {VarnekPGL_ReceiveMessage(0, &message, &count),
          "***** VarnekPGL_ReceiveMessage. Can't find current thread handle"},
-        {VarnekPGL_PeekMessage(&message, &count),
-         "***** VarnekPGL_PeekMessage. Can't find current thread handle"},
-        {VarnekPGL_ReceiveMessage(0, nullptr, &count),
-         "***** VarnekPGL_ReceiveMessage: message or count is NULL"},
-        {VarnekPGL_PeekMessage(&message, nullptr),
-         "***** VarnekPGL_PeekMessage: message or count is NULL"},
+        {VarnekPGL_PeekMessage(&message, &count), "***** VarnekPGL_PeekMessage. Can't find current thread handle"},
+        {VarnekPGL_ReceiveMessage(0, nullptr, &count), "***** VarnekPGL_ReceiveMessage: message or count is NULL"},
+        {VarnekPGL_PeekMessage(&message, nullptr), "***** VarnekPGL_PeekMessage: message or count is NULL"},
     };
     const auto errors = TakeErrors();
     for (const auto &row : rows) {
@@ -299,8 +282,7 @@ TEST_F(MessageQueue, ARemovalWakesTheWaiterAndNothingIsDestroyedUnderIt) {
         worker.Wait();
         TakeLog();
         VarnekPGL_DeleteThread(next);
-        EXPECT_THAT(TakeErrors(),
-                    ElementsAre("***** VarnekPGL_DeleteThread : MsgQ is not empty!!size = [1]"));
+        EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_DeleteThread : MsgQ is not empty!!size = [1]"));
     }
 }
 

@@ -45,11 +45,10 @@ TEST_F(Timer, HandlesAreSlotsAndNamesAreUnique) {
     EXPECT_EQ(VarnekPGL_CreateTimer((k40 + "n").c_str()), -1);
     EXPECT_EQ(VarnekPGL_CreateTimer(nullptr), -1);
     EXPECT_EQ(VarnekPGL_GetTimerByName(nullptr), -1);
-    EXPECT_THAT(TakeErrors(),
-                ElementsAre("VarnekPGL_CreateTimer. Duplicated Timer!! timer name = [" + k40 + "]!",
-                            "VarnekPGL_CreateTimer. Invalid Timer Name=[" + k40 + "n]",
-                            "VarnekPGL_CreateTimer. Invalid Timer Name=[(null)]",
-                            "VarnekPGL_GetTimerByName: Timer Name is NULL!"));
+    EXPECT_THAT(TakeErrors(), ElementsAre("VarnekPGL_CreateTimer. Duplicated Timer!! timer name = [" + k40 + "]!",
+                                          "VarnekPGL_CreateTimer. Invalid Timer Name=[" + k40 + "n]",
+                                          "VarnekPGL_CreateTimer. Invalid Timer Name=[(null)]",
+                                          "VarnekPGL_GetTimerByName: Timer Name is NULL!"));
     EXPECT_TRUE(VarnekPGL_IsTimerActive(0)) << "the duplicate left it alone";
     EXPECT_TRUE(VarnekPGL_DeleteTimer(0));
     EXPECT_EQ(VarnekPGL_CreateTimer("again"), 0);
@@ -73,12 +72,10 @@ TEST_F(Timer, BadHandlesAndArgumentsHaveTheirLine) {
         EXPECT_FALSE(VarnekPGL_CancelTimer(handle));
         EXPECT_FALSE(VarnekPGL_DeleteTimer(handle));
         EXPECT_FALSE(VarnekPGL_IsTimerActive(handle));
-        EXPECT_THAT(
-            TakeErrors(),
-            ElementsAre("VarnekPGL_StartTimer. Invalid Timer Handle=[" + shown + "]!",
-                        "VarnekPGL_CancelTimer. Invalid Timer Handle=[" + shown + "]..name = ",
-                        "VarnekPGL_DeleteTimer. Invalid Timer Handle=[" + shown + "]!",
-                        "VarnekPGL_IsTimerActive. Invalid Timer Handle=[" + shown + "]!"));
+        EXPECT_THAT(TakeErrors(), ElementsAre("VarnekPGL_StartTimer. Invalid Timer Handle=[" + shown + "]!",
+                                              "VarnekPGL_CancelTimer. Invalid Timer Handle=[" + shown + "]..name = ",
+                                              "VarnekPGL_DeleteTimer. Invalid Timer Handle=[" + shown + "]!",
+                                              "VarnekPGL_IsTimerActive. Invalid Timer Handle=[" + shown + "]!"));
     }
     EXPECT_FALSE(VarnekPGL_StartTimer(0, 0, CountExpiry, &expiries));
     EXPECT_FALSE(VarnekPGL_StartTimer(0, 1, nullptr, &expiries));
@@ -86,8 +83,7 @@ TEST_F(Timer, BadHandlesAndArgumentsHaveTheirLine) {
     EXPECT_FALSE(VarnekPGL_IsTimerActive(static_cast<uint32_t>(timer)));
     EXPECT_THAT(
         TakeErrors(),
-        ElementsAre("VarnekPGL_StartTimer. timeout is less than 0=[0]",
-                    "VarnekPGL_StartTimer. No timer callback!",
+        ElementsAre("VarnekPGL_StartTimer. timeout is less than 0=[0]", "VarnekPGL_StartTimer. No timer callback!",
                     "VarnekPGL_CancelTimer. Timer(never started) hasn't been started! timer=[0]!"));
 }
 
@@ -111,8 +107,7 @@ TEST_F(Timer, ExpiresOnceOnAnotherThreadAndStartsAgain) {
     EXPECT_NE(expiries.thread, static_cast<pid_t>(syscall(SYS_gettid)));
     TakeLog();
     EXPECT_TRUE(VarnekPGL_CancelTimer(timer)) << "an expired timer is disarmed already";
-    EXPECT_THAT(TakeErrors(),
-                ElementsAre("VarnekPGL_CancelTimer. This timer(timer) is disarmed currently"));
+    EXPECT_THAT(TakeErrors(), ElementsAre("VarnekPGL_CancelTimer. This timer(timer) is disarmed currently"));
     EXPECT_TRUE(VarnekPGL_DeleteTimer(timer));
     std::this_thread::sleep_for(std::chrono::milliseconds(100));
     EXPECT_EQ(expiries.count, 2);
@@ -135,8 +130,7 @@ TEST_F(Timer, ACallbackMayUseItsOwnTimer) {
     VarnekPGL_CreateTimer("timer");
     const TimerCallbackFunc again = [](uint32_t timer, void *userData) {
         if (++rounds < 3) {
-            EXPECT_TRUE(VarnekPGL_StartTimer(
-                timer, 1, reinterpret_cast<TimerCallbackFunc>(userData), userData));
+            EXPECT_TRUE(VarnekPGL_StartTimer(timer, 1, reinterpret_cast<TimerCallbackFunc>(userData), userData));
             return;
         }
         EXPECT_TRUE(VarnekPGL_CancelTimer(timer));

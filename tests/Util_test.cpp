@@ -40,8 +40,7 @@ TEST_F(Util, CrcIsTheDefinitionAtEveryLengthAndAlignment) {
         for (size_t offset = 0; offset < 16; ++offset) {
             const auto bytes = Random(offset + length);
             const unsigned char *data = bytes.data() + offset;
-            ASSERT_EQ(VarnekUtil_MakeCRC32(data, static_cast<int32_t>(length)),
-                      CrcByBits(data, length))
+            ASSERT_EQ(VarnekUtil_MakeCRC32(data, static_cast<int32_t>(length)), CrcByBits(data, length))
                 << length << " bytes at " << offset;
             ASSERT_THAT(TakeBodies("Varnek"), SizeIs(length < 4 ? 1 : 0));
         }
@@ -71,8 +70,7 @@ TEST_F(Util, AFlippedBitInvalidatesASection) {
             auto broken = section;
             broken[bit / 8] = static_cast<unsigned char>(broken[bit / 8] ^ 0x80 >> bit % 8);
             EXPECT_EQ(VarnekUtil_CheckSectionCRC32(broken.data()), FALSE) << bit;
-            EXPECT_THAT(TakeBodies(),
-                        ElementsAre(StartsWith("CRC32 Invalid! calculated crc32=[0x")));
+            EXPECT_THAT(TakeBodies(), ElementsAre(StartsWith("CRC32 Invalid! calculated crc32=[0x")));
         }
     }
 }
@@ -85,8 +83,7 @@ TEST_F(Util, AFileCarriesItsCrc) {
     EXPECT_EQ(ReadAll(path), "1234\xa6\x95\xc4\xaa");
     EXPECT_THAT(TakeBodies(),
                 ElementsAre("Append CRC Value, File=[" + path + "], CRC32=[0xa695c4aa]\n",
-                            "Check CRC Value, File=[" + path +
-                                "], Calulated=[0xa695c4aa], Included=[0xa695c4aa]\n"));
+                            "Check CRC Value, File=[" + path + "], Calulated=[0xa695c4aa], Included=[0xa695c4aa]\n"));
     EXPECT_EQ(VarnekUtil_AppendCRC32ToFile(path.c_str()), TRUE);
     EXPECT_EQ(VarnekUtil_CheckFileCRC32(path.c_str()), TRUE);
     EXPECT_EQ(ReadAll(path).substr(8), std::string(4, '\0'));
@@ -95,22 +92,18 @@ TEST_F(Util, AFileCarriesItsCrc) {
 }
 
 TEST_F(Util, FilesThatCannotCarryACrcAreRefused) {
-    const auto said = [](BOOL result) {
-        return std::to_string(result) + "|" + TakeLog().back().Body();
-    };
+    const auto said = [](BOOL result) { return std::to_string(result) + "|" + TakeLog().back().Body(); };
     const auto invalid = [](const std::string &operation, const std::string &path, int size) {
-        return "0|VarnekUtil_" + operation + ": Invalid File! file path=[" + path +
-               "], fileSize=[" + std::to_string(size) + "]\n";
+        return "0|VarnekUtil_" + operation + ": Invalid File! file path=[" + path + "], fileSize=[" +
+               std::to_string(size) + "]\n";
     };
     const std::string path = Path("file");
     EXPECT_EQ(said(VarnekUtil_CheckFileCRC32(path.c_str())), invalid("CheckFileCRC32", path, 0));
-    EXPECT_EQ(said(VarnekUtil_AppendCRC32ToFile(nullptr)),
-              invalid("AppendCRC32ToFile", "(null)", 0));
+    EXPECT_EQ(said(VarnekUtil_AppendCRC32ToFile(nullptr)), invalid("AppendCRC32ToFile", "(null)", 0));
     WriteAll(path, "1234567");
     EXPECT_EQ(said(VarnekUtil_CheckFileCRC32(path.c_str())), invalid("CheckFileCRC32", path, 7));
     WriteAll(path, "123");
-    EXPECT_EQ(said(VarnekUtil_AppendCRC32ToFile(path.c_str())),
-              invalid("AppendCRC32ToFile", path, 3));
+    EXPECT_EQ(said(VarnekUtil_AppendCRC32ToFile(path.c_str())), invalid("AppendCRC32ToFile", path, 3));
     EXPECT_EQ(ReadAll(path), "123");
     // A file of the kernel that promises a page and holds a line.
     const char *line = "/sys/devices/system/cpu/online";

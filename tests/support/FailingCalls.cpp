@@ -36,8 +36,7 @@ struct Call {
         return __real_##name(__VA_ARGS__);           \
     }
 #define WRAP_POSIX(name, parameters, ...) WRAP(int, -1, name, parameters, __VA_ARGS__)
-#define WRAP_PTHREAD(name, parameters, ...) \
-    WRAP(int, gCall_##name.error, name, parameters, __VA_ARGS__)
+#define WRAP_PTHREAD(name, parameters, ...) WRAP(int, gCall_##name.error, name, parameters, __VA_ARGS__)
 
 WRAP(void *, nullptr, malloc, (size_t size), size)
 WRAP_POSIX(sem_init, (sem_t * s, int shared, unsigned value), s, shared, value)
@@ -48,15 +47,12 @@ WRAP_POSIX(sem_wait, (sem_t * s), s)
 WRAP_POSIX(sem_timedwait, (sem_t * s, const timespec *time), s, time)
 WRAP_POSIX(clock_gettime, (clockid_t clock, timespec *time), clock, time)
 WRAP_POSIX(timer_create, (clockid_t clock, sigevent *event, timer_t *id), clock, event, id)
-WRAP_POSIX(timer_settime, (timer_t id, int flags, const itimerspec *now, itimerspec *old), id,
-           flags, now, old)
+WRAP_POSIX(timer_settime, (timer_t id, int flags, const itimerspec *now, itimerspec *old), id, flags, now, old)
 WRAP_POSIX(timer_gettime, (timer_t id, itimerspec *left), id, left)
 WRAP_POSIX(timer_delete, (timer_t id), id)
-WRAP_PTHREAD(pthread_create,
-             (pthread_t * id, const pthread_attr_t *attributes, void *(*run)(void *), void *arg),
-             id, attributes, run, arg)
-WRAP_PTHREAD(pthread_mutex_init, (pthread_mutex_t * mutex, const pthread_mutexattr_t *attributes),
-             mutex, attributes)
+WRAP_PTHREAD(pthread_create, (pthread_t * id, const pthread_attr_t *attributes, void *(*run)(void *), void *arg), id,
+             attributes, run, arg)
+WRAP_PTHREAD(pthread_mutex_init, (pthread_mutex_t * mutex, const pthread_mutexattr_t *attributes), mutex, attributes)
 WRAP_PTHREAD(pthread_mutex_lock, (pthread_mutex_t * mutex), mutex)
 WRAP_PTHREAD(pthread_mutex_unlock, (pthread_mutex_t * mutex), mutex)
 WRAP_PTHREAD(pthread_mutex_destroy, (pthread_mutex_t * mutex), mutex)

@@ -40,9 +40,7 @@ struct Timer {
     }
 };
 
-Timer *Of(timer_t id) {
-    return static_cast<Timer *>(id);
-}
+Timer *Of(timer_t id) { return static_cast<Timer *>(id); }
 
 }  // namespace
 
@@ -61,8 +59,7 @@ int timer_create(clockid_t, sigevent *event, timer_t *id) {
 
 int timer_settime(timer_t id, int, const itimerspec *time, itimerspec *) {
     const std::lock_guard<std::mutex> guard(Of(id)->lock);
-    const auto span = std::chrono::seconds(time->it_value.tv_sec) +
-                      std::chrono::nanoseconds(time->it_value.tv_nsec);
+    const auto span = std::chrono::seconds(time->it_value.tv_sec) + std::chrono::nanoseconds(time->it_value.tv_nsec);
     Of(id)->armed = span.count() > 0;
     Of(id)->due = Clock::now() + span;
     Of(id)->changed.notify_one();

@@ -37,8 +37,7 @@ void PutDefaultConfig() {
 }  // namespace
 
 // Takes the place of the platform's log function for the whole process.
-extern "C" __attribute__((visibility("default"))) int __android_log_write(int priority,
-                                                                          const char *tag,
+extern "C" __attribute__((visibility("default"))) int __android_log_write(int priority, const char *tag,
                                                                           const char *text) {
     LogLine line{priority, tag, text, static_cast<pid_t>(syscall(SYS_gettid))};
     if (gLogHook != nullptr) {
@@ -81,14 +80,21 @@ std::vector<std::string> TakeErrors() {
     return bodies;
 }
 
+void ExpectRows(const std::vector<Row> &rows) {
+    std::vector<std::string> expected;
+    for (const Row &row : rows) {
+        EXPECT_EQ(row.result, row.expected) << ::testing::PrintToString(row.lines);
+        expected.insert(expected.end(), row.lines.begin(), row.lines.end());
+    }
+    EXPECT_EQ(TakeErrors(), expected);
+}
+
 std::string ReadAll(const std::string &path) {
     std::ifstream file(path, std::ios::binary);
     return {std::istreambuf_iterator<char>(file), {}};
 }
 
-void WriteAll(const std::string &path, const std::string &content) {
-    std::ofstream(path, std::ios::binary) << content;
-}
+void WriteAll(const std::string &path, const std::string &content) { std::ofstream(path, std::ios::binary) << content; }
 
 void VarnekTest::SetUp() {
     PutDefaultConfig();

@@ -34,6 +34,17 @@ std::vector<std::string> TakeBodies(const std::string &tag = "");
 // The bodies of the Error traces and storage failures since the last call.
 std::vector<std::string> TakeErrors();
 
+// A row of a failure table: what a call returned, what it has to return, and the Error lines that it has
+// to leave.
+struct Row {
+    int64_t result;
+    int64_t expected;
+    std::vector<std::string> lines;
+};
+
+// Holds rows, whose calls were made in their order, against the log.
+void ExpectRows(const std::vector<Row> &rows);
+
 // Called for each line before it is captured, without a lock; null for none.
 extern void (*gLogHook)(const LogLine &line);
 
