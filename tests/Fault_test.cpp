@@ -1,9 +1,13 @@
 // Failing calls of the C library: result, line, and that everything is as before.
 #include <cerrno>
+#include <filesystem>
 #include <functional>
 #include <future>
 
 #include "Varnek_CBitInputStream.h"
+#include "Varnek_CRingBuffer.h"
+#include "Varnek_CString.h"
+#include "Varnek_Config.h"
 #include "Varnek_List.h"
 #include "Varnek_LngPack.h"
 #include "Varnek_Semaphore.h"
@@ -274,6 +278,62 @@ TEST_F(Fault, ABitStreamWithoutMemoryIsAtItsEnd) {
         stream->RwindToFirst();
         EXPECT_EQ(stream->GetByteArray(&byte, 1), -22);
     }
+}
+
+TEST_F(Fault, ARingWithoutMemoryHasNoStorage) {
+    VarnekCRingBuffer whole(4);
+    FailCall("malloc", 1, ENOMEM);
+    VarnekCRingBuffer failed(4);
+    FailCall("malloc", 1, ENOMEM);
+    VarnekCRingBuffer copy(whole);
+    FailCall("malloc", 1, ENOMEM);
+    EXPECT_EQ(whole.Reset(5), -8);
+    const std::string line = "Ring Buffer: Out of memory! size=[";
+    EXPECT_THAT(TakeErrors(), ElementsAreArray({line + "4]\n", line + "4]\n", line + "5]\n"}));
+    for (VarnekCRingBuffer *ring : {&whole, &failed, &copy}) {
+        const unsigned char byte = 1;
+        EXPECT_EQ(ring->Write(&byte, 1), -8);
+        EXPECT_EQ(ring->GetSpaceReading() + ring->GetSpaceWriting() + ring->GetDistance(), 0);
+        EXPECT_EQ(ring->Reset(4) + ring->Write(&byte, 1), 0);
+    }
+}
+
+TEST_F(Fault, AStringWithoutMemoryIsNullOrUnchanged) {
+    const VarnekCString empty(""), text("text");
+    VarnekCString target("a"), kept("text");
+    const std::function<void()> operations[] = {
+        [&] { EXPECT_EQ(text.String(), nullptr); },         [&] { target = text; }, [&] { target = "text"; },
+        [&] { EXPECT_EQ(VarnekCString(text) == text, 0); }, [&] { kept += text; },  [&] { kept += "text"; },
+    };
+    for (const auto &operation : operations) {
+        target = "a";
+        FailCall("operator new[]", 1, ENOMEM);
+        operation();
+        EXPECT_EQ(TakeErrors()[0].find("String: Out of memory! length=["), 0u);
+    }
+    EXPECT_TRUE(kept == text);
+    FailCall("operator new[]", 1, ENOMEM);
+    target = text;
+    EXPECT_EQ(target == empty, 0);
+    target += "text";
+    EXPECT_TRUE(target == text);
+}
+
+class FaultAlone : public Fault {};
+
+TEST_F(FaultAlone, SettingsStayWhenAFileCannotBeRead) {
+    const std::string path = VARNEK_DATA_DIR "Varnek_Config.cfg";
+    std::error_code ignored;
+    std::filesystem::rename(path, path + ".aside", ignored);
+    WriteAll(path, "CONFIG_STANDARDTYPE=5");
+    FailCall("malloc", 1, ENOMEM);
+    VarnekCfg_LoadConfigFile();
+    EXPECT_EQ(TakeBodies().back(), "  VarnekCfg_LoadConfigFile : Out of memory!");
+    EXPECT_EQ(VarnekCfg_GetConfigInfo()->cprmPlayerDelay, 68);
+    VarnekCfg_LoadConfigFile();
+    EXPECT_EQ(VarnekCfg_GetStandard(), 5);
+    std::filesystem::remove(path);
+    std::filesystem::rename(path + ".aside", path, ignored);
 }
 
 TEST_F(Fault, BlocksThatCannotBeAllocated) {

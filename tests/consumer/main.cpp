@@ -8,8 +8,7 @@
 int main() {
     const unsigned char text[] = "123456789";
     const uint32_t crc = VarnekUtil_MakeCRC32(text, 9);
-    unsigned char bytes[] = {static_cast<unsigned char>(crc >> 24),
-                             static_cast<unsigned char>(crc >> 16),
+    unsigned char bytes[] = {static_cast<unsigned char>(crc >> 24), static_cast<unsigned char>(crc >> 16),
                              static_cast<unsigned char>(crc >> 8), static_cast<unsigned char>(crc)};
     VarnekCBitInputStream bits(bytes, sizeof bytes, 0);
     unsigned char success = 1;

@@ -4,12 +4,14 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <mutex>
 
 void (*gLogHook)(const LogLine &line) = nullptr;
+const char *gFeature = "";
 
 namespace {
 
@@ -46,6 +48,13 @@ extern "C" __attribute__((visibility("default"))) int __android_log_write(int pr
     const std::lock_guard<std::mutex> guard(gLogLock);
     gLog.push_back(std::move(line));
     return 1;
+}
+
+// And that of the platform's feature store.
+extern "C" __attribute__((visibility("default"))) const char *VellNativeFeature_getStringWithDefault(
+    const char *key, const char *defaultValue) {
+    return strcmp(key, "TarnFeature_MobileTV_EnableServiceAs") == 0 && *defaultValue == '\0' ? gFeature
+                                                                                             : "not asked for";
 }
 
 std::string LogLine::Body() const {

@@ -48,6 +48,9 @@ void ExpectRows(const std::vector<Row> &rows);
 // Called for each line before it is captured, without a lock; null for none.
 extern void (*gLogHook)(const LogLine &line);
 
+// What the platform's feature store gives for the nation.
+extern const char *gFeature;
+
 std::string ReadAll(const std::string &path);
 void WriteAll(const std::string &path, const std::string &content);
 

@@ -1,0 +1,71 @@
+// A byte ring between one writing and one reading side, guarded by a named mutex of its own.
+#ifndef VARNEK_CRINGBUFFER_H
+#define VARNEK_CRINGBUFFER_H
+
+#include "Varnek_Common.h"
+
+#ifdef __cplusplus
+
+// Writes and reads take all of their bytes or none, and never wait. Besides its position, each side
+// has a loop count, the laps that it has done; together they tell a full ring from an empty one,
+// and a ring in disorder from both. With W, R the positions and WL, RL the loop counts:
+//
+//   state                    condition                        readable       writable
+//   same lap                 WL = RL, R <= W                  W - R          size - (W - R)
+//   writer one lap ahead     WL = RL + 1, W <= R              W - R + size   R - W
+//   underflow                WL = RL, W < R; RL > WL          none           none
+//   overflow                 WL = RL + 1, W > R; WL > RL + 1  none           none
+//
+// A ring whose size is invalid or whose storage cannot be allocated has size 0 and refuses
+// everything. Each refusal is traced.
+//
+// Threads: every operation from Reset to Read is atomic towards the others, in a ring that has its
+// mutex; construction, destruction and assignment (of either ring) are not guarded. A copy has no
+// mutex and is for one thread.
+class VARNEK_API VarnekCRingBuffer {
+  public:
+    // An empty ring of `size` bytes. Without a mutex (the pool of them is full) it works unguarded.
+    explicit VarnekCRingBuffer(int size);
+    // Takes state and bytes, not the mutex: the target keeps what it has.
+    VarnekCRingBuffer(const VarnekCRingBuffer &other);
+    VarnekCRingBuffer &operator=(const VarnekCRingBuffer &other);
+    ~VarnekCRingBuffer();
+
+    // Empties the ring, and gives it a new storage when the size is another one. Returns 0; -8 for
+    // a size below 1, which changes nothing, and when there is no memory.
+    int Reset(int size);
+    // Empties the ring. Returns 0.
+    int Flush();
+
+    // Moves the reader to an index (origin 0), on by `aOffset` bytes (1), or to the last `aOffset`
+    // bytes written (2), whatever the storage holds there. Returns 0; -10 for a negative offset and
+    // for one beyond the size or, with origin 1, beyond the readable bytes; -8 for another origin.
+    int Seek(int aOffset, int origin);
+
+    // The bytes that can be read and written now; -32 in an overflow and -34 in an underflow state.
+    int GetSpaceReading() const;
+    int GetSpaceWriting() const;
+    // The readable bytes in per cent of the size; in an abnormal state beyond 0 to 100.
+    int GetDistance() const;
+
+    // Copies `writelen` bytes in or `readLen` bytes out. Returns 0. A length below 0 or above the
+    // size, or a null pointer (after a panic report), is -8. Too little space is -10 and too few
+    // bytes -11; so is reading 0 bytes from an empty ring. A ring that is found in an abnormal
+    // state is emptied: -10 for an overflow, -11 for an underflow; only a write that finds W < R in
+    // one lap leaves it as it is.
+    int Write(const unsigned char *data, int writelen);
+    int Read(unsigned char *dest, int readLen);
+
+  private:
+    unsigned char *pRingBuf = nullptr;
+    int iRingSize = 0;
+    int iWritePos = 0;
+    int iReadPos = 0;
+    int iWriteLoopCnt = 0;
+    int iReadLoopCnt = 0;
+    int32_t hRingMutex = -1;
+};
+
+#endif
+
+#endif

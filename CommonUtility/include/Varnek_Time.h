@@ -1,0 +1,97 @@
+// Wall-clock time, and the calendar from 1970 to 2030.
+//
+// Seconds count from 1970-01-01 00:00:00. Calendar records carry no time zone: the conversions take
+// them as UTC. Nothing keeps state; any thread may call anything.
+#ifndef VARNEK_TIME_H
+#define VARNEK_TIME_H
+
+#include "Varnek_Common.h"
+
+// A date with a time of day, or a span of time.
+//
+//   iYear            the record is
+//   1970 and more    a point in time
+//   0 to 99          a span: years, months and days that passed, then hours, minutes, seconds
+//   anything else    invalid; counts as 0 seconds
+//
+// The results of the arithmetic are points: 90 seconds are 1970-01-01 00:01:30, which count as 90
+// seconds again. Comparisons look at the fields alone, from the year down.
+typedef struct VarnekCDateTime VarnekCDateTime;
+#ifdef __cplusplus
+struct VARNEK_API VarnekCDateTime
+#else
+struct VarnekCDateTime
+#endif
+{
+    int32_t iYear;    // in full, such as 2015
+    int32_t iMonth;   // 1 to 12
+    int32_t iDay;     // 1 to 31
+    int32_t iHour;    // 0 to 23
+    int32_t iMinute;  // 0 to 59
+    int32_t iSecond;  // 0 to 59
+
+#ifdef __cplusplus
+    // The seconds of this point or span. In a span, days that fill its month number carry into the
+    // next month, and 12 months into the next year; an invalid year is traced.
+    uint32_t GetElapsedSeconds() const;
+
+    // Adds or subtracts seconds, modulo 2^32. Subtracting more than there is is traced and changes
+    // nothing.
+    VarnekCDateTime &operator+=(const VarnekCDateTime &other);
+    VarnekCDateTime &operator-=(const VarnekCDateTime &other);
+    VarnekCDateTime operator+(const VarnekCDateTime &other) const;
+
+    BOOL operator==(const VarnekCDateTime &other) const;
+    BOOL operator>(const VarnekCDateTime &other) const;
+    BOOL operator>=(const VarnekCDateTime &other) const;
+    BOOL operator<(const VarnekCDateTime &other) const;
+    BOOL operator<=(const VarnekCDateTime &other) const;
+#endif
+};
+
+typedef struct PglMilliTime {
+    int32_t sec;   // since 1970
+    int32_t msec;  // 0 to 999
+} PglMilliTime;
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+//   returns  the current time in seconds
+VARNEK_API int32_t VarnekPGL_GetTime(void);
+
+// Reads the clock to the millisecond. From 2031 on it shows that time of day on the last day of
+// 2030, with 0 milliseconds.
+//   returns  TRUE; FALSE when the clock cannot be read, and for null after a panic report
+VARNEK_API BOOL VarnekPGL_GetMilliseconds(PglMilliTime *out);
+
+// Fills the record with the current time in UTC.
+//   returns  TRUE; FALSE for null after a panic report
+VARNEK_API BOOL VarnekPGL_GetSystemTime(VarnekCDateTime *dt);
+
+//   returns  local time minus UTC in seconds; 0, after a trace, when local time is not known
+VARNEK_API int32_t VarnekPGL_GetTimezoneOffset(void);
+
+// Day, hour, minute and second may be out of their range and simply add on.
+//   returns  the seconds; 0 for null, a year outside 1970 to 2030 and a month outside 1 to 12
+VARNEK_API uint32_t VarnekPGL_DateTimeToSeconds(const VarnekCDateTime *dt);
+
+//   returns  TRUE; FALSE for null after a panic report
+VARNEK_API BOOL VarnekPGL_SecondsToDataTime(uint32_t seconds, VarnekCDateTime *dt);
+
+//   returns  TRUE for day 1 to 31, month 1 to 12 and a year from 1970 on, whatever the month's
+//            length; FALSE for null
+VARNEK_API BOOL __VarnekPGL_ValidateDate(const VarnekCDateTime *dt);
+
+// Adds two records as seconds. A date that is not valid becomes 1970-01-01 in the caller's record,
+// which makes its time of day a span. `result` may be one of the two.
+//   returns  TRUE; FALSE for a null pointer after a panic report
+VARNEK_API BOOL VarnekPGL_AddDateTime(VarnekCDateTime *a, VarnekCDateTime *b,
+                                      VarnekCDateTime *result);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

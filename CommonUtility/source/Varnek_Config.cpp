@@ -1,0 +1,289 @@
+// The configuration record and its file. One table of keys, in the order of the fields, serves the
+// search, the loading and the saving.
+#include "Varnek_Config.h"
+
+#include <errno.h>
+#include <stddef.h>
+#include <stdio.h>
+#include <stdlib.h>
+#include <string.h>
+
+#include "Varnek_File.h"
+#include "Varnek_StrUtil.h"
+#include "Varnek_Trace.h"
+
+#define CTRL_HIGH(...) VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
+#define CTRL_MID(...) VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
+
+// The platform's feature store. Null or the default when there is no such feature.
+extern "C" const char *VellNativeFeature_getStringWithDefault(const char *key,
+                                                              const char *defaultValue);
+
+static_assert(sizeof(VarnekConfigInfo) == 212, "callers and library agree on this record");
+static_assert(offsetof(VarnekConfigInfo, standardType) == 100,
+              "callers and library agree on this record");
+static_assert(offsetof(VarnekConfigInfo, tsFileSimulEnable) == 105,
+              "callers and library agree on this record");
+static_assert(offsetof(VarnekConfigInfo, cprmPlayerDelay) == 108,
+              "callers and library agree on this record");
+static_assert(offsetof(VarnekConfigInfo, supportNation) == 112,
+              "callers and library agree on this record");
+
+namespace {
+
+constexpr size_t kLineSize = 255;  // of a line that is read, with its terminator
+constexpr size_t kFileSize = 900;  // of what is written, with a terminator
+
+constexpr char kConfigPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
+static_assert(sizeof kConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
+
+enum ConfigField {
+    AREA_NAME,
+    STANDARD_TYPE,
+    TS_CAPTURE,
+    TS_FILE_SIMUL,
+    PLAYER_DELAY,
+    NATION,
+    CONFIG_FIELD_COUNT
+};
+
+// The first key that is found in a line decides the line.
+constexpr const char *kKeys[CONFIG_FIELD_COUNT] = {
+    "CONFIG_CURRENTAREANAME=", "CONFIG_STANDARDTYPE=",     "CONFIG_TSCAPTURE=",
+    "CONFIG_TSFILESIMUL=",     "CONFIG_CPRMPLAYER_DELAY=", "CONFIG_SUPPORT_NATION=",
+};
+
+constexpr char kFeatureKey[] = "TarnFeature_MobileTV_EnableServiceAs";
+constexpr char kNationTag[] = "NATION:";
+constexpr size_t kNationLength = 3;
+constexpr char kDefaultNation[] = "BRA";
+constexpr char kNationWithBml[] = "PHL";
+
+VarnekConfigInfo gpVarnekConfigInfo = {"", 2, 0, 0, 68, ""};
+
+bool IsLineEnd(char c) {
+    return c == '\r' || c == '\n';
+}
+
+// Copies what fits.
+template <size_t size>
+void CopyText(char (&to)[size], const char *from, size_t length) {
+    const size_t count = length < size ? length : size - 1;
+    memcpy(to, from, count);
+    to[count] = '\0';
+}
+
+// As atoi; a number that does not fit becomes the nearest that does.
+int32_t NumberOf(const char *text) {
+    const int saved = errno;
+    const long long number = strtoll(text, nullptr, 10);
+    errno = saved;
+    return static_cast<int32_t>(number > INT32_MAX   ? INT32_MAX
+                                : number < INT32_MIN ? INT32_MIN
+                                                     : number);
+}
+
+template <size_t size>
+void StoreText(char (&field)[size], const char *key, const char *value) {
+    CopyText(field, value, strlen(value));
+    CTRL_HIGH("%s[%s]", key, field);
+}
+
+int32_t StoredNumber(const char *key, const char *value) {
+    const int32_t number = NumberOf(value);
+    CTRL_HIGH("%s[%d]", key, number);
+    return number;
+}
+
+void StoreValue(int field, const char *value) {
+    const char *key = kKeys[field];
+    switch (field) {
+        case AREA_NAME:
+            StoreText(gpVarnekConfigInfo.currentAreaName, key, value);
+            break;
+        case STANDARD_TYPE:
+            gpVarnekConfigInfo.standardType = StoredNumber(key, value);
+            break;
+        case TS_CAPTURE:
+            gpVarnekConfigInfo.tsCaptureEnable = static_cast<uint8_t>(StoredNumber(key, value));
+            break;
+        case TS_FILE_SIMUL:
+            gpVarnekConfigInfo.tsFileSimulEnable = static_cast<uint8_t>(StoredNumber(key, value));
+            break;
+        case PLAYER_DELAY:
+            gpVarnekConfigInfo.cprmPlayerDelay = StoredNumber(key, value);
+            break;
+        default:
+            StoreText(gpVarnekConfigInfo.supportNation, key, value);
+            break;
+    }
+}
+
+void ReadLine(const char *line) {
+    CTRL_HIGH("  __VarnekCfg_GetKeyWord : called!");
+    for (int field = 0; field < CONFIG_FIELD_COUNT; ++field) {
+        const char *found = VarnekPGL_Stristr(line, kKeys[field]);
+        if (found != nullptr) {
+            StoreValue(field, found + strlen(kKeys[field]));
+            return;
+        }
+    }
+    CTRL_HIGH(" ERROR :unknown line(%s)", line);
+}
+
+void ReadText(const char *text) {
+    for (;;) {
+        while (IsLineEnd(*text)) {
+            ++text;
+        }
+        if (*text == '\0') {
+            return;
+        }
+        const size_t length = strcspn(text, "\r\n");
+        char line[kLineSize];
+        CopyText(line, text, length);
+        ReadLine(line);
+        text += length;
+    }
+}
+
+// The whole file. A caller may have filled a text field to its last byte.
+void FormatFile(char (&text)[kFileSize]) {
+    const VarnekConfigInfo &info = gpVarnekConfigInfo;
+    snprintf(text, sizeof text, "%s%.99s\n%s%d\n%s%d\n%s%d\n%s%d\n%s%.99s\n", kKeys[AREA_NAME],
+             info.currentAreaName, kKeys[STANDARD_TYPE], info.standardType, kKeys[TS_CAPTURE],
+             info.tsCaptureEnable, kKeys[TS_FILE_SIMUL], info.tsFileSimulEnable,
+             kKeys[PLAYER_DELAY], info.cprmPlayerDelay, kKeys[NATION], info.supportNation);
+}
+
+void LoadUnlessLoaded() {
+    if (gpVarnekConfigInfo.standardType == 0) {
+        VarnekCfg_LoadConfigFile();
+    }
+}
+
+}  // namespace
+
+VarnekConfigInfo *VarnekCfg_GetConfigInfo() {
+    return &gpVarnekConfigInfo;
+}
+
+void VarnekCfg_LoadConfigFile() {
+    CTRL_HIGH("  VarnekCfg_LoadConfigFile : called!");
+    const PglFileHandle file = VarnekPGL_OpenFile(kConfigPath, PGL_FILE_MODE_READ);
+    if (file == -1) {
+        CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Open Config File!");
+        return;
+    }
+    const VarnekConfigInfo before = gpVarnekConfigInfo;
+    gpVarnekConfigInfo = {};
+    VarnekPGL_SeekFile(file, 0, SEEK_END);
+    const int32_t length = VarnekPGL_TellFile(file);
+    VarnekPGL_SeekFile(file, 0, SEEK_SET);
+    CTRL_HIGH("  VarnekCfg_LoadConfigFile : readlen = %d", length);
+    if (length > 0) {
+        char *text = static_cast<char *>(malloc(static_cast<size_t>(length) + 1));
+        if (text == nullptr) {
+            gpVarnekConfigInfo = before;
+            CTRL_HIGH("  VarnekCfg_LoadConfigFile : Out of memory!");
+            VarnekPGL_CloseFile(file);
+            return;
+        }
+        const uint32_t count =
+            VarnekPGL_ReadFileByHandle(file, text, static_cast<uint32_t>(length));
+        text[count] = '\0';
+        VarnekPGL_CloseFile(file);
+        ReadText(text);
+        free(text);
+    } else {
+        VarnekPGL_CloseFile(file);
+    }
+    CTRL_HIGH(" __VarnekCfg_GetTempBuffer: End of Configuration\n");
+    VarnekCfg_GetSupportNation();
+}
+
+void VarnekCfg_SaveConfigFile() {
+    if (VarnekPGL_CheckDir(VARNEK_DATA_DIR) != TRUE) {
+        VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_ESG,
+                     "VarnekCfg_SaveConfigFile: Root_Path(%s) is not Exist\n", VARNEK_DATA_DIR);
+        return;
+    }
+    // Opening empties the file, so everything is ready before.
+    char text[kFileSize];
+    FormatFile(text);
+    const PglFileHandle file =
+        VarnekPGL_OpenFile(kConfigPath, PGL_FILE_MODE_CREATE_RW | PGL_FILE_MODE_WRITE);
+    if (file == -1) {
+        CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_OpenFile() fail.!");
+        return;
+    }
+    const uint32_t length = static_cast<uint32_t>(strlen(text));
+    const uint32_t written = VarnekPGL_WriteFileByHandle(file, text, length);
+    // A full disk may show only here.
+    if (VarnekPGL_CloseFile(file) != 0 || written != length) {
+        CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_WriteFileByHandle() fail.!");
+    }
+}
+
+void VarnekCfg_SetStandard(int32_t std) {
+    CTRL_MID(" VarnekCfg_SetStandard: aStd is %d\n", std);
+    if (std == gpVarnekConfigInfo.standardType) {
+        return;
+    }
+    gpVarnekConfigInfo.standardType = std;
+    VarnekCfg_SaveConfigFile();
+}
+
+int32_t VarnekCfg_GetStandard() {
+    LoadUnlessLoaded();
+    CTRL_MID(" VarnekCfg_GetStandard: gpVarnekConfigInfo.standardType is %d\n",
+             gpVarnekConfigInfo.standardType);
+    return gpVarnekConfigInfo.standardType;
+}
+
+uint8_t VarnekCfg_GetTSCaptueEnable() {
+    LoadUnlessLoaded();
+    CTRL_MID("VarnekCfg_GetTSCaptueEnable: gpVarnekConfigInfo.tsCaptureEnable=[%d]",
+             gpVarnekConfigInfo.tsCaptureEnable);
+    return gpVarnekConfigInfo.tsCaptureEnable;
+}
+
+uint8_t VarnekCfg_GetTSFileSimulEnable() {
+    LoadUnlessLoaded();
+    return gpVarnekConfigInfo.tsFileSimulEnable;
+}
+
+const char *VarnekCfg_GetSupportNation() {
+    char(&nation)[100] = gpVarnekConfigInfo.supportNation;
+    if (nation[0] != '\0') {
+        return nation;
+    }
+    const char *feature = VellNativeFeature_getStringWithDefault(kFeatureKey, "");
+    if (feature == nullptr) {
+        TRACE_ERROR("%s can't find Nation from TARN feature. so set default nation(BRA)", __func__);
+        CopyText(nation, kDefaultNation, kNationLength);
+        return nation;
+    }
+    const char *tag = strstr(feature, kNationTag);
+    const char *code = tag != nullptr ? tag + strlen(kNationTag) : "";
+    if (strlen(code) < kNationLength) {
+        CopyText(nation, kDefaultNation, kNationLength);
+        TRACE_ERROR("%s can't find Nation TAG in TARN feature. so set default nation(BRA)",
+                    __func__);
+        return nation;
+    }
+    CopyText(nation, code, kNationLength);
+    TRACE_ERROR("%s found nation in TARN = %s", __func__, nation);
+    return nation;
+}
+
+BOOL VarnekCfg_IsSupportBML() {
+    if (strncmp(VarnekCfg_GetSupportNation(), kNationWithBml, kNationLength) == 0) {
+        VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_SESSION_MANAGER, " %s: BML supported",
+                     __func__);
+        return TRUE;
+    }
+    VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_SESSION_MANAGER, " %s: BML not supported",
+                 __func__);
+    return FALSE;
+}

@@ -1,0 +1,266 @@
+// The clock, the calendar and the arithmetic on records. In the supported range every fourth year
+// is a leap year, so the calendar repeats every 1461 days. Seconds are added modulo 2^32
+// throughout.
+#include "Varnek_Time.h"
+
+#include <errno.h>
+#include <stddef.h>
+#include <sys/time.h>
+#include <time.h>
+
+#include "Varnek_Trace.h"
+
+static_assert(sizeof(VarnekCDateTime) == 24, "callers and library agree on this record");
+static_assert(offsetof(VarnekCDateTime, iSecond) == 20, "callers and library agree on this record");
+static_assert(sizeof(PglMilliTime) == 8, "callers and library agree on this record");
+
+namespace {
+
+constexpr int32_t kFirstYear = 1970;
+constexpr int32_t kLastYear = 2030;
+constexpr int32_t kLastSpanYear = 99;
+
+constexpr uint32_t kDay = 86400;
+constexpr uint32_t kYear = 365 * kDay;
+constexpr uint32_t kLeapYear = 366 * kDay;
+constexpr uint32_t kCycle = 3 * kYear + kLeapYear;
+
+constexpr int64_t kEndOfRange = 1924992000;  // 2031-01-01
+constexpr int64_t kLastDay = kEndOfRange - kDay;
+
+// The days before each month, minus one: a day of the month counts from 1.
+constexpr int32_t kCommonMonths[] = {-1, 30, 58, 89, 119, 150, 180, 211, 242, 272, 303, 333, 364};
+constexpr int32_t kLeapMonths[] = {-1, 30, 59, 90, 120, 151, 181, 212, 243, 273, 304, 334, 365};
+
+// Negative, 0 or positive, as the first field that differs tells.
+int Compare(const VarnekCDateTime &a, const VarnekCDateTime &b) {
+    constexpr int32_t VarnekCDateTime::*kFields[] = {
+        &VarnekCDateTime::iYear, &VarnekCDateTime::iMonth,  &VarnekCDateTime::iDay,
+        &VarnekCDateTime::iHour, &VarnekCDateTime::iMinute, &VarnekCDateTime::iSecond,
+    };
+    for (const auto field : kFields) {
+        if (a.*field != b.*field) {
+            return a.*field < b.*field ? -1 : 1;
+        }
+    }
+    return 0;
+}
+
+// Whether `days` whole days fill the month of this number; months 0 and above 12 never fill.
+bool FillsMonth(int32_t month, int32_t days) {
+    switch (month) {
+        case 1:
+        case 3:
+        case 5:
+        case 7:
+        case 8:
+        case 10:
+        case 12:
+            return days >= 31;
+        case 4:
+        case 6:
+        case 9:
+        case 11:
+            return days >= 30;
+        case 2:
+            return days >= 28;
+        default:
+            return false;
+    }
+}
+
+// Gives a record without a valid date the first one there is.
+void RepairDate(VarnekCDateTime *dt) {
+    if (__VarnekPGL_ValidateDate(dt) == TRUE) {
+        return;
+    }
+    dt->iYear = kFirstYear;
+    dt->iMonth = 1;
+    dt->iDay = 1;
+}
+
+}  // namespace
+
+int32_t VarnekPGL_GetTime() {
+    return static_cast<int32_t>(time(nullptr));
+}
+
+BOOL VarnekPGL_GetMilliseconds(PglMilliTime *out) {
+    if (out == nullptr) {
+        VARNEK_PANIC();
+        return FALSE;
+    }
+    timeval now = {};
+    if (gettimeofday(&now, nullptr) != 0) {
+        return FALSE;
+    }
+    int64_t sec = now.tv_sec;
+    int32_t msec = static_cast<int32_t>(now.tv_usec / 1000);
+    if (sec >= kEndOfRange) {
+        sec = kLastDay + (sec - kEndOfRange) % kDay;
+        msec = 0;
+    }
+    out->sec = static_cast<int32_t>(sec);
+    out->msec = msec;
+    return TRUE;
+}
+
+BOOL VarnekPGL_GetSystemTime(VarnekCDateTime *dt) {
+    if (dt == nullptr) {
+        VARNEK_PANIC();
+        return FALSE;
+    }
+    return VarnekPGL_SecondsToDataTime(static_cast<uint32_t>(time(nullptr)), dt);
+}
+
+int32_t VarnekPGL_GetTimezoneOffset() {
+    const time_t now = time(nullptr);
+    tm local = {};
+    if (localtime_r(&now, &local) == nullptr) {
+        return VARNEK_FAIL(0,
+                           "***** VarnekPGL_GetTimezoneOffset : Get Local Time FAIL, errno = [%d]",
+                           VarnekPGL_SysGetLastErro());
+    }
+    const VarnekCDateTime dt = {local.tm_year + 1900, local.tm_mon + 1, local.tm_mday,
+                                local.tm_hour,        local.tm_min,     local.tm_sec};
+    return static_cast<int32_t>(VarnekPGL_DateTimeToSeconds(&dt) - static_cast<uint32_t>(now));
+}
+
+uint32_t VarnekPGL_DateTimeToSeconds(const VarnekCDateTime *dt) {
+    if (dt == nullptr || dt->iYear < kFirstYear || dt->iYear > kLastYear) {
+        return 0;
+    }
+    if (dt->iMonth < 1 || dt->iMonth > 12) {
+        return 0;
+    }
+    int32_t before = dt->iYear * 365 + (dt->iYear - 1901) / 4 + kCommonMonths[dt->iMonth - 1];
+    // In a leap year's later months the leap day has passed.
+    before -= dt->iYear % 4 != 0 || dt->iMonth <= 2 ? 719067 : 719066;
+    const uint32_t days = static_cast<uint32_t>(before) + static_cast<uint32_t>(dt->iDay);
+    return days * kDay + static_cast<uint32_t>(dt->iHour) * 3600 +
+           static_cast<uint32_t>(dt->iMinute) * 60 + static_cast<uint32_t>(dt->iSecond);
+}
+
+BOOL VarnekPGL_SecondsToDataTime(uint32_t seconds, VarnekCDateTime *dt) {
+    if (dt == nullptr) {
+        VARNEK_PANIC();
+        return FALSE;
+    }
+    const uint32_t cycle = seconds / kCycle;
+    uint32_t rest = seconds % kCycle;
+    // The third year of a cycle is its leap year.
+    uint32_t year = 0;
+    const int32_t *months = kCommonMonths;
+    if (rest >= 2 * kYear + kLeapYear) {
+        year = 3;
+        rest -= 2 * kYear + kLeapYear;
+    } else if (rest >= 2 * kYear) {
+        year = 2;
+        rest -= 2 * kYear;
+        months = kLeapMonths;
+    } else if (rest >= kYear) {
+        year = 1;
+        rest -= kYear;
+    }
+    const int32_t day = static_cast<int32_t>(rest / kDay);
+    // No month is longer than 32 days, so the search starts at the right month or just before it.
+    int32_t month = day / 32 + 1;
+    while (months[month] < day) {
+        ++month;
+    }
+    const int32_t second = static_cast<int32_t>(rest % kDay);
+    dt->iYear = kFirstYear + static_cast<int32_t>(4 * cycle + year);
+    dt->iMonth = month;
+    dt->iDay = day - months[month - 1];
+    dt->iHour = second / 3600;
+    dt->iMinute = second % 3600 / 60;
+    dt->iSecond = second % 60;
+    return TRUE;
+}
+
+BOOL __VarnekPGL_ValidateDate(const VarnekCDateTime *dt) {
+    return dt != nullptr && dt->iDay >= 1 && dt->iDay <= 31 && dt->iMonth >= 1 &&
+                   dt->iMonth <= 12 && dt->iYear >= kFirstYear
+               ? TRUE
+               : FALSE;
+}
+
+BOOL VarnekPGL_AddDateTime(VarnekCDateTime *a, VarnekCDateTime *b, VarnekCDateTime *result) {
+    if (a == nullptr || b == nullptr || result == nullptr) {
+        VARNEK_PANIC();
+        return FALSE;
+    }
+    RepairDate(a);
+    RepairDate(b);
+    return VarnekPGL_SecondsToDataTime(
+        VarnekPGL_DateTimeToSeconds(a) + VarnekPGL_DateTimeToSeconds(b), result);
+}
+
+uint32_t VarnekCDateTime::GetElapsedSeconds() const {
+    if (iYear >= kFirstYear) {
+        return VarnekPGL_DateTimeToSeconds(this);
+    }
+    if (iYear < 0 || iYear > kLastSpanYear) {
+        return VARNEK_FAIL(0u, "Invalid Year!! iYear=[%d]\n", iYear);
+    }
+    // The point that lies this span after the epoch: what has passed is one less than the number of
+    // the day and of the month.
+    VarnekCDateTime point = *this;
+    point.iYear = iYear + kFirstYear;
+    int32_t passed = iMonth;
+    if (FillsMonth(iMonth, iDay)) {
+        ++passed;
+        point.iDay = 1;
+    } else {
+        point.iDay = static_cast<int32_t>(static_cast<uint32_t>(iDay) + 1);
+    }
+    if (passed >= 12) {
+        ++point.iYear;
+        point.iMonth = 1;
+    } else {
+        point.iMonth = passed + 1;
+    }
+    return VarnekPGL_DateTimeToSeconds(&point);
+}
+
+VarnekCDateTime &VarnekCDateTime::operator+=(const VarnekCDateTime &other) {
+    VarnekPGL_SecondsToDataTime(GetElapsedSeconds() + other.GetElapsedSeconds(), this);
+    return *this;
+}
+
+VarnekCDateTime &VarnekCDateTime::operator-=(const VarnekCDateTime &other) {
+    const uint32_t a = GetElapsedSeconds();
+    const uint32_t b = other.GetElapsedSeconds();
+    if (a < b) {
+        TRACE_ERROR("Time Information Invalid! This Time=[%u], Arg Time=[%u]\n", a, b);
+        return *this;
+    }
+    VarnekPGL_SecondsToDataTime(a - b, this);
+    return *this;
+}
+
+VarnekCDateTime VarnekCDateTime::operator+(const VarnekCDateTime &other) const {
+    VarnekCDateTime sum;
+    VarnekPGL_SecondsToDataTime(GetElapsedSeconds() + other.GetElapsedSeconds(), &sum);
+    return sum;
+}
+
+BOOL VarnekCDateTime::operator==(const VarnekCDateTime &other) const {
+    return Compare(*this, other) == 0 ? TRUE : FALSE;
+}
+
+BOOL VarnekCDateTime::operator>(const VarnekCDateTime &other) const {
+    return Compare(*this, other) > 0 ? TRUE : FALSE;
+}
+
+BOOL VarnekCDateTime::operator>=(const VarnekCDateTime &other) const {
+    return Compare(*this, other) >= 0 ? TRUE : FALSE;
+}
+
+BOOL VarnekCDateTime::operator<(const VarnekCDateTime &other) const {
+    return Compare(*this, other) < 0 ? TRUE : FALSE;
+}
+
+BOOL VarnekCDateTime::operator<=(const VarnekCDateTime &other) const {
+    return Compare(*this, other) <= 0 ? TRUE : FALSE;
+}

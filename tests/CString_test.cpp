@@ -1,0 +1,100 @@
+// The owning string against an optional std::string, and what it owns.
+#include "Varnek_CString.h"
+
+#include <cstring>
+#include <memory>
+#include <optional>
+#include <random>
+
+#include "support/VarnekTest.h"
+
+namespace {
+
+class String : public VarnekTest {};
+
+using Text = std::optional<std::string>;
+
+Text TextOf(const VarnekCString &string) {
+    const std::unique_ptr<char[]> copy(string.String());
+    return copy != nullptr ? Text(copy.get()) : Text();
+}
+
+char *NewArray(const char *text) { return text != nullptr ? strcpy(new char[strlen(text) + 1], text) : nullptr; }
+
+TEST_F(String, BehavesLikeAnOptionalText) {
+    std::mt19937 random(33);
+    const std::string one = "One of two strings is NULL!\n";
+    const char *const texts[] = {nullptr, "", "a", "ab", "\xFF", "abc"};
+    VarnekCString strings[] = {nullptr, "", "a"};
+    Text models[] = {Text(), "", "a"};
+    for (int step = 0; step < 30000; ++step) {
+        const size_t i = random() % 3, j = random() % 3;
+        const char *const text = texts[random() % 6];
+        const Text old = models[i], other = models[j], given = text != nullptr ? Text(text) : Text();
+        Text next = old;
+        std::vector<std::string> lines;
+        const auto append = [&](const Text &tail, bool refused, const char *line) {
+            refused ? lines.assign(2, line) : void(next = old.value_or("") + *tail);
+        };
+        switch (random() % 7) {
+            case 0:
+                strings[i] = text;
+                next = given;
+                break;
+            case 1:
+                strings[i] = strings[j];
+                next = other;
+                break;
+            case 2:
+                strings[i].SetMemAllocedString(NewArray(text));
+                given ? void(next = given) : lines.push_back("Argument String is NULL!\n");
+                break;
+            case 3:
+                append(given, !given, "Adding String is NULL!\n");
+                ASSERT_EQ(TextOf(strings[i] + text), next);
+                strings[i] += text;
+                break;
+            case 4:
+                append(other, other.value_or("").empty(), "No String!\n");
+                ASSERT_EQ(TextOf(strings[i] + strings[j]), next);
+                strings[i] += strings[j];
+                break;
+            default: {
+                const VarnekCString &a = strings[i], &b = strings[j];
+                const int order = old && other ? strcmp(old->c_str(), other->c_str()) : 0;
+                const std::vector<int> found = {a == b, a<b, a <= b, a> b, a >= b};
+                ASSERT_EQ(found, old && other
+                                     ? (std::vector<int>{order == 0, order<0, order <= 0, order> 0, order >= 0})
+                                     : (std::vector<int>{old == other, 0, 0, 0, 0}));
+                lines.assign(old && other ? 0 : 5, one);
+                old || other ? void() : void(lines[0] = "Two strings are NULL!\n");
+            }
+        }
+        ASSERT_EQ(TextOf(strings[i]), models[i] = next) << step;
+        ASSERT_EQ(TakeBodies(), lines) << step;
+        if (next.value_or("").size() > 40) {
+            strings[i] = nullptr;
+            models[i].reset();
+        }
+    }
+}
+
+TEST_F(String, OwnsItsArrayAndNoOther) {
+    char *const array = NewArray("text");
+    VarnekCString string("before");
+    string.SetMemAllocedString(array);
+    array[0] = 'n';
+    const VarnekCString copy(string);
+    string.SetMemAllocedString(array);
+    string = array + 1;
+    EXPECT_EQ(TextOf(string), Text("ext"));
+    EXPECT_EQ(TextOf(copy), Text("next"));
+    EXPECT_THAT(TakeLog(), ::testing::IsEmpty());
+    const VarnekCString null(nullptr);
+    EXPECT_EQ((copy == null) + (copy < null), 0);
+    const auto lines = TakeLog();
+    EXPECT_EQ(lines[0].priority, 4) << "a question about null strings is High";
+    EXPECT_EQ(lines[1].priority, 6) << "an order of null strings is an Error";
+}
+
+}  // namespace

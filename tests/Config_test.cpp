@@ -1,0 +1,163 @@
+// The configuration file: what is loaded from hostile and from friendly ones, what is saved, and
+// where the nation comes from. The file is put back as it was.
+#include "Varnek_Config.h"
+
+#include <cstring>
+#include <filesystem>
+
+#include "support/VarnekTest.h"
+
+namespace {
+
+using ::testing::Contains;
+using ::testing::ElementsAre;
+
+const std::string kPath = VARNEK_DATA_DIR "Varnek_Config.cfg";
+
+class ConfigAlone : public VarnekTest {
+  protected:
+    void SetUp() override {
+        VarnekTest::SetUp();
+        std::filesystem::rename(kPath, kPath + ".aside", ignored_);
+    }
+    void TearDown() override {
+        std::filesystem::remove(kPath);
+        std::filesystem::rename(kPath + ".aside", kPath, ignored_);
+        VarnekTest::TearDown();
+    }
+    // What is saved after this was loaded.
+    static std::string Reloaded(const std::string &content) {
+        WriteAll(kPath, content);
+        VarnekCfg_LoadConfigFile();
+        VarnekCfg_SaveConfigFile();
+        return ReadAll(kPath);
+    }
+    std::error_code ignored_;
+    VarnekConfigInfo &info_ = *VarnekCfg_GetConfigInfo();
+};
+
+std::string File(const std::string &area, int64_t standard, int capture, int simulation, int64_t delay,
+                 const std::string &nation) {
+    const auto line = [](const char *key, const std::string &value) {
+        return "CONFIG_" + std::string(key) + "=" + value + "\n";
+    };
+    return line("CURRENTAREANAME", area) + line("STANDARDTYPE", std::to_string(standard)) +
+           line("TSCAPTURE", std::to_string(capture)) + line("TSFILESIMUL", std::to_string(simulation)) +
+           line("CPRMPLAYER_DELAY", std::to_string(delay)) + line("SUPPORT_NATION", nation);
+}
+
+TEST_F(ConfigAlone, SavesOnChangeAndLoadsOnDemand) {
+    VarnekCfg_LoadConfigFile();
+    EXPECT_EQ(TakeBodies("SBTVD_CTRL").back(), "  VarnekCfg_LoadConfigFile : Cannot Open Config File!");
+    VarnekCfg_SetStandard(2);
+    EXPECT_FALSE(std::filesystem::exists(kPath));
+    VarnekCfg_SetStandard(-3);
+    EXPECT_EQ(ReadAll(kPath), File("", -3, 0, 0, 68, ""));
+    EXPECT_EQ(TakeBodies("SBTVD_CTRL").back(), " VarnekCfg_SetStandard: aStd is -3\n");
+    WriteAll(kPath, File("", 0, 1, 2, 0, "ARG"));
+    EXPECT_EQ(VarnekCfg_GetTSCaptueEnable(), 0);
+    info_.standardType = 0;
+    EXPECT_EQ(VarnekCfg_GetTSCaptueEnable(), 1);
+    EXPECT_EQ(TakeBodies().back(), "VarnekCfg_GetTSCaptueEnable: gpVarnekConfigInfo.tsCaptureEnable=[1]");
+    info_.tsFileSimulEnable = 0;
+    EXPECT_EQ(VarnekCfg_GetTSFileSimulEnable(), 2);
+    WriteAll(kPath, File("", 7, 0, 0, 0, "ARG"));
+    EXPECT_EQ(VarnekCfg_GetStandard(), 7);
+    EXPECT_EQ(TakeBodies().back(), " VarnekCfg_GetStandard: gpVarnekConfigInfo.standardType is 7\n");
+}
+
+TEST_F(ConfigAlone, LinesAreTracedAsTheyAreRead) {
+    const std::string file = "config_standardtype= +3x\r\n#nothing\n\rxCONFIG_TSCAPTURE=1\n";
+    EXPECT_EQ(Reloaded(file), File("", 3, 1, 0, 0, "BRA"));
+    const std::string keyWord = "  __VarnekCfg_GetKeyWord : called!";
+    EXPECT_THAT(TakeBodies("SBTVD_CTRL"),
+                ElementsAre("  VarnekCfg_LoadConfigFile : called!",
+                            "  VarnekCfg_LoadConfigFile : readlen = " + std::to_string(file.size()), keyWord,
+                            "CONFIG_STANDARDTYPE=[3]", keyWord, " ERROR :unknown line(#nothing)", keyWord,
+                            "CONFIG_TSCAPTURE=[1]", " __VarnekCfg_GetTempBuffer: End of Configuration\n"));
+}
+
+TEST_F(ConfigAlone, AnyFileLoads) {
+    const std::string type = "CONFIG_STANDARDTYPE=", area = "CONFIG_CURRENTAREANAME=";
+    const std::string nation = "CONFIG_SUPPORT_NATION=", cut(99, 'x'), none = File("", 0, 0, 0, 0, "BRA");
+    const std::string good = File("S\xC3\xA3o Paulo\t", 3, 1, 255, -5, "ARG");
+    const auto ofType = [](int64_t standard) { return File("", standard, 0, 0, 0, "BRA"); };
+    const auto many = [](char c, size_t count) { return std::string(count, c); };
+    const struct {
+        std::string file, expected;
+    } rows[] = {
+        {good, good},
+        {"\n" + good.substr(0, good.size() - 1), good},
+        {type + "7\n" + good, good},
+        {"", none},
+        {type.substr(0, 19), none},
+        {area + many('x', 100000), File(cut, 0, 0, 0, 0, "BRA")},
+        {nation + many('x', 100000) + "\n" + type + "4", File("", 4, 0, 0, 0, cut)},
+        // Of a line, 254 characters are looked at.
+        {many('x', 233) + type + "51", ofType(5)},
+        {many('x', 235) + type + "51", none},
+        {type + "99999999999999999999", ofType(INT32_MAX)},
+        {type + "-99999999999999999999", ofType(INT32_MIN)},
+        {"CONFIG_TSCAPTURE=257\nCONFIG_TSFILESIMUL=-1", File("", 0, 1, 255, 0, "BRA")},
+        {type + "5\n" + many('\0', 1) + type + "6", ofType(5)},
+        {many('\n', 10 << 20) + type + "8", ofType(8)},
+        {type + "9\r" + many('\xFF', 10 << 20) + "\r" + type + "10", ofType(10)},
+    };
+    for (const auto &row : rows) {
+        EXPECT_EQ(Reloaded(row.file), row.expected) << row.file.substr(0, 300);
+    }
+    memset(info_.currentAreaName, 'x', sizeof info_.currentAreaName);
+    memset(info_.supportNation, 'x', sizeof info_.supportNation);
+    info_.standardType = info_.cprmPlayerDelay = INT32_MIN;
+    VarnekCfg_SaveConfigFile();
+    EXPECT_EQ(ReadAll(kPath), File(cut, INT32_MIN, 0, 0, INT32_MIN, cut));
+}
+
+TEST_F(ConfigAlone, TheNationComesFromFileThenPlatformThenDefault) {
+    const std::string none = "can't find Nation ", set = "TARN feature. so set default nation(BRA)";
+    const struct {
+        const char *feature;
+        std::string nation, line;
+    } rows[] = {
+        {nullptr, "BRA", none + "from " + set},
+        {"", "BRA", none + "TAG in " + set},
+        {"nation:PHL", "BRA", none + "TAG in " + set},
+        {"NATION:PH", "BRA", none + "TAG in " + set},
+        {"a,NATION:PHL,NATION:ARG", "PHL", "found nation in TARN = PHL"},
+        {"NATION:phl", "phl", "found nation in TARN = phl"},
+    };
+    for (const auto &row : rows) {
+        gFeature = row.feature;
+        info_.supportNation[0] = '\0';
+        const bool bml = row.nation == "PHL";
+        EXPECT_EQ(VarnekCfg_IsSupportBML(), bml ? TRUE : FALSE) << row.line;
+        EXPECT_EQ(VarnekCfg_GetSupportNation(), row.nation);
+        const auto log = TakeLog();
+        ASSERT_EQ(log.size(), 2u);
+        EXPECT_EQ(log[0].tag + log[0].Body(), "SBTVD_COMVarnekCfg_GetSupportNation " + row.line);
+        EXPECT_EQ(log[0].priority, 6);
+        EXPECT_EQ(log[1].tag + log[1].Body(),
+                  "SBTVD_SessionMGR VarnekCfg_IsSupportBML: BML " + std::string(bml ? "" : "not ") + "supported");
+    }
+    gFeature = "NATION:PHL";
+    EXPECT_EQ(Reloaded("CONFIG_SUPPORT_NATION=ARG"), File("", 0, 0, 0, 0, "ARG"));
+}
+
+TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
+    const auto expect = [](const char *tag, const std::string &line) {
+        VarnekCfg_SaveConfigFile();
+        std::filesystem::remove(kPath);
+        EXPECT_THAT(TakeBodies(tag), ElementsAre("VarnekCfg_SaveConfigFile" + line));
+    };
+    std::filesystem::create_symlink("/dev/full", kPath);
+    expect("SBTVD_CTRL", "() :  VarnekPGL_WriteFileByHandle() fail.!");
+    std::filesystem::create_directory(kPath);
+    expect("SBTVD_CTRL", "() :  VarnekPGL_OpenFile() fail.!");
+    const std::string data = std::filesystem::path(VARNEK_DATA_DIR).parent_path();
+    std::filesystem::rename(data, data + ".aside");
+    expect("SBTVD_ESG", ": Root_Path(" VARNEK_DATA_DIR ") is not Exist\n");
+    EXPECT_FALSE(std::filesystem::exists(data));
+    std::filesystem::rename(data + ".aside", data);
+}
+
+}  // namespace
