@@ -349,13 +349,12 @@ int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer, uin
             hFile);
         return 0;
     }
-    errno = 0;
     const ssize_t written = write(hFile, buffer, length);
     if (written >= 0 && static_cast<size_t>(written) == length) {
         return static_cast<int32_t>(length);
     }
     // A short write reports no error, so the errno of an earlier call must not be taken for one.
-    const int error = errno;
+    const int error = written < 0 ? errno : 0;
     __VarnekPGL_FileLog(
         "[FULLSEG_64BIT_FILE]VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : %d, Size : [ "
         "%u "
@@ -417,7 +416,7 @@ int64_t VarnekPGL_GetFileSize64Bits(const char *path) {
     }
     const int64_t size = SizeOfDescriptor(fd);
     close(fd);
-    return size;
+    return size > 0 ? size : 0;
 }
 
 int64_t VarnekPGL_GetFileSizeByHandle64Bits(int32_t hFile) {
@@ -447,12 +446,21 @@ void ReadProcessName(char (&name)[size]) {
     }
 }
 
-// Whether the last component is a link that leads to a directory.
+// Whether the last component is a link that leads to a directory. A slash behind it would have
+// lstat look through the link.
 bool IsLinkToDir(const char *path) {
     struct stat64 link = {};
     struct stat64 target = {};
     return lstat64(path, &link) == 0 && S_ISLNK(link.st_mode) && stat64(path, &target) == 0 &&
            S_ISDIR(target.st_mode);
+}
+
+size_t LengthWithoutSlashes(const char *path) {
+    size_t length = strlen(path);
+    while (length > 1 && path[length - 1] == '/') {
+        length--;
+    }
+    return length;
 }
 
 // Deletes one entry of the directory `parent`. A path that does not fit must not be cut into the
@@ -486,11 +494,10 @@ int32_t VarnekPGL_MakeDir(const char *path) {
         __VarnekPGL_FileLog("%s : exceed max file path length : %s", __func__, path);
         return -1;
     }
-    errno = EFAULT;  // what the system says of a null path
     if (path != nullptr && mkdir(path, 0755) == 0) {
         return 0;
     }
-    const int error = errno;
+    const int error = path != nullptr ? errno : EFAULT;  // what the system says of a null path
     char process[200];
     ReadProcessName(process);
     __VarnekPGL_FileLog("%s : [%s] dir create failed! errno(%d),process(%s) pid(%d) uid(%d)",
@@ -514,11 +521,15 @@ int32_t VarnekPGL_DeleteDirEx(const char *path) {
     if (length > 0 && (trimmed[length - 1] == '/' || trimmed[length - 1] == '\\')) {
         trimmed[length - 1] = '\0';
     }
+    const size_t bare = LengthWithoutSlashes(trimmed);
+    const char cut = trimmed[bare];
+    trimmed[bare] = '\0';
     if (IsLinkToDir(trimmed)) {
         const int32_t result = VarnekPGL_DeleteFile(trimmed);
         free(trimmed);
         return result;
     }
+    trimmed[bare] = cut;
     void *dir = VarnekPGL_OpenDir(trimmed);
     if (dir == PGL_INVALID_DIR_HANDLE) {
         __VarnekPGL_FileLog("%s : No Eixst Dir! [%s]", __func__, trimmed);
@@ -575,7 +586,7 @@ BOOL __VarnekPGL_ReadDir(void *hDir, PglDirEntry *entry) {
         return FALSE;
     }
     DIR *dir = DirOf(hDir);
-    const struct dirent *next = dir != nullptr ? readdir(dir) : nullptr;
+    const struct dirent64 *next = dir != nullptr ? readdir64(dir) : nullptr;
     if (next == nullptr || next->d_reclen < 1 || next->d_reclen > 256) {
         entry->type = 0;
         __VarnekPGL_FileLog("%s : return FALSE pDir = 0x%x", __func__,
