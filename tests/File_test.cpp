@@ -360,9 +360,12 @@ TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
         EXPECT_FALSE(std::filesystem::exists(tree));
         EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
     }
-    std::filesystem::create_directory_symlink("outside", Path("root"));
-    EXPECT_EQ(VarnekPGL_DeleteDirEx((Path("root") + "/").c_str()), 0);
-    EXPECT_FALSE(std::filesystem::exists(std::filesystem::symlink_status(Path("root"))));
+    for (const char *suffix : {"", "/", "//"}) {
+        std::filesystem::create_directory_symlink("outside", Path("root"));
+        EXPECT_EQ(VarnekPGL_DeleteDirEx((Path("root") + suffix).c_str()), 0) << suffix;
+        EXPECT_FALSE(std::filesystem::exists(std::filesystem::symlink_status(Path("root"))));
+        EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
+    }
     EXPECT_EQ(VarnekPGL_ClearDir(outside.c_str()), 0);
     EXPECT_TRUE(std::filesystem::is_empty(outside));
 }

@@ -81,8 +81,7 @@ VARNEK_API int32_t VarnekPGL_DeleteFile(const char *path);
 
 // Opens a descriptor; nothing ever truncates.
 //   flags    READ; WRITE (write-only); APPEND (with WRITE or CREATE_RW); READ | WRITE (read-write,
-//   not
-//            created, not appending); CREATE_RW (read-write, created with 0666 under the umask)
+//            not created, not appending); CREATE_RW (read-write, created with 0666 under the umask)
 //   returns  the descriptor, to be closed by the caller; a negative value on failure
 VARNEK_API int32_t VarnekPGL_OpenFile64Bits(const char *path, int32_t flags);
 
@@ -110,7 +109,7 @@ VARNEK_API int64_t VarnekPGL_TellFile64Bits(int32_t hFile);
 //   returns  0 whatever the system reported; -1 for a negative descriptor
 VARNEK_API int32_t VarnekPGL_FlushFile64Bits(int32_t hFile);
 
-//   returns  the size in bytes; 0, without a log line, when the file cannot be opened
+//   returns  the size in bytes; 0, without a log line, when the file cannot be opened or measured
 VARNEK_API int64_t VarnekPGL_GetFileSize64Bits(const char *path);
 
 //   returns  the size in bytes, -1 when it cannot be told; the position stays
@@ -150,13 +149,15 @@ typedef struct PglFmFileAttributes {
 VARNEK_API int32_t VarnekPGL_MakeDir(const char *path);
 
 // Deletes a directory tree, going on past entries that cannot be deleted. Links are removed, never
-// followed. An entry whose path would exceed 256 characters is left, with a log line.
+// followed. An entry whose path would exceed 256 characters is left, with a log line, and so is
+// what a listing does not reach.
 //   path     one final slash or backslash is ignored
 //   returns  0 when the directory and its contents are gone, -1 otherwise
 VARNEK_API int32_t VarnekPGL_DeleteDirEx(const char *path);
 VARNEK_API int32_t VarnekPGL_DeleteDir(const char *path);
 
-// Deletes a directory tree and makes the directory again.
+// Deletes a directory tree and makes the directory again. A link to a directory is replaced by a
+// new directory; what it led to stays as it is.
 //   returns  0, or -1; a directory that does not exist is not created
 VARNEK_API int32_t VarnekPGL_ClearDir(const char *path);
 
@@ -167,7 +168,8 @@ VARNEK_API void *VarnekPGL_OpenDir(const char *path);
 VARNEK_API BOOL VarnekPGL_CloseDir(void *hDir);
 
 // Reads the next entry, in no particular order, "." and ".." included. One handle is read by one
-// thread at a time. The end of a listing writes a log line.
+// thread at a time. The end of a listing writes a log line. A listing ends early at an entry whose
+// record is longer than 256 bytes, that is, whose name has more than 236.
 //   returns  TRUE with an entry; FALSE, and type 0, at the end or on failure
 VARNEK_API BOOL __VarnekPGL_ReadDir(void *hDir, PglDirEntry *entry);
 VARNEK_API BOOL VarnekPGL_ReadDir(void *hDir, PglDirEntryInfo *info);

@@ -37,7 +37,7 @@ VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInTex
 // UTF-8 to units, of at most `length` bytes of input; bytes beyond are never read. A byte that
 // starts no character gives its low seven bits. U+00A0 becomes a space. Four-byte forms are not
 // decoded.
-//   outBufSize  bytes of room, the terminator counted
+//   outBufSize  bytes of room, the terminator counted; the two bytes of that are always needed
 //   returns     TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a
 //               null pointer or too little room
 VARNEK_API BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize,

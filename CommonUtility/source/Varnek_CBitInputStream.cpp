@@ -173,10 +173,12 @@ int VarnekCBitInputStream::GetByteArray(unsigned char *dest, int count) {
         return -1;
     }
     const int remaining = static_cast<int>(uiBufLen) - iCurByteIdx;
-    if (remaining < count || count < 0 || dest == nullptr) {
+    if (remaining < count || count < 0 || (dest == nullptr && count > 0)) {
         return -10;
     }
-    memcpy(dest, pBuffer + iCurByteIdx, static_cast<size_t>(count));
+    if (count > 0) {
+        memcpy(dest, pBuffer + iCurByteIdx, static_cast<size_t>(count));
+    }
     iCurByteIdx += count;
     iBitIdxInCurByte = 0;
     if (count == remaining) {

@@ -223,6 +223,11 @@ int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uint32_t lengt
 }
 
 int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t length) {
+    if (buffer == nullptr && length > 0) {
+        // Opening would create the file for nothing.
+        __VarnekPGL_FileLog("%s : NULL buffer", __func__);
+        return -1;
+    }
     const PglFileHandle file = VarnekPGL_OpenFile(path, PGL_FILE_MODE_APPEND);
     if (file == -1) {
         __VarnekPGL_FileLog("%s : File doesn't exist! file path=[%s]", __func__, Shown(path));
@@ -446,45 +451,91 @@ void ReadProcessName(char (&name)[size]) {
     }
 }
 
-// Whether the last component is a link that leads to a directory. A slash behind it would have
-// lstat look through the link.
-bool IsLinkToDir(const char *path) {
+// What one level of a tree deletion works with. It lies in the heap: a deep tree would be too much
+// for the stack of a small thread.
+struct TreeLevel {
+    PglDirEntry entry;
+    char child[kChildPathSize];
+    char path[1];  // and as many more as it takes
+};
+
+// A level for a directory, whose path loses one final slash or backslash; null without memory.
+TreeLevel *MakeLevel(const char *path) {
+    const size_t length = strlen(path);
+    TreeLevel *level = static_cast<TreeLevel *>(malloc(sizeof(TreeLevel) + length));
+    if (level == nullptr) {
+        return nullptr;
+    }
+    memcpy(level->path, path, length + 1);
+    if (length > 0 && (path[length - 1] == '/' || path[length - 1] == '\\')) {
+        level->path[length - 1] = '\0';
+    }
+    level->entry = {};
+    return level;
+}
+
+// Whether the path names a link to a directory. The slashes that it may still end in would have
+// lstat look through the link; the path of a link loses them.
+bool CutToLink(char *path) {
+    size_t bare = strlen(path);
+    while (bare > 1 && path[bare - 1] == '/') {
+        bare--;
+    }
+    const char cut = path[bare];
+    path[bare] = '\0';
     struct stat64 link = {};
     struct stat64 target = {};
-    return lstat64(path, &link) == 0 && S_ISLNK(link.st_mode) && stat64(path, &target) == 0 &&
-           S_ISDIR(target.st_mode);
-}
-
-size_t LengthWithoutSlashes(const char *path) {
-    size_t length = strlen(path);
-    while (length > 1 && path[length - 1] == '/') {
-        length--;
+    const bool isLink = lstat64(path, &link) == 0 && S_ISLNK(link.st_mode) &&
+                        stat64(path, &target) == 0 && S_ISDIR(target.st_mode);
+    if (!isLink) {
+        path[bare] = cut;
     }
-    return length;
+    return isLink;
 }
 
-// Deletes one entry of the directory `parent`. A path that does not fit must not be cut into the
-// name of some other file, so that entry stays.
-void DeleteChild(const char *operation, const char *parent, const PglDirEntry &entry) {
-    const size_t length = strlen(parent);
-    const bool joined = entry.name[0] == '/' || (length > 0 && parent[length - 1] == '/');
-    char child[kChildPathSize];
-    const int needed = snprintf(child, sizeof child, joined ? "%s%s" : "%s/%s", parent, entry.name);
-    if (needed < 0 || static_cast<size_t>(needed) >= sizeof child) {
-        __VarnekPGL_FileLog("%s : exceed max file path length : %s/%s", operation, parent,
-                            entry.name);
+// Deletes the level's present entry. A path that does not fit must not be cut into the name of some
+// other file, so that entry stays.
+void DeleteChild(const char *operation, TreeLevel *level) {
+    const char *name = level->entry.name;
+    const size_t length = strlen(level->path);
+    const bool joined = name[0] == '/' || (length > 0 && level->path[length - 1] == '/');
+    const int needed =
+        snprintf(level->child, sizeof level->child, joined ? "%s%s" : "%s/%s", level->path, name);
+    if (needed < 0 || static_cast<size_t>(needed) >= sizeof level->child) {
+        __VarnekPGL_FileLog("%s : exceed max file path length : %s/%s", operation, level->path,
+                            name);
         return;
     }
-    switch (entry.type) {
+    switch (level->entry.type) {
         case PGL_ENTRY_DIR:
-            VarnekPGL_DeleteDirEx(child);
+            VarnekPGL_DeleteDirEx(level->child);
             return;
         case PGL_ENTRY_FILE:
-            VarnekPGL_DeleteFile(child);
+            VarnekPGL_DeleteFile(level->child);
             return;
         default:
             __VarnekPGL_FileLog("%s: Invalid entry type", operation);
     }
+}
+
+// Deletes the level's directory with all that is in it, for `operation`.
+int32_t DeleteTree(const char *operation, TreeLevel *level) {
+    void *dir = VarnekPGL_OpenDir(level->path);
+    if (dir == PGL_INVALID_DIR_HANDLE) {
+        __VarnekPGL_FileLog("%s : No Eixst Dir! [%s]", operation, level->path);
+        return -1;
+    }
+    while (__VarnekPGL_ReadDir(dir, &level->entry)) {
+        if (strcmp(level->entry.name, ".") != 0 && strcmp(level->entry.name, "..") != 0) {
+            DeleteChild(operation, level);
+        }
+    }
+    VarnekPGL_CloseDir(dir);
+    if (rmdir(level->path) != 0) {
+        __VarnekPGL_FileLog("%s : rmdir[%s] Fail. return FALSE", operation, level->path);
+        return -1;
+    }
+    return 0;
 }
 
 }  // namespace
@@ -512,48 +563,20 @@ int32_t VarnekPGL_DeleteDir(const char *path) {
 
 // Calls itself for each directory inside; the limit on a child's path bounds the depth.
 int32_t VarnekPGL_DeleteDirEx(const char *path) {
-    char *trimmed = path != nullptr ? strdup(path) : nullptr;
-    if (trimmed == nullptr) {
+    TreeLevel *level = path != nullptr ? MakeLevel(path) : nullptr;
+    if (level == nullptr) {
         __VarnekPGL_FileLog("%s : No Eixst Dir! [%s]", __func__, Shown(path));
         return -1;
     }
-    const size_t length = strlen(trimmed);
-    if (length > 0 && (trimmed[length - 1] == '/' || trimmed[length - 1] == '\\')) {
-        trimmed[length - 1] = '\0';
-    }
-    const size_t bare = LengthWithoutSlashes(trimmed);
-    const char cut = trimmed[bare];
-    trimmed[bare] = '\0';
-    if (IsLinkToDir(trimmed)) {
-        const int32_t result = VarnekPGL_DeleteFile(trimmed);
-        free(trimmed);
-        return result;
-    }
-    trimmed[bare] = cut;
-    void *dir = VarnekPGL_OpenDir(trimmed);
-    if (dir == PGL_INVALID_DIR_HANDLE) {
-        __VarnekPGL_FileLog("%s : No Eixst Dir! [%s]", __func__, trimmed);
-        free(trimmed);
-        return -1;
-    }
-    PglDirEntry entry = {};
-    while (__VarnekPGL_ReadDir(dir, &entry)) {
-        if (strcmp(entry.name, ".") != 0 && strcmp(entry.name, "..") != 0) {
-            DeleteChild(__func__, trimmed, entry);
-        }
-    }
-    VarnekPGL_CloseDir(dir);
-    if (rmdir(trimmed) != 0) {
-        __VarnekPGL_FileLog("%s : rmdir[%s] Fail. return FALSE", __func__, trimmed);
-        free(trimmed);
-        return -1;
-    }
-    free(trimmed);
-    return 0;
+    const int32_t result =
+        CutToLink(level->path) ? VarnekPGL_DeleteFile(level->path) : DeleteTree(__func__, level);
+    free(level);
+    return result;
 }
 
 int32_t VarnekPGL_ClearDir(const char *path) {
-    if (VarnekPGL_DeleteDirEx(path) != 0) {
+    // What could not be made again is not deleted.
+    if (IsTooLong(path) || VarnekPGL_DeleteDirEx(path) != 0) {
         __VarnekPGL_FileLog("%s : Directory Deletion Fail. Dir Path=[%s]", __func__, Shown(path));
         return -1;
     }
