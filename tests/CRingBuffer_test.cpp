@@ -35,6 +35,7 @@ struct Fields {
 Fields FieldsOf(const VarnekCRingBuffer &ring) {
     Fields fields;
     static_assert(sizeof fields == sizeof ring);
+    // A look at the object's memory is the purpose. NOLINTNEXTLINE(bugprone-undefined-memory-manipulation)
     memcpy(&fields, &ring, sizeof fields);
     return fields;
 }

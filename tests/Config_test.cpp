@@ -9,7 +9,6 @@
 
 namespace {
 
-using ::testing::Contains;
 using ::testing::ElementsAre;
 
 const std::string kPath = VARNEK_DATA_DIR "Varnek_Config.cfg";

@@ -109,7 +109,7 @@ void Advance(int *pos, int *laps, int length, int size) {
 
 // Either pointer may be null when there is nothing to copy.
 void Copy(unsigned char *to, const unsigned char *from, int count) {
-    if (count > 0) {
+    if (count > 0 && to != nullptr && from != nullptr) {
         memcpy(to, from, static_cast<size_t>(count));
     }
 }
