@@ -15,6 +15,8 @@
 #include "PacketSource.h"
 #include "Presentation.h"
 #include "Tables.h"
+#include "Varnek_Semaphore.h"
+#include "Varnek_Thread.h"
 #include "Varnek_Util.h"
 #include "support/VarnekTest.h"
 
@@ -588,6 +590,59 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
     std::fclose(full);
 }
 
+// Fills a registry up.
+std::vector<int32_t> CreateAll(const std::function<int32_t(const char *)> &create, const std::string &name) {
+    std::vector<int32_t> handles;
+    do {
+        handles.push_back(create((name + std::to_string(handles.size())).c_str()));
+    } while (handles.back() != -1);
+    handles.pop_back();
+    return handles;
+}
+
+// With the registry of one family full but for 0, 1, 2 ... places: no more places are needed than
+// there are objects, and each run leaves as many as it found.
+TEST_F(ReceiverFiles, LeavesNothingBehind) {
+    const struct {
+        const char *family;
+        std::function<int32_t(const char *)> create;
+        BOOL (*remove)(int32_t);
+        size_t needed;
+    } families[] = {
+        {"thread",
+         [](const char *name) {
+             return VarnekPGL_CreateThread(
+                 name, 1, 65536, [](void *) -> void * { return nullptr; }, nullptr);
+         },
+         VarnekPGL_DeleteThread, 4},
+        {"semaphore", [](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); }, VarnekPGL_DeleteSemaphore,
+         3},
+        {"mutex", VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex, 1},
+    };
+    const std::string expected = RunProgram({"--json", VARNEK_SAMPLE}).out;
+    for (const auto &family : families) {
+        std::vector<int32_t> fillers = CreateAll(family.create, "filler");
+        ASSERT_GT(fillers.size(), family.needed);
+        for (size_t places = 0; places <= family.needed; ++places) {
+            const Result result = RunProgram({"--json", VARNEK_SAMPLE});
+            const bool enough = places == family.needed;
+            EXPECT_EQ(result.status, enough ? 0 : 1) << family.family << places;
+            EXPECT_EQ(result.out, enough ? expected : "") << family.family << places;
+            EXPECT_EQ(result.err.find(std::string("the ") + family.family) != std::string::npos, !enough) << result.err;
+            const std::vector<int32_t> free = CreateAll(family.create, "free");
+            EXPECT_EQ(free.size(), places) << family.family;
+            for (const int32_t handle : free) {
+                family.remove(handle);
+            }
+            family.remove(fillers.back());
+            fillers.pop_back();
+        }
+        for (const int32_t handle : fillers) {
+            family.remove(handle);
+        }
+    }
+}
+
 bool IsUtf8(const std::string &text) {
     for (size_t i = 0; i < text.size();) {
         const unsigned char c = static_cast<unsigned char>(text[i]);
@@ -618,7 +673,7 @@ void Check(const Report &report, size_t bytes) {
     TakeLog();
 }
 
-TEST(Receiver, SurvivesDamage) {
+TEST_F(ReceiverFiles, SurvivesDamage) {
     std::mt19937 random(20240615);
     const Bytes sample = Sample();
     for (int round = 0; round < 60; ++round) {
@@ -639,7 +694,13 @@ TEST(Receiver, SurvivesDamage) {
                     *place = Low(random());
             }
         }
-        Check(ReadStream(stream, 1 + random() % 9000), stream.size());
+        const Report report = ReadStream(stream, 1 + random() % 9000);
+        Check(report, stream.size());
+        if (round % 4 == 0) {
+            WriteAll(Path("damaged.ts"), std::string(stream.begin(), stream.end()));
+            const Result result = RunProgram({"--json", Path("damaged.ts")});
+            ASSERT_EQ(result.out, ToJson(report)) << result.err << ::testing::PrintToString(TakeErrors());
+        }
     }
     // Sections with a right CRC and nonsense within, so that it reaches the tables.
     const std::pair<uint16_t, unsigned char> places[] = {{0x00, 0x00}, {0x101, 0x02}, {0x10, 0x40},

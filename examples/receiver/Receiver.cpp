@@ -1,20 +1,18 @@
-// Wires the stages together: file, packet source, demultiplexer, table parser, presentation. Each
-// knows only the form of what it is handed.
+// The command line, then the pipeline over the file, then the presentation of what it found.
 #include "Receiver.h"
+
+#include <unistd.h>
 
 #include <cerrno>
 #include <system_error>
 
-#include "Demultiplexer.h"
-#include "PacketSource.h"
+#include "Pipeline.h"
 #include "Presentation.h"
 #include "StreamFile.h"
-#include "Tables.h"
 
 namespace receiver {
 namespace {
 
-constexpr size_t kBlockSize = 65536;
 constexpr char kUsage[] =
     "usage: receiver [--json] FILE\n"
     "  Reads a transport stream and shows its services, events and counters.\n"
@@ -45,24 +43,6 @@ bool ParseArguments(const std::vector<std::string> &arguments, Options &options)
     return options.help || !options.path.empty();
 }
 
-Report Read(StreamFile &file) {
-    Report report;
-    TableParser parser(report.model);
-    Demultiplexer demultiplexer([&parser](uint16_t pid, const unsigned char *section, size_t size) {
-        parser.Push(pid, section, size);
-    });
-    PacketSource source(
-        [&demultiplexer](const unsigned char *packet) { demultiplexer.Push(packet); });
-    std::vector<unsigned char> block(kBlockSize);
-    while (const size_t count = file.Read(block.data(), block.size())) {
-        source.Feed(block.data(), count);
-    }
-    source.Finish();
-    report.packets = source.Counters();
-    report.sections = demultiplexer.Counters();
-    return report;
-}
-
 // Why a file that could be opened gave no packet.
 std::string DescribeFailure(const std::string &path, const PacketCounters &packets) {
     if (packets.bytes != 0) {
@@ -75,6 +55,11 @@ std::string DescribeFailure(const std::string &path, const PacketCounters &packe
 int Fail(std::FILE *err, const std::string &path, const std::string &message) {
     std::fprintf(err, "receiver: %s: %s\n", path.c_str(), message.c_str());
     return 1;
+}
+
+bool IsTerminal(std::FILE *file) {
+    const int descriptor = fileno(file);
+    return descriptor >= 0 && isatty(descriptor) != 0;
 }
 
 }  // namespace
@@ -98,7 +83,11 @@ int RunReceiver(const std::vector<std::string> &arguments, std::FILE *out, std::
                     std::string("cannot be opened") +
                         (error != 0 ? ": " + std::generic_category().message(error) : ""));
     }
-    const Report report = Read(file);
+    Report report;
+    const std::string missing = RunPipeline(file, IsTerminal(err) ? err : nullptr, report);
+    if (!missing.empty()) {
+        return Fail(err, options.path, "the " + missing + " could not be created");
+    }
     if (report.packets.packets == 0) {
         return Fail(err, options.path, DescribeFailure(options.path, report.packets));
     }

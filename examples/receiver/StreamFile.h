@@ -3,6 +3,7 @@
 #define RECEIVER_STREAMFILE_H
 
 #include <cstddef>
+#include <cstdint>
 
 #include "Varnek_File.h"
 
@@ -29,6 +30,12 @@ class StreamFile {
     //   returns  the bytes read; 0 at the end and on an error
     size_t Read(unsigned char *buffer, size_t size) const {
         return VarnekPGL_ReadFileByHandle(handle_, buffer, static_cast<uint32_t>(size));
+    }
+
+    //   returns  the size in bytes; 0 when it is not known
+    uint64_t Size() const {
+        const int32_t size = VarnekPGL_GetFileSizeByHandle(handle_);
+        return size > 0 ? static_cast<uint64_t>(size) : 0;
     }
 
   private:

@@ -1,0 +1,328 @@
+// Three threads in a chain, and one that collects what they found:
+//
+//   reader --packets--> demultiplexer --sections--> parser
+//      \ counters           \ counters                 \ model, end
+//       +--------------------+--------------------------+---------> control <-- timer's ticks
+//
+// First the threads, then their messages, last the life of all in RunPipeline. An end message goes
+// down the chain behind the data, so whoever sees it has seen everything, and each thread's result
+// is with control before the end gets there.
+#include "Pipeline.h"
+
+#include <cstring>
+#include <memory>
+#include <new>
+#include <type_traits>
+#include <utility>
+#include <vector>
+
+#include "Demultiplexer.h"
+#include "PacketSource.h"
+#include "Progress.h"
+#include "Tables.h"
+#include "Varnek_Semaphore.h"
+#include "Varnek_Thread.h"
+#include "Varnek_Timer.h"
+
+namespace receiver {
+namespace {
+
+constexpr size_t kBlockSize = 65536;
+// What goes from thread to thread in one message: enough that waking the other side costs little.
+constexpr size_t kBatchSize = 256 * kPacketSize;
+constexpr uint32_t kBatchesWaiting = 8;
+constexpr uint32_t kTickTime = 250;  // milliseconds
+
+// In the order of their creation: whom a thread sends to is there before it.
+enum ThreadIndex { kControl, kParser, kDemultiplexer, kReader, kThreadCount };
+
+// What the threads share. Handles are -1 until there is something; a thread uses only those that
+// were there before it.
+struct Pipeline {
+    StreamFile &file;  // the reader's as long as that runs
+    uint64_t size;     // of the file in bytes, 0 when it is not known
+    std::FILE *progress;
+
+    int32_t packet_room = -1;   // semaphore: batches that may still be sent to the demultiplexer
+    int32_t section_room = -1;  // semaphore: the same, of sections to the parser
+    int32_t ended = -1;         // semaphore: threads that are through
+    int32_t mutex = -1;
+    int32_t timer = -1;
+    int32_t threads[kThreadCount] = {-1, -1, -1, -1};
+
+    uint64_t bytes_read = 0;  // under the mutex
+    Report report = {};       // control's as long as it runs
+};
+
+// Messages ---------------------------------------------------------------------------------------
+
+// A message hands its object over: who takes it out of the queue deletes it. None but messages
+// without an object may be left in a queue when its thread goes.
+enum class Kind : uint32_t {
+    kPackets,
+    kSections,
+    kPacketCounters,
+    kSectionCounters,
+    kModel,
+    kTick,
+    kEnd
+};
+
+using Packets = std::vector<unsigned char>;
+
+struct Section {
+    uint16_t pid;
+    std::vector<unsigned char> bytes;
+};
+using Sections = std::vector<Section>;
+
+struct Message {
+    Kind kind;
+    void *object = nullptr;
+};
+static_assert(sizeof(Message) <= sizeof(THREAD_MSG) && std::is_trivially_copyable_v<Message>);
+
+bool TrySend(int32_t thread, const Message &message) {
+    THREAD_MSG record{};
+    std::memcpy(record.data, &message, sizeof message);
+    return VarnekPGL_SendMessage(thread, &record) != FALSE;
+}
+
+// To a thread that is there: only memory can be lacking, which ends the program as elsewhere.
+void Send(int32_t thread, const Message &message) {
+    if (!TrySend(thread, message)) {
+        throw std::bad_alloc();
+    }
+}
+
+template <typename Object>
+void SendObject(int32_t thread, Kind kind, Object object) {
+    Send(thread, {kind, new Object(std::move(object))});
+}
+
+template <typename Object>
+Object Take(const Message &message) {
+    const std::unique_ptr<Object> object(static_cast<Object *>(message.object));
+    return std::move(*object);
+}
+
+// The calling thread's next message. Nothing but a signal can cut the wait short.
+Message Receive() {
+    THREAD_MSG record{};
+    int32_t left = 0;
+    while (VarnekPGL_ReceiveMessage(WAIT_FOREVER, &record, &left) == FALSE) {
+    }
+    Message message{};
+    std::memcpy(&message, record.data, sizeof message);
+    return message;
+}
+
+void Wait(int32_t semaphore) {
+    while (VarnekPGL_WaitSemaphore(semaphore, WAIT_FOREVER) == FALSE) {
+    }
+}
+
+// Threads ----------------------------------------------------------------------------------------
+
+void RunReader(Pipeline &pipeline) {
+    Packets batch;
+    const auto send_batch = [&] {
+        Wait(pipeline.packet_room);
+        SendObject(pipeline.threads[kDemultiplexer], Kind::kPackets, std::exchange(batch, {}));
+    };
+    PacketSource source([&](const unsigned char *packet) {
+        batch.reserve(kBatchSize);
+        batch.insert(batch.end(), packet, packet + kPacketSize);
+        if (batch.size() == kBatchSize) {
+            send_batch();
+        }
+    });
+    std::vector<unsigned char> block(kBlockSize);
+    while (const size_t count = pipeline.file.Read(block.data(), block.size())) {
+        source.Feed(block.data(), count);
+        VarnekPGL_AcquireMutex(pipeline.mutex);
+        pipeline.bytes_read += count;
+        VarnekPGL_ReleaseMutex(pipeline.mutex);
+    }
+    source.Finish();
+    if (!batch.empty()) {
+        send_batch();
+    }
+    SendObject(pipeline.threads[kControl], Kind::kPacketCounters, source.Counters());
+    Send(pipeline.threads[kDemultiplexer], {Kind::kEnd});
+}
+
+void RunDemultiplexer(Pipeline &pipeline) {
+    Sections sections;
+    Demultiplexer demultiplexer([&](uint16_t pid, const unsigned char *section, size_t size) {
+        sections.push_back({pid, {section, section + size}});
+    });
+    for (Message message = Receive(); message.kind != Kind::kEnd; message = Receive()) {
+        const Packets packets = Take<Packets>(message);
+        VarnekPGL_SignalSemaphore(pipeline.packet_room);
+        for (size_t at = 0; at < packets.size(); at += kPacketSize) {
+            demultiplexer.Push(packets.data() + at);
+        }
+        if (!sections.empty()) {
+            Wait(pipeline.section_room);
+            SendObject(pipeline.threads[kParser], Kind::kSections, std::exchange(sections, {}));
+        }
+    }
+    SendObject(pipeline.threads[kControl], Kind::kSectionCounters, demultiplexer.Counters());
+    Send(pipeline.threads[kParser], {Kind::kEnd});
+}
+
+void RunParser(Pipeline &pipeline) {
+    Model model;
+    TableParser parser(model);
+    for (Message message = Receive(); message.kind != Kind::kEnd; message = Receive()) {
+        const Sections sections = Take<Sections>(message);
+        VarnekPGL_SignalSemaphore(pipeline.section_room);
+        for (const Section &section : sections) {
+            parser.Push(section.pid, section.bytes.data(), section.bytes.size());
+        }
+    }
+    SendObject(pipeline.threads[kControl], Kind::kModel, std::move(model));
+    Send(pipeline.threads[kControl], {Kind::kEnd});
+}
+
+// Runs on a thread of the timer service, perhaps late, when the pipeline is gone. So it is handed
+// nothing but the control thread's handle, which reaches nobody then.
+void OnTimer(uint32_t, void *control) {
+    TrySend(static_cast<int32_t>(reinterpret_cast<intptr_t>(control)), {Kind::kTick});
+}
+
+void StartTimer(const Pipeline &pipeline) {
+    if (pipeline.timer != -1) {
+        void *const control = reinterpret_cast<void *>(intptr_t{VarnekPGL_GetCurrentThread()});
+        VarnekPGL_StartTimer(static_cast<uint32_t>(pipeline.timer), kTickTime, OnTimer, control);
+    }
+}
+
+void RunControl(Pipeline &pipeline) {
+    ProgressLine line(pipeline.progress, pipeline.size);
+    StartTimer(pipeline);
+    for (Message message = Receive(); message.kind != Kind::kEnd; message = Receive()) {
+        if (message.kind == Kind::kPacketCounters) {
+            pipeline.report.packets = Take<PacketCounters>(message);
+        } else if (message.kind == Kind::kSectionCounters) {
+            pipeline.report.sections = Take<DemultiplexerCounters>(message);
+        } else if (message.kind == Kind::kModel) {
+            pipeline.report.model = Take<Model>(message);
+        } else if (message.kind == Kind::kTick) {
+            VarnekPGL_AcquireMutex(pipeline.mutex);
+            const uint64_t done = pipeline.bytes_read;
+            VarnekPGL_ReleaseMutex(pipeline.mutex);
+            line.Show(done);
+            StartTimer(pipeline);
+        }
+    }
+    line.Erase();
+}
+
+// The thread's last act, when nothing of its body is left. It signals with the mutex held, so that
+// who has seen every signal and then gets the mutex knows that nobody is within the semaphore.
+template <void (*Body)(Pipeline &)>
+void *RunThread(void *argument) {
+    Pipeline &pipeline = *static_cast<Pipeline *>(argument);
+    Body(pipeline);
+    VarnekPGL_AcquireMutex(pipeline.mutex);
+    VarnekPGL_SignalSemaphore(pipeline.ended);
+    VarnekPGL_ReleaseMutex(pipeline.mutex);
+    return nullptr;
+}
+
+constexpr struct {
+    const char *name;
+    void *(*function)(void *);
+} kThreads[kThreadCount] = {
+    {"ReceiverControl", RunThread<RunControl>},
+    {"ReceiverParser", RunThread<RunParser>},
+    {"ReceiverDemultiplexer", RunThread<RunDemultiplexer>},
+    {"ReceiverReader", RunThread<RunReader>},
+};
+constexpr int32_t kPriority = 50;
+constexpr uint32_t kStackSize = 1 << 20;
+
+// Life -------------------------------------------------------------------------------------------
+
+//   returns  as RunPipeline
+std::string CreateObjects(Pipeline &pipeline) {
+    const struct {
+        const char *name;
+        uint32_t count;
+        int32_t &handle;
+    } semaphores[] = {
+        {"ReceiverPacketRoom", kBatchesWaiting, pipeline.packet_room},
+        {"ReceiverSectionRoom", kBatchesWaiting, pipeline.section_room},
+        {"ReceiverEnded", 0, pipeline.ended},
+    };
+    for (const auto &semaphore : semaphores) {
+        semaphore.handle = VarnekPGL_CreateSemaphore(semaphore.name, semaphore.count);
+        if (semaphore.handle == -1) {
+            return std::string("semaphore ") + semaphore.name;
+        }
+    }
+    pipeline.mutex = VarnekPGL_CreateMutex("ReceiverMutex");
+    if (pipeline.mutex == -1) {
+        return "mutex ReceiverMutex";
+    }
+    if (pipeline.progress != nullptr) {
+        pipeline.timer = VarnekPGL_CreateTimer("ReceiverTick");
+        if (pipeline.timer == -1) {
+            return "timer ReceiverTick";
+        }
+    }
+    return {};
+}
+
+void DeleteObjects(const Pipeline &pipeline) {
+    for (const int32_t semaphore : {pipeline.packet_room, pipeline.section_room, pipeline.ended}) {
+        if (semaphore != -1) {
+            VarnekPGL_DeleteSemaphore(semaphore);
+        }
+    }
+    if (pipeline.mutex != -1) {
+        VarnekPGL_DeleteMutex(pipeline.mutex);
+    }
+    if (pipeline.timer != -1) {
+        VarnekPGL_DeleteTimer(static_cast<uint32_t>(pipeline.timer));
+    }
+}
+
+}  // namespace
+
+std::string RunPipeline(StreamFile &file, std::FILE *progress, Report &report) {
+    Pipeline pipeline{file, file.Size(), progress};
+    std::string missing = CreateObjects(pipeline);
+    int started = 0;
+    while (missing.empty() && started < kThreadCount) {
+        const auto &[name, function] = kThreads[started];
+        pipeline.threads[started] =
+            VarnekPGL_CreateThread(name, kPriority, kStackSize, function, &pipeline);
+        if (pipeline.threads[started] == -1) {
+            missing = std::string("thread ") + name;
+        } else {
+            ++started;
+        }
+    }
+    if (started > 0 && started < kThreadCount) {
+        // The one in front, which would send the end down the chain, is not there.
+        Send(pipeline.threads[started - 1], {Kind::kEnd});
+    }
+    for (int i = 0; i < started; ++i) {
+        Wait(pipeline.ended);
+    }
+    if (started > 0) {
+        VarnekPGL_AcquireMutex(pipeline.mutex);
+        VarnekPGL_ReleaseMutex(pipeline.mutex);
+    }
+    for (int i = 0; i < started; ++i) {
+        VarnekPGL_DeleteThread(pipeline.threads[i]);
+    }
+    DeleteObjects(pipeline);
+    report = std::move(pipeline.report);
+    return missing;
+}
+
+}  // namespace receiver
