@@ -452,13 +452,13 @@ TEST(Receiver, KeepsWhatApplies) {
           {0x27, Section(0x4E, 9, Eit(1, 0x22, "one-seg"))},
           {0x14, Section(0x4E, 1, Eit(1, 0x18, "misplaced"))}},
          {"\"events\": [\n"
-          R"(    {"service_id": 5, "event_id": 1, "start": "1993-10-13 17:00:00", "duration": "01:00:00", "name": "elsewhere", "text": ""},)"
+          R"(    {"service_id": 5, "event_id": 1, "start": "1993-10-13 17:00:00", "local_start": "", "duration": "01:00:00", "name": "elsewhere", "text": ""},)"
           "\n"
-          R"(    {"service_id": 1, "event_id": 1, "start": "1993-10-13 18:00:00", "duration": "01:00:00", "name": "first", "text": ""},)"
+          R"(    {"service_id": 1, "event_id": 1, "start": "1993-10-13 18:00:00", "local_start": "", "duration": "01:00:00", "name": "first", "text": ""},)"
           "\n"
-          R"(    {"service_id": 1, "event_id": 2, "start": "1993-10-13 21:00:00", "duration": "01:00:00", "name": "second", "text": ""},)"
+          R"(    {"service_id": 1, "event_id": 2, "start": "1993-10-13 21:00:00", "local_start": "", "duration": "01:00:00", "name": "second", "text": ""},)"
           "\n"
-          R"(    {"service_id": 9, "event_id": 1, "start": "1993-10-13 22:00:00", "duration": "01:00:00", "name": "one-seg", "text": ""})"
+          R"(    {"service_id": 9, "event_id": 1, "start": "1993-10-13 22:00:00", "local_start": "", "duration": "01:00:00", "name": "one-seg", "text": ""})"
           "\n  ]"},
          {"wrong", "misplaced"}},
         {"lengths that lead outside",
@@ -498,6 +498,7 @@ TEST(Receiver, ReadsTheSample) {
   "network_id": 1602,
   "network_name": "Rede Ipê do Cerrado",
   "utc_time": "2024-06-15 23:00:08",
+  "local_time": "2024-06-15 20:00:08",
   "local_time_offsets": [
     {"country": "BRA", "region": 0, "offset": "-03:00", "change": "2024-10-13 00:00:00", "next_offset": "-03:00"}
   ],
@@ -506,27 +507,31 @@ TEST(Receiver, ReadsTheSample) {
     {"id": 51288, "name": "TV Ipê Móvel", "provider": "Ipê Comunicação", "type": 1, "pmt_pid": 8136, "pcr_pid": 385, "components": [{"pid": 385, "type": 27}, {"pid": 386, "type": 15}]}
   ],
   "events": [
-    {"service_id": 51264, "event_id": 257, "start": "2024-06-15 22:00:00", "duration": "01:00:00", "name": "Café com Prosa", "text": "Vizinhos contam histórias do bairro, com receitas de pão de queijo e bolo de fubá. Hoje: a família que guarda o forno mais antigo da rua."},
-    {"service_id": 51288, "event_id": 513, "start": "2024-06-15 22:30:00", "duration": "00:30:00", "name": "Notícias em um Minuto", "text": ""},
-    {"service_id": 51264, "event_id": 258, "start": "2024-06-15 23:00:00", "duration": "00:45:00", "name": "Jornal da Região", "text": "As notícias do dia, a previsão do tempo e o trânsito. Edição ao vivo, com closed caption e audiodescrição."},
-    {"service_id": 51288, "event_id": 514, "start": "2024-06-15 23:00:00", "duration": "01:30:00", "name": "Clipes à Noite", "text": "Música para levar no bolso."},
-    {"service_id": 51264, "event_id": 259, "start": "2024-06-15 23:45:00", "duration": "01:15:00", "name": "Novela: O Pião e a Maçã", "text": "Capítulo 42. Conceição descobre a carta do avô e decide voltar à ilha antes da tempestade; Ângelo espera no cais."},
-    {"service_id": 51264, "event_id": 260, "start": "2024-06-16 01:00:00", "duration": "02:00:00", "name": "Sessão Coração: À Procura do Ônibus", "text": "Comédia. Três amigos atravessam o país atrás de um ônibus que só passa uma vez por ano. Ingresso na época: 5 €. Título original: \"Sœur\"."},
-    {"service_id": 51264, "event_id": 261, "start": "2024-06-16 03:00:00", "duration": "00:30:00", "name": "Última Edição", "text": "O resumo do dia."},
-    {"service_id": 51264, "event_id": 511, "start": "", "duration": "", "name": "", "text": ""}
+    {"service_id": 51264, "event_id": 257, "start": "2024-06-15 22:00:00", "local_start": "2024-06-15 19:00:00", "duration": "01:00:00", "name": "Café com Prosa", "text": "Vizinhos contam histórias do bairro, com receitas de pão de queijo e bolo de fubá. Hoje: a família que guarda o forno mais antigo da rua."},
+    {"service_id": 51288, "event_id": 513, "start": "2024-06-15 22:30:00", "local_start": "2024-06-15 19:30:00", "duration": "00:30:00", "name": "Notícias em um Minuto", "text": ""},
+    {"service_id": 51264, "event_id": 258, "start": "2024-06-15 23:00:00", "local_start": "2024-06-15 20:00:00", "duration": "00:45:00", "name": "Jornal da Região", "text": "As notícias do dia, a previsão do tempo e o trânsito. Edição ao vivo, com closed caption e audiodescrição."},
+    {"service_id": 51288, "event_id": 514, "start": "2024-06-15 23:00:00", "local_start": "2024-06-15 20:00:00", "duration": "01:30:00", "name": "Clipes à Noite", "text": "Música para levar no bolso."},
+    {"service_id": 51264, "event_id": 259, "start": "2024-06-15 23:45:00", "local_start": "2024-06-15 20:45:00", "duration": "01:15:00", "name": "Novela: O Pião e a Maçã", "text": "Capítulo 42. Conceição descobre a carta do avô e decide voltar à ilha antes da tempestade; Ângelo espera no cais."},
+    {"service_id": 51264, "event_id": 260, "start": "2024-06-16 01:00:00", "local_start": "2024-06-15 22:00:00", "duration": "02:00:00", "name": "Sessão Coração: À Procura do Ônibus", "text": "Comédia. Três amigos atravessam o país atrás de um ônibus que só passa uma vez por ano. Ingresso na época: 5 €. Título original: \"Sœur\"."},
+    {"service_id": 51264, "event_id": 261, "start": "2024-06-16 03:00:00", "local_start": "2024-06-16 00:00:00", "duration": "00:30:00", "name": "Última Edição", "text": "O resumo do dia."},
+    {"service_id": 51264, "event_id": 511, "start": "", "local_start": "", "duration": "", "name": "", "text": ""}
   ],
-  "events_left_out": 0
+  "events_left_out": 0,
+  "standard_type": 2,
+  "nation": "BRA",
+  "bml": false
 }
 )";
     EXPECT_EQ(ToJson(ReadStream(Sample())), kExpected);
     EXPECT_EQ(ToJson(ReadStream(Sample(), 1)), kExpected);
     const std::string summary = ToSummary(ReadStream(Sample()));
     for (const char *line :
-         {"Clock     2024-06-15 23:00:08 UTC, BRA -03:00\n",
+         {"Clock     2024-06-15 23:00:08 UTC, BRA -03:00, local 2024-06-15 20:00:08\n",
           "  0xC858  TV Ipê Móvel  television, Ipê Comunicação  (PMT 0x1FC8)\n",
           "          0x0181 H.264 video, 0x0182 AAC audio (ADTS)\n",
-          "  2024-06-15 22:30:00  00:30:00  TV Ipê Móvel  Notícias em um Minuto\n",
-          "  start not known      -         TV Ipê HD     -\n", "  sections with a bad CRC          1\n"}) {
+          "  2024-06-15 22:30:00  2024-06-15 19:30:00  00:30:00  TV Ipê Móvel  Notícias em um Minuto\n",
+          "  start not known      -                    -         TV Ipê HD     -\n",
+          "  sections with a bad CRC          1\n"}) {
         EXPECT_THAT(summary, HasSubstr(line));
     }
 }
@@ -569,7 +574,7 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
         {{Path("text"), Path("text")}, 2, "", "usage: "},
         {{"--help"}, 0, "usage: ", ""},
         {{Path("missing")}, 1, "", "cannot be opened: No such file or directory"},
-        {{std::string(300, 'x')}, 1, "", "x: cannot be opened\n"},
+        {{std::string(300, 'x')}, 1, "", "x: cannot be opened: File name too long\n"},
         {{"--json", Path("empty")}, 1, "", "is empty"},
         {{Path("")}, 1, "", "is a directory"},
         {{Path("text")}, 1, "", "no transport stream packets in 9999 bytes"},
@@ -617,7 +622,7 @@ TEST_F(ReceiverFiles, LeavesNothingBehind) {
          VarnekPGL_DeleteThread, 4},
         {"semaphore", [](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); }, VarnekPGL_DeleteSemaphore,
          3},
-        {"mutex", VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex, 1},
+        {"mutex", VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex, 2},
     };
     const std::string expected = RunProgram({"--json", VARNEK_SAMPLE}).out;
     for (const auto &family : families) {
@@ -641,6 +646,29 @@ TEST_F(ReceiverFiles, LeavesNothingBehind) {
             family.remove(handle);
         }
     }
+}
+
+// The packets that the tables come from make a stream of their own, with the same tables.
+TEST_F(ReceiverFiles, CapturesAndStops) {
+    const std::string captured = Path("captured.ts");
+    const Result first = RunProgram({"--json", "--quiet", "--capture", captured, VARNEK_SAMPLE});
+    EXPECT_EQ(first.status, 0) << first.err;
+    const Result again = RunProgram({"--json", captured});
+    const auto tables = [](const Result &result) { return result.out.substr(result.out.find("\"sections\"")); };
+    EXPECT_EQ(tables(again), tables(first));
+    EXPECT_LT(ReadAll(captured).size(), SampleText().size());
+
+    EXPECT_EQ(RunProgram({"--capture", captured, captured}).status, 1) << "a stream is not overwritten";
+    EXPECT_EQ(RunProgram({"--capture", Path(""), captured}).status, 1);
+    const Result full = RunProgram({"--capture", "/dev/full", VARNEK_SAMPLE});
+    EXPECT_EQ(full.status, 1);
+    EXPECT_THAT(full.err, HasSubstr("the capture ended early: no space is left"));
+    EXPECT_THAT(full.out, HasSubstr("1600 packets")) << "the reading goes on";
+
+    const std::atomic<bool> stop{true};
+    std::FILE *nowhere = std::fopen("/dev/null", "w");
+    EXPECT_EQ(RunReceiver({VARNEK_SAMPLE}, nowhere, nowhere, &stop), 1) << "nothing was read yet";
+    std::fclose(nowhere);
 }
 
 bool IsUtf8(const std::string &text) {

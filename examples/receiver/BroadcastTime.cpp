@@ -3,7 +3,10 @@
 #include "BroadcastTime.h"
 
 #include <cstdio>
+#include <cstdlib>
 #include <tuple>
+
+#include "Varnek_Time.h"
 
 namespace receiver {
 namespace {
@@ -42,6 +45,26 @@ std::optional<DateTime> DecodeDateTime(uint16_t mjd, uint32_t bcd) {
     const int wrap = month >= 14 ? 1 : 0;
     return DateTime{1900 + year + wrap, month - 1 - wrap * 12, day - 14956 - year_days - month_days,
                     *time / 3600,       *time / 60 % 60,       *time % 60};
+}
+
+std::optional<DateTime> Shifted(const DateTime &time, int minutes) {
+    VarnekCDateTime point = {time.year, time.month, time.day, time.hour, time.minute, time.second};
+    const VarnekCDateTime span = {0, 0, 0, std::abs(minutes) / 60, std::abs(minutes) % 60, 0};
+    const uint32_t seconds = VarnekPGL_DateTimeToSeconds(&point);
+    // Outside the library's calendar a point counts as 0 seconds.
+    if (seconds == 0 || (minutes < 0 && seconds < span.GetElapsedSeconds())) {
+        return std::nullopt;
+    }
+    if (minutes < 0) {
+        point -= span;
+    } else {
+        point += span;
+    }
+    if (VarnekPGL_DateTimeToSeconds(&point) == 0) {
+        return std::nullopt;
+    }
+    return DateTime{point.iYear, point.iMonth,  point.iDay,
+                    point.iHour, point.iMinute, point.iSecond};
 }
 
 std::string ToText(const std::optional<DateTime> &time) {

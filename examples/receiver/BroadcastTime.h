@@ -15,14 +15,17 @@ struct DateTime {
 
 // A time of day or a duration: six decimal digits hhmmss.
 //   returns  seconds; nothing for a digit above 9 or 60 and more minutes or seconds, so also for
-//   all
-//            ones, which stand for a time that is not known
+//            all ones, which stand for a time that is not known
 std::optional<int> DecodeBcdTime(uint32_t bcd);
 
 // A day and a time of day.
 //   returns  nothing for a time that DecodeBcdTime refuses or of 24 hours and more, and for days
 //            before 1900-03-01, where the calendar rule that broadcasting uses begins
 std::optional<DateTime> DecodeDateTime(uint16_t mjd, uint32_t bcd);
+
+// The time that is `minutes` later, or earlier when they are negative.
+//   returns  nothing when either time lies outside 1970 to 2030
+std::optional<DateTime> Shifted(const DateTime &time, int minutes);
 
 // "YYYY-MM-DD hh:mm:ss" and "hh:mm:ss"; empty when not known.
 std::string ToText(const std::optional<DateTime> &time);

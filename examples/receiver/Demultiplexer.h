@@ -34,6 +34,9 @@ class Demultiplexer {
     // Takes the 188 bytes of the stream's next packet.
     void Push(const unsigned char *packet);
 
+    // Whether sections are taken from this PID at this point of the stream.
+    bool Follows(uint16_t pid) const { return assemblers_.count(pid) != 0; }
+
     const DemultiplexerCounters &Counters() const { return counters_; }
 
   private:

@@ -15,6 +15,11 @@ void JsonWriter::Number(const char *key, int64_t value) {
     out_ += std::to_string(value);
 }
 
+void JsonWriter::Boolean(const char *key, bool value) {
+    Member(key);
+    out_ += value ? "true" : "false";
+}
+
 void JsonWriter::Begin(const char *key, char open) {
     Member(key);
     out_ += open;

@@ -19,6 +19,7 @@ class JsonWriter {
     // Text must be well-formed UTF-8.
     void Text(const char *key, const std::string &value);
     void Number(const char *key, int64_t value);
+    void Boolean(const char *key, bool value);
     template <typename Integer>
     void Number(const char *key, const std::optional<Integer> &value) {
         if (value) {

@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "BroadcastTime.h"
+#include "Name.h"
 
 namespace receiver {
 
@@ -35,8 +36,8 @@ struct ProgramMap {    // a PMT
 struct ServiceInfo {  // an SDT entry
     uint16_t service_id;
     std::optional<uint8_t> type;
-    std::string provider;
-    std::string name;
+    Name provider;
+    Name name;
 };
 
 struct Event {
@@ -79,7 +80,7 @@ struct Model {
 
     std::optional<uint16_t> transport_stream_id;
     std::optional<uint16_t> network_id;
-    std::string network_name;
+    Name network_name;
     std::optional<DateTime> utc_time;  // the latest
     std::vector<LocalOffset> local_offsets;
     Sections<std::vector<Program>> pat;

@@ -1,12 +1,13 @@
 // Three threads in a chain, and one that collects what they found:
 //
-//   reader --packets--> demultiplexer --sections--> parser
+//   reader ==packets==> demultiplexer --sections--> parser
 //      \ counters           \ counters                 \ model, end
 //       +--------------------+--------------------------+---------> control <-- timer's ticks
 //
-// First the threads, then their messages, last the life of all in RunPipeline. An end message goes
-// down the chain behind the data, so whoever sees it has seen everything, and each thread's result
-// is with control before the end gets there.
+// Packets go through a ring, and a message says how many bytes came into it; everything else goes
+// with its message. First the threads, then their messages, last the life of all in RunPipeline. An
+// end message goes down the chain behind the data, so whoever sees it has seen everything, and each
+// thread's result is with control before the end gets there.
 #include "Pipeline.h"
 
 #include <cstring>
@@ -20,6 +21,7 @@
 #include "PacketSource.h"
 #include "Progress.h"
 #include "Tables.h"
+#include "Varnek_CRingBuffer.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
 #include "Varnek_Timer.h"
@@ -41,7 +43,12 @@ enum ThreadIndex { kControl, kParser, kDemultiplexer, kReader, kThreadCount };
 struct Pipeline {
     StreamFile &file;  // the reader's as long as that runs
     uint64_t size;     // of the file in bytes, 0 when it is not known
-    std::FILE *progress;
+    const PipelineOptions &options;
+
+    // As much as the batches that may wait. It neither waits nor takes half, so semaphores see to
+    // it that there is room. Made before the mutex: when the registry has no place left for the
+    // ring's own, there is none for ours either, and the pipeline does not start.
+    VarnekCRingBuffer ring{static_cast<int>(kBatchSize * kBatchesWaiting)};
 
     int32_t packet_room = -1;   // semaphore: batches that may still be sent to the demultiplexer
     int32_t section_room = -1;  // semaphore: the same, of sections to the parser
@@ -59,7 +66,7 @@ struct Pipeline {
 // A message hands its object over: who takes it out of the queue deletes it. None but messages
 // without an object may be left in a queue when its thread goes.
 enum class Kind : uint32_t {
-    kPackets,
+    kPackets,  // no object; its length is what came into the ring
     kSections,
     kPacketCounters,
     kSectionCounters,
@@ -68,17 +75,16 @@ enum class Kind : uint32_t {
     kEnd
 };
 
-using Packets = std::vector<unsigned char>;
-
 struct Section {
     uint16_t pid;
     std::vector<unsigned char> bytes;
 };
-using Sections = std::vector<Section>;
+using SectionBatch = std::vector<Section>;
 
 struct Message {
     Kind kind;
     void *object = nullptr;
+    uint32_t length = 0;  // of packets, in bytes
 };
 static_assert(sizeof(Message) <= sizeof(THREAD_MSG) && std::is_trivially_copyable_v<Message>);
 
@@ -125,20 +131,30 @@ void Wait(int32_t semaphore) {
 // Threads ----------------------------------------------------------------------------------------
 
 void RunReader(Pipeline &pipeline) {
-    Packets batch;
+    std::vector<unsigned char> batch;
+    batch.reserve(kBatchSize);
     const auto send_batch = [&] {
         Wait(pipeline.packet_room);
-        SendObject(pipeline.threads[kDemultiplexer], Kind::kPackets, std::exchange(batch, {}));
+        if (pipeline.ring.Write(batch.data(), static_cast<int>(batch.size())) != 0) {
+            throw std::bad_alloc();  // a ring without storage
+        }
+        const auto length = static_cast<uint32_t>(batch.size());
+        Send(pipeline.threads[kDemultiplexer], {Kind::kPackets, nullptr, length});
+        batch.clear();
     };
     PacketSource source([&](const unsigned char *packet) {
-        batch.reserve(kBatchSize);
         batch.insert(batch.end(), packet, packet + kPacketSize);
         if (batch.size() == kBatchSize) {
             send_batch();
         }
     });
     std::vector<unsigned char> block(kBlockSize);
-    while (const size_t count = pipeline.file.Read(block.data(), block.size())) {
+    const std::atomic<bool> *stop = pipeline.options.stop;
+    while (stop == nullptr || !*stop) {
+        const size_t count = pipeline.file.Read(block.data(), block.size());
+        if (count == 0) {
+            break;
+        }
         source.Feed(block.data(), count);
         VarnekPGL_AcquireMutex(pipeline.mutex);
         pipeline.bytes_read += count;
@@ -153,20 +169,29 @@ void RunReader(Pipeline &pipeline) {
 }
 
 void RunDemultiplexer(Pipeline &pipeline) {
-    Sections sections;
+    SectionBatch sections;
     Demultiplexer demultiplexer([&](uint16_t pid, const unsigned char *section, size_t size) {
         sections.push_back({pid, {section, section + size}});
     });
+    Capture *const capture = pipeline.options.capture;
+    std::vector<unsigned char> packets(kBatchSize);
     for (Message message = Receive(); message.kind != Kind::kEnd; message = Receive()) {
-        const Packets packets = Take<Packets>(message);
+        pipeline.ring.Read(packets.data(), static_cast<int>(message.length));
         VarnekPGL_SignalSemaphore(pipeline.packet_room);
-        for (size_t at = 0; at < packets.size(); at += kPacketSize) {
-            demultiplexer.Push(packets.data() + at);
+        for (size_t at = 0; at < message.length; at += kPacketSize) {
+            const unsigned char *packet = packets.data() + at;
+            demultiplexer.Push(packet);
+            if (capture != nullptr && demultiplexer.Follows(PidOf(packet))) {
+                capture->Push(packet);
+            }
         }
         if (!sections.empty()) {
             Wait(pipeline.section_room);
             SendObject(pipeline.threads[kParser], Kind::kSections, std::exchange(sections, {}));
         }
+    }
+    if (capture != nullptr) {
+        capture->Finish();
     }
     SendObject(pipeline.threads[kControl], Kind::kSectionCounters, demultiplexer.Counters());
     Send(pipeline.threads[kParser], {Kind::kEnd});
@@ -176,7 +201,7 @@ void RunParser(Pipeline &pipeline) {
     Model model;
     TableParser parser(model);
     for (Message message = Receive(); message.kind != Kind::kEnd; message = Receive()) {
-        const Sections sections = Take<Sections>(message);
+        const SectionBatch sections = Take<SectionBatch>(message);
         VarnekPGL_SignalSemaphore(pipeline.section_room);
         for (const Section &section : sections) {
             parser.Push(section.pid, section.bytes.data(), section.bytes.size());
@@ -200,7 +225,7 @@ void StartTimer(const Pipeline &pipeline) {
 }
 
 void RunControl(Pipeline &pipeline) {
-    ProgressLine line(pipeline.progress, pipeline.size);
+    ProgressLine line(pipeline.options.progress, pipeline.size);
     StartTimer(pipeline);
     for (Message message = Receive(); message.kind != Kind::kEnd; message = Receive()) {
         if (message.kind == Kind::kPacketCounters) {
@@ -267,7 +292,7 @@ std::string CreateObjects(Pipeline &pipeline) {
     if (pipeline.mutex == -1) {
         return "mutex ReceiverMutex";
     }
-    if (pipeline.progress != nullptr) {
+    if (pipeline.options.progress != nullptr) {
         pipeline.timer = VarnekPGL_CreateTimer("ReceiverTick");
         if (pipeline.timer == -1) {
             return "timer ReceiverTick";
@@ -292,8 +317,8 @@ void DeleteObjects(const Pipeline &pipeline) {
 
 }  // namespace
 
-std::string RunPipeline(StreamFile &file, std::FILE *progress, Report &report) {
-    Pipeline pipeline{file, file.Size(), progress};
+std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report &report) {
+    Pipeline pipeline{file, file.Size(), options};
     std::string missing = CreateObjects(pipeline);
     int started = 0;
     while (missing.empty() && started < kThreadCount) {
@@ -321,7 +346,9 @@ std::string RunPipeline(StreamFile &file, std::FILE *progress, Report &report) {
         VarnekPGL_DeleteThread(pipeline.threads[i]);
     }
     DeleteObjects(pipeline);
-    report = std::move(pipeline.report);
+    report.packets = pipeline.report.packets;
+    report.sections = pipeline.report.sections;
+    report.model = std::move(pipeline.report.model);
     return missing;
 }
 

@@ -2,20 +2,27 @@
 #ifndef RECEIVER_PIPELINE_H
 #define RECEIVER_PIPELINE_H
 
+#include <atomic>
 #include <cstdio>
 #include <string>
 
+#include "Capture.h"
 #include "Presentation.h"
 #include "StreamFile.h"
 
 namespace receiver {
 
+struct PipelineOptions {
+    std::FILE *progress = nullptr;            // a terminal for the progress line; null for none
+    Capture *capture = nullptr;               // an open capture; null for none
+    const std::atomic<bool> *stop = nullptr;  // ends the reading early when set; may be null
+};
+
 // Reads an open file to its end, in bounded memory. The threads and everything made for them are
 // gone when it returns, also on failure. Their names are fixed: one call at a time in a process.
-//   progress  a terminal for the progress line, which is erased at the end; null for none
-//   report    what was read
+//   report    what was read; the settings are left as they are
 //   returns   empty; else what could not be created, and nothing was read
-std::string RunPipeline(StreamFile &file, std::FILE *progress, Report &report);
+std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report &report);
 
 }  // namespace receiver
 

@@ -144,6 +144,28 @@ std::string NameOrDash(const std::string &name) {
     return name.empty() ? "-" : name;
 }
 
+// The offset that local times are shown with: the one for the receiver's nation, or else the first.
+const LocalOffset *OffsetFor(const Report &report) {
+    const std::vector<LocalOffset> &offsets = report.model.local_offsets;
+    const auto own = std::find_if(offsets.begin(), offsets.end(), [&](const LocalOffset &offset) {
+        return offset.country == report.settings.nation;
+    });
+    if (own != offsets.end()) {
+        return &*own;
+    }
+    return offsets.empty() ? nullptr : &offsets.front();
+}
+
+// Local time at a moment in UTC, with the offset that applies then; nothing when either is not
+// known.
+std::optional<DateTime> ToLocal(const std::optional<DateTime> &time, const LocalOffset *offset) {
+    if (!time || offset == nullptr) {
+        return std::nullopt;
+    }
+    const bool changed = offset->change && !(*time < *offset->change);
+    return Shifted(*time, changed ? offset->next_minutes : offset->minutes);
+}
+
 void AppendStream(const Report &report, std::string &out) {
     const Model &model = report.model;
     out += "Stream    ";
@@ -153,7 +175,10 @@ void AppendStream(const Report &report, std::string &out) {
     out +=
         Format("%llu packets of %u bytes\n",
                static_cast<unsigned long long>(report.packets.packets), report.packets.packet_size);
-    out += "Network   " + NameOrDash(model.network_name);
+    out += "Receiver  nation " + report.settings.nation;
+    out += report.settings.bml ? ", BML supported" : ", BML not supported";
+    out += Format(", standard type %d\n", report.settings.standard_type);
+    out += "Network   " + NameOrDash(model.network_name.Text());
     out += model.network_id ? Format(" (0x%04X)\n", *model.network_id) : "\n";
     out += "Clock     ";
     out += model.utc_time ? ToText(model.utc_time) + " UTC" : "-";
@@ -162,7 +187,8 @@ void AppendStream(const Report &report, std::string &out) {
         out += offset.region != 0 ? Format(" region %d ", offset.region) : " ";
         out += ToOffsetText(offset.minutes);
     }
-    out += '\n';
+    const std::optional<DateTime> local = ToLocal(model.utc_time, OffsetFor(report));
+    out += local ? ", local " + ToText(local) + "\n" : "\n";
 }
 
 // "one, two, three" over as many lines as it takes.
@@ -192,18 +218,19 @@ void AppendServices(const std::map<uint16_t, Service> &services, std::string &ou
     out += services.empty() ? "\nServices  none named\n" : "\nServices\n";
     size_t width = 0;
     for (const auto &entry : services) {
-        width =
-            std::max(width, entry.second.info != nullptr ? WidthOf(entry.second.info->name) : 0);
+        width = std::max(
+            width, entry.second.info != nullptr ? WidthOf(entry.second.info->name.Text()) : 0);
     }
     for (const auto &entry : services) {
         const Service &service = entry.second;
         out += Format("  0x%04X  ", entry.first);
-        out += Padded(service.info != nullptr ? NameOrDash(service.info->name) : "-", width);
+        out += Padded(service.info != nullptr ? NameOrDash(service.info->name.Text()) : "-", width);
         if (service.info != nullptr && service.info->type) {
             const char *type = NameOf(kServiceTypes, *service.info->type);
             out += "  ";
             out += type != nullptr ? type : Format("service type 0x%02X", *service.info->type);
-            out += service.info->provider.empty() ? "" : ", " + service.info->provider;
+            const std::string provider = service.info->provider.Text();
+            out += provider.empty() ? "" : ", " + provider;
         }
         out +=
             service.pmt_pid ? Format("  (PMT 0x%04X)\n", *service.pmt_pid) : "  (not in the PAT)\n";
@@ -213,8 +240,10 @@ void AppendServices(const std::map<uint16_t, Service> &services, std::string &ou
     }
 }
 
-void AppendEvents(const Model &model, const std::map<uint16_t, Service> &services,
+void AppendEvents(const Report &report, const std::map<uint16_t, Service> &services,
                   std::string &out) {
+    const Model &model = report.model;
+    const LocalOffset *offset = OffsetFor(report);
     const std::vector<EventEntry> events = SortEvents(model);
     std::vector<EventEntry> shown;
     for (const EventEntry entry : events) {
@@ -228,17 +257,20 @@ void AppendEvents(const Model &model, const std::map<uint16_t, Service> &service
     }
     const auto name_of = [&services](EventEntry entry) {
         const ServiceInfo *info = services.at(entry->first.first).info;
-        return info != nullptr && !info->name.empty() ? info->name
-                                                      : Format("0x%04X", entry->first.first);
+        const std::string name = info != nullptr ? info->name.Text() : "";
+        return !name.empty() ? name : Format("0x%04X", entry->first.first);
     };
     size_t width = 0;
     for (const EventEntry entry : shown) {
         width = std::max(width, WidthOf(name_of(entry)));
     }
-    out += "\nEvents (UTC)\n";
+    out += offset != nullptr ? "\nEvents (UTC, local time)\n" : "\nEvents (UTC)\n";
     for (const EventEntry entry : shown) {
         const Event &event = entry->second;
         out += "  " + Padded(event.start ? ToText(event.start) : "start not known", 19) + "  ";
+        if (offset != nullptr) {
+            out += Padded(NameOrDash(ToText(ToLocal(event.start, offset))), 19) + "  ";
+        }
         out += Padded(NameOrDash(ToText(event.duration)), 8) + "  ";
         out += Padded(name_of(entry), width) + "  " + NameOrDash(event.name) + '\n';
     }
@@ -300,8 +332,8 @@ void WriteServices(const Model &model, JsonWriter &json) {
         const ServiceInfo *info = service.info;
         json.BeginObject(nullptr);
         json.Number("id", entry.first);
-        json.Text("name", info != nullptr ? info->name : "");
-        json.Text("provider", info != nullptr ? info->provider : "");
+        json.Text("name", info != nullptr ? info->name.Text() : "");
+        json.Text("provider", info != nullptr ? info->provider.Text() : "");
         json.Number("type", info != nullptr ? info->type : std::nullopt);
         json.Number("pmt_pid", service.pmt_pid);
         json.Number("pcr_pid",
@@ -321,14 +353,15 @@ void WriteServices(const Model &model, JsonWriter &json) {
     json.EndArray();
 }
 
-void WriteEvents(const Model &model, JsonWriter &json) {
+void WriteEvents(const Report &report, JsonWriter &json) {
     json.BeginArray("events");
-    for (const EventEntry entry : SortEvents(model)) {
+    for (const EventEntry entry : SortEvents(report.model)) {
         const Event &event = entry->second;
         json.BeginObject(nullptr);
         json.Number("service_id", entry->first.first);
         json.Number("event_id", entry->first.second);
         json.Text("start", ToText(event.start));
+        json.Text("local_start", ToText(ToLocal(event.start, OffsetFor(report))));
         json.Text("duration", ToText(event.duration));
         json.Text("name", event.name);
         json.Text("text", event.text);
@@ -358,7 +391,7 @@ std::string ToSummary(const Report &report) {
     std::string out;
     AppendStream(report, out);
     AppendServices(services, out);
-    AppendEvents(report.model, services, out);
+    AppendEvents(report, services, out);
     AppendCounters(report, out);
     AppendTables(report.sections, out);
     return out;
@@ -391,12 +424,16 @@ std::string ToJson(const Report &report) {
     json.EndObject();
     json.Number("transport_stream_id", model.transport_stream_id);
     json.Number("network_id", model.network_id);
-    json.Text("network_name", model.network_name);
+    json.Text("network_name", model.network_name.Text());
     json.Text("utc_time", ToText(model.utc_time));
+    json.Text("local_time", ToText(ToLocal(model.utc_time, OffsetFor(report))));
     WriteLocalOffsets(model, json);
     WriteServices(model, json);
-    WriteEvents(model, json);
+    WriteEvents(report, json);
     json.Number("events_left_out", count(model.events_left_out));
+    json.Number("standard_type", report.settings.standard_type);
+    json.Text("nation", report.settings.nation);
+    json.Boolean("bml", report.settings.bml);
     json.EndObject();
     return json.Out() + '\n';
 }

@@ -10,7 +10,15 @@
 
 namespace receiver {
 
+// What the receiver is set up for, from the library's configuration.
+struct Settings {
+    int standard_type = 2;
+    std::string nation = "BRA";
+    bool bml = false;  // whether that nation has BML data broadcasting
+};
+
 struct Report {
+    Settings settings;
     PacketCounters packets;
     DemultiplexerCounters sections;
     Model model;

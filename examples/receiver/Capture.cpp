@@ -1,0 +1,67 @@
+// Packets are written a block at a time, since each write of the library is a system call.
+#include "Capture.h"
+
+#include "PacketSource.h"
+#include "Varnek_File.h"
+
+namespace receiver {
+namespace {
+
+constexpr size_t kBlockSize = 256 * kPacketSize;
+
+const char *Explain(int32_t result) {
+    switch (result) {
+        case -28:
+            return "no space is left";
+        case -27:
+            return "the file would become too large";
+        case -5:
+            return "the device failed";
+        default:
+            return "it could not be written";
+    }
+}
+
+}  // namespace
+
+Capture::~Capture() {
+    if (file_ >= 0) {
+        VarnekPGL_CloseFile64Bits(file_);
+    }
+}
+
+bool Capture::Open(const std::string &path) {
+    // The open of a large file never truncates.
+    if (VarnekPGL_WriteFile(path.c_str(), "", 0) != 0) {
+        return false;
+    }
+    file_ = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_WRITE);
+    return file_ >= 0;
+}
+
+void Capture::Push(const unsigned char *packet) {
+    if (!failure_.empty()) {
+        return;
+    }
+    waiting_.insert(waiting_.end(), packet, packet + kPacketSize);
+    if (waiting_.size() >= kBlockSize) {
+        Write();
+    }
+}
+
+void Capture::Finish() {
+    if (failure_.empty() && !waiting_.empty()) {
+        Write();
+    }
+}
+
+void Capture::Write() {
+    const auto size = static_cast<uint32_t>(waiting_.size());
+    const int32_t result = VarnekPGL_WriteFileByHandle64Bits(file_, waiting_.data(), size);
+    if (result != static_cast<int32_t>(size)) {
+        failure_ = Explain(result);
+    }
+    waiting_.clear();
+}
+
+}  // namespace receiver

@@ -1,0 +1,42 @@
+// A second file, into which the packets go that the receiver's tables come from.
+#ifndef RECEIVER_CAPTURE_H
+#define RECEIVER_CAPTURE_H
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace receiver {
+
+// One thread writes to it; the result is asked for when that is through.
+class Capture {
+  public:
+    Capture() = default;
+    Capture(const Capture &) = delete;
+    Capture &operator=(const Capture &) = delete;
+    ~Capture();
+
+    // Empties or creates the file.
+    //   returns  false when it cannot be written
+    bool Open(const std::string &path);
+    bool IsOpen() const { return file_ >= 0; }
+
+    // Takes the 188 bytes of a packet. The first failure ends the capture.
+    void Push(const unsigned char *packet);
+    void Finish();
+
+    //   returns  empty; else why the capture ended early
+    const std::string &Failure() const { return failure_; }
+
+  private:
+    void Write();
+
+    int32_t file_ = -1;
+    std::vector<unsigned char> waiting_;
+    std::string failure_;
+};
+
+}  // namespace receiver
+
+#endif
