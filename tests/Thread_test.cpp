@@ -150,6 +150,35 @@ TEST_F(Thread, ADuplicateTakesTheRecord) {
                                           "***** END : VarnekPGL_DeleteThread, 0"));
 }
 
+TEST_F(Thread, AWaitersRecordIsReplacedInAFullTable) {
+    const auto wait = [](void *) -> void * {
+        THREAD_MSG message;
+        int32_t count = 0;
+        VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count);
+        return nullptr;
+    };
+    for (int i = 0; i < 20; i++) {
+        ASSERT_NE(VarnekPGL_CreateThread(std::to_string(i).c_str(), 1, 65536, wait, nullptr), -1);
+    }
+    for (int i = 0; i < 200; i++) {
+        ASSERT_EQ(VarnekPGL_CreateThread("7", 1, 65536, wait, nullptr), 21 + i);
+    }
+    for (int i = 0; i < 20; i++) {
+        EXPECT_TRUE(VarnekPGL_DeleteThread(VarnekPGL_GetThreadByName(std::to_string(i).c_str())));
+    }
+}
+
+TEST_F(Thread, AThreadFindsItselfFirstOfAll) {
+    std::atomic<int> missed{0};
+    for (int i = 0; i < 2000; i++) {
+        Worker worker([&missed] {
+            const int32_t byName = VarnekPGL_GetThreadByName("worker");
+            missed += byName == -1 || byName != VarnekPGL_GetCurrentThread();
+        });
+    }
+    EXPECT_EQ(missed, 0);
+}
+
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
     // Gives every thread the time to find that there is no guard yet.
     gLogHook = [](const LogLine &line) {

@@ -125,6 +125,30 @@ TEST_F(Timer, ACancelledStartNeverCallsBack) {
     EXPECT_THAT(TakeErrors(), IsEmpty());
 }
 
+TEST_F(Timer, ALateDeliveryMakesNoSecondCall) {
+    // Holds the first delivery until a later start has expired too.
+    static std::atomic<int> deliveries{0};
+    static std::atomic<bool> held{true};
+    gLogHook = [](const LogLine &line) {
+        if (line.text.find("Timer Callback: Timer") != std::string::npos && deliveries++ == 0) {
+            Eventually([] { return !held; });
+        }
+    };
+    VarnekPGL_CreateTimer("timer");
+    Expiries first;
+    Expiries second;
+    EXPECT_TRUE(VarnekPGL_StartTimer(0, 1, CountExpiry, &first));
+    EXPECT_TRUE(Eventually([] { return deliveries == 1; }));
+    EXPECT_TRUE(VarnekPGL_CancelTimer(0));
+    EXPECT_TRUE(VarnekPGL_StartTimer(0, 1, CountExpiry, &second));
+    EXPECT_TRUE(Eventually([&] { return second.count == 1; }));
+    held = false;
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
+    EXPECT_EQ(first.count, 0);
+    EXPECT_EQ(second.count, 1);
+    gLogHook = nullptr;
+}
+
 TEST_F(Timer, ACallbackMayUseItsOwnTimer) {
     static std::atomic<int> rounds{0};
     VarnekPGL_CreateTimer("timer");

@@ -2,7 +2,8 @@
 //
 // Handles start at 1, rise by one with every creation and are never given out twice; mutexes and
 // semaphores count apart. Names have 1 to 31 characters and compare exactly. Any thread may call
-// any operation, and no call is needed to set the tables up. Every failure is one Error trace.
+// any operation, and no call is needed to set the tables up. A failure is
+// traced at Error; a time-out and a name that is not found are none.
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H
 

@@ -1,8 +1,10 @@
 // The registry of named threads, and the message queue that each of them owns.
 //
 // A thread is a detached OS thread; the registry keeps the record through which it is known and
-// reached, and never stops, joins or cancels it. 20 records; names have 1 to 31 characters, compare
-// exactly and are unique. Any thread may call any operation. Every failure is traced at Error.
+// reached, and never stops, joins or cancels it. A thread must not be cancelled inside a call of
+// this library. 20 records; names have 1 to 31 characters, compare exactly and are unique, unless
+// two threads create one at the same moment. Any thread may call any operation. A failure is traced
+// at Error; a name that is not found is none.
 #ifndef VARNEK_THREAD_H
 #define VARNEK_THREAD_H
 

@@ -30,7 +30,15 @@ class SlotTable {
             return -1;
         }
         const int hint = HintOf(handle).load(std::memory_order_relaxed);
-        return IsLive(hint, handle) ? hint : ScanForHandle(handle);
+        if (IsLive(hint, handle)) {
+            return hint;
+        }
+        const int slot = ScanForHandle(handle);
+        // A hint left by a handle that is gone is mended; two live ones leave it to one of them.
+        if (slot != -1 && &HintOf(HandleOf(hint)) != &HintOf(handle)) {
+            HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
+        }
+        return slot;
     }
 
     // The handle of the lowest live slot of this name, kInvalidHandle for none and for null.
@@ -124,16 +132,13 @@ class SlotTable {
         }
     }
 
-    std::atomic<uint8_t> &HintOf(int32_t handle) {
-        return hints_[static_cast<uint32_t>(handle) % kHints];
-    }
-    const std::atomic<uint8_t> &HintOf(int32_t handle) const {
+    std::atomic<uint8_t> &HintOf(int32_t handle) const {
         return hints_[static_cast<uint32_t>(handle) % kHints];
     }
 
     Slot slots_[kSlots];
     std::atomic<uint32_t> names_[kSlots][kNameWords];
-    std::atomic<uint8_t> hints_[kHints];
+    mutable std::atomic<uint8_t> hints_[kHints];
 };
 
 #endif

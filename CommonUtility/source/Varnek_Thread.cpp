@@ -16,6 +16,7 @@
 #include "Varnek_Semaphore.h"
 #include "Varnek_SlotTable.h"
 #include "Varnek_Support.h"
+#include "Varnek_Timer.h"
 #include "Varnek_Trace.h"
 
 static_assert(sizeof(THREAD_MSG) == 40, "every module of the stack counts on this size");
@@ -36,6 +37,7 @@ struct THREAD_MGR_INFO {
 };
 
 constexpr uint32_t kRemoved = 0x80000000u;
+constexpr int kLeaveTries = 1000;  // of a millisecond
 
 SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE> gThreadInfoArr;
 std::atomic<int32_t> gThreadInfoArrSize{0};
@@ -55,6 +57,14 @@ int32_t Guard() {
     return guard != kGuardInTheMaking ? guard : kNoGuard;
 }
 
+// Ends a removal that found no record. A guard that does not exist yet is released all the same, so
+// that both of its lines are in the log; one that the system refused is not ours to release.
+void ReleaseGuard(int32_t guard, bool held) {
+    if (held || guard == kNoGuard) {
+        VarnekPGL_ReleaseMutex(guard);
+    }
+}
+
 // Makes the guard on first use. Of several threads one makes it and the others wait that moment,
 // since a second mutex of its name would destroy the first.
 bool EnsureGuard() {
@@ -70,6 +80,30 @@ bool EnsureGuard() {
         }
         sched_yield();
     }
+}
+
+// Holds the guard, but only while a thread is starting: a lookup finds the record of every thread
+// that was running when it began, the calling one included.
+class StartedThreads {
+  public:
+    StartedThreads()
+        : held_(gThreadStarting.load(std::memory_order_acquire) &&
+                VarnekPGL_AcquireMutex(Guard()) != FALSE) {}
+    ~StartedThreads() {
+        if (held_) {
+            VarnekPGL_ReleaseMutex(Guard());
+        }
+    }
+    StartedThreads(const StartedThreads &) = delete;
+    StartedThreads &operator=(const StartedThreads &) = delete;
+
+  private:
+    const bool held_;
+};
+
+int32_t HandleOfName(const char *szThreadName) {
+    const StartedThreads started;
+    return gThreadInfoArr.FindByName(szThreadName);
 }
 
 // Users of a record ------------------------------------------------------------------------------
@@ -168,7 +202,7 @@ void __Varnek_delete_thread_info(int32_t hThread) {
     const int slot = held ? gThreadInfoArr.FindByHandle(hThread) : -1;
     if (slot == -1) {
         TRACE_ERROR("***** %s : Can't find thread info. thread handle = [%d]", __func__, hThread);
-        VarnekPGL_ReleaseMutex(guard);
+        ReleaseGuard(guard, held);
         return;
     }
     const int32_t count = Remove(slot, __func__, VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON);
@@ -218,11 +252,11 @@ int32_t StartRecord(int slot, const char *szThreadName, int32_t priority, uint32
                            VarnekPGL_SysGetLastErro());
     }
     list_initialize(&info.MsgQ);
-    gThreadStarting.store(true, std::memory_order_relaxed);
+    gThreadStarting.store(true, std::memory_order_release);
     pthread_t linuxThread = {};
     const int result = StartThread(&linuxThread, priority, stackSize, function, argument);
     if (result != 0) {
-        gThreadStarting.store(false, std::memory_order_relaxed);
+        gThreadStarting.store(false, std::memory_order_release);
         TRACE_ERROR("***** __Varnek_create_thread : pthread creation FAIL!! errCode = [%d]",
                     result);
         sem_destroy(&info.msgQSem);
@@ -264,7 +298,7 @@ int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint3
             -1, "***** __Varnek_create_thread : Thread pool is full. gThreadInfoArrSize = [%d]",
             count);
     }
-    if (gThreadInfoArr.FindByName(szThreadName) != kInvalidHandle) {
+    if (HandleOfName(szThreadName) != kInvalidHandle) {
         return VARNEK_FAIL(-1,
                            "***** __Varnek_create_thread : Duplicated thread. thread name = [%s]",
                            szThreadName);
@@ -274,7 +308,19 @@ int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint3
     if (VarnekPGL_AcquireMutex(guard) == FALSE) {
         return -1;
     }
-    const int slot = FirstUnused();
+    int slot = FirstUnused();
+    // A removed record is free once its last visitor has left, which takes a moment.
+    for (int i = 0;
+         i < kLeaveTries && slot == -1 &&
+         gThreadInfoArrSize.load(std::memory_order_relaxed) < MAX_THREAD_MGR_INFO_ARR_SIZE;
+         i++) {
+        VarnekPGL_ReleaseMutex(guard);
+        VarnekPGL_MSleep(1);
+        if (VarnekPGL_AcquireMutex(guard) == FALSE) {
+            return -1;
+        }
+        slot = FirstUnused();
+    }
     if (slot == -1) {
         TRACE_ERROR("***** __Varnek_create_thread : Can't find empty index!!!!");
         VarnekPGL_ReleaseMutex(guard);
@@ -296,6 +342,7 @@ int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint3
 // The handle of the newest record with this thread id, since the system reuses the ids of threads
 // that ended; -1 for none. The handle is read before and after, as in a lookup by name.
 int32_t HandleOfThread(pthread_t linuxThread) {
+    const StartedThreads started;
     int32_t newest = kInvalidHandle;
     for (int slot = 0; slot < MAX_THREAD_MGR_INFO_ARR_SIZE; slot++) {
         const int32_t hHandle = gThreadInfoArr.HandleOf(slot);
@@ -314,7 +361,7 @@ int32_t HandleOfThread(pthread_t linuxThread) {
 int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t priority, uint32_t stackSize,
                                void *(*function)(void *), void *argument) {
     TRACE_LOW("***** START : __Varnek_get_thread_by_name, szThreadName=[%s]", Shown(szThreadName));
-    const int32_t hOld = gThreadInfoArr.FindByName(szThreadName);
+    const int32_t hOld = HandleOfName(szThreadName);
     if (hOld != kInvalidHandle) {
         TRACE_LOW("***** END : __Varnek_get_thread_by_name. thread handle = [%d]\n", hOld);
         TRACE_ERROR("szThreadName=[%s]. Duplicated Thread. Old one will be destroyed!\n",
@@ -339,7 +386,7 @@ BOOL VarnekPGL_DeleteThread(int32_t hThread) {
     if (slot == -1) {
         TRACE_ERROR("***** VarnekPGL_DeleteThread : Can't find thread info. thread handle = [%d]",
                     hThread);
-        VarnekPGL_ReleaseMutex(guard);
+        ReleaseGuard(guard, held);
         return FALSE;
     }
     const int32_t count = Remove(slot, __func__, VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON);
@@ -350,7 +397,7 @@ BOOL VarnekPGL_DeleteThread(int32_t hThread) {
 
 int32_t VarnekPGL_GetThreadByName(const char *szThreadName) {
     TRACE_LOW("***** START : VarnekPGL_GetThreadByName, szThreadName=[%s]", Shown(szThreadName));
-    const int32_t hThread = gThreadInfoArr.FindByName(szThreadName);
+    const int32_t hThread = HandleOfName(szThreadName);
     if (hThread != kInvalidHandle) {
         TRACE_LOW("***** END : VarnekPGL_GetThreadByName. thread handle = [%d]", hThread);
     }
@@ -360,17 +407,7 @@ int32_t VarnekPGL_GetThreadByName(const char *szThreadName) {
 int32_t VarnekPGL_GetCurrentThread() {
     const pthread_t self = pthread_self();
     TRACE_LOW("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]", static_cast<int>(self));
-    int32_t hThread = kInvalidHandle;
-    if (!gThreadStarting.load(std::memory_order_acquire)) {
-        hThread = HandleOfThread(self);
-    } else {
-        // This may be the thread that is starting, and a record with its id may be left of a thread
-        // that ended: the creator holds the guard until the right one is visible.
-        const int32_t guard = Guard();
-        VarnekPGL_AcquireMutex(guard);
-        hThread = HandleOfThread(self);
-        VarnekPGL_ReleaseMutex(guard);
-    }
+    const int32_t hThread = HandleOfThread(self);
     if (hThread == kInvalidHandle) {
         return VARNEK_FAIL(
             -1, "***** VarnekPGL_GetCurrentThread : Can't find thread Info. pthreadID = [%d]",

@@ -22,6 +22,7 @@ struct TIMER_MGR_INFO {
     TimerCallbackFunc pfnCallback;  // null until the first start
     void *pUserData;
     bool bTimerCreated;
+    bool bAwaited;  // the last start has not called back yet
 };
 
 // All guarded by gTimerArrLock.
@@ -104,7 +105,7 @@ void TimerCallbackEntry(sigval value) {
         return;
     }
     TableGuard guard;
-    const TIMER_MGR_INFO *info = FindTimer(timer);
+    TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
         TRACE_ERROR("Timer Callback! But Timer isn't used! timer=[%d]", static_cast<int>(timer));
         return;
@@ -113,11 +114,14 @@ void TimerCallbackEntry(sigval value) {
         TRACE_ERROR("Timer Callback! But Timer Callback Function is NULL!");
         return;
     }
-    // An armed timer has not expired: this is the late delivery of an earlier start.
+    // A late delivery of an earlier start finds the timer armed or called off, or takes the place
+    // of the last start's own delivery, which then finds nobody waiting for it: at most one call a
+    // start, and never early.
     bool armed = false;
-    if (info->bTimerCreated && ReadArmed(*info, &armed) == 0 && armed) {
+    if (!info->bAwaited || (info->bTimerCreated && ReadArmed(*info, &armed) == 0 && armed)) {
         return;
     }
+    info->bAwaited = false;
     const TimerCallbackFunc pfnCallback = info->pfnCallback;
     void *pUserData = info->pUserData;
     guard.Release();
@@ -207,6 +211,7 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
     // An expiry in between waits for the lock and then finds these.
     info->pfnCallback = callback;
     info->pUserData = userData;
+    info->bAwaited = true;
     guard.Release();
     TRACE_MID("END: VarnekPGL_StartTimer. Success!");
     return TRUE;
@@ -215,7 +220,7 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
 BOOL VarnekPGL_CancelTimer(uint32_t timer) {
     TRACE_LOW("START: VarnekPGL_CancelTimer. timer=[%d]", static_cast<int>(timer));
     TableGuard guard;
-    const TIMER_MGR_INFO *info = FindTimer(timer);
+    TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
         // A free slot's name is empty, and no other handle has a name.
         return VARNEK_FAIL(FALSE, "VarnekPGL_CancelTimer. Invalid Timer Handle=[%d]..name = %s",
@@ -238,6 +243,8 @@ BOOL VarnekPGL_CancelTimer(uint32_t timer) {
         const int error = VarnekPGL_SysGetLastErro();
         return VARNEK_FAIL(FALSE, "VarnekPGL_CancelTimer. Set Timer FAIL. errCode = [%d][%s]",
                            error, ErrorText(error));
+    } else {
+        info->bAwaited = false;
     }
     guard.Release();
     TRACE_MID("END: VarnekPGL_CancelTimer. timer=[%d]", static_cast<int>(timer));
