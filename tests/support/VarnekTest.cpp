@@ -21,8 +21,9 @@ constexpr char kEverythingOn[] =
     "Common=1\nJNI=1\nMainControl=1\nESG=1\nSessionManager=1\nSectionParser=1\nDsmccDC=1\n"
     "DsmccOC=1\nTsDemux=1\nCPRM=1\nSMPlayer=1\nGingaAppMgr=1\n";
 
-std::mutex gLogLock;
-std::vector<LogLine> gLog;
+// Never destroyed: a detached thread may still log while the process ends.
+std::mutex &gLogLock = *new std::mutex;
+std::vector<LogLine> &gLog = *new std::vector<LogLine>;
 
 // Other tests may be reading the file, so it is put in place whole.
 void PutDefaultConfig() {
