@@ -1,5 +1,5 @@
 // CRC-32 over memory, sections and stored files. The register takes 16 bytes a step through 16
-// tables where there is cache for them, then 4, then single bytes; bytes are combined by value, so
+// tables where there is room for them, then 4, then single bytes; bytes are combined by value, so
 // neither the byte order of the machine nor the alignment of the data matters.
 #include "Varnek_Util.h"
 
@@ -17,8 +17,8 @@ constexpr int32_t kTrailer = 4;     // bytes of a stored CRC
 constexpr int32_t kMinPayload = 4;  // bytes that a stored CRC covers at least
 
 // A table is 1 KiB. On the 32-bit target 16 would be half of the first cache and a quarter of the
-// library, for sections of a few hundred bytes.
-constexpr int kTables = sizeof(void *) == 8 ? 16 : 4;
+// library, for sections of a few hundred bytes at a megabyte or two a second.
+constexpr int kTables = sizeof(void *) == 8 ? 16 : 1;
 
 // word[n][i] is the register after byte i in its top 8 bits and n more bytes of 0.
 struct CrcTables {
@@ -85,9 +85,9 @@ uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t length) {
             crc = Shifted<12>(crc ^ BigEndian(data)) ^ Shifted<8>(BigEndian(data + 4)) ^
                   Shifted<4>(BigEndian(data + 8)) ^ Shifted<0>(BigEndian(data + 12));
         }
-    }
-    for (; length >= 4; length -= 4, data += 4) {
-        crc = Shifted<0>(crc ^ BigEndian(data));
+        for (; length >= 4; length -= 4, data += 4) {
+            crc = Shifted<0>(crc ^ BigEndian(data));
+        }
     }
     for (; length > 0; --length, ++data) {
         crc = kCrc.word[0][*data ^ crc >> 24] ^ crc << 8;

@@ -25,6 +25,6 @@ set(CMAKE_C_FLAGS_INIT "-mthumb -nostdlibinc -D__ARM_PCS_VFP -isystem ${headers}
 set(CMAKE_CXX_FLAGS_INIT "-mthumb -nostdlibinc -D__ARM_PCS_VFP -isystem ${cxx_headers} \
 -isystem ${cxx_headers}/arm-linux-gnueabihf -isystem ${headers}")
 set(CMAKE_SHARED_LINKER_FLAGS_INIT
-    "-nostdlib -fuse-ld=/usr/bin/arm-linux-gnueabihf-ld -L${CMAKE_CURRENT_LIST_DIR}/../../../../build/ndk")
+    "-nostdlib -Wno-unused-command-line-argument -fuse-ld=/usr/bin/arm-linux-gnueabihf-ld -L${CMAKE_CURRENT_LIST_DIR}/../../../../build/ndk")
 set(CMAKE_C_STANDARD_LIBRARIES -lc)
 set(CMAKE_CXX_STANDARD_LIBRARIES -lc)
