@@ -49,8 +49,8 @@ class Input {
     int Below(int limit) { return Byte() % limit; }
     // Mostly small, now and then of any size.
     int Int() {
-        const int small = static_cast<int8_t>(Byte());
-        return small != INT8_MIN ? small : static_cast<int>(uint32_t{Byte()} << 24 | Byte());
+        const int byte = Byte();
+        return byte != 128 ? (byte < 128 ? byte : byte - 256) : static_cast<int>(uint32_t{Byte()} << 24 | Byte());
     }
     // Up to `limit` bytes, in a block of exactly their size, so that a sanitizer sees one too many.
     template <typename Char = uint8_t>

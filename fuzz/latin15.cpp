@@ -8,7 +8,7 @@
 #include "Varnek_LngPack.h"
 
 int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
-    static const iconv_t converter = iconv_open("UTF-8", "ISO-8859-15");
+    static iconv_t converter = iconv_open("UTF-8", "ISO-8859-15");
     CHECK(reinterpret_cast<intptr_t>(converter) != -1);
     Input input(data, size);
     const unsigned int stated = input.Byte() == 0 ? UINT32_MAX : input.Byte();

@@ -96,11 +96,13 @@ bool Receive(Worker &me, bool peek) {
 void UseSharedObjects(Worker &me) {
     CHECK(VarnekPGL_AcquireMutex(gMutex) == TRUE);
     const int64_t before = gGuarded;
+    std::this_thread::yield();
     gGuarded = before + 1;
     CHECK(VarnekPGL_ReleaseMutex(gMutex) == TRUE);
     ++me.locks;
     if (VarnekPGL_WaitSemaphore(gSemaphore, static_cast<uint32_t>(me.Below(2))) == TRUE) {
         CHECK(++gUnitsTaken <= kUnits);
+        std::this_thread::yield();
         --gUnitsTaken;
         CHECK(VarnekPGL_SignalSemaphore(gSemaphore) == TRUE);
         ++me.units;

@@ -22,7 +22,7 @@ struct Fields {
 inline Fields FieldsOf(const VarnekCRingBuffer &ring) {
     Fields fields;
     static_assert(sizeof fields == sizeof ring);
-    memcpy(&fields, &ring, sizeof fields);
+    memcpy(&fields, static_cast<const void *>(&ring), sizeof fields);
     return fields;
 }
 
