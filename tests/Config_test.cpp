@@ -122,6 +122,7 @@ TEST_F(ConfigAlone, TheNationComesFromFileThenPlatformThenDefault) {
         {"", "BRA", none + "TAG in " + set},
         {"nation:PHL", "BRA", none + "TAG in " + set},
         {"NATION:PH", "BRA", none + "TAG in " + set},
+        {"NATION:P\nL", "BRA", none + "TAG in " + set},
         {"a,NATION:PHL,NATION:ARG", "PHL", "found nation in TARN = PHL"},
         {"NATION:phl", "phl", "found nation in TARN = phl"},
     };

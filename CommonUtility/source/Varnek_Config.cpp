@@ -266,7 +266,8 @@ const char *VarnekCfg_GetSupportNation() {
     }
     const char *tag = strstr(feature, kNationTag);
     const char *code = tag != nullptr ? tag + strlen(kNationTag) : "";
-    if (strlen(code) < kNationLength) {
+    // A line end is in no code: the record's file could not hold it.
+    if (strcspn(code, "\r\n") < kNationLength) {
         CopyText(nation, kDefaultNation, kNationLength);
         TRACE_ERROR("%s can't find Nation TAG in TARN feature. so set default nation(BRA)",
                     __func__);
