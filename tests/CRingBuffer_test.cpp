@@ -33,7 +33,7 @@ auto Apply(Ring &ring, std::mt19937 random) {
     std::generate(data.begin(), data.end(), random);
     const int result = operation == 0   ? ring.Flush()
                        : operation == 1 ? ring.Reset(n)
-                       : operation < 5  ? ring.Seek(n, operation % 5 - 1 + (n < 0 ? 2 : 0))
+                       : operation < 5  ? ring.Seek(n, operation - 2 + (n < 0 ? 1 : 0))
                        : operation < 10 ? ring.Read(data.data(), n)
                                         : ring.Write(data.data(), n);
     return std::make_tuple(result, data, ring.GetSpaceReading(), ring.GetSpaceWriting(), ring.GetDistance());
