@@ -87,7 +87,7 @@ TEST_F(DebugAlone, ALineEnablesByTheFirstKeyInIt) {
         {"1 LogToUSB\nError=10\nxCommon 1", 0x80000001, 0x40000001},
         {"LogToUSB=1\n#Error=1\nHigh=1\nCommon=1", 0x40000001, 0x80000001},
         {"LogToUSB=1\nErrorHigh=1\nCommon=1", 0x80000001, 0x40000001},
-        {"LogToUSB=1\nError=0\nHigh=1\nCommon=1", 0x40000001, 0x80000001},
+        {"LogToUSB=1\nError=0\nerror=1\nHigh=1\nCommon=1", 0x40000001, 0x80000001},
         {"\nLogToUSB=1\nError=1\nCommon=1", 0, 0x80000001},
         {"LogToUSB=1\r\n\r\n\nError=1\rCommon=1", 0x80000001, 0x10000001},
         {"LogToUSB=1\nError=1\nGingaAppMgr=1", 0x80000400, 0x80000800},

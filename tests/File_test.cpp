@@ -83,6 +83,7 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
         {VarnekPGL_ReadFileByHandle(0, buffer, 1), 0, {"VarnekPGL_ReadFileByHandle : NULL file pointer"}},
         {VarnekPGL_WriteFileByHandle(0, buffer, 1), 0, {"VarnekPGL_WriteFileByHandle : NULL file pointer"}},
         {VarnekPGL_WriteFileByHandle(writer, nullptr, 1), 0, {"VarnekPGL_WriteFileByHandle : NULL buffer"}},
+        {VarnekPGL_ReadFileByHandle(writer, nullptr, 1), 0, {"VarnekPGL_ReadFileByHandle : NULL buffer"}},
         {VarnekPGL_ReadFileByHandle(writer, buffer, 8), 0, {}},
         {VarnekPGL_GetFileSizeByHandle(0),
          -1,
@@ -103,6 +104,7 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
          {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[/no/dir]",
           "VarnekPGL_AppendFile : File doesn't exist! file path=[/no/dir]"}},
         {VarnekPGL_WriteFile(Path("w").c_str(), nullptr, 1), 0, {"VarnekPGL_WriteFile : NULL buffer"}},
+        {VarnekPGL_AppendFile(Path("w").c_str(), nullptr, 1), -1, {"VarnekPGL_AppendFile : NULL buffer"}},
     });
     VarnekPGL_CloseFile(full);
     VarnekPGL_CloseFile(writer);
@@ -293,6 +295,7 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
          {openFail, gone, "VarnekPGL_ClearDir : Directory Deletion Fail. Dir Path=[" + none + "]"}},
         {VarnekPGL_CheckDir(none.c_str()), FALSE, {openFail}},
         {__VarnekPGL_ReadDir(nullptr, nullptr), FALSE, {"__VarnekPGL_ReadDir : pEntry == NULL"}},
+        {VarnekPGL_ReadDir(nullptr, nullptr), FALSE, {"VarnekPGL_ReadDir : pEntry == NULL"}},
         {VarnekPGL_ReadDir(PGL_INVALID_DIR_HANDLE, &info),
          FALSE,
          {"__VarnekPGL_ReadDir : return FALSE pDir = 0xffffffff"}},

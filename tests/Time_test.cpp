@@ -142,7 +142,7 @@ TEST_F(Time, TheClockIsReadInUtcAndInItsZone) {
     }
     EXPECT_THAT(TakeLog(), IsEmpty());
     if (sizeof(time_t) > 4) {
-        gNow = INT64_MAX / 2;
+        gNow = static_cast<time_t>(INT64_MAX / 2);
         EXPECT_EQ(VarnekPGL_GetTimezoneOffset(), 0);
         EXPECT_EQ(TakeErrors().back(), "***** VarnekPGL_GetTimezoneOffset : Get Local Time FAIL, errno = [" +
                                            std::to_string(EOVERFLOW) + "]");

@@ -143,6 +143,7 @@ VarnekCRingBuffer::VarnekCRingBuffer(const VarnekCRingBuffer &other) {
     *this = other;
 }
 
+// cppcheck-suppress operatorEqVarError  // the mutex belongs to this ring
 VarnekCRingBuffer &VarnekCRingBuffer::operator=(const VarnekCRingBuffer &other) {
     if (this == &other) {
         return *this;

@@ -7,6 +7,8 @@
 #include <string.h>
 #include <time.h>
 
+#include <limits>
+
 // What a log line shows of a text that may be null.
 inline const char *Shown(const char *text) {
     return text != nullptr ? text : "(null)";
@@ -38,16 +40,19 @@ inline bool Succeeded(int pthreadResult) {
     return pthreadResult == 0;
 }
 
+// Seconds as the system takes them: where its own have 32 bits, those after 2038 are its last one.
+inline time_t SystemSeconds(int64_t seconds) {
+    constexpr time_t kLast = std::numeric_limits<time_t>::max();
+    return seconds < kLast ? static_cast<time_t>(seconds) : kLast;
+}
+
 // The point in time `timeout` milliseconds after `now`.
 inline timespec DeadlineAfter(const timespec &now, uint32_t timeout) {
-    constexpr long kSecond = 1000000000;
-    timespec deadline = now;
-    deadline.tv_sec += static_cast<time_t>(timeout / 1000);
-    deadline.tv_nsec += static_cast<long>(timeout % 1000) * 1000000;
-    if (deadline.tv_nsec >= kSecond) {
-        deadline.tv_sec += deadline.tv_nsec / kSecond;
-        deadline.tv_nsec %= kSecond;
-    }
+    constexpr int64_t kSecond = 1000000000;
+    const int64_t nanoseconds = now.tv_nsec + int64_t{timeout} * 1000000;
+    timespec deadline = {};
+    deadline.tv_sec = SystemSeconds(now.tv_sec + nanoseconds / kSecond);
+    deadline.tv_nsec = static_cast<long>(nanoseconds % kSecond);
     return deadline;
 }
 

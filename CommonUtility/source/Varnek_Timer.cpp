@@ -76,7 +76,7 @@ int32_t FirstFree() {
 
 timespec Milliseconds(int64_t milliseconds) {
     timespec time = {};
-    time.tv_sec = static_cast<time_t>(milliseconds / 1000);
+    time.tv_sec = SystemSeconds(milliseconds / 1000);
     time.tv_nsec = static_cast<long>(milliseconds % 1000) * 1000000;
     return time;
 }

@@ -1,6 +1,6 @@
 // CRC-32 over memory, sections and stored files. The register takes 16 bytes a step through 16
-// tables, then 4, then single bytes; bytes are combined by value, so neither the byte order of the
-// machine nor the alignment of the data matters.
+// tables where there is room for them, then 4, then single bytes; bytes are combined by value, so
+// neither the byte order of the machine nor the alignment of the data matters.
 #include "Varnek_Util.h"
 
 #include <stdlib.h>
@@ -16,9 +16,13 @@ constexpr uint32_t kInitial = 0xFFFFFFFFu;
 constexpr int32_t kTrailer = 4;     // bytes of a stored CRC
 constexpr int32_t kMinPayload = 4;  // bytes that a stored CRC covers at least
 
+// A table is 1 KiB. On the 32-bit target 16 would be half of the first cache and a quarter of the
+// library, for sections of a few hundred bytes at a megabyte or two a second.
+constexpr int kTables = sizeof(void *) == 8 ? 16 : 1;
+
 // word[n][i] is the register after byte i in its top 8 bits and n more bytes of 0.
 struct CrcTables {
-    uint32_t word[16][256];
+    uint32_t word[kTables][256];
 };
 
 constexpr CrcTables MakeCrcTables() {
@@ -30,7 +34,7 @@ constexpr CrcTables MakeCrcTables() {
         }
         tables.word[0][i] = crc;
     }
-    for (int n = 1; n < 16; ++n) {
+    for (int n = 1; n < kTables; ++n) {
         for (int i = 0; i < 256; ++i) {
             const uint32_t crc = tables.word[n - 1][i];
             tables.word[n][i] = (crc << 8) ^ tables.word[0][crc >> 24];
@@ -76,12 +80,14 @@ uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t length) {
         return kInitial;
     }
     uint32_t crc = kInitial;
-    for (; length >= 16; length -= 16, data += 16) {
-        crc = Shifted<12>(crc ^ BigEndian(data)) ^ Shifted<8>(BigEndian(data + 4)) ^
-              Shifted<4>(BigEndian(data + 8)) ^ Shifted<0>(BigEndian(data + 12));
-    }
-    for (; length >= 4; length -= 4, data += 4) {
-        crc = Shifted<0>(crc ^ BigEndian(data));
+    if constexpr (kTables >= 16) {
+        for (; length >= 16; length -= 16, data += 16) {
+            crc = Shifted<12>(crc ^ BigEndian(data)) ^ Shifted<8>(BigEndian(data + 4)) ^
+                  Shifted<4>(BigEndian(data + 8)) ^ Shifted<0>(BigEndian(data + 12));
+        }
+        for (; length >= 4; length -= 4, data += 4) {
+            crc = Shifted<0>(crc ^ BigEndian(data));
+        }
     }
     for (; length > 0; --length, ++data) {
         crc = kCrc.word[0][*data ^ crc >> 24] ^ crc << 8;

@@ -1,12 +1,16 @@
 #include "support/FailingCalls.h"
 
+#include <dirent.h>
 #include <pthread.h>
 #include <semaphore.h>
 #include <signal.h>
+#include <sys/stat.h>
 #include <time.h>
+#include <unistd.h>
 
 #include <atomic>
 #include <cerrno>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <new>
@@ -15,11 +19,26 @@ namespace {
 
 struct Call {
     const char *name;
+    Call *next;
     std::atomic<int> left{0};
     int error = 0;
 
+    explicit Call(const char *callName);
     bool Fails() { return left > 0 && --left == 0; }
 };
+
+Call *gCalls = nullptr;
+
+Call::Call(const char *callName) : name(callName), next(gCalls) { gCalls = this; }
+
+Call &Find(const char *name) {
+    for (Call *call = gCalls; call != nullptr; call = call->next) {
+        if (strcmp(call->name, name) == 0) {
+            return *call;
+        }
+    }
+    abort();
+}
 
 }  // namespace
 
@@ -57,7 +76,25 @@ WRAP_PTHREAD(pthread_mutex_lock, (pthread_mutex_t * mutex), mutex)
 WRAP_PTHREAD(pthread_mutex_unlock, (pthread_mutex_t * mutex), mutex)
 WRAP_PTHREAD(pthread_mutex_destroy, (pthread_mutex_t * mutex), mutex)
 
-// operator new[](size_t, const std::nothrow_t &), under its mangled name.
+WRAP(FILE *, nullptr, fopen, (const char *path, const char *mode), path, mode)
+WRAP(size_t, 0, fread, (void *to, size_t size, size_t count, FILE *file), to, size, count, file)
+WRAP(size_t, 0, fwrite, (const void *from, size_t size, size_t count, FILE *file), from, size, count, file)
+WRAP_POSIX(fseek, (FILE * file, long offset, int base), file, offset, base)
+WRAP(long, -1, ftell, (FILE * file), file)
+WRAP_POSIX(fflush, (FILE * file), file)
+// A close that fails has closed the stream.
+WRAP(int, (__real_fclose(file), errno = gCall_fclose.error, EOF), fclose, (FILE * file), file)
+WRAP_POSIX(open, (const char *path, int flags, mode_t mode), path, flags, mode)
+WRAP(ssize_t, -1, read, (int fd, void *to, size_t count), fd, to, count)
+WRAP(ssize_t, -1, write, (int fd, const void *from, size_t count), fd, from, count)
+WRAP(off64_t, -1, lseek64, (int fd, off64_t offset, int base), fd, offset, base)
+WRAP_POSIX(remove, (const char *path), path)
+WRAP_POSIX(rmdir, (const char *path), path)
+WRAP_POSIX(mkdir, (const char *path, mode_t mode), path, mode)
+WRAP(DIR *, nullptr, opendir, (const char *path), path)
+WRAP_POSIX(system, (const char *command), command)
+
+// Of these, the library uses operator new[](size_t, const std::nothrow_t &), under its mangled name.
 #if __SIZEOF_POINTER__ == 8
 #define NEW_ARRAY _ZnamRKSt9nothrow_t
 #else
@@ -65,39 +102,21 @@ WRAP_PTHREAD(pthread_mutex_destroy, (pthread_mutex_t * mutex), mutex)
 #endif
 #define WRAP_NAMED(...) WRAP(__VA_ARGS__)
 WRAP_NAMED(void *, nullptr, NEW_ARRAY, (size_t size, const std::nothrow_t &tag), size, tag)
-#define CALL_OF(name) gCall_##name
-#define CALL_NAMED(name) CALL_OF(name)
+#define NAME_OF(name) #name
+#define NAME(name) NAME_OF(name)
+
+std::vector<const char *> FailingCalls() {
+    std::vector<const char *> names;
+    for (const Call *call = gCalls; call != nullptr; call = call->next) {
+        names.push_back(call->name);
+    }
+    return names;
+}
 
 void FailCall(const char *function, int nth, int error) {
-    Call *const calls[] = {
-        &gCall_malloc,
-        &gCall_sem_init,
-        &gCall_sem_destroy,
-        &gCall_sem_post,
-        &gCall_sem_getvalue,
-        &gCall_sem_wait,
-        &gCall_sem_timedwait,
-        &gCall_clock_gettime,
-        &gCall_timer_create,
-        &gCall_timer_settime,
-        &gCall_timer_gettime,
-        &gCall_timer_delete,
-        &gCall_pthread_create,
-        &gCall_pthread_mutex_init,
-        &gCall_pthread_mutex_lock,
-        &gCall_pthread_mutex_unlock,
-        &gCall_pthread_mutex_destroy,
-    };
-    for (Call *call : calls) {
-        if (strcmp(call->name, function) == 0) {
-            call->error = error;
-            call->left = nth;
-            return;
-        }
-    }
-    if (strcmp(function, "operator new[]") == 0) {
-        CALL_NAMED(NEW_ARRAY).left = nth;
-        return;
-    }
-    abort();
+    Call &call = Find(strcmp(function, "operator new[]") == 0 ? NAME(NEW_ARRAY) : function);
+    call.error = error;
+    call.left = nth;
 }
+
+bool IsStillToFail(const char *function) { return Find(function).left > 0; }

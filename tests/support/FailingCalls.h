@@ -3,8 +3,17 @@
 #ifndef VARNEK_TESTS_SUPPORT_FAILINGCALLS_H
 #define VARNEK_TESTS_SUPPORT_FAILINGCALLS_H
 
+#include <vector>
+
+// The names of all of them, that of operator new[] mangled.
+std::vector<const char *> FailingCalls();
+
 // Makes the n-th call from now (1 for the next) of this function fail with `error`; 0 for none. A
-// pthread call returns the error, malloc null, the others -1, with errno set.
+// pthread call returns the error, a stream's read or write 0, what returns a pointer null, the others -1, with errno
+// set.
 void FailCall(const char *function, int nth, int error);
+
+// Whether the call that FailCall() asked for has not been made yet.
+bool IsStillToFail(const char *function);
 
 #endif

@@ -1,0 +1,79 @@
+// What the fuzz targets share: the input taken apart, the check that ends a run, and the log.
+//
+// A target runs in a directory of its own, which holds what the library reads and writes. Every
+// trace is on, so its formatting is part of the run, and every line is held against its limits.
+#ifndef VARNEK_FUZZ_H
+#define VARNEK_FUZZ_H
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+#include <vector>
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
+
+#define CHECK(condition)                                                           \
+    do {                                                                           \
+        if (!(condition)) {                                                        \
+            fprintf(stderr, "%s:%d: CHECK(%s)\n", __FILE__, __LINE__, #condition); \
+            abort();                                                               \
+        }                                                                          \
+    } while (false)
+
+// Called for each line of the log; null for none.
+extern void (*gOnLog)(const char *tag, const char *text);
+
+// What the platform's feature store gives for the nation.
+extern std::string gFeature;
+
+// A file in the library's data directory, rewritten in place: a new file each time would cost more
+// than all the rest.
+class DataFile {
+  public:
+    explicit DataFile(const char *name);
+    void Write(const std::string &content) const;
+
+  private:
+    int fd_;
+};
+
+// The input's bytes in order; zeros behind its end.
+class Input {
+  public:
+    Input(const uint8_t *data, size_t size) : data_(data), left_(size) {}
+
+    bool Empty() const { return left_ == 0; }
+    uint8_t Byte() { return left_ == 0 ? 0 : (--left_, *data_++); }
+    int Below(int limit) { return Byte() % limit; }
+    // Mostly small, now and then of any size.
+    int Int() {
+        const int byte = Byte();
+        return byte != 128 ? (byte < 128 ? byte : byte - 256) : static_cast<int>(uint32_t{Byte()} << 24 | Byte());
+    }
+    // Up to `limit` bytes, in a block of exactly their size, so that a sanitizer sees one too many.
+    template <typename Char = uint8_t>
+    std::vector<Char> Bytes(size_t limit = SIZE_MAX) {
+        const size_t count = left_ < limit ? left_ : limit;
+        std::vector<Char> bytes(data_, data_ + count);
+        data_ += count;
+        left_ -= count;
+        return bytes;
+    }
+    // The bytes up to a 0 or the end, and the terminator, in a block of exactly their size.
+    std::vector<char> Text() {
+        std::vector<char> text;
+        for (char c = '\0'; !Empty() && (c = static_cast<char>(Byte())) != '\0';) {
+            text.push_back(c);
+        }
+        text.push_back('\0');
+        return {text.begin(), text.end()};
+    }
+
+  private:
+    const uint8_t *data_;
+    size_t left_;
+};
+
+#endif

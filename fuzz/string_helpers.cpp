@@ -1,0 +1,99 @@
+// The helpers on NUL-terminated strings and the string class, against the C library and the C++
+// library, on blocks of exactly the texts' sizes.
+#include <algorithm>
+#include <cstring>
+#include <string>
+
+#include "Fuzz.h"
+#include "Varnek_CString.h"
+#include "Varnek_StrUtil.h"
+
+namespace {
+
+constexpr char kBlanks[] = "\t\n\v\f\r ";
+
+int Sign(int value) { return (value > 0) - (value < 0); }
+
+void CheckNumber(uint32_t value, uint32_t radix) {
+    char text[33];
+    VarnekPGL_Itoa(value, text, radix);
+    if (radix >= 2 && radix <= 16) {
+        CHECK(strtoull(text, nullptr, static_cast<int>(radix)) == value && strpbrk(text, "abcdef") == nullptr);
+    } else {
+        CHECK(text[0] == '\0');
+    }
+    const int32_t number = static_cast<int32_t>(value);
+    VarnekPGL_Ltoa(number, text, radix);
+    if (radix >= 2 && radix <= 36) {
+        const int64_t expected = radix == 10 ? int64_t{number} : int64_t{value};
+        CHECK(strtoll(text, nullptr, static_cast<int>(radix)) == expected);
+    } else {
+        CHECK(text[0] == '\0');
+    }
+}
+
+void CheckPart(const std::string &source, const char *exact, int32_t start, int32_t count) {
+    std::vector<char> part(static_cast<size_t>(std::max(count, 1)), '#');
+    const char *result = VarnekPGL_Strmcpy(part.data(), exact, start, count);
+    if (count >= 1 && start > static_cast<int32_t>(source.size())) {
+        CHECK(result != part.data() && *result == '\0' && part[0] == '#');
+        return;
+    }
+    std::string expected = count < 1 ? "" : source.substr(start < 1 ? 0 : static_cast<size_t>(start), part.size());
+    expected.resize(part.size());
+    CHECK(result == part.data() && expected == std::string(part.begin(), part.end()));
+}
+
+void CheckClass(const std::string &a, const char *exactA, const std::string &b, const char *exactB) {
+    const VarnekCString left(exactA), right(exactB);
+    CHECK((left == right) == (a == b ? 1 : 0) && (left < right) == (a < b ? 1 : 0));
+    CHECK((left > right) == (a > b ? 1 : 0) && (left <= right) == (a <= b ? 1 : 0));
+    char *const sum = (left + exactB).String();
+    CHECK(a + b == sum);
+    VarnekCString taken(nullptr);
+    taken.SetMemAllocedString(sum);
+    VarnekCString twice(taken);
+    twice += taken;
+    twice += twice;
+    CHECK(twice == VarnekCString((a + b + a + b + a + b + a + b).c_str()));
+}
+
+}  // namespace
+
+int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
+    Input input(data, size);
+    const uint8_t radix = input.Byte();
+    const uint32_t value = uint32_t{input.Byte()} << 24 | static_cast<uint32_t>(input.Int());
+    const int32_t start = input.Int();
+    const int32_t count = input.Int() % 4096;
+    std::vector<char> exactA = input.Text();
+    std::vector<char> exactB = input.Text();
+    const std::string a = exactA.data();
+    const std::string b = exactB.data();
+
+    CheckNumber(value, radix % 40);
+    CheckPart(a, exactA.data(), start, count);
+    CheckClass(a, exactA.data(), b, exactB.data());
+
+    CHECK(VarnekPGL_Stristr(exactA.data(), exactB.data()) == strcasestr(exactA.data(), exactB.data()));
+    CHECK(Sign(VarnekPGL_Stricmp(exactA.data(), exactB.data())) == Sign(strcasecmp(a.c_str(), b.c_str())));
+    CHECK(Sign(VarnekPGL_Strnicmp(exactA.data(), exactB.data(), radix)) ==
+          Sign(strncasecmp(a.c_str(), b.c_str(), radix)));
+
+    std::string upper = a;
+    std::transform(upper.begin(), upper.end(), upper.begin(), toupper);
+    std::string lower = a;
+    std::transform(lower.begin(), lower.end(), lower.begin(), tolower);
+    std::vector<char> text = exactA;
+    CHECK(VarnekPGL_Strupr(text.data()) == upper);
+    CHECK(VarnekPGL_Strlwr(text.data()) == lower);
+
+    text = exactA;
+    const std::string right = a.substr(0, a.find_last_not_of(kBlanks) + 1);
+    VarnekPGL_Strrtrim(text.data());
+    CHECK(text.data() == right);
+    text = exactA;
+    VarnekPGL_Strtrim(text.data());
+    CHECK(text.data() == right.substr(std::min(right.find_first_not_of(kBlanks), right.size())));
+    return 0;
+}

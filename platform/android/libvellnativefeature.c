@@ -1,0 +1,8 @@
+// Import library of the device's feature store: the linker notes its name and its symbol, the
+// device brings the code. Never installed.
+const char *VellNativeFeature_getStringWithDefault(const char *key, const char *fallback);
+
+const char *VellNativeFeature_getStringWithDefault(const char *key, const char *fallback) {
+    (void)key;
+    return fallback;
+}

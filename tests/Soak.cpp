@@ -1,0 +1,325 @@
+// Eight threads that do at random, for as many seconds as the first argument says, what the modules of
+// a running stack do to the library. Every operation's result is held against what the threads know of
+// each other, and at the end nothing is missing: no message, no trace, no place in a table.
+#include <sys/resource.h>
+
+#include <atomic>
+#include <chrono>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <fstream>
+#include <random>
+#include <string>
+#include <thread>
+
+#include "Varnek_CRingBuffer.h"
+#include "Varnek_Debug.h"
+#include "Varnek_Semaphore.h"
+#include "Varnek_Thread.h"
+#include "Varnek_Timer.h"
+
+namespace {
+
+constexpr int kThreads = 8;
+constexpr int kUnits = 3;  // of the semaphore that all share
+constexpr int kPacket = 188;
+
+#define CHECK(condition)                                                           \
+    do {                                                                           \
+        if (!(condition)) {                                                        \
+            fprintf(stderr, "%s:%d: CHECK(%s)\n", __FILE__, __LINE__, #condition); \
+            abort();                                                               \
+        }                                                                          \
+    } while (false)
+
+std::atomic<bool> gStop{false};
+std::atomic<int> gReady{0}, gSenders{kThreads}, gRunning{kThreads}, gUnitsTaken{0};
+std::atomic<int64_t> gTraces{0}, gLines{0};
+int32_t gMutex, gSemaphore;
+int64_t gGuarded = 0;
+
+// A message as the threads agree on it: `number` counts what one thread sent to another one.
+struct Message {
+    int64_t number;
+    int32_t from;
+    BOOL urgent;
+    char filled[24];
+};
+static_assert(sizeof(Message) == sizeof(THREAD_MSG));
+
+// What one thread did and saw. Its own, but for the two atomics and the ring's two ends.
+struct Worker {
+    int index;
+    int32_t handle;
+    std::mt19937 random;
+    int64_t sent[kThreads], received[kThreads], urgentSent, urgentReceived;
+    int64_t peeked, objects, locks, units, starts, short_lived, written, read, operations;
+    std::atomic<int64_t> fired, ran;
+    VarnekCRingBuffer *ring;  // between an even worker, who writes, and the next one
+
+    int Below(int limit) { return static_cast<int>(random() % static_cast<unsigned int>(limit)); }
+    std::string Name(const char *what) const { return what + std::to_string(index); }
+};
+Worker gWorkers[kThreads];
+
+void Send(Worker &me) {
+    const int to = me.Below(kThreads);
+    const BOOL urgent = me.Below(8) == 0 ? TRUE : FALSE;
+    Message message{urgent ? ++me.urgentSent : ++me.sent[to], me.index, urgent, {}};
+    memset(message.filled, static_cast<char>(message.number), sizeof message.filled);
+    THREAD_MSG out;
+    memcpy(&out, &message, sizeof out);
+    CHECK((urgent ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage)(gWorkers[to].handle, &out) == TRUE);
+}
+
+bool Receive(Worker &me, bool peek) {
+    THREAD_MSG in;
+    int32_t left = -1;
+    if ((peek ? VarnekPGL_PeekMessage(&in, &left) : VarnekPGL_ReceiveMessage(0, &in, &left)) != TRUE) {
+        return false;
+    }
+    Message message;
+    memcpy(&message, &in, sizeof message);
+    char expected[sizeof message.filled];
+    memset(expected, static_cast<char>(message.number), sizeof expected);
+    CHECK(left >= 0 && memcmp(message.filled, expected, sizeof expected) == 0);
+    me.peeked += peek ? 1 : 0;
+    if (message.urgent) {
+        ++me.urgentReceived;
+    } else {
+        CHECK(message.number == ++me.received[message.from]);
+    }
+    return true;
+}
+
+void UseSharedObjects(Worker &me) {
+    CHECK(VarnekPGL_AcquireMutex(gMutex) == TRUE);
+    const int64_t before = gGuarded;
+    std::this_thread::yield();
+    gGuarded = before + 1;
+    CHECK(VarnekPGL_ReleaseMutex(gMutex) == TRUE);
+    ++me.locks;
+    if (VarnekPGL_WaitSemaphore(gSemaphore, static_cast<uint32_t>(me.Below(2))) == TRUE) {
+        CHECK(++gUnitsTaken <= kUnits);
+        std::this_thread::yield();
+        --gUnitsTaken;
+        CHECK(VarnekPGL_SignalSemaphore(gSemaphore) == TRUE);
+        ++me.units;
+    }
+}
+
+void UseOwnObjects(Worker &me) {
+    const std::string name = me.Name("own");
+    const int32_t mutex = VarnekPGL_CreateMutex(name.c_str());
+    const int32_t semaphore = VarnekPGL_CreateSemaphore(name.c_str(), 1);
+    CHECK(mutex > 0 && VarnekPGL_GetMutexByName(name.c_str()) == mutex);
+    CHECK(semaphore > 0 && VarnekPGL_SemaphoreByName(name.c_str()) == semaphore);
+    CHECK(VarnekPGL_AcquireMutex(mutex) == TRUE && VarnekPGL_ReleaseMutex(mutex) == TRUE);
+    CHECK(VarnekPGL_WaitSemaphore(semaphore, WAIT_FOREVER) == TRUE && VarnekPGL_WaitSemaphore(semaphore, 0) == FALSE);
+    CHECK(VarnekPGL_DeleteMutex(mutex) == TRUE && VarnekPGL_DeleteSemaphore(semaphore) == TRUE);
+    CHECK(VarnekPGL_GetMutexByName(name.c_str()) == -1 && VarnekPGL_AcquireMutex(mutex) == FALSE);
+    ++me.objects;
+}
+
+void UseTimer(Worker &me) {
+    const int32_t timer = VarnekPGL_CreateTimer(me.Name("timer").c_str());
+    CHECK(timer >= 0 && VarnekPGL_GetTimerByName(me.Name("timer").c_str()) == timer);
+    const uint32_t handle = static_cast<uint32_t>(timer);
+    const auto fire = [](uint32_t, void *worker) { ++static_cast<Worker *>(worker)->fired; };
+    CHECK(VarnekPGL_StartTimer(handle, 1 + static_cast<uint32_t>(me.Below(3)), fire, &me) == TRUE);
+    ++me.starts;
+    if (me.Below(2) == 0) {
+        VarnekPGL_MSleep(me.Below(4));
+        VarnekPGL_CancelTimer(handle);
+        CHECK(VarnekPGL_IsTimerActive(handle) == FALSE);
+    }
+    CHECK(VarnekPGL_DeleteTimer(handle) == TRUE);
+    CHECK(me.fired <= me.starts);
+}
+
+void UseRing(Worker &me) {
+    unsigned char packet[kPacket];
+    Worker &writer = gWorkers[me.index & ~1];
+    if (me.index == writer.index) {
+        memset(packet, static_cast<char>(me.written), sizeof packet);
+        if (me.ring->GetSpaceWriting() >= kPacket) {
+            CHECK(me.ring->Write(packet, kPacket) == 0);
+            ++me.written;
+        }
+    } else if (writer.ring->GetSpaceReading() >= kPacket) {
+        unsigned char expected[kPacket];
+        memset(expected, static_cast<char>(me.read), sizeof expected);
+        CHECK(writer.ring->Read(packet, kPacket) == 0 && memcmp(packet, expected, sizeof packet) == 0);
+        ++me.read;
+    }
+    VarnekCRingBuffer own(1 + me.Below(300));
+    CHECK(own.GetDistance() == 0 && own.Reset(kPacket) == 0 && own.Write(packet, kPacket) == 0);
+    CHECK(own.GetDistance() == 100);
+}
+
+void UseThread(Worker &me) {
+    const int64_t before = me.ran;
+    const auto run = [](void *argument) -> void * {
+        Worker &parent = *static_cast<Worker *>(argument);
+        CHECK(VarnekPGL_GetCurrentThread() == VarnekPGL_GetThreadByName(parent.Name("short").c_str()));
+        ++parent.ran;
+        return nullptr;
+    };
+    const int32_t thread = VarnekPGL_CreateThread(me.Name("short").c_str(), 1, 0, run, &me);
+    CHECK(thread > 0);
+    while (me.ran == before) {
+        std::this_thread::yield();
+    }
+    CHECK(VarnekPGL_DeleteThread(thread) == TRUE);
+    ++me.short_lived;
+}
+
+void *Work(void *argument) {
+    Worker &me = *static_cast<Worker *>(argument);
+    while (gReady == 0) {
+        std::this_thread::yield();
+    }
+    CHECK(VarnekPGL_GetCurrentThread() == me.handle);
+    for (; !gStop; ++me.operations) {
+        const int kind = me.Below(100);
+        if (kind < 30) {
+            Send(me);
+        } else if (kind < 66) {
+            Receive(me, kind == 65);
+        } else if (kind < 76) {
+            UseSharedObjects(me);
+        } else if (kind < 82) {
+            UseOwnObjects(me);
+        } else if (kind < 84) {
+            UseTimer(me);
+        } else if (kind < 93) {
+            UseRing(me);
+        } else if (kind < 94) {
+            UseThread(me);
+        } else {
+            ++gTraces;
+            VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_GINGA, "soak %d end", me.index);
+        }
+    }
+    --gSenders;
+    while (gSenders > 0) {
+        std::this_thread::yield();
+    }
+    // Each message that was peeked leaves a signal behind, at which a receive returns empty-handed.
+    for (int64_t empty = 0; empty <= me.peeked;) {
+        empty += Receive(me, false) ? 0 : 1;
+    }
+    --gRunning;
+    return nullptr;
+}
+
+// How many objects of a kind fit in beside those that live.
+template <typename Create, typename Delete>
+int Room(Create create, Delete destroy) {
+    int32_t handles[256];
+    int count = 0;
+    while ((handles[count] = create(("room" + std::to_string(count)).c_str())) != -1) {
+        ++count;
+    }
+    for (int i = 0; i < count; ++i) {
+        destroy(handles[i]);
+    }
+    return count;
+}
+
+std::string RoomInTables() {
+    const int mutexes = Room(VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex);
+    const int semaphores =
+        Room([](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); }, VarnekPGL_DeleteSemaphore);
+    const int timers =
+        Room(VarnekPGL_CreateTimer, [](int32_t timer) { return VarnekPGL_DeleteTimer(static_cast<uint32_t>(timer)); });
+    const int threads = Room(
+        [](const char *name) {
+            return VarnekPGL_CreateThread(
+                name, 1, 0, [](void *) -> void * { return nullptr; }, nullptr);
+        },
+        VarnekPGL_DeleteThread);
+    return std::to_string(mutexes) + " mutexes, " + std::to_string(semaphores) + " semaphores, " +
+           std::to_string(timers) + " timers, " + std::to_string(threads) + " threads";
+}
+
+template <typename Field>
+long long Sum(Field field) {
+    long long sum = 0;
+    for (const Worker &worker : gWorkers) {
+        sum += field(worker);
+    }
+    return sum;
+}
+
+}  // namespace
+
+// Takes the place of the platform's log function.
+extern "C" __attribute__((visibility("default"))) int __android_log_write(int, const char *tag, const char *text) {
+    CHECK(strnlen(text, 2048) < 2048);
+    if (strcmp(tag, "SBTVD_GINGA") == 0) {
+        const char *body = strstr(text, "] soak ");
+        CHECK(text[1] == 'H' && body != nullptr && strcmp(body + 8, " end") == 0);
+        ++gLines;
+    }
+    return 1;
+}
+
+int main(int argc, char **argv) {
+    const int seconds = argc > 1 ? atoi(argv[1]) : 1;
+    // Everything is on for the tests, whose directory this is; elsewhere the same is put in place.
+    constexpr char kConfig[] = VARNEK_DATA_DIR "debug_ltn.ini";
+    if (!std::ifstream(kConfig).good()) {
+        std::ofstream(kConfig) << "LogToUSB=1\nError=1\nHigh=1\nMid=1\nLow=1\nCommon=1\nGingaAppMgr=1\n";
+    }
+    for (int i = 0; i < kThreads; ++i) {
+        gWorkers[i].index = i;
+        gWorkers[i].random.seed(static_cast<unsigned int>(i + 1));
+        gWorkers[i].ring = i % 2 == 0 ? new VarnekCRingBuffer(kPacket * 7 + 5) : nullptr;
+        gWorkers[i].handle = VarnekPGL_CreateThread(gWorkers[i].Name("soak").c_str(), 1, 0, Work, &gWorkers[i]);
+        CHECK(gWorkers[i].handle > 0);
+    }
+    gMutex = VarnekPGL_CreateMutex("all");
+    gSemaphore = VarnekPGL_CreateSemaphore("all", kUnits);
+    const std::string room = RoomInTables();
+    gReady = 1;
+    std::this_thread::sleep_for(std::chrono::seconds(seconds));
+    gStop = true;
+    while (gRunning > 0) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+    }
+
+    const long long locks = Sum([](const Worker &w) { return w.locks; });
+    CHECK(gGuarded == locks && gUnitsTaken == 0 && gTraces == gLines && RoomInTables() == room);
+    const long long urgentSent = Sum([](const Worker &w) { return w.urgentSent; });
+    const long long urgentReceived = Sum([](const Worker &w) { return w.urgentReceived; });
+    long long sent = urgentSent;
+    long long lost = urgentSent - urgentReceived;
+    for (const Worker &from : gWorkers) {
+        for (const Worker &to : gWorkers) {
+            sent += from.sent[to.index];
+            lost += from.sent[to.index] - to.received[from.index];
+        }
+    }
+    for (int i = 0; i < kThreads; i += 2) {
+        CHECK(gWorkers[i].ring->GetSpaceReading() == (gWorkers[i].written - gWorkers[i + 1].read) * kPacket);
+        delete gWorkers[i].ring;
+    }
+    rusage usage{};
+    getrusage(RUSAGE_SELF, &usage);
+    printf("seconds              %d\n", seconds);
+    printf("operations           %lld\n", Sum([](const Worker &w) { return w.operations; }));
+    printf("messages             %lld, of which urgent %lld\n", sent, urgentSent);
+    printf("lost messages        %lld\n", lost);
+    printf("locks, units         %lld, %lld\n", locks, Sum([](const Worker &w) { return w.units; }));
+    printf("mutexes, semaphores  %lld of each made and deleted\n", Sum([](const Worker &w) { return w.objects; }));
+    printf("timer starts         %lld, of which %lld called back\n", Sum([](const Worker &w) { return w.starts; }),
+           Sum([](const Worker &w) { return w.fired.load(); }));
+    printf("ring packets         %lld\n", Sum([](const Worker &w) { return w.read; }));
+    printf("threads              %lld\n", Sum([](const Worker &w) { return w.short_lived; }));
+    printf("traces               %lld\n", static_cast<long long>(gTraces));
+    printf("room afterwards      %s, as before\n", room.c_str());
+    printf("largest memory       %ld KiB\n", usage.ru_maxrss);
+    return lost == 0 ? 0 : 1;
+}

@@ -1,0 +1,90 @@
+// A model of the bit stream that moves single bits and works piece by piece, for its test and its
+// fuzz target.
+#ifndef VARNEK_TESTS_SUPPORT_BITSTREAMMODEL_H
+#define VARNEK_TESTS_SUPPORT_BITSTREAMMODEL_H
+
+#include <algorithm>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+// The same operations, bit by bit.
+struct BitStreamModel {
+    std::vector<unsigned char> bytes;
+    int size = static_cast<int>(bytes.size());
+    int index = 0;
+    int consumed = 0;  // as counted; a rewind from inside a byte makes it differ from what is taken
+    int taken = 0;
+    bool end = false;
+    std::vector<std::string> log = {};
+
+    int64_t Fail(const std::string &line, unsigned char &flag) {
+        flag = 0;
+        if (!line.empty()) {
+            log.push_back("BIS: GetBits" + line + "\n");
+        }
+        return 0;
+    }
+    int64_t GetBits(int num, unsigned char &flag) {
+        const std::string text = "aNum=[" + std::to_string(num) + "]";
+        if (num > 8 - consumed) {
+            const std::string bit = std::to_string(consumed);
+            return Fail(" Warning: " + text + ", iBitIdxInCurByte=[" + bit + "]", flag);
+        }
+        if (end || num < 0) {
+            return Fail(end ? " Warning: End of Stream!" : ". Wrong bits number! " + text, flag);
+        }
+        int64_t value = 0;
+        for (int i = 0; i < num; ++i, ++consumed) {
+            value = value * 2 + (bytes[static_cast<size_t>(index)] >> (7 - taken++) & 1);
+        }
+        end = consumed == 8 && index == size - 1;
+        if (consumed == 8 && !end) {
+            ++index;
+            consumed = taken = 0;
+        }
+        return value;
+    }
+    int64_t Pieces(int count, unsigned char &flag) {
+        int piece = std::min(count, 8 - consumed);
+        int64_t value = GetBits(piece, flag);
+        for (count -= piece; count > 0; count -= piece) {
+            piece = std::min(count, 8);
+            value = (value << piece & UINT32_MAX) | GetBits(piece, flag);
+        }
+        return value;
+    }
+    int64_t Read(int count, int largest, unsigned char &flag) {
+        return count < 0 || count > largest || end ? Fail("", flag) : Pieces(count, flag);
+    }
+    int64_t ReadBit(unsigned char &flag) { return Read(1, 1, flag); }
+    int64_t ReadByte(int count, unsigned char &flag) { return Read(count, 8, flag); }
+    int64_t ReadShort(int count, unsigned char &flag) { return Read(count, 16, flag); }
+    int64_t ReadInt(int count, unsigned char &flag) { return Read(count, 32, flag); }
+    void Skip(int count) {
+        unsigned char flag;
+        count == 0 || end ? 0 : Pieces(count, flag);
+    }
+    int GetByteArray(unsigned char *dest, int count) {
+        if (end || consumed != 0 || count < 0 || count > size - index) {
+            return end ? -22 : consumed != 0 ? -1 : -10;
+        }
+        std::copy_n(bytes.begin() + index, count, dest);
+        index += count;
+        end = index == size;
+        return 0;
+    }
+    int RewindBytes(int count) {
+        const int target = (end ? size : index) - count;
+        if (target >= 0 && target < size) {
+            consumed = end ? 0 : consumed;
+            index = target;
+            taken = 0;
+            end = false;
+        }
+        return 0;
+    }
+    int RwindToFirst() { return index = consumed = taken = end = 0; }
+};
+
+#endif
