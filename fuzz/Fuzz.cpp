@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <cstring>
+#include <utility>
 
 #include "Varnek_Debug.h"
 
@@ -17,14 +18,39 @@ const char *__asan_default_options() { return "quarantine_size_mb=1:malloc_conte
 void (*gOnLog)(const char *tag, const char *text) = nullptr;
 std::string gFeature;
 
-DataFile::DataFile(const char *name)
-    : fd_(open((VARNEK_DATA_DIR + std::string(name)).c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0666)) {
+namespace {
+
+std::vector<std::string> gTraces;
+std::vector<std::string> gDataFiles;
+
+}  // namespace
+
+void CollectTraces() {
+    gTraces.clear();
+    gOnLog = [](const char *, const char *text) {
+        const char *body = strstr(text, "][");
+        body = body != nullptr ? strstr(body, "] ") : nullptr;
+        gTraces.emplace_back(body != nullptr ? body + 2 : text);
+    };
+}
+
+std::vector<std::string> TakeTraces() { return std::exchange(gTraces, {}); }
+
+DataFile::DataFile(const char *name) : fd_(-1) {
+    gDataFiles.push_back(VARNEK_DATA_DIR + std::string(name));
+    fd_ = open(gDataFiles.back().c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0666);
     CHECK(fd_ >= 0);
 }
 
 void DataFile::Write(const std::string &content) const {
     CHECK(pwrite(fd_, content.data(), content.size(), 0) == static_cast<ssize_t>(content.size()));
     CHECK(ftruncate(fd_, static_cast<off_t>(content.size())) == 0);
+}
+
+void RemoveDataFiles() {
+    for (const std::string &path : gDataFiles) {
+        unlink(path.c_str());
+    }
 }
 
 // Takes the place of the platform's log function. 2047 characters are what a line may have.

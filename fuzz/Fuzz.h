@@ -25,6 +25,10 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
 // Called for each line of the log; null for none.
 extern void (*gOnLog)(const char *tag, const char *text);
 
+// Collects the callers' texts of the traces, instead.
+void CollectTraces();
+std::vector<std::string> TakeTraces();
+
 // What the platform's feature store gives for the nation.
 extern std::string gFeature;
 
@@ -39,13 +43,16 @@ class DataFile {
     int fd_;
 };
 
+// Those that were written.
+void RemoveDataFiles();
+
 // The input's bytes in order; zeros behind its end.
 class Input {
   public:
     Input(const uint8_t *data, size_t size) : data_(data), left_(size) {}
 
     bool Empty() const { return left_ == 0; }
-    uint8_t Byte() { return left_ == 0 ? 0 : (--left_, *data_++); }
+    uint8_t Byte() { return left_ == 0 ? uint8_t{0} : (--left_, *data_++); }
     int Below(int limit) { return Byte() % limit; }
     // Mostly small, now and then of any size.
     int Int() {

@@ -1,8 +1,8 @@
 // The bit stream: a sequence of operations on borrowed and copied bytes, against the model that
 // moves single bits.
+#include "BitStreamModel.h"
 #include "Fuzz.h"
 #include "Varnek_CBitInputStream.h"
-#include "support/BitStreamModel.h"
 
 namespace {
 
@@ -46,6 +46,7 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     if (source.empty()) {
         return 0;
     }
+    CollectTraces();
     BitStreamModel model{source};
     VarnekCBitInputStream stream(source.data(), static_cast<unsigned int>(source.size()), mode % 2);
     while (!input.Empty()) {
@@ -63,6 +64,8 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         const int64_t expected = Apply(model, operation, expectedFlag, expectedBytes);
         CHECK(Apply(stream, operation, flag, bytes) == expected);
         CHECK(flag == expectedFlag && bytes == expectedBytes);
+        CHECK(TakeTraces() == model.log);
+        model.log.clear();
     }
     return 0;
 }

@@ -4,7 +4,7 @@
 #include <numeric>
 
 #include "Fuzz.h"
-#include "support/RingModel.h"
+#include "RingModel.h"
 
 namespace {
 
@@ -35,6 +35,7 @@ int Apply(Ring &ring, const Operation &operation, std::vector<unsigned char> &by
 
 int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     Input input(data, size);
+    CollectTraces();
     VarnekCRingBuffer ring(input.Below(64) + 1);
     RingModel model{FieldsOf(ring), {}, {}};
     model.bytes.resize(static_cast<size_t>(model.size));
@@ -54,6 +55,7 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         } else if (kind >= 245) {
             ring = VarnekCRingBuffer(ring);
         }
+        TakeTraces();
         const Operation operation{kind % 8, input.Int() % 512, kind / 8 % 4};
         std::vector<unsigned char> bytes(static_cast<size_t>(std::max(operation.count, 0)));
         std::iota(bytes.begin(), bytes.end(), next);
@@ -71,6 +73,7 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
             memcpy(after.storage, model.bytes.data(), model.bytes.size());
         }
         CHECK(std::equal(model.bytes.begin(), model.bytes.end(), after.storage));
+        CHECK(TakeTraces() == model.log);
         model.log.clear();
     }
     return 0;

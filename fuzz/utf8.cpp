@@ -32,7 +32,7 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     CHECK(length < units.size());
     size_t bytes = 0;
     for (size_t i = 0; i < length; ++i) {
-        bytes += units[i] < 0x80 ? 1 : units[i] < 0x800 ? 2 : 3;
+        bytes += units[i] < 0x80 ? 1u : units[i] < 0x800 ? 2u : 3u;
     }
     std::vector<char> utf8(bytes + 1, '#');
     CHECK(WmConvert2LCode(utf8.data(), units.data()) == TRUE);

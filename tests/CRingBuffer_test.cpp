@@ -1,17 +1,15 @@
-// The ring against a model that moves single bytes, also from states that only a fault can bring
-// about; its mutexes; and threads at both ends.
+// A ring without storage, its mutexes, and threads at both ends. Its operations are held against a model
+// by a fuzz target, which runs as a test.
 #include "Varnek_CRingBuffer.h"
 
 #include <algorithm>
 #include <memory>
 #include <numeric>
-#include <random>
 #include <set>
 #include <thread>
-#include <tuple>
 
 #include "Varnek_Semaphore.h"
-#include "support/RingModel.h"
+#include "support/RingFields.h"
 #include "support/VarnekTest.h"
 
 namespace {
@@ -22,61 +20,6 @@ using ::testing::SizeIs;
 class RingBuffer : public VarnekTest {};
 
 using Bytes = std::vector<unsigned char>;
-
-// One operation, as `random` has it, on a ring or on its model.
-template <typename Ring>
-auto Apply(Ring &ring, std::mt19937 random) {
-    const int operation = static_cast<int>(random() % 16);
-    const int n = static_cast<int>(random() % 10) - (random() % 16 == 0 ? 3 : 0);
-    // Exactly the room for it, so that a sanitizer sees a byte too many.
-    Bytes data(static_cast<size_t>(std::max(n, 0)));
-    std::generate(data.begin(), data.end(), random);
-    const int result = operation == 0   ? ring.Flush()
-                       : operation == 1 ? ring.Reset(n)
-                       : operation < 5  ? ring.Seek(n, operation - 2 + (n < 0 ? 1 : 0))
-                       : operation < 10 ? ring.Read(data.data(), n)
-                                        : ring.Write(data.data(), n);
-    return std::make_tuple(result, data, ring.GetSpaceReading(), ring.GetSpaceWriting(), ring.GetDistance());
-}
-
-TEST_F(RingBuffer, BehavesLikeTheModel) {
-    std::mt19937 random(188);
-    const auto below = [&random](int limit) { return static_cast<int>(random() % static_cast<unsigned int>(limit)); };
-    for (int round = 0; round < 500; ++round) {
-        VarnekCRingBuffer ring(below(12) + 1);
-        RingModel model{FieldsOf(ring), {}, {}};
-        model.bytes.resize(static_cast<size_t>(model.size));
-        memset(model.storage, 0, model.bytes.size());
-        for (int step = 0; step < 60; ++step) {
-            Fields now = FieldsOf(ring);
-            if (below(12) == 0) {
-                // Near the end of the loop counts too.
-                const int laps = below(2) == 0 ? INT32_MAX - 8 : 0;
-                now = {now.storage,     now.size,        below(now.size), below(now.size),
-                       laps + below(4), laps + below(4), now.mutex};
-                memcpy(static_cast<void *>(&ring), &now, sizeof now);
-                static_cast<Fields &>(model) = now;
-            } else if (below(12) == 0) {
-                ring = VarnekCRingBuffer(ring);
-                const VarnekCRingBuffer &same = ring;
-                ring = same;
-                ASSERT_EQ(FieldsOf(ring).mutex, now.mutex);
-            }
-            TakeLog();
-            ASSERT_EQ(Apply(ring, random), Apply(model, random)) << round << "." << step;
-            random.discard(1);
-            ASSERT_EQ(TakeBodies(), model.log) << round << "." << step;
-            ASSERT_EQ(FieldsOf(ring).State(), model.State()) << round << "." << step;
-            model.log.clear();
-            // What was never written may be read, so a new storage starts with what the model has.
-            Fields after = FieldsOf(ring);
-            if (after.size != now.size) {
-                memcpy(after.storage, model.bytes.data(), model.bytes.size());
-            }
-            ASSERT_TRUE(std::equal(model.bytes.begin(), model.bytes.end(), after.storage));
-        }
-    }
-}
 
 TEST_F(RingBuffer, WithoutStorageEverythingIsRefused) {
     VarnekCRingBuffer none(0), negative(-1), copy(none), target(4);

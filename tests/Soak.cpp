@@ -268,11 +268,8 @@ extern "C" __attribute__((visibility("default"))) int __android_log_write(int, c
 
 int main(int argc, char **argv) {
     const int seconds = argc > 1 ? atoi(argv[1]) : 1;
-    // Everything is on for the tests, whose directory this is; elsewhere the same is put in place.
-    constexpr char kConfig[] = VARNEK_DATA_DIR "debug_ltn.ini";
-    if (!std::ifstream(kConfig).good()) {
-        std::ofstream(kConfig) << "LogToUSB=1\nError=1\nHigh=1\nMid=1\nLow=1\nCommon=1\nGingaAppMgr=1\n";
-    }
+    std::ofstream(VARNEK_DATA_DIR "debug_ltn.ini")
+        << "LogToUSB=1\nError=1\nHigh=1\nMid=1\nLow=1\nCommon=1\nGingaAppMgr=1\n";
     for (int i = 0; i < kThreads; ++i) {
         gWorkers[i].index = i;
         gWorkers[i].random.seed(static_cast<unsigned int>(i + 1));

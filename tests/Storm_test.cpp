@@ -189,35 +189,6 @@ TEST_F(StormAlone, MessagesToRecordsThatComeAndGo) {
     EXPECT_GT(sent, totals.received) << "no record went with messages unread";
 }
 
-TEST_F(StormAlone, NoMessageIsLost) {
-    Totals totals[2];
-    std::atomic<int> sent{0};
-    Storm(2, [&](int thread, std::mt19937 &) {
-        totals[thread].alive = 1;
-        const int32_t handle = VarnekPGL_CreateThread(NameOf(thread).c_str(), 1, 65536, Receiver, &totals[thread]);
-        std::thread senders[kSenders];
-        for (int sender = 0; sender < kSenders; sender++) {
-            senders[sender] = std::thread([&sent, handle, sender] {
-                for (int32_t number = 0; number < 200; number++) {
-                    const THREAD_MSG message = Pack({handle, sender, number, 0});
-                    ASSERT_TRUE(VarnekPGL_SendMessage(handle, &message));
-                    sent++;
-                }
-            });
-        }
-        for (std::thread &sender : senders) {
-            sender.join();
-        }
-        const THREAD_MSG last = Pack({handle, 0, 200, 1});
-        ASSERT_TRUE(VarnekPGL_SendMessage(handle, &last));
-        sent++;
-        ASSERT_TRUE(Eventually([&] { return totals[thread].alive == 0; })) << "a message was lost";
-        ASSERT_TRUE(VarnekPGL_DeleteThread(handle));
-    });
-    EXPECT_GT(sent, 0);
-    EXPECT_EQ(totals[0].received + totals[1].received, sent);
-}
-
 // One start of a timer: when it is due.
 struct Start {
     std::atomic<int64_t> due{0};

@@ -1,7 +1,7 @@
-// A model of the bit stream that moves single bits and works piece by piece, for its test and its
-// fuzz target.
-#ifndef VARNEK_TESTS_SUPPORT_BITSTREAMMODEL_H
-#define VARNEK_TESTS_SUPPORT_BITSTREAMMODEL_H
+// A model of the bit stream that moves single bits, works piece by piece, and composes the traces that
+// the stream owes.
+#ifndef VARNEK_FUZZ_BITSTREAMMODEL_H
+#define VARNEK_FUZZ_BITSTREAMMODEL_H
 
 #include <algorithm>
 #include <cstdint>

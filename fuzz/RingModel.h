@@ -1,37 +1,15 @@
-// A model of the byte ring that moves single bytes, and sees into a ring's memory, for its test and
-// its fuzz target.
-#ifndef VARNEK_TESTS_SUPPORT_RINGMODEL_H
-#define VARNEK_TESTS_SUPPORT_RINGMODEL_H
+// A model of the byte ring that moves single bytes, and composes the traces that the ring owes.
+#ifndef VARNEK_FUZZ_RINGMODEL_H
+#define VARNEK_FUZZ_RINGMODEL_H
 
-#include <cstring>
-#include <sstream>
 #include <string>
-#include <tuple>
+#include <type_traits>
 #include <vector>
 
-#include "Varnek_CRingBuffer.h"
+#include "support/RingFields.h"
 
-// A ring's memory: how a test brings about what no operation does.
-struct Fields {
-    unsigned char *storage;
-    int size, w, r, wl, rl;
-    int32_t mutex;
-    auto State() const { return std::tie(size, w, r, wl, rl); }
-};
-
-inline Fields FieldsOf(const VarnekCRingBuffer &ring) {
-    Fields fields;
-    static_assert(sizeof fields == sizeof ring);
-    memcpy(&fields, static_cast<const void *>(&ring), sizeof fields);
-    return fields;
-}
-
-template <typename... Parts>
-std::string Text(const Parts &...parts) {
-    std::ostringstream text;
-    (text << ... << parts);
-    return text.str();
-}
+inline std::string Text(const std::string &text) { return text; }
+inline std::string Text(int number) { return std::to_string(number); }
 
 // The same operations, byte by byte.
 struct RingModel : Fields {
@@ -40,7 +18,7 @@ struct RingModel : Fields {
 
     template <typename... Parts>
     int Say(int result, const Parts &...parts) {
-        log.push_back(Text(parts..., "\n"));
+        log.push_back((Text(parts) + ... + "\n"));
         return result;
     }
     int Ahead() const { return static_cast<int>(int64_t{wl} - rl); }
