@@ -5,7 +5,6 @@
 #include <unistd.h>
 
 #include <cstring>
-#include <utility>
 
 #include "Varnek_Debug.h"
 
@@ -34,7 +33,20 @@ void CollectTraces() {
     };
 }
 
-std::vector<std::string> TakeTraces() { return std::exchange(gTraces, {}); }
+void DropTraces() { gTraces.clear(); }
+
+void CheckTraces(const std::vector<std::string> &expected) {
+    if (gTraces == expected) {
+        return DropTraces();
+    }
+    for (const std::string &line : gTraces) {
+        fprintf(stderr, "traced:   %s", line.c_str());
+    }
+    for (const std::string &line : expected) {
+        fprintf(stderr, "expected: %s", line.c_str());
+    }
+    CHECK(gTraces == expected);
+}
 
 DataFile::DataFile(const char *name) : fd_(-1) {
     gDataFiles.push_back(VARNEK_DATA_DIR + std::string(name));
@@ -77,5 +89,9 @@ int LLVMFuzzerInitialize(int *, char ***) {
             "LogToUSB=1\nError=1\nHigh=1\nMid=1\nLow=1\nCommon=1\nJNI=1\nMainControl=1\nESG=1\n"
             "SessionManager=1\nSectionParser=1\nDsmccDC=1\nDsmccOC=1\nTsDemux=1\nCPRM=1\nSMPlayer=1\nGingaAppMgr=1\n");
     VarnekPGL_CheckAndInitDebug();
+    CollectTraces();
+    VARNEK_TRACE(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON, "on");
+    CheckTraces({"on"});
+    gOnLog = nullptr;
     return 0;
 }

@@ -27,7 +27,9 @@ extern void (*gOnLog)(const char *tag, const char *text);
 
 // Collects the callers' texts of the traces, instead.
 void CollectTraces();
-std::vector<std::string> TakeTraces();
+void DropTraces();
+// Ends the run, and shows both, unless these were collected since the last call.
+void CheckTraces(const std::vector<std::string> &expected);
 
 // What the platform's feature store gives for the nation.
 extern std::string gFeature;

@@ -15,6 +15,7 @@
 #include <atomic>
 
 #include "Varnek_File.h"
+#include "Varnek_Lock.h"
 #include "Varnek_Support.h"
 
 extern "C" int __android_log_write(int priority, const char *tag, const char *text);
@@ -43,7 +44,7 @@ std::atomic<uint32_t> gDebugState{0};
 
 // Serialises loads. gDebugLoader names the thread that holds it, so that a log function which
 // traces while the load reports through it finds everything off instead of waiting for itself.
-pthread_mutex_t gDebugLoadLock = PTHREAD_MUTEX_INITIALIZER;
+Lock gDebugLoadLock;
 std::atomic<pthread_t> gDebugLoader{};
 
 constexpr size_t kTraceLineSize = 2048;
@@ -233,7 +234,7 @@ void LogSummary(uint32_t enabled) {
 
 // One load, in the thread that holds gDebugLoadLock. While it runs nothing is traced, also when it
 // replaces an earlier load.
-void LoadConfig() {
+void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     gDebugState.fetch_and(kInitialised, std::memory_order_relaxed);
     char path[kPathSize];
     snprintf(path, sizeof path, "%s%s", VARNEK_DATA_DIR, kConfigName);
@@ -265,13 +266,12 @@ void LoadConfigOnce(bool again) {
     if (pthread_equal(gDebugLoader.load(std::memory_order_relaxed), pthread_self())) {
         return;
     }
-    pthread_mutex_lock(&gDebugLoadLock);
+    const Hold hold(gDebugLoadLock);
     if (again || (gDebugState.load(std::memory_order_relaxed) & kInitialised) == 0) {
         gDebugLoader.store(pthread_self(), std::memory_order_relaxed);
         LoadConfig();
         gDebugLoader.store(pthread_t{}, std::memory_order_relaxed);
     }
-    pthread_mutex_unlock(&gDebugLoadLock);
 }
 
 // Composes and writes one line that the configuration lets through. Kept out of line, so that the

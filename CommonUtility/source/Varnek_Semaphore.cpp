@@ -6,6 +6,7 @@
 #include <pthread.h>
 #include <semaphore.h>
 
+#include "Varnek_Lock.h"
 #include "Varnek_SlotTable.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
@@ -23,17 +24,17 @@ struct SEM_MGR_INFO {
     sem_t linuxSem;
 };
 
-// gMutexArrLock guards every change of the table and gNextMutexHandle; the count is read without.
+// The lock guards every change of the table; the table and the count are read without.
+Lock gMutexArrLock;
 SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE> gMutexArr;
 std::atomic<int32_t> gMutexArrSize{0};
-int32_t gNextMutexHandle = 1;
-pthread_mutex_t gMutexArrLock = PTHREAD_MUTEX_INITIALIZER;
+int32_t gNextMutexHandle VARNEK_GUARDED_BY(gMutexArrLock) = 1;
 
-// gSemArrLock likewise.
+// Likewise.
+Lock gSemArrLock;
 SlotTable<SEM_MGR_INFO, MAX_SEM_MGR_INFO_ARR_SIZE> gSemArr;
 std::atomic<int32_t> gSemArrSize{0};
-int32_t gNextSemHandle = 1;
-pthread_mutex_t gSemArrLock = PTHREAD_MUTEX_INITIALIZER;
+int32_t gNextSemHandle VARNEK_GUARDED_BY(gSemArrLock) = 1;
 
 // Mutexes ----------------------------------------------------------------------------------------
 
@@ -58,25 +59,21 @@ int32_t __Varnek_create_mutex(const char *szMutexName) {
                            szMutexName);
     }
 
-    pthread_mutex_lock(&gMutexArrLock);
+    Hold hold(gMutexArrLock);
     const int slot = gMutexArr.FirstFree();
     if (slot == -1) {
-        TRACE_ERROR("***** __Varnek_create_mutex : Can't find empty index!!!!");
-        pthread_mutex_unlock(&gMutexArrLock);
-        return -1;
+        return VARNEK_FAIL(-1, "***** __Varnek_create_mutex : Can't find empty index!!!!");
     }
     pthread_mutex_t &linuxMutex = gMutexArr[slot].linuxMutex;
     if (!Succeeded(pthread_mutex_init(&linuxMutex, nullptr))) {
-        TRACE_ERROR("***** __Varnek_create_mutex : Mutex creation FAIL!! errCode = [%d]",
-                    VarnekPGL_SysGetLastErro());
-        pthread_mutex_unlock(&gMutexArrLock);
-        return -1;
+        return VARNEK_FAIL(-1, "***** __Varnek_create_mutex : Mutex creation FAIL!! errCode = [%d]",
+                           VarnekPGL_SysGetLastErro());
     }
     const int word = FirstWord(linuxMutex);  // before others can lock it
     const int32_t hHandle = gNextMutexHandle++;
     gMutexArr.Publish(slot, szMutexName, hHandle);
     gMutexArrSize.fetch_add(1, std::memory_order_relaxed);
-    pthread_mutex_unlock(&gMutexArrLock);
+    hold.Release();
 
     TRACE_LOW("***** END : __Varnek_create_mutex mutex handle = %d, linuxMutex=[%d]\n", hHandle,
               word);
@@ -106,23 +103,21 @@ int32_t VarnekPGL_CreateMutex(const char *szMutexName) {
 
 BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
     TRACE_LOW("***** START : VarnekPGL_DeleteMutex. hMutex=[%d]", hMutex);
-    pthread_mutex_lock(&gMutexArrLock);
+    Hold hold(gMutexArrLock);
     const int slot = gMutexArr.FindByHandle(hMutex);
     if (slot == -1) {
-        TRACE_ERROR("***** VarnekPGL_DeleteMutex : Can't find mutex info. mutex handle = [%d]",
-                    hMutex);
-        pthread_mutex_unlock(&gMutexArrLock);
-        return FALSE;
+        return VARNEK_FAIL(
+            FALSE, "***** VarnekPGL_DeleteMutex : Can't find mutex info. mutex handle = [%d]",
+            hMutex);
     }
     if (!DestroyMutex(&gMutexArr[slot].linuxMutex)) {
-        TRACE_ERROR("***** VarnekPGL_DeleteMutex : Mutex Destroy FAIL! errCode = [%d]",
-                    VarnekPGL_SysGetLastErro());
-        pthread_mutex_unlock(&gMutexArrLock);
-        return FALSE;
+        return VARNEK_FAIL(FALSE,
+                           "***** VarnekPGL_DeleteMutex : Mutex Destroy FAIL! errCode = [%d]",
+                           VarnekPGL_SysGetLastErro());
     }
     gMutexArr.Withdraw(slot);
     gMutexArrSize.fetch_sub(1, std::memory_order_relaxed);
-    pthread_mutex_unlock(&gMutexArrLock);
+    hold.Release();
     TRACE_LOW("***** END : VarnekPGL_DeleteMutex");
     return TRUE;
 }
@@ -186,16 +181,13 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
                            szSemName, size);
     }
 
-    pthread_mutex_lock(&gSemArrLock);
+    Hold hold(gSemArrLock);
     const int arrIdx = gSemArr.FirstFree();
     if (arrIdx == -1) {
-        TRACE_ERROR("***** __Varnek_create_semaphore : Can't find empty index!!!!");
-        pthread_mutex_unlock(&gSemArrLock);
-        return -1;
+        return VARNEK_FAIL(-1, "***** __Varnek_create_semaphore : Can't find empty index!!!!");
     }
     sem_t &linuxSem = gSemArr[arrIdx].linuxSem;
     if (sem_init(&linuxSem, 0, count) != 0) {
-        pthread_mutex_unlock(&gSemArrLock);
         return VARNEK_FAIL(-1, "__Varnek_create_semaphore: retSem != 0. errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
     }
@@ -203,7 +195,7 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
     const int32_t hHandle = gNextSemHandle++;
     gSemArr.Publish(arrIdx, szSemName, hHandle);
     const int32_t newSize = gSemArrSize.fetch_add(1, std::memory_order_relaxed) + 1;
-    pthread_mutex_unlock(&gSemArrLock);
+    hold.Release();
 
     TRACE_LOW("__Varnek_create_semaphore: ret [%d]. linux Semaphore=[%d],  size = [%d]\n", hHandle,
               word, newSize);
@@ -260,10 +252,9 @@ int32_t VarnekPGL_CreateSemaphore(const char *szSemName, uint32_t count) {
 }
 
 BOOL VarnekPGL_DeleteSemaphore(int32_t hSem) {
-    pthread_mutex_lock(&gSemArrLock);
+    Hold hold(gSemArrLock);
     const int arrIdx = gSemArr.FindByHandle(hSem);
     if (arrIdx == -1) {
-        pthread_mutex_unlock(&gSemArrLock);
         return VARNEK_FAIL(FALSE, "Varnek_delete_semaphore: arrIdx == -1, %d", hSem);
     }
     gSemArr.Withdraw(arrIdx);
@@ -272,7 +263,7 @@ BOOL VarnekPGL_DeleteSemaphore(int32_t hSem) {
                     VarnekPGL_SysGetLastErro());
     }
     const int32_t size = gSemArrSize.fetch_sub(1, std::memory_order_relaxed) - 1;
-    pthread_mutex_unlock(&gSemArrLock);
+    hold.Release();
     TRACE_LOW("Varnek_delete_semaphore: OK %d", size);
     return TRUE;
 }

@@ -13,6 +13,7 @@
 #include <stdlib.h>
 
 #include "Varnek_List.h"
+#include "Varnek_Lock.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_SlotTable.h"
 #include "Varnek_Support.h"
@@ -30,8 +31,8 @@ struct THREAD_MGR_INFO {
     std::atomic<pthread_t> linuxThread;  // as the handle: complete before that is published
     std::atomic<uint32_t> users;         // who is inside, and kRemoved
     sem_t msgQSem;                       // counts the queue's messages
-    pthread_mutex_t queueLock;           // guards MsgQ; zero is unlocked, and it is never destroyed
-    list_t MsgQ;
+    Lock queueLock;
+    list_t MsgQ VARNEK_GUARDED_BY(queueLock);
     const char *removedBy;  // the operation that removed the record, and the level at which it
     uint32_t unreadMask;    // reports unread messages: for the last one out
 };
@@ -108,8 +109,9 @@ int32_t HandleOfName(const char *szThreadName) {
 
 // Users of a record ------------------------------------------------------------------------------
 
-// Takes a removed record apart. Runs in the last thread that had to do with it.
-void Dispose(int slot) {
+// Takes a removed record apart. Runs in the last thread that had to do with it, which is why the
+// queue needs no lock here.
+void Dispose(int slot) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
     THREAD_MGR_INFO &info = gThreadInfoArr[slot];
     if (sem_destroy(&info.msgQSem) != 0) {
         TRACE_ERROR("***** %s : semaphore destroy FAIL!! errCode = [%d]", info.removedBy,
@@ -429,11 +431,11 @@ bool Enqueue(THREAD_MGR_INFO &info, const THREAD_MSG &message, void (*insert)(li
         return false;
     }
     memcpy(block, &message, sizeof message);
-    pthread_mutex_lock(&info.queueLock);
+    Hold hold(info.queueLock);
     const int32_t before = info.MsgQ.count;
     insert(&info.MsgQ, block);
     const bool inserted = info.MsgQ.count != before;
-    pthread_mutex_unlock(&info.queueLock);
+    hold.Release();
     if (!inserted) {
         free(block);
     }
@@ -442,10 +444,10 @@ bool Enqueue(THREAD_MGR_INFO &info, const THREAD_MSG &message, void (*insert)(li
 
 // Moves the first message out of the queue. False when there is none.
 bool Dequeue(THREAD_MGR_INFO &info, THREAD_MSG *message, int32_t *count) {
-    pthread_mutex_lock(&info.queueLock);
+    Hold hold(info.queueLock);
     void *block = list_removeHead(&info.MsgQ);
     const int32_t left = info.MsgQ.count;
-    pthread_mutex_unlock(&info.queueLock);
+    hold.Release();
     if (block == nullptr) {
         return false;
     }

@@ -3,10 +3,10 @@
 // held while a callback runs.
 #include "Varnek_Timer.h"
 
-#include <pthread.h>
 #include <signal.h>
 #include <time.h>
 
+#include "Varnek_Lock.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
@@ -25,38 +25,18 @@ struct TIMER_MGR_INFO {
     bool bAwaited;  // the last start has not called back yet
 };
 
-// All guarded by gTimerArrLock.
-TIMER_MGR_INFO gTimerArr[MAX_TIMER_MGR_INFO_ARR_SIZE];
-int32_t gTimerArrSize = 0;
-pthread_mutex_t gTimerArrLock = PTHREAD_MUTEX_INITIALIZER;
-
-// Holds the table for one operation; released early where a trace or a callback comes after.
-class TableGuard {
-  public:
-    TableGuard() { pthread_mutex_lock(&gTimerArrLock); }
-    ~TableGuard() { Release(); }
-    TableGuard(const TableGuard &) = delete;
-    TableGuard &operator=(const TableGuard &) = delete;
-
-    void Release() {
-        if (held_) {
-            held_ = false;
-            pthread_mutex_unlock(&gTimerArrLock);
-        }
-    }
-
-  private:
-    bool held_ = true;
-};
+Lock gTimerArrLock;
+TIMER_MGR_INFO gTimerArr[MAX_TIMER_MGR_INFO_ARR_SIZE] VARNEK_GUARDED_BY(gTimerArrLock);
+int32_t gTimerArrSize VARNEK_GUARDED_BY(gTimerArrLock) = 0;
 
 // The record of a timer in use, null for an unknown handle.
-TIMER_MGR_INFO *FindTimer(uint32_t timer) {
+TIMER_MGR_INFO *FindTimer(uint32_t timer) VARNEK_REQUIRES(gTimerArrLock) {
     return timer < MAX_TIMER_MGR_INFO_ARR_SIZE && gTimerArr[timer].bUsed ? &gTimerArr[timer]
                                                                          : nullptr;
 }
 
 // The handle of the timer in use under this name, -1 for none.
-int32_t FindName(const char *szTmName) {
+int32_t FindName(const char *szTmName) VARNEK_REQUIRES(gTimerArrLock) {
     for (int32_t timer = 0; timer < MAX_TIMER_MGR_INFO_ARR_SIZE; timer++) {
         if (gTimerArr[timer].bUsed && strcmp(gTimerArr[timer].szTmName, szTmName) == 0) {
             return timer;
@@ -65,7 +45,7 @@ int32_t FindName(const char *szTmName) {
     return -1;
 }
 
-int32_t FirstFree() {
+int32_t FirstFree() VARNEK_REQUIRES(gTimerArrLock) {
     for (int32_t timer = 0; timer < MAX_TIMER_MGR_INFO_ARR_SIZE; timer++) {
         if (!gTimerArr[timer].bUsed) {
             return timer;
@@ -104,7 +84,7 @@ void TimerCallbackEntry(sigval value) {
         TRACE_ERROR("Timer Callback! But timer is invalid! timer=[%d]", static_cast<int>(timer));
         return;
     }
-    TableGuard guard;
+    Hold hold(gTimerArrLock);
     TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
         TRACE_ERROR("Timer Callback! But Timer isn't used! timer=[%d]", static_cast<int>(timer));
@@ -124,7 +104,7 @@ void TimerCallbackEntry(sigval value) {
     info->bAwaited = false;
     const TimerCallbackFunc pfnCallback = info->pfnCallback;
     void *pUserData = info->pUserData;
-    guard.Release();
+    hold.Release();
     pfnCallback(timer, pUserData);
 }
 
@@ -144,7 +124,7 @@ int32_t VarnekPGL_CreateTimer(const char *szTmName) {
     if (szTmName == nullptr || strnlen(szTmName, kTimerNameSize) >= kTimerNameSize) {
         return VARNEK_FAIL(-1, "VarnekPGL_CreateTimer. Invalid Timer Name=[%s]", Shown(szTmName));
     }
-    TableGuard guard;
+    Hold hold(gTimerArrLock);
     if (gTimerArrSize >= MAX_TIMER_MGR_INFO_ARR_SIZE) {
         return VARNEK_FAIL(-1, "VarnekPGL_CreateTimer. Timer pool is Full!");
     }
@@ -161,7 +141,7 @@ int32_t VarnekPGL_CreateTimer(const char *szTmName) {
     gTimerArr[timer].bUsed = true;
     memcpy(gTimerArr[timer].szTmName, szTmName, strlen(szTmName) + 1);
     gTimerArrSize++;
-    guard.Release();
+    hold.Release();
     TRACE_MID("END: VarnekPG_CreateTimer. timer handle=[%d]!!!", timer);
     return timer;
 }
@@ -176,7 +156,7 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
     if (callback == nullptr) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_StartTimer. No timer callback!");
     }
-    TableGuard guard;
+    Hold hold(gTimerArrLock);
     TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_StartTimer. Invalid Timer Handle=[%d]!",
@@ -212,14 +192,14 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
     info->pfnCallback = callback;
     info->pUserData = userData;
     info->bAwaited = true;
-    guard.Release();
+    hold.Release();
     TRACE_MID("END: VarnekPGL_StartTimer. Success!");
     return TRUE;
 }
 
 BOOL VarnekPGL_CancelTimer(uint32_t timer) {
     TRACE_LOW("START: VarnekPGL_CancelTimer. timer=[%d]", static_cast<int>(timer));
-    TableGuard guard;
+    Hold hold(gTimerArrLock);
     TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
         // A free slot's name is empty, and no other handle has a name.
@@ -246,14 +226,14 @@ BOOL VarnekPGL_CancelTimer(uint32_t timer) {
     } else {
         info->bAwaited = false;
     }
-    guard.Release();
+    hold.Release();
     TRACE_MID("END: VarnekPGL_CancelTimer. timer=[%d]", static_cast<int>(timer));
     return TRUE;
 }
 
 BOOL VarnekPGL_DeleteTimer(uint32_t timer) {
     TRACE_LOW("START: VarnekPGL_DeleteTimer. timer=[%d]", static_cast<int>(timer));
-    TableGuard guard;
+    Hold hold(gTimerArrLock);
     TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_DeleteTimer. Invalid Timer Handle=[%d]!",
@@ -267,7 +247,7 @@ BOOL VarnekPGL_DeleteTimer(uint32_t timer) {
     }
     *info = {};
     gTimerArrSize--;
-    guard.Release();
+    hold.Release();
     TRACE_MID("END: VarnekPGL_DeleteTimer.");
     return TRUE;
 }
@@ -276,12 +256,12 @@ int32_t VarnekPGL_GetTimerByName(const char *szTmName) {
     if (szTmName == nullptr) {
         return VARNEK_FAIL(-1, "VarnekPGL_GetTimerByName: Timer Name is NULL!");
     }
-    const TableGuard guard;
+    const Hold hold(gTimerArrLock);
     return FindName(szTmName);
 }
 
 BOOL VarnekPGL_IsTimerActive(uint32_t timer) {
-    const TableGuard guard;
+    const Hold hold(gTimerArrLock);
     const TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_IsTimerActive. Invalid Timer Handle=[%d]!",
