@@ -17,6 +17,7 @@
 #include "Varnek_LngPack.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
+#include "Varnek_Time.h"
 #include "Varnek_Timer.h"
 #include "Varnek_Util.h"
 #include "support/FailingCalls.h"
@@ -445,7 +446,36 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
          808,
          {-101, -501, -500, -492, 0, 799, 800},
          true},
-        {"copy", [&] { return content(), VarnekPGL_CopyFile(file.c_str(), copy.c_str()); }, 0, {-1}},
+        {"copy", [&] { return content(), VarnekPGL_CopyFile(file.c_str(), copy.c_str()); }, 0, {-1}, true},
+        {"listing",
+         [&] {
+             VarnekPGL_MakeDir(directory.c_str());
+             int entries = 0;
+             PglDirEntryInfo entry;
+             void *const listed = VarnekPGL_OpenDir(directory.c_str());
+             for (; VarnekPGL_ReadDir(listed, &entry); ++entries) {
+             }
+             VarnekPGL_CloseDir(listed);
+             std::filesystem::remove_all(directory, ignored);
+             return entries;
+         },
+         2,
+         {0, 1}},
+        {"attributes",
+         [&] {
+             PglFmFileAttributes attributes;
+             return content(), VarnekPGL_FmGetFileAttributes(file.c_str(), &attributes);
+         },
+         TRUE,
+         {FALSE}},
+        {"clock",
+         [] {
+             PglMilliTime now;
+             return VarnekPGL_GetMilliseconds(&now);
+         },
+         TRUE,
+         {FALSE},
+         true},
         {"directory",
          [&] {
              const int32_t made = VarnekPGL_MakeDir(directory.c_str());
@@ -497,7 +527,7 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         }
     }
     RecordProperty("forced", forced);
-    EXPECT_GT(forced, 90);
+    EXPECT_GT(forced, 130);
     EXPECT_TRUE(VarnekPGL_DeleteThread(sink));
     std::filesystem::remove(settings);
     std::filesystem::rename(settings + ".aside", settings, ignored);

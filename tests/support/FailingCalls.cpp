@@ -5,6 +5,7 @@
 #include <semaphore.h>
 #include <signal.h>
 #include <sys/stat.h>
+#include <sys/time.h>
 #include <time.h>
 #include <unistd.h>
 
@@ -92,6 +93,14 @@ WRAP_POSIX(remove, (const char *path), path)
 WRAP_POSIX(rmdir, (const char *path), path)
 WRAP_POSIX(mkdir, (const char *path, mode_t mode), path, mode)
 WRAP(DIR *, nullptr, opendir, (const char *path), path)
+WRAP_POSIX(stat64, (const char *path, struct stat64 *info), path, info)
+WRAP_POSIX(lstat64, (const char *path, struct stat64 *info), path, info)
+WRAP_POSIX(access, (const char *path, int mode), path, mode)
+WRAP_POSIX(fsync, (int fd), fd)
+WRAP(int, (__real_close(fd), errno = gCall_close.error, -1), close, (int fd), fd)
+WRAP(dirent64 *, nullptr, readdir64, (DIR * directory), directory)
+WRAP(int, (__real_closedir(directory), errno = gCall_closedir.error, -1), closedir, (DIR * directory), directory)
+WRAP_POSIX(gettimeofday, (timeval * time, void *zone), time, zone)
 WRAP_POSIX(system, (const char *command), command)
 
 // Of these, the library uses operator new[](size_t, const std::nothrow_t &), under its mangled name.
