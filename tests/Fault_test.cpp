@@ -292,8 +292,14 @@ TEST_F(Fault, AStringWithoutMemoryIsNullOrUnchanged) {
     const VarnekCString empty(""), text("text");
     VarnekCString target("a"), kept("text");
     const std::function<void()> operations[] = {
-        [&] { EXPECT_EQ(text.String(), nullptr); },         [&] { target = text; }, [&] { target = "text"; },
-        [&] { EXPECT_EQ(VarnekCString(text) == text, 0); }, [&] { kept += text; },  [&] { kept += "text"; },
+        [&] { EXPECT_EQ(text.String(), nullptr); },
+        [&] { target = text; },
+        [&] { target = "text"; },
+        [&] { EXPECT_EQ(VarnekCString(text) == text, 0); },
+        [&] { kept += text; },
+        [&] { kept += "text"; },
+        [&] { EXPECT_EQ((text + text).String(), nullptr); },
+        [&] { EXPECT_EQ((text + "text").String(), nullptr); },
     };
     for (const auto &operation : operations) {
         target = "a";
@@ -316,10 +322,12 @@ TEST_F(FaultAlone, SettingsStayWhenAFileCannotBeRead) {
     std::error_code ignored;
     std::filesystem::rename(path, path + ".aside", ignored);
     WriteAll(path, "CONFIG_STANDARDTYPE=5");
-    FailCall("malloc", 1, ENOMEM);
-    VarnekCfg_LoadConfigFile();
-    EXPECT_EQ(TakeBodies().back(), "  VarnekCfg_LoadConfigFile : Out of memory!");
-    EXPECT_EQ(VarnekCfg_GetConfigInfo()->cprmPlayerDelay, 68);
+    for (const auto &[call, reason] : {std::pair("malloc", "Out of memory!"), {"fread", "Cannot Read Config File!"}}) {
+        FailCall(call, 1, EIO);
+        VarnekCfg_LoadConfigFile();
+        EXPECT_EQ(TakeBodies().back(), std::string("  VarnekCfg_LoadConfigFile : ") + reason);
+        EXPECT_EQ(VarnekCfg_GetConfigInfo()->cprmPlayerDelay, 68);
+    }
     VarnekCfg_LoadConfigFile();
     EXPECT_EQ(VarnekCfg_GetStandard(), 5);
     std::filesystem::remove(path);

@@ -107,7 +107,7 @@ void Advance(int *pos, int *laps, int length, int size) {
     *laps = AddLaps(*laps, 1);
 }
 
-// Either pointer may be null when there is nothing to copy.
+// A null pointer comes with nothing to copy.
 void Copy(unsigned char *to, const unsigned char *from, int count) {
     if (count > 0 && to != nullptr && from != nullptr) {
         memcpy(to, from, static_cast<size_t>(count));

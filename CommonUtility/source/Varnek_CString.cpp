@@ -114,15 +114,21 @@ VarnekCString &VarnekCString::operator+=(char const *text) {
     return *this;
 }
 
+// Without memory for the left operand a sum is null, and not the right operand alone.
+
 VarnekCString VarnekCString::operator+(const VarnekCString &other) const {
     VarnekCString sum(*this);
-    sum += other;
+    if (sum.pszString != nullptr || pszString == nullptr) {
+        sum += other;
+    }
     return sum;
 }
 
 VarnekCString VarnekCString::operator+(char const *text) const {
     VarnekCString sum(*this);
-    sum += text;
+    if (sum.pszString != nullptr || pszString == nullptr) {
+        sum += text;
+    }
     return sum;
 }
 

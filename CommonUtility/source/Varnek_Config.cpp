@@ -183,21 +183,24 @@ void VarnekCfg_LoadConfigFile() {
     CTRL_HIGH("  VarnekCfg_LoadConfigFile : readlen = %d", length);
     if (length > 0) {
         char *text = static_cast<char *>(malloc(static_cast<size_t>(length) + 1));
-        if (text == nullptr) {
+        const uint32_t count =
+            text != nullptr ? VarnekPGL_ReadFileByHandle(file, text, static_cast<uint32_t>(length))
+                            : 0;
+        // A file that cannot be read is no reason to lose the settings, which the next save would
+        // write over it.
+        if (count == 0) {
             gpVarnekConfigInfo = before;
-            CTRL_HIGH("  VarnekCfg_LoadConfigFile : Out of memory!");
+            CTRL_HIGH("  VarnekCfg_LoadConfigFile : %s",
+                      text != nullptr ? "Cannot Read Config File!" : "Out of memory!");
             VarnekPGL_CloseFile(file);
+            free(text);
             return;
         }
-        const uint32_t count =
-            VarnekPGL_ReadFileByHandle(file, text, static_cast<uint32_t>(length));
         text[count] = '\0';
-        VarnekPGL_CloseFile(file);
         ReadText(text);
         free(text);
-    } else {
-        VarnekPGL_CloseFile(file);
     }
+    VarnekPGL_CloseFile(file);
     CTRL_HIGH(" __VarnekCfg_GetTempBuffer: End of Configuration\n");
     VarnekCfg_GetSupportNation();
 }

@@ -163,7 +163,7 @@ BOOL VarnekPGL_SecondsToDataTime(uint32_t seconds, VarnekCDateTime *dt) {
         rest -= kYear;
     }
     const int32_t day = static_cast<int32_t>(rest / kDay);
-    // No month is longer than 32 days, so the search starts at the right month or just before it.
+    // Months have at most 31 days, so this is the right month or one before it, never one behind.
     int32_t month = day / 32 + 1;
     while (months[month] < day) {
         ++month;
