@@ -7,20 +7,12 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
 #include <string>
 #include <vector>
 
-extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
+#include "Check.h"
 
-#define CHECK(condition)                                                           \
-    do {                                                                           \
-        if (!(condition)) {                                                        \
-            fprintf(stderr, "%s:%d: CHECK(%s)\n", __FILE__, __LINE__, #condition); \
-            abort();                                                               \
-        }                                                                          \
-    } while (false)
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
 
 // Called for each line of the log; null for none.
 extern void (*gOnLog)(const char *tag, const char *text);

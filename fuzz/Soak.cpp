@@ -6,13 +6,13 @@
 #include <atomic>
 #include <chrono>
 #include <cstdio>
-#include <cstdlib>
 #include <cstring>
 #include <fstream>
 #include <random>
 #include <string>
 #include <thread>
 
+#include "Check.h"
 #include "Varnek_CRingBuffer.h"
 #include "Varnek_Debug.h"
 #include "Varnek_Semaphore.h"
@@ -24,14 +24,6 @@ namespace {
 constexpr int kThreads = 8;
 constexpr int kUnits = 3;  // of the semaphore that all share
 constexpr int kPacket = 188;
-
-#define CHECK(condition)                                                           \
-    do {                                                                           \
-        if (!(condition)) {                                                        \
-            fprintf(stderr, "%s:%d: CHECK(%s)\n", __FILE__, __LINE__, #condition); \
-            abort();                                                               \
-        }                                                                          \
-    } while (false)
 
 std::atomic<bool> gStop{false};
 std::atomic<int> gReady{0}, gSenders{kThreads}, gRunning{kThreads}, gUnitsTaken{0};

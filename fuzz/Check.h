@@ -1,0 +1,16 @@
+// What must hold at any moment. Its failure ends the process, where a debugger or a fuzzer sees it.
+#ifndef VARNEK_FUZZ_CHECK_H
+#define VARNEK_FUZZ_CHECK_H
+
+#include <cstdio>
+#include <cstdlib>
+
+#define CHECK(condition)                                                           \
+    do {                                                                           \
+        if (!(condition)) {                                                        \
+            fprintf(stderr, "%s:%d: CHECK(%s)\n", __FILE__, __LINE__, #condition); \
+            abort();                                                               \
+        }                                                                          \
+    } while (false)
+
+#endif
