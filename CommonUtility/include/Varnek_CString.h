@@ -22,6 +22,7 @@ class VARNEK_API VarnekCString {
     // is refused.
     void SetMemAllocedString(char *text);
 
+    // A copy of the other text; null makes a null string.
     VarnekCString &operator=(const VarnekCString &other);
     VarnekCString &operator=(char const *text);
 

@@ -19,12 +19,13 @@ typedef int32_t BOOL;
 // Time-outs are unsigned 32-bit milliseconds; this one waits without limit.
 #define WAIT_FOREVER 0xFFFFFFFFu
 
-// Trace masks: one level bit and one module bit, or-ed together.
+// Level of a trace: one of these, or-ed with one module.
 #define VARNEK_LEVEL_ERROR 0x80000000u
 #define VARNEK_LEVEL_HIGH 0x40000000u
 #define VARNEK_LEVEL_MID 0x20000000u
 #define VARNEK_LEVEL_LOW 0x10000000u
 
+// Module that traces; each has its tag in the log. Common is this library.
 #define VARNEK_MODULE_COMMON 0x001u
 #define VARNEK_MODULE_JNI 0x002u
 #define VARNEK_MODULE_MAIN_CONTROL 0x004u

@@ -16,7 +16,7 @@ extern "C" {
 
 // Texts are NUL-terminated and hold no line ends. Callers may change fields; nothing is saved then.
 typedef struct VarnekConfigInfo {
-    char currentAreaName[100];
+    char currentAreaName[100];  // the callers' text
     int32_t standardType;       // the callers' code; 0 is "not loaded"; initially 2
     uint8_t tsCaptureEnable;    // 0 or 1
     uint8_t tsFileSimulEnable;  // 0 or 1
@@ -24,7 +24,8 @@ typedef struct VarnekConfigInfo {
     char supportNation[100];    // three-letter code
 } VarnekConfigInfo;
 
-//   returns  the record of the process
+// Gives access to the record, without a load.
+//   returns  the record of the process, never null
 VARNEK_API VarnekConfigInfo *VarnekCfg_GetConfigInfo(void);
 
 // Loads the file. Keys match without case and anywhere in a line; lines beyond 254 characters and
@@ -39,7 +40,7 @@ VARNEK_API void VarnekCfg_SaveConfigFile(void);
 // Sets the standard type, and saves when it is another one.
 VARNEK_API void VarnekCfg_SetStandard(int32_t std);
 
-// May load, see above.
+// Read a field. These three load the file first while `standardType` is 0.
 VARNEK_API int32_t VarnekCfg_GetStandard(void);
 VARNEK_API uint8_t VarnekCfg_GetTSCaptueEnable(void);
 VARNEK_API uint8_t VarnekCfg_GetTSFileSimulEnable(void);
@@ -48,6 +49,7 @@ VARNEK_API uint8_t VarnekCfg_GetTSFileSimulEnable(void);
 //   returns  the record's nation, never empty: "BRA" unless file or platform say otherwise
 VARNEK_API const char *VarnekCfg_GetSupportNation(void);
 
+// Whether the receiver shows BML data broadcasts.
 //   returns  TRUE when the nation is "PHL"
 VARNEK_API BOOL VarnekCfg_IsSupportBML(void);
 

@@ -30,10 +30,13 @@ VARNEK_API PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags);
 VARNEK_API int32_t VarnekPGL_CloseFile(PglFileHandle hFile);
 
 // Moves the position.
+//   hFile    handle of an open stream
+//   offset   bytes from the base
 //   base     0 from the start, 1 from here, 2 from the end
 //   returns  0, also for no stream; -8 for another base; -1 when the seek fails
 VARNEK_API int32_t VarnekPGL_SeekFile(PglFileHandle hFile, int32_t offset, uint32_t base);
 
+// Tells the position.
 //   returns  the position in bytes; -1 for no stream or when there is no such position
 VARNEK_API int32_t VarnekPGL_TellFile(PglFileHandle hFile);
 
@@ -50,7 +53,8 @@ VARNEK_API uint32_t VarnekPGL_ReadFileByHandle(PglFileHandle hFile, void *buffer
 VARNEK_API uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer,
                                                 uint32_t length);
 
-//   returns  the size in bytes, -1 when it cannot be told; the position stays
+// Measures an open stream; the position stays.
+//   returns  the size in bytes, -1 when it cannot be told
 VARNEK_API int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile);
 
 // Reads the first bytes of a file.
@@ -65,9 +69,11 @@ VARNEK_API int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uin
 //   returns  0 when all bytes are stored; -1 when not; -18 when the file cannot be opened
 VARNEK_API int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t length);
 
+// Measures a file.
 //   returns  the size in bytes; 0 when the file cannot be opened or measured
 VARNEK_API int32_t VarnekPGL_GetFileSize(const char *path);
 
+// Tries whether a file can be read.
 //   returns  TRUE when the file can be opened for reading
 VARNEK_API BOOL VarnekPGL_CheckFile(const char *path);
 
@@ -80,14 +86,17 @@ VARNEK_API int32_t VarnekPGL_DeleteFile(const char *path);
 // write is one system call, unbuffered. A negative descriptor is logged and refused.
 
 // Opens a descriptor; nothing ever truncates.
+//   path     of any length that the system takes
 //   flags    READ; WRITE (write-only); APPEND (with WRITE or CREATE_RW); READ | WRITE (read-write,
 //            not created, not appending); CREATE_RW (read-write, created with 0666 under the umask)
 //   returns  the descriptor, to be closed by the caller; a negative value on failure
 VARNEK_API int32_t VarnekPGL_OpenFile64Bits(const char *path, int32_t flags);
 
+// Closes a descriptor.
 //   returns  0 whatever the close reported; -1 for a negative descriptor
 VARNEK_API int32_t VarnekPGL_CloseFile64Bits(int32_t hFile);
 
+// Reads up to `length` bytes with one call.
 //   returns  the bytes read, 0 at the end of the file; -1 when the read fails; 0 for a negative
 //            descriptor
 VARNEK_API int32_t VarnekPGL_ReadFileByHandle64Bits(int32_t hFile, void *buffer, uint32_t length);
@@ -98,10 +107,14 @@ VARNEK_API int32_t VarnekPGL_ReadFileByHandle64Bits(int32_t hFile, void *buffer,
 VARNEK_API int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer,
                                                      uint32_t length);
 
+// Moves the position.
+//   hFile    the descriptor
+//   offset   bytes from the base
 //   base     0 from the start, 1 from here, 2 from the end
 //   returns  0 whatever the seek reported; -8 for another base; -1 for a negative descriptor
 VARNEK_API int32_t VarnekPGL_SeekFile64Bits(int32_t hFile, int64_t offset, uint32_t base);
 
+// Tells the position.
 //   returns  the position in bytes; -1 when there is none; 0 for a negative descriptor
 VARNEK_API int64_t VarnekPGL_TellFile64Bits(int32_t hFile);
 
@@ -109,16 +122,18 @@ VARNEK_API int64_t VarnekPGL_TellFile64Bits(int32_t hFile);
 //   returns  0 whatever the system reported; -1 for a negative descriptor
 VARNEK_API int32_t VarnekPGL_FlushFile64Bits(int32_t hFile);
 
+// Measures a file.
 //   returns  the size in bytes; 0, without a log line, when the file cannot be opened or measured
 VARNEK_API int64_t VarnekPGL_GetFileSize64Bits(const char *path);
 
-//   returns  the size in bytes, -1 when it cannot be told; the position stays
+// Measures an open file; the position stays. Logs nothing.
+//   returns  the size in bytes, -1 when it cannot be told
 VARNEK_API int64_t VarnekPGL_GetFileSizeByHandle64Bits(int32_t hFile);
 
 // Directories ------------------------------------------------------------------------------------
 
 #define PGL_ENTRY_FILE 1  // anything that is not a directory, or whose kind is not known
-#define PGL_ENTRY_DIR 2
+#define PGL_ENTRY_DIR 2   // a directory
 
 // What an open of a directory returns on failure.
 #define PGL_INVALID_DIR_HANDLE ((void *)(intptr_t)-1)
@@ -161,9 +176,11 @@ VARNEK_API int32_t VarnekPGL_DeleteDir(const char *path);
 //   returns  0, or -1; a directory that does not exist is not created
 VARNEK_API int32_t VarnekPGL_ClearDir(const char *path);
 
+// Opens a directory.
 //   returns  a directory handle, to be closed by the caller; PGL_INVALID_DIR_HANDLE on failure
 VARNEK_API void *VarnekPGL_OpenDir(const char *path);
 
+// Closes a directory. A null handle and that of a failed open are accepted.
 //   returns  TRUE, always
 VARNEK_API BOOL VarnekPGL_CloseDir(void *hDir);
 
@@ -174,9 +191,11 @@ VARNEK_API BOOL VarnekPGL_CloseDir(void *hDir);
 VARNEK_API BOOL __VarnekPGL_ReadDir(void *hDir, PglDirEntry *entry);
 VARNEK_API BOOL VarnekPGL_ReadDir(void *hDir, PglDirEntryInfo *info);
 
+// Tries whether a directory can be listed.
 //   returns  TRUE when the directory can be opened
 VARNEK_API BOOL VarnekPGL_CheckDir(const char *path);
 
+// Tells a file's size.
 //   returns  TRUE with the record filled; FALSE when there is no such file or no record
 VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttributes *attr);
 
@@ -189,10 +208,12 @@ VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttribu
 //   returns  0, or -1
 VARNEK_API int32_t VarnekPGL_CopyFile(const char *source, const char *destination);
 
+// Moves or renames a file, over another file's place included.
 //   returns  0, or -1
 VARNEK_API int32_t VarnekPGL_MoveFile(const char *source, const char *destination);
 
 // Changes a file's permissions.
+//   path     the file
 //   mode     decimal 666, 755 or 777, read as the octal permission
 //   returns  0; the command's status, as system() gives it, when it fails; -1 for another mode or a
 //            command that is too long

@@ -1,5 +1,10 @@
 // A doubly linked list of untyped data pointers. It owns its nodes and, where not said otherwise,
 // not the data. It has no lock: who shares a list guards it.
+//
+// A null list is accepted everywhere and nothing happens (results: 0 or null). Positions count from
+// 0 at the head. Null data is never stored, so a null result of a removal means that nothing was
+// removed. When a node cannot be allocated, an insertion leaves the list unchanged. Nothing is
+// traced.
 #ifndef VARNEK_LIST_H
 #define VARNEK_LIST_H
 
@@ -9,28 +14,29 @@
 extern "C" {
 #endif
 
+// A node, from malloc; the list's until it is removed.
 typedef struct list_node_t {
-    void *data;
-    struct list_node_t *prev;
-    struct list_node_t *next;
+    void *data;                // the caller's, never null
+    struct list_node_t *prev;  // null at the head
+    struct list_node_t *next;  // null at the tail
 } list_node_t;
 
+// A list; all zero is an empty one.
 typedef struct list_t {
-    int32_t count;
-    list_node_t *head;
-    list_node_t *tail;
+    int32_t count;      // nodes
+    list_node_t *head;  // null when empty
+    list_node_t *tail;  // null when empty
 } list_t;
 
-// A null list is accepted everywhere and nothing happens (results: 0 or null). Positions count from
-// 0 at the head. Null data is never stored, so a null result of a removal means that nothing was
-// removed. When a node cannot be allocated, an insertion leaves the list unchanged.
-
+// Makes an empty list. Nodes that it had are forgotten, not freed.
 VARNEK_API void list_initialize(list_t *list);
 
+// Insert data at the head and at the tail.
 VARNEK_API void list_insertHead(list_t *list, void *data);
 VARNEK_API void list_insertTail(list_t *list, void *data);
-VARNEK_API void list_insert(list_t *list, void *data);  // at the tail
-// At a position from 0; one at or beyond the count appends, a negative one changes nothing.
+VARNEK_API void list_insert(list_t *list, void *data);
+// Inserts data at a position from 0; one at or beyond the count appends, a negative one changes
+// nothing.
 VARNEK_API void list_insertAt(list_t *list, int32_t position, void *data);
 
 // The data at a position; null outside the list.

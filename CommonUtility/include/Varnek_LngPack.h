@@ -14,11 +14,14 @@ extern "C" {
 #endif
 
 // Latin-15 to units. Control characters are dropped; the no-break space becomes a space.
-//   outBufSize  units of room, the terminator not counted: an input of exactly this many bytes fits
-//   returns     TRUE; FALSE for a null pointer or an input that is too long
+//   pmszOutText  out: the units and a terminator
+//   outBufSize   units of room, the terminator not counted: as many bytes of input fit
+//   szInText     the Latin-15 text
+//   returns      TRUE; FALSE for a null pointer or an input that is too long
 VARNEK_API BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize,
                                            const char *szInText);
 
+// Counts units.
 //   returns  the units before the terminator; -1 for null
 VARNEK_API int WmStrlen(const unsigned short *mszText);
 
@@ -37,12 +40,16 @@ VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInTex
 // UTF-8 to units, of at most `length` bytes of input; bytes beyond are never read. A byte that
 // starts no character gives its low seven bits. U+00A0 becomes a space. Four-byte forms are not
 // decoded.
-//   outBufSize  bytes of room, the terminator counted; the two bytes of that are always needed
-//   returns     TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a
-//               null pointer or too little room
+//   pmszOutText  out: the units and a terminator
+//   outBufSize   bytes of room, the terminator counted; the two bytes of that are always needed
+//   szInText     the UTF-8 text
+//   length       bytes of input at most
+//   returns      TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a
+//                null pointer or too little room
 VARNEK_API BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize,
                                    const char *szInText, int length);
 
+// Measures for WmConvertUTF2PCode.
 //   returns  the bytes of room that WmConvertUTF2PCode needs for this input, terminator included;
 //            that of an empty text for null
 VARNEK_API int __WmLngStrlenByByte(const char *szText, int length);
@@ -65,6 +72,7 @@ VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned 
 // Latin-15 to a new UTF-8 text.
 //   outputData   in: null or a block from malloc, which is freed; out: a block from malloc that the
 //                caller frees. Left alone when the result is FALSE or the converted text is empty
+//   szInput      the Latin-15 text
 //   szInputSize  length of the input in bytes; up to three times as many and one are accepted
 //   returns      TRUE; FALSE for a null pointer, a longer input or too little memory
 VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,

@@ -2,8 +2,8 @@
 //
 // Handles start at 1, rise by one with every creation and are never given out twice; mutexes and
 // semaphores count apart. Names have 1 to 31 characters and compare exactly. Any thread may call
-// any operation, and no call is needed to set the tables up. A failure is
-// traced at Error; a time-out and a name that is not found are none.
+// any operation, and no call is needed to set the tables up. A failure is traced at Error. A
+// time-out and a name that is not found are no failures, and nothing is traced for them.
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H
 
@@ -21,6 +21,7 @@ extern "C" {
 //   returns  the handle; -1 for a bad name, a full table or a failing OS call
 VARNEK_API int32_t VarnekPGL_CreateMutex(const char *szMutexName);
 
+// Deletes a mutex that nobody holds.
 //   returns  TRUE when the mutex is gone; FALSE for an unknown handle or a mutex that is held
 VARNEK_API BOOL VarnekPGL_DeleteMutex(int32_t hMutex);
 
@@ -32,25 +33,28 @@ VARNEK_API BOOL VarnekPGL_AcquireMutex(int32_t hMutex);
 //   returns  TRUE; FALSE for an unknown handle or a failing OS call
 VARNEK_API BOOL VarnekPGL_ReleaseMutex(int32_t hMutex);
 
-//   returns  the handle of the live mutex of this name; -1 for none and for null. Traces nothing
+// Finds a mutex. Traces nothing.
+//   returns  the handle of the live mutex of this name; -1 for none and for null
 VARNEK_API int32_t VarnekPGL_GetMutexByName(const char *szMutexName);
 
 // Semaphores -------------------------------------------------------------------------------------
 // A semaphore is deleted only when no thread waits on it or can still signal it.
 
 // Creates a semaphore. A live semaphore of this name is deleted first.
-//   count    units at the start, at most what the system's semaphores hold
-//   returns  the handle; -1 for a bad name, a full table or a failing OS call
+//   szSemName  1 to 31 characters
+//   count      units at the start, at most what the system's semaphores hold
+//   returns    the handle; -1 for a bad name, a full table or a failing OS call
 VARNEK_API int32_t VarnekPGL_CreateSemaphore(const char *szSemName, uint32_t count);
 
+// Deletes a semaphore.
 //   returns  TRUE when the slot is free, whatever the OS says; FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteSemaphore(int32_t hSem);
 
 // Takes one unit, waiting up to `timeout`.
+//   hSem     handle of a live semaphore
 //   timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
-//   returns  TRUE when a unit was taken; FALSE on time-out and on every failure alike. An
-//   interrupted
-//            wait is not resumed
+//   returns  TRUE when a unit was taken; FALSE on time-out and on every failure alike. A wait that
+//            a signal interrupts is not resumed
 //   traces   Low on entry; Error for an unknown handle or a failing OS wait; nothing on time-out
 VARNEK_API BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout);
 
@@ -58,8 +62,8 @@ VARNEK_API BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout);
 //   returns  TRUE; FALSE for an unknown handle or a failing OS call
 VARNEK_API BOOL VarnekPGL_SignalSemaphore(int32_t hSem);
 
-//   returns  the handle of the live semaphore of this name; -1 for none and for null. Traces
-//   nothing
+// Finds a semaphore. Traces nothing.
+//   returns  the handle of the live semaphore of this name; -1 for none and for null
 VARNEK_API int32_t VarnekPGL_SemaphoreByName(const char *szSemName);
 
 #ifdef __cplusplus

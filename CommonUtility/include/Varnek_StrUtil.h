@@ -19,6 +19,7 @@ extern "C" {
 VARNEK_API char *VarnekPGL_Stristr(const char *haystack, const char *needle);
 
 // Writes a number with upper-case digits.
+//   value    the number
 //   buffer   room for the digits and the terminator: 11 bytes in radix 10, at most 33
 //   radix    2 to 16; any other gives the empty text
 //   returns  `buffer`
@@ -26,6 +27,7 @@ VARNEK_API char *VarnekPGL_Itoa(uint32_t value, char *buffer, uint32_t radix);
 
 // Writes a number with lower-case digits; only radix 10 knows a sign, every other shows the 32-bit
 // pattern.
+//   value    the number
 //   buffer   room for sign, digits and terminator: 12 bytes in radix 10, at most 33
 //   radix    2 to 36; any other gives the empty text
 //   returns  `buffer`
@@ -41,11 +43,12 @@ VARNEK_API int32_t VarnekPGL_Strnicmp(const char *a, const char *b, uint32_t cou
 
 // Copies a part of a text, as strncpy does: exactly `count` bytes are written, padded with NULs,
 // and there is no terminator when the part has `count` bytes or more.
-//   start    position of the first byte; below 1 from the beginning
-//   count    below 1 makes the destination empty
-//   returns  `destination`; a constant empty text, and nothing written, when `start` lies beyond
-//   the
-//            source's end
+//   destination  room for `count` bytes, at least one
+//   source       the text
+//   start        position of the first byte; below 1 from the beginning
+//   count        bytes to write; below 1 makes the destination empty
+//   returns      `destination`; a constant empty text, and nothing written, when `start` lies
+//                beyond the source's end
 VARNEK_API char *VarnekPGL_Strmcpy(char *destination, const char *source, int32_t start,
                                    int32_t count);
 

@@ -4,7 +4,7 @@
 // reached, and never stops, joins or cancels it. A thread must not be cancelled inside a call of
 // this library. 20 records; names have 1 to 31 characters, compare exactly and are unique, unless
 // two threads create one at the same moment. Any thread may call any operation. A failure is traced
-// at Error; a name that is not found is none.
+// at Error; a name that is not found is no failure.
 #ifndef VARNEK_THREAD_H
 #define VARNEK_THREAD_H
 
@@ -21,7 +21,8 @@ extern "C" {
 //   szThreadName  1 to 31 characters
 //   priority      1 to 99, kept for the scheduler's policy, which is the ordinary one
 //   stackSize     bytes; what the system refuses gives its default size
-//   function      runs in the new thread with `argument`; its result is dropped
+//   function      runs in the new thread; its result is dropped
+//   argument      handed to `function` unchanged
 //   returns       the handle, never given out twice; -1 on failure
 VARNEK_API int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t priority,
                                           uint32_t stackSize, void *(*function)(void *),
@@ -32,19 +33,21 @@ VARNEK_API int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t prio
 //   returns  TRUE, or FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 
+// Finds a thread.
 //   returns  the handle of the thread of this name; -1 for none and for null
 VARNEK_API int32_t VarnekPGL_GetThreadByName(const char *szThreadName);
 
-//   returns  the calling thread's handle; -1 when it has no record
+// Who am I.
+//   returns  the calling thread's handle; -1, after an Error line, when it has no record
 VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 
 // Messages ---------------------------------------------------------------------------------------
 // A message is copied in and copied out. A queue is bounded only by memory. What one thread sends
 // with VarnekPGL_SendMessage is received in that order.
 
-// What the communicating modules agree on; the library only copies it.
+// One message of 40 bytes.
 typedef struct THREAD_MSG {
-    unsigned char data[40];
+    unsigned char data[40];  // what the communicating modules agree on; the library only copies it
 } THREAD_MSG;
 
 // Appends a message to a thread's queue.

@@ -41,6 +41,7 @@ struct VarnekCDateTime
     VarnekCDateTime &operator-=(const VarnekCDateTime &other);
     VarnekCDateTime operator+(const VarnekCDateTime &other) const;
 
+    // Compare the fields: TRUE or FALSE.
     BOOL operator==(const VarnekCDateTime &other) const;
     BOOL operator>(const VarnekCDateTime &other) const;
     BOOL operator>=(const VarnekCDateTime &other) const;
@@ -49,15 +50,17 @@ struct VarnekCDateTime
 #endif
 };
 
+// A point in time, to the millisecond.
 typedef struct PglMilliTime {
-    int32_t sec;   // since 1970
-    int32_t msec;  // 0 to 999
+    int32_t sec;   // seconds since 1970
+    int32_t msec;  // milliseconds, 0 to 999
 } PglMilliTime;
 
 #ifdef __cplusplus
 extern "C" {
 #endif
 
+// Reads the clock.
 //   returns  the current time in seconds
 VARNEK_API int32_t VarnekPGL_GetTime(void);
 
@@ -70,16 +73,20 @@ VARNEK_API BOOL VarnekPGL_GetMilliseconds(PglMilliTime *out);
 //   returns  TRUE; FALSE for null after a panic report
 VARNEK_API BOOL VarnekPGL_GetSystemTime(VarnekCDateTime *dt);
 
+// Asks the system's time zone.
 //   returns  local time minus UTC in seconds; 0, after a trace, when local time is not known
 VARNEK_API int32_t VarnekPGL_GetTimezoneOffset(void);
 
-// Day, hour, minute and second may be out of their range and simply add on.
+// Counts the seconds from 1970 to a record. Day, hour, minute and second may be out of their range
+// and simply add on.
 //   returns  the seconds; 0 for null, a year outside 1970 to 2030 and a month outside 1 to 12
 VARNEK_API uint32_t VarnekPGL_DateTimeToSeconds(const VarnekCDateTime *dt);
 
+// Fills the record with the point that lies so many seconds after 1970 began.
 //   returns  TRUE; FALSE for null after a panic report
 VARNEK_API BOOL VarnekPGL_SecondsToDataTime(uint32_t seconds, VarnekCDateTime *dt);
 
+// Checks a date, roughly.
 //   returns  TRUE for day 1 to 31, month 1 to 12 and a year from 1970 on, whatever the month's
 //            length; FALSE for null
 VARNEK_API BOOL __VarnekPGL_ValidateDate(const VarnekCDateTime *dt);

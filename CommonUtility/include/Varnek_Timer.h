@@ -2,8 +2,8 @@
 //
 // 32 timers; a handle is the slot's index, 0 to 31, and comes back after a deletion. Names have 0
 // to 40 characters, compare exactly and are unique. A timer is created, then started and cancelled
-// any number of times, then deleted. Any thread may call any operation, a callback included.
-// Failures are traced at Error.
+// any number of times, then deleted. Any thread may call any operation, a callback included. A
+// failure is traced at Error; a name that is not found is no failure.
 #ifndef VARNEK_TIMER_H
 #define VARNEK_TIMER_H
 
@@ -13,8 +13,8 @@
 extern "C" {
 #endif
 
-// Runs on a thread of the OS timer service, with no lock held; callbacks of several timers may run
-// at once. A callback may use its own timer, start it again included.
+// What a timer calls. Runs on a thread of the OS timer service, with no lock held; callbacks of
+// several timers may run at once. A callback may use its own timer, start it again included.
 typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 
 // Takes the lowest free slot; no OS timer exists before the first start.
@@ -22,28 +22,30 @@ typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 
 // Arms the timer once.
+//   timer     handle from VarnekPGL_CreateTimer
 //   timeout   milliseconds from now on the wall clock, 1 or more
+//   callback  called once at the expiry
 //   userData  handed to `callback` unchanged; both stay until the next start
-//   returns   TRUE when armed; FALSE for an unknown handle, an armed timer, a null callback, a
-//   timeout
+//   returns   TRUE when armed; FALSE for an unknown handle, an armed timer, a null callback, a time
 //             of 0 or a failing OS call
 VARNEK_API BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc callback,
                                      void *userData);
 
 // Disarms the timer. An expiry at the same moment may still call back.
 //   returns  TRUE when it is disarmed now, with an Error line when it was already; FALSE for an
-//   unknown
-//            handle, a timer never started or a failing OS call
+//            unknown handle, a timer never started or a failing OS call
 VARNEK_API BOOL VarnekPGL_CancelTimer(uint32_t timer);
 
 // Frees the slot, disarming the timer. An expiry at the same moment may still call back.
 //   returns  TRUE, whatever the OS says; FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteTimer(uint32_t timer);
 
-//   returns  the handle of the timer of this name; -1 for none and for null
+// Finds a timer.
+//   returns  the handle of the timer of this name; -1 for none and, after an Error line, for null
 VARNEK_API int32_t VarnekPGL_GetTimerByName(const char *szTmName);
 
-//   returns  TRUE while the timer is armed
+// Whether a timer is armed.
+//   returns  TRUE while the timer is armed; FALSE otherwise and for an unknown handle
 VARNEK_API BOOL VarnekPGL_IsTimerActive(uint32_t timer);
 
 // Sleeps for milliseconds. A signal ends the sleep early; a negative time returns at once.

@@ -14,6 +14,7 @@ extern "C" {
 
 // Computes the CRC of `length` bytes. Over data that ends in its own CRC, most significant byte
 // first, the result is 0.
+//   data     the bytes, of any alignment
 //   length   4 or more; less is reported by a panic report, and less than 1 reads nothing
 //   returns  the register; 0xFFFFFFFF when `length` is below 1, and for null after a panic report
 VARNEK_API uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t length);
