@@ -30,7 +30,7 @@ VARNEK_API VarnekConfigInfo *VarnekCfg_GetConfigInfo(void);
 
 // Loads the file. Keys match without case and anywhere in a line; lines beyond 254 characters and
 // values beyond 99 are cut, numbers beyond 32 bits are the nearest that fits. A file that cannot be
-// opened, or read for want of memory, leaves the record as it is.
+// opened or read leaves the record as it is.
 VARNEK_API void VarnekCfg_LoadConfigFile(void);
 
 // Writes the record over the file; the data directory must exist. A failure is traced. The file's

@@ -2,7 +2,6 @@
 // search, the loading and the saving.
 #include "Varnek_Config.h"
 
-#include <errno.h>
 #include <stddef.h>
 #include <stdio.h>
 #include <stdlib.h>
@@ -10,6 +9,7 @@
 
 #include "Varnek_File.h"
 #include "Varnek_StrUtil.h"
+#include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
 #define CTRL_HIGH(...) VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
@@ -61,10 +61,6 @@ constexpr char kNationWithBml[] = "PHL";
 
 VarnekConfigInfo gpVarnekConfigInfo = {"", 2, 0, 0, 68, ""};
 
-bool IsLineEnd(char c) {
-    return c == '\r' || c == '\n';
-}
-
 // Copies what fits.
 template <size_t size>
 void CopyText(char (&to)[size], const char *from, size_t length) {
@@ -75,9 +71,8 @@ void CopyText(char (&to)[size], const char *from, size_t length) {
 
 // As atoi; a number that does not fit becomes the nearest that does.
 int32_t NumberOf(const char *text) {
-    const int saved = errno;
+    const ErrnoKeeper keeper;
     const long long number = strtoll(text, nullptr, 10);
-    errno = saved;
     return static_cast<int32_t>(number > INT32_MAX   ? INT32_MAX
                                 : number < INT32_MIN ? INT32_MIN
                                                      : number);

@@ -166,10 +166,6 @@ char *ReadConfig(const char *path, int32_t *size) {
     return data;
 }
 
-bool IsLineEnd(char c) {
-    return c == '\r' || c == '\n';
-}
-
 // What one line enables. A key counts wherever it stands, and so does the '1'.
 uint32_t BitOfLine(const char *line) {
     if (line[0] == '#') {

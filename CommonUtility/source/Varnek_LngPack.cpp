@@ -6,6 +6,7 @@
 #include <stdlib.h>
 #include <string.h>
 
+#include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
 namespace {
@@ -208,15 +209,14 @@ BOOL __WmConvertCodeBufferSizeCheck(const char *szName, int OutBuffer, int Requi
     if (OutBuffer >= RequiredBufSize) {
         return TRUE;
     }
-    const char *name = szName != nullptr ? szName : "(null)";
     if (OutBuffer == 4) {
         TRACE_HIGH("__WmConvertCodeBufferSizeCheck: Out buffer size seems to be small (%s)\n",
-                   name);
+                   Shown(szName));
     } else {
         TRACE_HIGH(
             "__WmConvertCodeBufferSizeCheck: Buffer size is too small %s: OutBuffer(%d), "
             "RequiredBufSize(%d)\n",
-            name, OutBuffer, RequiredBufSize);
+            Shown(szName), OutBuffer, RequiredBufSize);
     }
     return FALSE;
 }

@@ -213,6 +213,7 @@ BOOL WaitForever(int32_t hSem, int arrIdx) {
     return TRUE;
 }
 
+// The limited wait. It looks the handle up afresh, as late as it can: right before the wait.
 BOOL WaitUntilDeadline(int32_t hSem, uint32_t timeout) {
     timespec curTime = {};
     timespec semTimeOut = {};

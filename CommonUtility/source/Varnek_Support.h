@@ -14,6 +14,11 @@ inline const char *Shown(const char *text) {
     return text != nullptr ? text : "(null)";
 }
 
+// Whether a character ends a line of the two configuration files.
+inline bool IsLineEnd(char c) {
+    return c == '\r' || c == '\n';
+}
+
 // The system's text for an error number, the calling thread's until it asks again.
 inline const char *ErrorText(int error) {
     return strerror(error);  // NOLINT(concurrency-mt-unsafe): a buffer per thread on every target
