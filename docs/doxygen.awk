@@ -10,10 +10,10 @@
 
 function is_comment(text) { return text ~ /^ *\/\/( |$)/ }
 
-# Appends to the comment that is being made.
-function say(text) { doc = doc indent "///" (text == "" ? "" : " ") text "\n" }
+# Appends to the comment that is being made, in `doc`.
+function say(text) { doc = doc indent text "\n" }
 
-# Makes `doc` out of comment lines first to last; `columns` tells parameters from tables.
+# Adds comment lines first to last; `columns` tells parameters from tables.
 function render(first, last, columns, i, text, table) {
     for (i = first; i <= last; i++) {
         text = line[i]
@@ -39,6 +39,10 @@ function render(first, last, columns, i, text, table) {
     if (table) { say("@endverbatim") }
 }
 
+function show(last_words) {
+    printf "%s/**\n%s%s%s*/\n", indent, doc, last_words, indent
+}
+
 function close_group() {
     if (grouped) { print "/// @}" }
     grouped = 0
@@ -55,7 +59,7 @@ END {
             if (at == 1) {
                 say("@file")
                 render(at, last, 0)
-                printf "%s", doc
+                show()
                 doc = ""
             } else if (text ~ /-----$/) {
                 close_group()
@@ -63,8 +67,7 @@ END {
                 sub(/ -+$/, "", text)
                 say("@name " text)
                 render(at + 1, last, 0)
-                say("@{")
-                printf "%s", doc
+                show("@{\n")
                 doc = ""
                 grouped = 1
             } else if (line[last + 1] != "") {
@@ -77,7 +80,7 @@ END {
         if (text ~ /^#/ && text !~ /^#define/) {
             if (text ~ /^#ifdef __cplusplus/) { close_group() }
         } else if (text != "") {
-            if (!inside) { printf "%s", doc }
+            if (!inside && doc != "") { show() }
             sub(/  \/\/ /, "  ///< ", text)
             code = text
             sub(/ *\/\/\/<.*/, "", code)
