@@ -105,8 +105,10 @@ int main() {
         std::fputs("exchange: no thread\n", stderr);
         return 1;
     }
-    const bool ended = VarnekPGL_WaitSemaphore(hEnded, 2 * kPatience) != FALSE &&
-                       VarnekPGL_WaitSemaphore(hEnded, 2 * kPatience) != FALSE;
+    bool ended = true;
+    for (int thread = 0; thread < 2; ++thread) {
+        ended = VarnekPGL_WaitSemaphore(hEnded, 2 * kPatience) != FALSE && ended;
+    }
     if (!ended || !gAllShown) {
         std::fputs("exchange: a message went missing\n", stderr);
         return 1;
