@@ -20,8 +20,9 @@
 // everything. Each refusal is traced.
 //
 // Threads: every operation from Reset to Read is atomic towards the others, in a ring that has its
-// mutex; construction, destruction and assignment (of either ring) are not guarded. A copy has no
-// mutex and is for one thread.
+// mutex, but for one that finds the ring in disorder: it lets go of the mutex for a moment before
+// it empties the ring. Construction, destruction and assignment (of either ring) are not guarded. A
+// copy has no mutex and is for one thread.
 class VARNEK_API VarnekCRingBuffer {
   public:
     // An empty ring of `size` bytes. Without a mutex (the pool of them is full) it works unguarded.
@@ -38,14 +39,16 @@ class VARNEK_API VarnekCRingBuffer {
     int Flush();
 
     // Moves the reader to an index (origin 0), on by `aOffset` bytes (1), or to the last `aOffset`
-    // bytes written (2), whatever the storage holds there. Returns 0; -10 for a negative offset and
-    // for one beyond the size or, with origin 1, beyond the readable bytes; -8 for another origin.
+    // bytes written (2), whatever the storage holds there; with origin 2, an offset of the whole
+    // size leaves nothing to read. An index equal to the size is the storage's end: read, or move
+    // on by 0, before the next write. Returns 0; -10 for a negative offset and for one beyond the
+    // size or, with origin 1, beyond the readable bytes; -8 for another origin.
     int Seek(int aOffset, int origin);
 
     // The bytes that can be read and written now; -32 in an overflow and -34 in an underflow state.
     int GetSpaceReading() const;
     int GetSpaceWriting() const;
-    // The readable bytes in per cent of the size; in an abnormal state beyond 0 to 100.
+    // The readable bytes in per cent of the size; in an abnormal state maybe not 0 to 100.
     int GetDistance() const;
 
     // Copies `writelen` bytes in or `readLen` bytes out. Returns 0. A length below 0 or above the

@@ -7,8 +7,8 @@
 #ifdef __cplusplus
 
 // Holds a NUL-terminated text in an array of its own, or none: a null string differs from one with
-// an empty text. Misuse is traced and changes nothing. Without memory, construction and assignment
-// give a null string, and appending changes nothing. One thread uses a string at a time.
+// an empty text. Misuse is traced and changes nothing. Without memory, construction, assignment
+// and a sum give a null string, and appending changes nothing. One thread uses a string at a time.
 class VARNEK_API VarnekCString {
   public:
     // A copy of `text`; null gives a null string.
@@ -16,7 +16,8 @@ class VARNEK_API VarnekCString {
     VarnekCString(const VarnekCString &other);
     ~VarnekCString();
 
-    // A new copy of the text, which the caller releases with delete[]; null for a null string.
+    // A new copy of the text, which the caller releases with delete[]; null for a null string
+    // and without memory.
     char *String() const;
     // Takes over an array from new[] that holds a text; the caller must not use it any more. Null
     // is refused.

@@ -18,8 +18,8 @@ extern "C" {
 typedef struct VarnekConfigInfo {
     char currentAreaName[100];  // the callers' text
     int32_t standardType;       // the callers' code; 0 is "not loaded"; initially 2
-    uint8_t tsCaptureEnable;    // 0 or 1
-    uint8_t tsFileSimulEnable;  // 0 or 1
+    uint8_t tsCaptureEnable;    // 0 is off
+    uint8_t tsFileSimulEnable;  // 0 is off
     int32_t cprmPlayerDelay;    // initially 68
     char supportNation[100];    // three-letter code
 } VarnekConfigInfo;
@@ -29,8 +29,8 @@ typedef struct VarnekConfigInfo {
 VARNEK_API VarnekConfigInfo *VarnekCfg_GetConfigInfo(void);
 
 // Loads the file. Keys match without case and anywhere in a line; lines beyond 254 characters and
-// values beyond 99 are cut, numbers beyond 32 bits are the nearest that fits. A file that cannot be
-// opened or read leaves the record as it is.
+// values beyond 99 are cut, numbers beyond 32 bits are the nearest that fits, and the switches take
+// a number's low 8 bits. A file that cannot be opened or read leaves the record as it is.
 VARNEK_API void VarnekCfg_LoadConfigFile(void);
 
 // Writes the record over the file; the data directory must exist. A failure is traced. The file's

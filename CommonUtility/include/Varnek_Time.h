@@ -14,6 +14,9 @@
 //   0 to 99          a span: years, months and days that passed, then hours, minutes, seconds
 //   anything else    invalid; counts as 0 seconds
 //
+// A point beyond 2030, and a span that would end there, count as 0 seconds too, without a trace.
+// The arithmetic can lead to such points.
+//
 // The results of the arithmetic are points: 90 seconds are 1970-01-01 00:01:30, which count as 90
 // seconds again. Comparisons look at the fields alone, from the year down.
 typedef struct VarnekCDateTime VarnekCDateTime;
@@ -74,7 +77,8 @@ VARNEK_API BOOL VarnekPGL_GetMilliseconds(PglMilliTime *out);
 VARNEK_API BOOL VarnekPGL_GetSystemTime(VarnekCDateTime *dt);
 
 // Asks the system's time zone.
-//   returns  local time minus UTC in seconds; 0, after a trace, when local time is not known
+//   returns  local time minus UTC in seconds; 0, after a trace, when local time is not known; from
+//            2031 on, minus the current time
 VARNEK_API int32_t VarnekPGL_GetTimezoneOffset(void);
 
 // Counts the seconds from 1970 to a record. Day, hour, minute and second may be out of their range
