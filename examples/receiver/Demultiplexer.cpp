@@ -4,7 +4,6 @@
 
 #include <utility>
 
-#include "FieldReader.h"
 #include "Ids.h"
 #include "PacketSource.h"
 #include "Tables.h"
@@ -58,11 +57,10 @@ void Demultiplexer::Push(const unsigned char *packet) {
     if (order == Order::kBroken) {
         ++counters_.continuity_errors;
     }
-    const auto found = assemblers_.find(header.pid);
-    if (found == assemblers_.end() || order == Order::kRepeated) {
+    if (names_[header.pid] == 0 || order == Order::kRepeated) {
         return;
     }
-    SectionAssembler &assembler = found->second;
+    SectionAssembler &assembler = assemblers_.find(header.pid)->second;
     const bool unusable = header.has_payload && (header.scrambled || header.payload == kPacketSize);
     if (order != Order::kNext || unusable) {
         counters_.incomplete += static_cast<unsigned>(assembler.Drop());
@@ -78,26 +76,24 @@ void Demultiplexer::Push(const unsigned char *packet) {
     counters_.incomplete += static_cast<unsigned>(given_up);
 }
 
+// By hand and not field by field, since every packet of the stream comes through here.
 Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
-    FieldReader fields(packet, kPacketSize);
+    constexpr size_t kHeaderSize = 4;
     Header header{};
-    fields.Skip(8);
-    header.transport_error = fields.U8(1) != 0;
-    header.unit_start = fields.U8(1) != 0;
-    fields.Skip(1);
-    header.pid = fields.U16(13);
-    header.scrambled = fields.U8(2) != 0;
-    const bool has_adaptation = fields.U8(1) != 0;
-    header.has_payload = fields.U8(1) != 0;
+    header.transport_error = (packet[1] & 0x80) != 0;
+    header.unit_start = (packet[1] & 0x40) != 0;
+    header.pid = PidOf(packet);
+    header.scrambled = (packet[3] & 0xC0) != 0;
+    const bool has_adaptation = (packet[3] & 0x20) != 0;
+    header.has_payload = (packet[3] & 0x10) != 0;
     header.reserved = !has_adaptation && !header.has_payload;
-    header.counter = fields.U8(4);
-    header.payload = kPacketSize - static_cast<size_t>(fields.BytesLeft());
+    header.counter = packet[3] & 0x0F;
+    header.payload = kHeaderSize;
     if (has_adaptation) {
-        const uint8_t length = fields.U8();
-        FieldReader adaptation = fields.Enter(length);
-        header.discontinuity = length > 0 && adaptation.U8(1) != 0;
-        header.payload =
-            fields.Ok() ? kPacketSize - static_cast<size_t>(fields.BytesLeft()) : kPacketSize;
+        const size_t length = packet[kHeaderSize];
+        const bool fits = kHeaderSize + 1 + length <= kPacketSize;
+        header.discontinuity = fits && length > 0 && (packet[kHeaderSize + 1] & 0x80) != 0;
+        header.payload = fits ? kHeaderSize + 1 + length : kPacketSize;
     }
     return header;
 }
