@@ -270,6 +270,39 @@ void LoadConfigOnce(bool again) {
     }
 }
 
+// Writes "[L][File.cpp- 442] ", as far as it fits, without a terminator. Returns its length. By
+// hand, since the C library would take as long for it as for a caller's text.
+size_t PutPrefix(char (&line)[kTraceLineSize], char label, const char *file, int32_t number) {
+    constexpr size_t kColumns = 4;  // of the line number, at least
+    char digits[12];
+    char *first = digits + sizeof digits;
+    uint32_t rest = number < 0 ? 0u - static_cast<uint32_t>(number) : static_cast<uint32_t>(number);
+    do {
+        *--first = static_cast<char>('0' + rest % 10);
+        rest /= 10;
+    } while (rest != 0);
+    if (number < 0) {
+        *--first = '-';
+    }
+    while (first > digits + sizeof digits - kColumns) {
+        *--first = ' ';
+    }
+
+    size_t length = 0;
+    const auto put = [&line, &length](const char *text, size_t size) {
+        const size_t room = sizeof line - 1 - length;
+        memcpy(line + length, text, size < room ? size : room);
+        length += size < room ? size : room;
+    };
+    const char opening[] = {'[', label, ']', '['};
+    put(opening, sizeof opening);
+    put(file, strlen(file));
+    put("-", 1);
+    put(first, static_cast<size_t>(digits + sizeof digits - first));
+    put("] ", 2);
+    return length;
+}
+
 // Composes and writes one line that the configuration lets through. Kept out of line, so that the
 // buffer costs nothing in a trace that is off.
 __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, const char *format,
@@ -280,14 +313,10 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
     }
     const LevelLook look = LookOfLevel(mask);
     char line[kTraceLineSize];
-    const int written = snprintf(line, sizeof line, "[%c][%s-%4d] ", look.label, CallerFileName(),
-                                 static_cast<int>(CallerLine()));
-    const size_t prefix = written < 0 ? 0 : static_cast<size_t>(written);
-    if (prefix < sizeof line - 1) {
-        const size_t room = sizeof line - prefix;
-        line[prefix] = '\0';
-        vsnprintf(line + prefix, room < kTraceTextSize ? room : kTraceTextSize, format, args);
-    }
+    const size_t prefix = PutPrefix(line, look.label, CallerFileName(), CallerLine());
+    const size_t room = sizeof line - prefix;
+    line[prefix] = '\0';
+    vsnprintf(line + prefix, room < kTraceTextSize ? room : kTraceTextSize, format, args);
     if ((gDebugState.load(std::memory_order_relaxed) & kOutputOn) != 0) {
         __android_log_write(look.priority, TagOfModule(mask), line);
     }
