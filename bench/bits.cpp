@@ -15,8 +15,10 @@ constexpr int kFields[] = {8, 1, 1, 2, 12, 16, 2, 5, 1, 8, 8, 3, 13, 4, 12};
 constexpr size_t kRound = 12;  // bytes of these fields
 constexpr size_t kBytes = 85 * kRound;
 
-uint32_t Ours(unsigned char *data, size_t size) {
-    VarnekCBitInputStream stream(data, static_cast<unsigned int>(size), 0);
+uint32_t Ours(const unsigned char *data, size_t size) {
+    // Borrowed, and only read.
+    VarnekCBitInputStream stream(const_cast<unsigned char *>(data), static_cast<unsigned int>(size),
+                                 0);
     unsigned char success = 1;
     uint32_t sum = 0;
     for (size_t at = 0; at < size; at += kRound) {
@@ -33,7 +35,7 @@ uint32_t Ours(unsigned char *data, size_t size) {
     return success == 1 ? sum : 0;
 }
 
-uint32_t Limit(unsigned char *data, size_t size) {
+uint32_t Limit(const unsigned char *data, size_t size) {
     LimitReader reader = {data, size * 8, 0};
     uint32_t sum = 0;
     for (size_t at = 0; at < size; at += kRound) {
@@ -49,7 +51,7 @@ uint32_t Limit(unsigned char *data, size_t size) {
 }
 
 #ifdef HAVE_GSTREAMER
-uint32_t GStreamer(unsigned char *data, size_t size) {
+uint32_t GStreamer(const unsigned char *data, size_t size) {
     GstBitReader reader;
     gst_bit_reader_init(&reader, data, static_cast<guint>(size));
     uint32_t sum = 0;
@@ -66,9 +68,10 @@ uint32_t GStreamer(unsigned char *data, size_t size) {
 }
 #endif
 
-void Register(const std::string &name, size_t size, uint32_t (*read)(unsigned char *, size_t)) {
+void Register(const std::string &name, size_t size,
+              uint32_t (*read)(const unsigned char *, size_t)) {
     bench::Add(name, [size, read](benchmark::State &state) {
-        std::vector<unsigned char> data = bench::Noise(size);
+        const std::vector<unsigned char> data = bench::Noise(size);
         if (!bench::Require(state, read(data.data(), size) == Ours(data.data(), size),
                             "other fields than ours")) {
             return;

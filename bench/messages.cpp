@@ -50,6 +50,8 @@ class Limit {
         void *block = malloc(sizeof message);
         Node *node = static_cast<Node *>(malloc(sizeof *node));
         if (block == nullptr || node == nullptr) {
+            free(block);
+            free(node);
             return false;
         }
         memcpy(block, &message, sizeof message);
@@ -170,14 +172,14 @@ class Partner {
     Partner(bool echo, int core) : echo_(echo), core_(core) {
         sem_init(&ready_, 0, 0);
         sem_init(&ended_, 0, 0);
-        back.Own();
+        back_.Own();
         handle_ = VarnekPGL_CreateThread("partner", 1, 1024 * 1024, Run, this);
         Wait(&ready_);
     }
     ~Partner() {
         THREAD_MSG message = {};
         message.data[0] = 1;
-        there.Send(message);
+        there_.Send(message);
         Wait(&ended_);
         VarnekPGL_DeleteThread(handle_);
         sem_destroy(&ready_);
@@ -186,7 +188,8 @@ class Partner {
     Partner(const Partner &) = delete;
     Partner &operator=(const Partner &) = delete;
 
-    Queue there, back;
+    Queue &There() { return there_; }
+    Queue &Back() { return back_; }
 
   private:
     static void Wait(sem_t *semaphore) {
@@ -199,17 +202,18 @@ class Partner {
     }
     void Answer() {
         bench::PinTo(core_);
-        there.Own();
+        there_.Own();
         sem_post(&ready_);
         THREAD_MSG message = {};
-        for (int i = 0; there.Receive(&message) && message.data[0] == 0;) {
+        for (int i = 0; there_.Receive(&message) && message.data[0] == 0;) {
             if (echo_ || ++i % kBatch == 0) {
-                back.Send(message);
+                back_.Send(message);
             }
         }
         sem_post(&ended_);
     }
 
+    Queue there_, back_;
     sem_t ready_ = {}, ended_ = {};
     const bool echo_;
     const int core_;
@@ -223,9 +227,9 @@ void OneWay(benchmark::State &state) {
     THREAD_MSG message = {};
     for (auto _ : state) {
         for (int i = 0; i < kBatch; i++) {
-            partner.there.Send(message);
+            partner.There().Send(message);
         }
-        partner.back.Receive(&message);
+        partner.Back().Receive(&message);
     }
     state.SetItemsProcessed(state.iterations() * kBatch);
 }
@@ -237,8 +241,8 @@ void PingPong(benchmark::State &state) {
     Partner<Queue> partner(true, core);
     THREAD_MSG message = {};
     for (auto _ : state) {
-        partner.there.Send(message);
-        partner.back.Receive(&message);
+        partner.There().Send(message);
+        partner.Back().Receive(&message);
     }
 }
 

@@ -45,7 +45,7 @@ bool SameAsOurs(const std::string &text, const char *other, size_t length) {
 }
 
 void Iconv(benchmark::State &state, const std::string &text) {
-    const iconv_t converter = iconv_open("UTF-8", "ISO-8859-15");
+    iconv_t converter = iconv_open("UTF-8", "ISO-8859-15");
     std::vector<char> buffer(text.size() * 3 + 1);
     std::string in = text;
     size_t room = buffer.size();

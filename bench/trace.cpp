@@ -83,7 +83,7 @@ void AndroidOff(benchmark::State &state) {
     static const AndroidPrint print = LoadAndroidPrint();
     constexpr int kVerbose = 2;
     if (!bench::Require(state, print != nullptr, "cannot be loaded") ||
-        !bench::Require(state, print(kVerbose, "SBTVD_COM", "%d", 1) < 0, "is not filtered")) {
+        !bench::Require(state, print(kVerbose, "SBTVD_COM", "%d", 1) <= 0, "is not filtered")) {
         return;
     }
     int i = 0;

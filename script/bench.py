@@ -4,7 +4,8 @@
   bench.py list                      the rows' names
   bench.py areas [ROW...]            the programs that measure these rows, each with a filter
   bench.py receiver TOP MIB RUNS OUT  measures the receiver of the build tree TOP beside ffprobe
-  bench.py table|growth DIR          prints what the JSON in DIR says
+  bench.py table DIR [ROW...]        prints what the JSON in DIR says; fails when one of ours is not in it
+  bench.py growth DIR                prints how cost grows
   bench.py record DIR DOCS           writes it into DOCS/performance.md and the charts beside it
 """
 import datetime
@@ -87,6 +88,12 @@ GROWTH = [
 ]
 AREAS = list(dict.fromkeys(row.area for row in ROWS))
 
+
+def chosen(prefixes):
+    rows = [row for row in ROWS if not prefixes or any(row.name.startswith(prefix) for prefix in prefixes)]
+    return rows or sys.exit(f'no such row: {" ".join(prefixes)}')
+
+
 # What was measured ----------------------------------------------------------------------------------
 
 
@@ -151,7 +158,7 @@ def lines(figures):
 HEAD = ('row', 'ours', 'ours, least to most', 'beside', 'theirs', 'ratio', 'goal', '')
 
 
-def print_table(figures):
+def print_table(figures, prefixes):
     table = [HEAD, *lines(figures)]
     widths = [max(len(line[i]) for line in table) for i in range(len(HEAD))]
     last = None
@@ -163,6 +170,9 @@ def print_table(figures):
         print('  '.join(f'{field:<{width}}' for field, width in zip(fields, widths)).rstrip())
     count = [line[-1] for line in table]
     print(f'{count.count("met")} goals met, {count.count("MISSED")} missed')
+    absent = [row.name for row in chosen(prefixes) if not figures.of(row.name, 'ours', row.wall)]
+    if absent:
+        sys.exit(f'no figure of ours: {", ".join(absent)}')
 
 
 def curves(figures, chart):
@@ -401,11 +411,8 @@ def record(directory, docs):
 
 
 def print_areas(prefixes):
-    chosen = [row for row in ROWS if not prefixes or any(row.name.startswith(p) for p in prefixes)]
-    if not chosen:
-        sys.exit(f'no such row: {" ".join(prefixes)}')
     for area in AREAS:
-        names = [row.name for row in chosen if row.area == area]
+        names = [row.name for row in chosen(prefixes) if row.area == area]
         if names:
             # Google Benchmark takes an extended regular expression.
             print(area, '.' if not prefixes else '^(' + '|'.join(names) + '):')
@@ -420,8 +427,8 @@ def main(arguments):
             print_areas(prefixes)
         case ['receiver', top, megabytes, runs, out]:
             measure_receiver(top, int(megabytes), int(runs), out)
-        case ['table', directory]:
-            print_table(Figures(directory))
+        case ['table', directory, *prefixes]:
+            print_table(Figures(directory), prefixes)
         case ['growth', directory]:
             print_growth(Figures(directory))
         case ['record', directory, docs]:
