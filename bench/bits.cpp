@@ -11,68 +11,93 @@
 
 namespace {
 
-constexpr int kFields[] = {8, 1, 1, 2, 12, 16, 2, 5, 1, 8, 8, 3, 13, 4, 12};
+template <int... counts>
+struct Fields {};
+using Psi = Fields<8, 1, 1, 2, 12, 16, 2, 5, 1, 8, 8, 3, 13, 4, 12>;
 constexpr size_t kRound = 12;  // bytes of these fields
 constexpr size_t kBytes = 85 * kRound;
 
-uint32_t Ours(const unsigned char *data, size_t size) {
-    // Borrowed, and only read.
-    VarnekCBitInputStream stream(const_cast<unsigned char *>(data), static_cast<unsigned int>(size),
-                                 0);
-    unsigned char success = 1;
+// One read after the other with a width that the compiler knows, as a parser has them. 0 when one
+// of them fails.
+template <typename Reader, int... counts>
+uint32_t ReadAll(Reader *reader, size_t size, Fields<counts...>) {
     uint32_t sum = 0;
     for (size_t at = 0; at < size; at += kRound) {
-        for (const int count : kFields) {
-            if (count == 1) {
-                sum = sum * 31 + stream.ReadBit(success);
-            } else if (count <= 8) {
-                sum = sum * 31 + stream.ReadByte(count, success);
-            } else {
-                sum = sum * 31 + stream.ReadShort(count, success);
-            }
-        }
+        ((sum = sum * 31 + reader->template Read<counts>()), ...);
     }
-    return success == 1 ? sum : 0;
+    return reader->Succeeded() ? sum : 0;
 }
 
-uint32_t Limit(const unsigned char *data, size_t size) {
-    LimitReader reader = {data, size * 8, 0};
-    uint32_t sum = 0;
-    for (size_t at = 0; at < size; at += kRound) {
-        for (const int count : kFields) {
-            uint32_t value = 0;
-            if (LimitReadBits(&reader, count, &value) == 0) {
-                return 0;
-            }
-            sum = sum * 31 + value;
+class OurReader {
+  public:
+    OurReader(const unsigned char *data, size_t size)
+        // Borrowed, and only read.
+        : stream_(const_cast<unsigned char *>(data), static_cast<unsigned int>(size), 0) {}
+    template <int count>
+    uint32_t Read() {
+        if constexpr (count == 1) {
+            return stream_.ReadBit(success_);
+        } else if constexpr (count <= 8) {
+            return stream_.ReadByte(count, success_);
+        } else {
+            return stream_.ReadShort(count, success_);
         }
     }
-    return sum;
-}
+    bool Succeeded() const { return success_ == 1; }
+
+  private:
+    VarnekCBitInputStream stream_;
+    unsigned char success_ = 1;
+};
+
+class CheckedReader {
+  public:
+    CheckedReader(const unsigned char *data, size_t size) : reader_{data, size * 8, 0} {}
+    template <int count>
+    uint32_t Read() {
+        uint32_t value = 0;
+        success_ &= LimitReadBits(&reader_, count, &value);
+        return value;
+    }
+    bool Succeeded() const { return success_ == 1; }
+
+  private:
+    LimitReader reader_;
+    int success_ = 1;
+};
 
 #ifdef HAVE_GSTREAMER
-uint32_t GStreamer(const unsigned char *data, size_t size) {
-    GstBitReader reader;
-    gst_bit_reader_init(&reader, data, static_cast<guint>(size));
-    uint32_t sum = 0;
-    for (size_t at = 0; at < size; at += kRound) {
-        for (const int count : kFields) {
-            guint32 value = 0;
-            if (!gst_bit_reader_get_bits_uint32(&reader, &value, static_cast<guint>(count))) {
-                return 0;
-            }
-            sum = sum * 31 + value;
-        }
+class GstReader {
+  public:
+    GstReader(const unsigned char *data, size_t size) {
+        gst_bit_reader_init(&reader_, data, static_cast<guint>(size));
     }
-    return sum;
-}
+    template <int count>
+    uint32_t Read() {
+        guint32 value = 0;
+        success_ &= gst_bit_reader_get_bits_uint32(&reader_, &value, count);
+        return value;
+    }
+    bool Succeeded() const { return success_ == TRUE; }
+
+  private:
+    GstBitReader reader_ = {};
+    gboolean success_ = TRUE;
+};
 #endif
+
+template <typename Reader>
+uint32_t ReadWith(const unsigned char *data, size_t size) {
+    Reader reader(data, size);
+    return ReadAll(&reader, size, Psi());
+}
 
 void Register(const std::string &name, size_t size,
               uint32_t (*read)(const unsigned char *, size_t)) {
     bench::Add(name, [size, read](benchmark::State &state) {
         const std::vector<unsigned char> data = bench::Noise(size);
-        if (!bench::Require(state, read(data.data(), size) == Ours(data.data(), size),
+        if (!bench::Require(state,
+                            read(data.data(), size) == ReadWith<OurReader>(data.data(), size),
                             "other fields than ours")) {
             return;
         }
@@ -83,16 +108,16 @@ void Register(const std::string &name, size_t size,
 }
 
 void RegisterAll() {
-    Register("bits:ours", kBytes, Ours);
-    Register("bits:limit", kBytes, Limit);
+    Register("bits:ours", kBytes, ReadWith<OurReader>);
+    Register("bits:limit", kBytes, ReadWith<CheckedReader>);
 #ifdef HAVE_GSTREAMER
-    Register("bits:gstreamer", kBytes, GStreamer);
+    Register("bits:gstreamer", kBytes, ReadWith<GstReader>);
 #else
     bench::AddMissing("bits:gstreamer");
 #endif
     for (const size_t rounds : {1u, 10u, 100u, 341u}) {
         const size_t size = rounds * kRound;
-        Register("grow_bits/" + std::to_string(size) + ":ours", size, Ours);
+        Register("grow_bits/" + std::to_string(size) + ":ours", size, ReadWith<OurReader>);
     }
 }
 
