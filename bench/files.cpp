@@ -10,7 +10,7 @@ namespace {
 
 constexpr uint32_t kPacket = 188;
 constexpr uint32_t kBlock = 64 * 1024;
-constexpr size_t kFileSize = size_t{kPacket} * kBlock;
+constexpr size_t kFileSize = size_t{kPacket} * kBlock / 4;  // whole packets and whole blocks
 
 // A file for one benchmark.
 class File {

@@ -8,6 +8,7 @@
 #include "limit.h"
 
 #ifdef HAVE_SPDLOG
+#include <spdlog/sinks/base_sink.h>
 #include <spdlog/sinks/null_sink.h>
 #include <spdlog/spdlog.h>
 #endif
@@ -113,12 +114,33 @@ void SpdlogOff(benchmark::State &state) {
     }
 }
 
-// The null sink drops the message before the prefix is composed, so the text alone is formatted.
+// The null sink drops the message before a line is composed, so the text alone is formatted.
 void SpdlogOn(benchmark::State &state) {
     spdlog::logger &logger = Spdlog();
     int i = 0;
     for (auto _ : state) {
         logger.error("section of table {} on pid {}", ++i, 18);
+    }
+}
+
+// Drops the line when it is composed, as the log function that the library writes to does.
+class DiscardingSink final : public spdlog::sinks::base_sink<spdlog::details::null_mutex> {
+  protected:
+    void sink_it_(const spdlog::details::log_msg &message) override {
+        spdlog::memory_buf_t line;
+        formatter_->format(message, line);
+        benchmark::DoNotOptimize(line.data());
+    }
+    void flush_() override {}
+};
+
+void SpdlogLine(benchmark::State &state) {
+    spdlog::logger logger("SBTVD_COM", std::make_shared<DiscardingSink>());
+    logger.set_pattern("[%L][%s-%#] %v", spdlog::pattern_time_type::utc);
+    int i = 0;
+    for (auto _ : state) {
+        logger.log(spdlog::source_loc{__FILE__, __LINE__, ""}, spdlog::level::err,
+                   "section of table {} on pid {}", ++i, 18);
     }
 }
 #endif
@@ -149,8 +171,10 @@ void RegisterAll() {
     bench::Add("trace_on:limit", LimitOn);
 #ifdef HAVE_SPDLOG
     bench::Add("trace_on:spdlog", SpdlogOn);
+    bench::Add("trace_on:spdlog_line", SpdlogLine);
 #else
     bench::AddMissing("trace_on:spdlog");
+    bench::AddMissing("trace_on:spdlog_line");
 #endif
 }
 

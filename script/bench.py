@@ -58,6 +58,7 @@ ROWS = [
     Row('trace_off/two', 'trace', 'trace that is off, two threads', ('liblog', 'liblog, filtered', None),
         ('spdlog', 'spdlog, below level', None), ('limit', 'limit: masked call', None)),
     Row('trace_on', 'trace', 'trace into nothing', ('spdlog', 'spdlog, null sink', 1.0),
+        ('spdlog_line', 'spdlog, whole line', None),
         ('limit', 'limit: vsnprintf', None)),
     Row('text/32', 'text', 'Latin-15 to UTF-8, 32 bytes', ('iconv', 'iconv', 0.7), ('icu', 'ICU', 0.7)),
     Row('text/4096', 'text', 'Latin-15 to UTF-8, 4 KiB', ('iconv', 'iconv', 0.5), ('icu', 'ICU', 0.5)),
@@ -83,8 +84,15 @@ GROWTH = [
     ('queue', 'messages', 'Messages in the queue', 'ns a message', False,
      (('grow_queue', 'ours', 'send + receive'), ('grow_queue', 'limit', 'limit: mallocs, list, locks'))),
     ('length', 'text crc bits', 'Bytes', 'ns a byte', True,
-     (('grow_text', 'ours', 'Latin-15 to UTF-8'), ('grow_text', 'iconv', 'the same by iconv'),
+     (('grow_text', 'ours', 'Latin-15 to UTF-8'), ('grow_text', 'iconv', 'the same, by iconv'),
       ('grow_crc', 'ours', 'CRC-32'), ('grow_bits', 'ours', 'bit fields'))),
+]
+# An operation in one thread, and in each of two at once.
+THREADS = [
+    ('mutexes in slots side by side', ('mutex2/neighbours', 'onethread'), ('mutex2/neighbours', 'ours')),
+    ('mutexes in slots far apart', ('mutex2/apart', 'onethread'), ('mutex2/apart', 'ours')),
+    *[(f'trace that is off, {label}', ('trace_off/one', who), ('trace_off/two', who)) for who, label in
+      (('ours', 'ours'), ('limit', 'masked call'), ('liblog', 'liblog'), ('spdlog', 'spdlog'))],
 ]
 AREAS = list(dict.fromkeys(row.area for row in ROWS))
 
@@ -264,7 +272,7 @@ class Svg:
 def bar_chart(figures, path):
     """A bar for each pair: ours as a multiple of theirs, on a logarithmic axis around 1."""
     bars = [(line[0], line[3], float(line[5]), line[6], line[7]) for line in lines(figures) if line[5]]
-    left, right, top, step = 400, 60, 64, 20
+    left, right, top, step = 400, 76, 64, 20
     width, height = 980, top + step * len(bars) + 50
     low = math.log10(min([0.05, *(bar[2] for bar in bars)]))
     high = math.log10(max([4, *(bar[2] for bar in bars)]) * 1.2)
@@ -273,10 +281,10 @@ def bar_chart(figures, path):
         return left + (math.log10(ratio) - low) / (high - low) * (width - left - right)
 
     svg = Svg(width, height, 'Time of the library as a multiple of its peers')
-    svg.text(16, 24, 'Time of the library as a multiple of its peer’s (shorter is faster)', extra=' font-size="16"')
-    svg.text(16, 44, 'Medians. A bar to the left of 1 is faster than the peer. The tick is the goal: '
-                     'blue where it is met, amber where it is missed, grey without one.', colour=PALE)
-    for tick in (0.01, 0.02, 0.05, 0.1, 0.2, 0.5, 1, 2, 5, 10, 20):
+    svg.text(16, 24, 'Time of the library as a multiple of its peer’s (left of 1 is faster)', extra=' font-size="16"')
+    svg.text(16, 44, 'Medians. The black tick is the goal; a bar is blue where it is met, amber where it is missed, '
+                     'grey without one.', colour=PALE)
+    for tick in (0.01, 0.02, 0.05, 0.1, 0.2, 0.5, 1, 2, 5, 10, 20, 50, 100):
         if low <= math.log10(tick) <= high:
             svg.line(x(tick), top - 6, x(tick), height - 36, INK if tick == 1 else GRID)
             svg.text(x(tick), height - 20, f'{tick:g}', 'middle', PALE)
@@ -295,8 +303,7 @@ def bar_chart(figures, path):
         if goal:
             at = x(float(goal.split()[1]))
             svg.line(at, y, at, y + step - 3, INK, 2)
-        svg.text(x(ratio) + (6 if ratio >= 1 else -6), y + 13, f'{ratio:.2f}', 'start' if ratio >= 1 else 'end', INK,
-                 ' font-size="11"')
+        svg.text(width - 16, y + 13, f'{ratio:.2f}', 'end')
     svg.write(path)
 
 
@@ -309,7 +316,7 @@ def growth_chart(figures, chart, path):
     name, _, xlabel, ylabel, per, _ = chart
     drawn = list(curves(figures, chart))
     if not drawn:
-        return False
+        return
     width, height, left, right, top, bottom = 720, 360, 70, 210, 30, 56
     xs = sorted({x for _, points in drawn for x, _ in points})
     ys = [y for _, points in drawn for _, y in points]
@@ -355,7 +362,33 @@ def growth_chart(figures, chart, path):
     for y, label, colour in ends:
         svg.text(width - right + 12, y, label, colour=colour)
     svg.write(path)
-    return True
+
+
+def thread_chart(figures, path):
+    """What an operation costs each of two threads at once, beside one thread alone."""
+    pairs = [(label, one, two) for label, *names in THREADS
+             for one, two in [[figures.of(*name, False) for name in names]] if one and two]
+    if not pairs:
+        return
+    left, top, step, width = 260, 56, 46, 720
+    height = top + step * len(pairs) + 50
+    ceiling = nice_ceiling(max(statistics.median(samples) for pair in pairs for samples in pair[1:]) * 1.05)
+    svg = Svg(width, height, 'Cost of an operation in one thread and in two at once')
+    svg.text(16, 24, 'ns an operation: one thread alone, and each of two threads at once', extra=' font-size="16"')
+    for i in range(6):
+        x = left + (width - left - 70) * i / 5
+        svg.line(x, top - 8, x, height - 40)
+        svg.text(x, height - 22, f'{ceiling * i / 5:g}', 'middle', PALE)
+    svg.text(left + (width - left - 70) / 2, height - 4, 'ns an operation', 'middle', PALE)
+    for i, (label, *pair) in enumerate(pairs):
+        y = top + step * i
+        svg.text(left - 10, y + 22, label, 'end')
+        for j, (samples, name) in enumerate(zip(pair, ('one', 'two'))):
+            median = statistics.median(samples)
+            length = median / ceiling * (width - left - 70)
+            svg.add(f'<rect x="{left}" y="{y + 17 * j}" width="{length:.1f}" height="15" fill="{COLOURS[j]}"/>')
+            svg.text(left + length + 6, y + 17 * j + 12, f'{median:.2f} {name}', extra=' font-size="11"')
+    svg.write(path)
 
 
 # The document ---------------------------------------------------------------------------------------
@@ -372,7 +405,7 @@ def section(directory, figures):
     table = list(lines(figures))
     compiler = subprocess.run(['g++', '--version'], capture_output=True, text=True, check=True).stdout.splitlines()[0]
     yield (f'Measured on {datetime.date.today().isoformat()}: {processor()}, {os.cpu_count()} cores, '
-           f'Linux {platform.release()}, {compiler}.')
+           f'Linux {platform.release().split("-")[0]}, {compiler}.')
     verdicts = [line[-1] for line in table]
     yield f'{verdicts.count("met")} goals met, {verdicts.count("MISSED")} missed.'
     yield ''
@@ -403,6 +436,7 @@ def record(directory, docs):
     bar_chart(figures, Path(docs, 'performance.svg'))
     for chart in GROWTH:
         growth_chart(figures, chart, Path(docs, f'performance-{chart[0]}.svg'))
+    thread_chart(figures, Path(docs, 'performance-threads.svg'))
     page = Path(docs, 'performance.md')
     begin, end = '<!-- results: script/bench --record -->', '<!-- end of results -->'
     text = page.read_text()
