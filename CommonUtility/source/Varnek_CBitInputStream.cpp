@@ -1,6 +1,5 @@
-// The bit input stream. GetBits is the only place where bits leave the current byte and where the
-// end is found. Fields that span bytes jump to the byte they end in and take their last piece with
-// GetBits; only fields that run past the end go piece by piece.
+// The bit input stream. Fields that end before the last byte does are taken as a whole; the others
+// go piece by piece through GetBits, which is the only place where the end is found.
 #include "Varnek_CBitInputStream.h"
 
 #include <limits.h>
@@ -8,6 +7,7 @@
 
 #include <new>
 
+#include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
 static unsigned char *CopyOf(const unsigned char *source, unsigned int length) {
@@ -114,7 +114,7 @@ unsigned int VarnekCBitInputStream::ReadBit(unsigned char &success) {
         success = 0;
         return 0;
     }
-    return GetBits(1, success);
+    return ReadInt(1, success);
 }
 
 unsigned char VarnekCBitInputStream::ReadByte(int count, unsigned char &success) {
@@ -133,36 +133,43 @@ unsigned short VarnekCBitInputStream::ReadShort(int count, unsigned char &succes
     return static_cast<unsigned short>(ReadInt(count, success));
 }
 
+// The `left` bits of the current byte and `rest` more. Kept out of line, so that the other fields
+// need no registers saved.
+__attribute__((noinline)) static unsigned int ReadByPieces(VarnekCBitInputStream &stream, int left,
+                                                           unsigned int rest,
+                                                           unsigned char &success) {
+    unsigned int value = stream.GetBits(left, success);
+    for (; rest > 8; rest -= 8) {
+        value = value << 8 | stream.GetBits(8, success);
+    }
+    return rest > 0 ? value << rest | stream.GetBits(static_cast<int>(rest), success) : value;
+}
+
 unsigned int VarnekCBitInputStream::ReadInt(int count, unsigned char &success) {
     if (count < 0 || count > 32 || bEndOfStream == 1) {
         success = 0;
         return 0;
     }
     const int left = 8 - iBitIdxInCurByte;
-    if (count <= left) {
-        return GetBits(count, success);
+    if (count < left) {
+        const unsigned int value = static_cast<unsigned int>(ucCurByte) >> (8 - count);
+        ucCurByte = static_cast<unsigned char>(ucCurByte << count);
+        iBitIdxInCurByte += count;
+        return value;
     }
-    unsigned int rest = static_cast<unsigned int>(count - left);
-    unsigned int value;
-    const unsigned int last = static_cast<unsigned int>(iCurByteIdx) + (rest + 7) / 8;
-    if (last < uiBufLen) {
+    const unsigned int rest = static_cast<unsigned int>(count - left);
+    const unsigned int next = static_cast<unsigned int>(iCurByteIdx) + 1;
+    if (next + sizeof(uint32_t) <= uiBufLen) {
         // After a rewind from inside a byte, ucCurByte is not what the buffer and the bit index
-        // give.
-        value = static_cast<unsigned int>(ucCurByte) >> iBitIdxInCurByte;
-        for (unsigned int i = static_cast<unsigned int>(iCurByteIdx) + 1; i < last; ++i) {
-            value = value << 8 | pBuffer[i];
-            rest -= 8;
-        }
-        iCurByteIdx = static_cast<int>(last);
-        iBitIdxInCurByte = 0;
-        ucCurByte = pBuffer[last];
-    } else {
-        value = GetBits(left, success);
-        for (; rest > 8; rest -= 8) {
-            value = value << 8 | GetBits(8, success);
-        }
+        // give. `rest` may be 0, which no shift by 32 - rest allows.
+        const unsigned int begun = static_cast<unsigned int>(ucCurByte) >> iBitIdxInCurByte;
+        const unsigned int value = begun << rest | BigEndian(pBuffer + next) >> 1 >> (31 - rest);
+        iCurByteIdx = static_cast<int>(next + rest / 8);
+        iBitIdxInCurByte = static_cast<int>(rest % 8);
+        ucCurByte = static_cast<unsigned char>(pBuffer[iCurByteIdx] << iBitIdxInCurByte);
+        return value;
     }
-    return value << rest | GetBits(static_cast<int>(rest), success);
+    return ReadByPieces(*this, left, rest, success);
 }
 
 int VarnekCBitInputStream::GetByteArray(unsigned char *dest, int count) {

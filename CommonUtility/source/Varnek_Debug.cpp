@@ -17,11 +17,13 @@
 #include "Varnek_File.h"
 #include "Varnek_Lock.h"
 #include "Varnek_Support.h"
+#include "Varnek_Trace.h"
 
 extern "C" int __android_log_write(int priority, const char *tag, const char *text);
 
 const char *gszVarnekDbgFilePath = "";
 int32_t gVarnekDbgLineNum = 0;
+std::atomic<uint32_t> gDebugState{0};
 
 namespace {
 
@@ -33,14 +35,8 @@ enum LogPriority {
     LOG_FATAL = 7,
 };
 
-// The state word holds the enabled levels and modules where a trace mask holds its own, and two
-// flags in bits that neither uses.
 constexpr uint32_t kLevelBits = 0xF0000000u;
 constexpr uint32_t kModuleBits = 0x00000FFFu;
-constexpr uint32_t kInitialised = 0x01000000u;
-constexpr uint32_t kOutputOn = 0x02000000u;
-
-std::atomic<uint32_t> gDebugState{0};
 
 // Serialises loads. gDebugLoader names the thread that holds it, so that a log function which
 // traces while the load reports through it finds everything off instead of waiting for itself.

@@ -1,5 +1,7 @@
-// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. One step of the decoder
-// tells the length of a character for the measuring and for the decoding, so the two cannot differ.
+// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. One step tells the unit
+// of a byte and one the UTF-8 of a unit, also where a text goes through both at once; one step of
+// the decoder tells the length of a character for the measuring and for the decoding. So what
+// belongs together cannot differ.
 #include "Varnek_LngPack.h"
 
 #include <limits.h>
@@ -42,6 +44,29 @@ constexpr Latin15Table MakeLatin15Table() {
 // The row of a byte is at its distance from 0xA0.
 constexpr Latin15Table gWmLatin15CodeTable = MakeLatin15Table();
 
+// The unit of a byte; 0 for a control character, which has none.
+unsigned int UnitOf(unsigned char byte) {
+    if (byte >= kFirstUpper) {
+        return gWmLatin15CodeTable.row[byte - kFirstUpper].unicode;
+    }
+    return byte >= 0x20 && byte <= 0x7E ? byte : 0;
+}
+
+// Appends the UTF-8 of a unit, one to three bytes. Returns where they end.
+char *PutUtf8(char *out, unsigned int unit) {
+    if (unit < 0x80) {
+        *out++ = static_cast<char>(unit);
+    } else if (unit < 0x800) {
+        *out++ = static_cast<char>(0xC0 | unit >> 6);
+        *out++ = static_cast<char>(0x80 | (unit & 0x3F));
+    } else {
+        *out++ = static_cast<char>(0xE0 | unit >> 12);
+        *out++ = static_cast<char>(0x80 | (unit >> 6 & 0x3F));
+        *out++ = static_cast<char>(0x80 | (unit & 0x3F));
+    }
+    return out;
+}
+
 // Bytes of the character at `text`, of which `length` may be read, at least one; 0 when malformed.
 int CharLength(const unsigned char *text, int length) {
     if (text[0] < 0x80) {
@@ -72,11 +97,9 @@ BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize, con
         return FALSE;
     }
     for (size_t i = 0; i < strLen; ++i) {
-        const unsigned char byte = static_cast<unsigned char>(szInText[i]);
-        if (byte >= kFirstUpper) {
-            *pmszOutText++ = gWmLatin15CodeTable.row[byte - kFirstUpper].unicode;
-        } else if (byte >= 0x20 && byte <= 0x7E) {
-            *pmszOutText++ = byte;
+        const unsigned int unit = UnitOf(static_cast<unsigned char>(szInText[i]));
+        if (unit != 0) {
+            *pmszOutText++ = static_cast<unsigned short>(unit);
         }
     }
     *pmszOutText = 0;
@@ -129,17 +152,7 @@ int __WmLngUnicode2UTF(char *des, const unsigned short *src, int nChar) {
     }
     char *out = des;
     for (int i = 0; i < nChar && src[i] != 0; ++i) {
-        const unsigned int unit = src[i];
-        if (unit < 0x80) {
-            *out++ = static_cast<char>(unit);
-        } else if (unit < 0x800) {
-            *out++ = static_cast<char>(0xC0 | unit >> 6);
-            *out++ = static_cast<char>(0x80 | (unit & 0x3F));
-        } else {
-            *out++ = static_cast<char>(0xE0 | unit >> 12);
-            *out++ = static_cast<char>(0x80 | (unit >> 6 & 0x3F));
-            *out++ = static_cast<char>(0x80 | (unit & 0x3F));
-        }
+        out = PutUtf8(out, src[i]);
     }
     *out = '\0';
     return static_cast<int>(out - des);
@@ -267,25 +280,33 @@ unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned char second
     return static_cast<unsigned short>(first << 12 | (second & 0x3F) << 6 | (third & 0x3F));
 }
 
-// The conversion within two work buffers that hold whatever `capacity` lets pass.
-static BOOL ConvertWithin(char **outputData, const char *szInput, unsigned int szInputSize,
-                          int capacity, unsigned short *pcode, char *utf8) {
-    TRACE_LOW("VarnekPGL_ConvertLatin15toUTF8: szInputSize is %d\t!\n",
-              static_cast<int>(szInputSize));
-    if (WmConvertLatin15Code2PCode(pcode, capacity, szInput) != TRUE) {
+// The conversion within a work buffer for `length` characters.
+static BOOL ConvertWithin(char *utf8, char **outputData, const char *szInput, size_t length,
+                          unsigned int szInputSize, int capacity) {
+    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: szInputSize is %d\t!\n",
+                    static_cast<int>(szInputSize));
+    if (length > static_cast<size_t>(capacity)) {
+        unsigned short nothing = 0;
+        WmConvertLatin15Code2PCode(&nothing, capacity, szInput);  // says so
         TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: WmConvertLatin15Code2PCode. ERROR  !\n");
         return FALSE;
     }
-    if (WmConvert2LCode(utf8, pcode) != TRUE) {
-        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: WmConvert2LCode. ERROR  !\n");
-        return FALSE;
+    // Both steps at once, without the units in between.
+    char *end = utf8;
+    for (size_t i = 0; i < length; ++i) {
+        const unsigned int unit = UnitOf(static_cast<unsigned char>(szInput[i]));
+        if (unit != 0) {
+            end = PutUtf8(end, unit);
+        }
     }
-    TRACE_LOW("VarnekPGL_ConvertLatin15toUTF8: Convert String => %s !\n", utf8);
-    const size_t textlen = strlen(utf8);
+    *end = '\0';
+    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: Convert String => %s !\n", utf8);
+    const size_t textlen = static_cast<size_t>(end - utf8);
     if (textlen == 0) {
         return TRUE;
     }
-    TRACE_LOW("VarnekPGL_ConvertLatin15toUTF8:textlen = %d !\n", static_cast<int>(textlen + 1));
+    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8:textlen = %d !\n",
+                    static_cast<int>(textlen + 1));
     char *text = static_cast<char *>(malloc(textlen + 1));
     if (text == nullptr) {
         TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: memalloc failed  !\n");
@@ -294,8 +315,8 @@ static BOOL ConvertWithin(char **outputData, const char *szInput, unsigned int s
     memcpy(text, utf8, textlen + 1);
     free(*outputData);
     *outputData = text;
-    TRACE_LOW("VarnekPGL_ConvertLatin15toUTF8 : VarnekPGL_Strlen(*outputData) = %d !\n",
-              static_cast<int>(textlen));
+    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8 : VarnekPGL_Strlen(*outputData) = %d !\n",
+                    static_cast<int>(textlen));
     return TRUE;
 }
 
@@ -306,20 +327,16 @@ BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
         return FALSE;
     }
     // The bytes of input that are accepted: three times the stated size and one, as long as no size
-    // below overflows. The buffers follow the input itself, not what the caller says of it.
+    // below overflows. The buffer follows the input itself, not what the caller says of it.
     const uint64_t stated = 3 * static_cast<uint64_t>(szInputSize) + 1;
     const int capacity = stated < INT_MAX / 4 ? static_cast<int>(stated) : INT_MAX / 4;
-    const size_t length = strnlen(szInput, static_cast<size_t>(capacity));
-    unsigned short *pcode =
-        static_cast<unsigned short *>(malloc((length + 1) * sizeof(unsigned short)));
+    const size_t length = strnlen(szInput, static_cast<size_t>(capacity) + 1);
     char *utf8 = static_cast<char *>(malloc(length * 3 + 1));
-    BOOL done = FALSE;
-    if (pcode != nullptr && utf8 != nullptr) {
-        done = ConvertWithin(outputData, szInput, szInputSize, capacity, pcode, utf8);
-    } else {
+    if (utf8 == nullptr) {
         TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: memalloc failed  !\n");
+        return FALSE;
     }
-    free(pcode);
+    const BOOL done = ConvertWithin(utf8, outputData, szInput, length, szInputSize, capacity);
     free(utf8);
     return done;
 }

@@ -271,7 +271,7 @@ BOOL VarnekPGL_DeleteSemaphore(int32_t hSem) {
 
 BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout) {
     const int arrIdx = gSemArr.FindByHandle(hSem);
-    TRACE_LOW("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]", hSem, arrIdx);
+    TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]", hSem, arrIdx);
     if (arrIdx == -1) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: arrIdx == -1, %d", hSem);
     }
@@ -280,12 +280,12 @@ BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout) {
 
 BOOL VarnekPGL_SignalSemaphore(int32_t hSem) {
     const int arrIdx = gSemArr.FindByHandle(hSem);
-    TRACE_LOW("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
+    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
     if (arrIdx == -1) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_SignalSemaphore: arrIdx == -1, %d", hSem);
     }
     const int retSem = sem_post(&gSemArr[arrIdx].linuxSem);
-    TRACE_LOW("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
+    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
     if (retSem != 0) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_SignalSemaphore: retSem != 0, errCode = [%d]",
                            VarnekPGL_SysGetLastErro());

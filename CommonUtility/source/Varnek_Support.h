@@ -45,6 +45,12 @@ inline bool Succeeded(int pthreadResult) {
     return pthreadResult == 0;
 }
 
+// Four bytes, the most significant first, wherever they lie.
+inline uint32_t BigEndian(const unsigned char *p) {
+    return static_cast<uint32_t>(p[0]) << 24 | static_cast<uint32_t>(p[1]) << 16 |
+           static_cast<uint32_t>(p[2]) << 8 | p[3];
+}
+
 // Seconds as the system takes them: where its own have 32 bits, those after 2038 are its last one.
 inline time_t SystemSeconds(int64_t seconds) {
     constexpr time_t kLast = std::numeric_limits<time_t>::max();

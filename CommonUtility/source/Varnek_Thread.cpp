@@ -408,14 +408,15 @@ int32_t VarnekPGL_GetThreadByName(const char *szThreadName) {
 
 int32_t VarnekPGL_GetCurrentThread() {
     const pthread_t self = pthread_self();
-    TRACE_LOW("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]", static_cast<int>(self));
+    TRACE_LOW_QUICK("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]",
+                    static_cast<int>(self));
     const int32_t hThread = HandleOfThread(self);
     if (hThread == kInvalidHandle) {
         return VARNEK_FAIL(
             -1, "***** VarnekPGL_GetCurrentThread : Can't find thread Info. pthreadID = [%d]",
             static_cast<int>(self));
     }
-    TRACE_LOW("***** END : VarnekPGL_GetCurrentThread. thread handle = [%d]", hThread);
+    TRACE_LOW_QUICK("***** END : VarnekPGL_GetCurrentThread. thread handle = [%d]", hThread);
     return hThread;
 }
 
@@ -473,7 +474,7 @@ int WaitForMessage(sem_t *msgQSem, uint32_t timeout) {
 }  // namespace
 
 BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message) {
-    TRACE_LOW("***** START : VarnekPGL_SendMessage. hThread = %d", hThread);
+    TRACE_LOW_QUICK("***** START : VarnekPGL_SendMessage. hThread = %d", hThread);
     if (message == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendMessage: message is NULL");
     }
@@ -482,7 +483,7 @@ BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message) {
         return VARNEK_FAIL(
             FALSE, "***** VarnekPGL_SendMessage. Can't find thread info. thread = [%d]", hThread);
     }
-    TRACE_LOW("***** VarnekPGL_SendMessage: ThreadMgr arrIdx = %d", use.Slot());
+    TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: ThreadMgr arrIdx = %d", use.Slot());
     if (!Enqueue(use.Info(), *message, list_insert)) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendMessage: memalloc failed");
     }
@@ -498,7 +499,7 @@ BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message) {
                     VarnekPGL_SysGetLastErro());
         semCount = -1;
     }
-    TRACE_LOW("***** VarnekPGL_SendMessage: semCount = %d", semCount);
+    TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: semCount = %d", semCount);
     return TRUE;
 }
 
@@ -525,7 +526,7 @@ BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message) {
 
 BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *count) {
     const int32_t curThread = VarnekPGL_GetCurrentThread();
-    TRACE_LOW("***** START : VarnekPGL_ReceiveMessage. current thread = %d", curThread);
+    TRACE_LOW_QUICK("***** START : VarnekPGL_ReceiveMessage. current thread = %d", curThread);
     if (message == nullptr || count == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_ReceiveMessage: message or count is NULL");
     }
@@ -534,7 +535,7 @@ BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *co
                            "***** VarnekPGL_ReceiveMessage. Can't find current thread handle");
     }
     const RecordUse use(curThread);
-    TRACE_LOW("VarnekPGL_ReceiveMessage: arrIdx = %d", use.Slot());
+    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: arrIdx = %d", use.Slot());
     if (use.Slot() == -1) {
         return VARNEK_FAIL(
             FALSE, "VarnekPGL_ReceiveMessage: Can't find current thread Info. curThread = [%d]",
@@ -548,7 +549,7 @@ BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *co
                     read);
         semCount = -1;
     }
-    TRACE_LOW("VarnekPGL_ReceiveMessage: semCount = %d", semCount);
+    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: semCount = %d", semCount);
     if (WaitForMessage(msgQSem, timeout) != 0) {
         return VARNEK_FAIL(FALSE,
                            "***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [%d]",

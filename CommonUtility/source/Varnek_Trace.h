@@ -2,12 +2,36 @@
 #ifndef VARNEK_SOURCE_TRACE_H
 #define VARNEK_SOURCE_TRACE_H
 
+#include <atomic>
+
 #include "Varnek_Debug.h"
+
+// The enabled levels and modules where a trace mask holds its own, and two flags in bits that
+// neither uses. A load of the debug configuration writes it.
+constexpr uint32_t kInitialised = 0x01000000u;
+constexpr uint32_t kOutputOn = 0x02000000u;
+extern __attribute__((visibility("hidden"))) std::atomic<uint32_t> gDebugState;
+
+// Whether a mask of one level and one module is off. Before the configuration is loaded that is not
+// known, and the trace loads it.
+inline bool TraceIsOff(uint32_t mask) {
+    const uint32_t state = gDebugState.load(std::memory_order_relaxed);
+    return (state & kInitialised) != 0 && (~state & (mask | kOutputOn)) != 0;
+}
 
 #define TRACE_ERROR(...) VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON, __VA_ARGS__)
 #define TRACE_HIGH(...) VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_COMMON, __VA_ARGS__)
 #define TRACE_MID(...) VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_COMMON, __VA_ARGS__)
 #define TRACE_LOW(...) VARNEK_TRACE(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON, __VA_ARGS__)
+
+// TRACE_LOW for operations that are called often. The place is stored as ever, but the call is left
+// out when it would write nothing, and with it the arguments' way to the stack and back.
+#define TRACE_LOW_QUICK(...)                                                  \
+    (__atomic_store_n(&gszVarnekDbgFilePath, &__FILE__[0], __ATOMIC_RELAXED), \
+     __atomic_store_n(&gVarnekDbgLineNum, __LINE__, __ATOMIC_RELAXED),        \
+     TraceIsOff(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON)                      \
+         ? (void)0                                                            \
+         : VarnekPGL_TraceOut(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON, __VA_ARGS__))
 
 // One row of a failure table: traces the Error line and is the result. The `return` stays with the
 // caller.

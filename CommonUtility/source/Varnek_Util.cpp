@@ -46,11 +46,6 @@ constexpr CrcTables MakeCrcTables() {
 constexpr CrcTables kCrc = MakeCrcTables();
 static_assert(kCrc.word[0][1] == 0x04C11DB7u && kCrc.word[0][255] == 0xB1F740B4u);
 
-uint32_t BigEndian(const unsigned char *p) {
-    return static_cast<uint32_t>(p[0]) << 24 | static_cast<uint32_t>(p[1]) << 16 |
-           static_cast<uint32_t>(p[2]) << 8 | p[3];
-}
-
 // The register after `word` and `n` more bytes of 0.
 template <int n>
 uint32_t Shifted(uint32_t word) {

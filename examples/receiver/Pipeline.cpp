@@ -31,7 +31,7 @@ namespace {
 
 constexpr size_t kBlockSize = 65536;
 // What goes from thread to thread in one message: enough that waking the other side costs little.
-constexpr size_t kBatchSize = 256 * kPacketSize;
+constexpr size_t kBatchSize = 1024 * kPacketSize;
 constexpr uint32_t kBatchesWaiting = 8;
 constexpr uint32_t kTickTime = 250;  // milliseconds
 

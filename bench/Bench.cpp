@@ -1,0 +1,79 @@
+#include "Bench.h"
+
+#include <pthread.h>
+#include <sched.h>
+#include <semaphore.h>
+
+#include <random>
+
+#include "Varnek_Debug.h"
+#include "Varnek_File.h"
+#include "Varnek_Thread.h"
+
+namespace bench {
+
+namespace {
+
+sem_t done;
+
+void *RunAll(void *) {
+    PinTo(0);
+    benchmark::RunSpecifiedBenchmarks();
+    sem_post(&done);
+    return nullptr;
+}
+
+}  // namespace
+
+int Main(int argc, char **argv, void (*registerAll)(), const char *config) {
+    benchmark::Initialize(&argc, argv);
+    if (benchmark::ReportUnrecognizedArguments(argc, argv)) {
+        return 2;
+    }
+    const std::string text = std::string("# benchmark\n") + config;
+    const char *path = VARNEK_DATA_DIR "debug_ltn.ini";
+    const uint32_t size = static_cast<uint32_t>(text.size());
+    if (VarnekPGL_WriteFile(path, text.data(), size) != static_cast<int32_t>(size)) {
+        std::fprintf(stderr, "cannot write %s\n", path);
+        return 1;
+    }
+    VarnekPGL_InitializeDebug();
+    registerAll();
+    sem_init(&done, 0, 0);
+    if (VarnekPGL_CreateThread("bench", 1, 1024 * 1024, RunAll, nullptr) == -1) {
+        std::fprintf(stderr, "no thread for the benchmarks\n");
+        return 1;
+    }
+    while (sem_wait(&done) != 0) {
+    }
+    VarnekPGL_DeleteFile(path);
+    return 0;
+}
+
+void AddMissing(const std::string &name) {
+    Add(name, [](benchmark::State &state) { state.SkipWithError("not installed"); });
+}
+
+std::vector<unsigned char> Noise(size_t size) {
+    std::mt19937 random(188);  // NOLINT(cert-msc51-cpp): the same bytes on every run, on purpose
+    std::vector<unsigned char> bytes(size);
+    for (unsigned char &byte : bytes) {
+        byte = static_cast<unsigned char>(random());
+    }
+    return bytes;
+}
+
+void PinTo(int core) {
+    cpu_set_t all;
+    cpu_set_t one;
+    CPU_ZERO(&one);
+    static const int cores = [&all] {
+        CPU_ZERO(&all);
+        sched_getaffinity(0, sizeof all, &all);
+        return CPU_COUNT(&all);
+    }();
+    CPU_SET(static_cast<size_t>(cores > 0 ? core % cores : 0), &one);
+    pthread_setaffinity_np(pthread_self(), sizeof one, &one);
+}
+
+}  // namespace bench

@@ -1,0 +1,145 @@
+// Mutexes and semaphores by handle: the first and the last slot of a full table, in one thread and
+// in two at once on objects that have nothing to do with one another.
+#include <pthread.h>
+#include <semaphore.h>
+
+#include <memory>
+
+#include "Bench.h"
+#include "Varnek_Semaphore.h"
+#include "limit.h"
+
+namespace {
+
+constexpr int kSlots = 39;  // the thread registry has one of the 40 mutexes
+
+// `count` objects of a family, in the slots from 0 on.
+class Table {
+  public:
+    Table(bool semaphores, int count) : semaphores_(semaphores) {
+        for (int i = 0; i < count; i++) {
+            const std::string name = "bench" + std::to_string(i);
+            handles_.push_back(semaphores ? VarnekPGL_CreateSemaphore(name.c_str(), 1)
+                                          : VarnekPGL_CreateMutex(name.c_str()));
+        }
+    }
+    ~Table() {
+        for (const int32_t handle : handles_) {
+            if (semaphores_) {
+                VarnekPGL_DeleteSemaphore(handle);
+            } else {
+                VarnekPGL_DeleteMutex(handle);
+            }
+        }
+    }
+    Table(const Table &) = delete;
+    Table &operator=(const Table &) = delete;
+
+    int32_t operator[](int slot) const { return handles_[static_cast<size_t>(slot)]; }
+
+  private:
+    const bool semaphores_;
+    std::vector<int32_t> handles_;
+};
+
+void AcquireRelease(benchmark::State &state, int32_t handle) {
+    for (auto _ : state) {
+        if (VarnekPGL_AcquireMutex(handle) == FALSE || VarnekPGL_ReleaseMutex(handle) == FALSE) {
+            state.SkipWithError("the mutex is refused");
+            break;
+        }
+    }
+}
+
+void SignalWait(benchmark::State &state, int32_t handle) {
+    for (auto _ : state) {
+        if (VarnekPGL_SignalSemaphore(handle) == FALSE ||
+            VarnekPGL_WaitSemaphore(handle, WAIT_FOREVER) == FALSE) {
+            state.SkipWithError("the semaphore is refused");
+            break;
+        }
+    }
+}
+
+// One slot of a table with `fill` objects.
+void RegisterSlot(const std::string &name, bool semaphores, int fill, int slot) {
+    bench::Add(name, [semaphores, fill, slot](benchmark::State &state) {
+        const Table table(semaphores, fill);
+        (semaphores ? SignalWait : AcquireRelease)(state, table[slot]);
+    });
+}
+
+// Two threads, each on a core and a mutex of its own.
+void RegisterTwo(const std::string &name, int slotA, int slotB) {
+    static std::unique_ptr<Table> table;
+    bench::Add(name,
+               [slotA, slotB](benchmark::State &state) {
+                   bench::PinTo(state.thread_index());
+                   AcquireRelease(state, (*table)[state.thread_index() == 0 ? slotA : slotB]);
+               })
+        ->Setup([](const benchmark::State &) { table = std::make_unique<Table>(false, kSlots); })
+        ->Teardown([](const benchmark::State &) { table.reset(); })
+        ->Threads(2);
+}
+
+void BareMutex(benchmark::State &state) {
+    pthread_mutex_t mutex = PTHREAD_MUTEX_INITIALIZER;
+    for (auto _ : state) {
+        benchmark::DoNotOptimize(pthread_mutex_lock(&mutex));
+        benchmark::DoNotOptimize(pthread_mutex_unlock(&mutex));
+    }
+}
+
+void LibraryMutex(benchmark::State &state) {
+    pthread_mutex_t mutex = PTHREAD_MUTEX_INITIALIZER;
+    for (auto _ : state) {
+        benchmark::DoNotOptimize(LimitLock(&mutex));
+        benchmark::DoNotOptimize(LimitUnlock(&mutex));
+    }
+}
+
+void BareSemaphore(benchmark::State &state) {
+    sem_t semaphore;
+    sem_init(&semaphore, 0, 1);
+    for (auto _ : state) {
+        benchmark::DoNotOptimize(sem_post(&semaphore));
+        benchmark::DoNotOptimize(sem_wait(&semaphore));
+    }
+    sem_destroy(&semaphore);
+}
+
+void RegisterAll() {
+    for (const auto &[slot, place] : {std::pair{0, "first"}, std::pair{kSlots - 1, "last"}}) {
+        const std::string mutex = std::string("mutex/") + place + ":";
+        RegisterSlot(mutex + "ours", false, kSlots, slot);
+        bench::Add(mutex + "bare", BareMutex);
+        bench::Add(mutex + "limit", LibraryMutex);
+        const std::string semaphore = std::string("semaphore/") + place + ":";
+        RegisterSlot(semaphore + "ours", true, kSlots, slot);
+        bench::Add(semaphore + "bare", BareSemaphore);
+    }
+    const std::pair<int, const char *> pairs[] = {{1, "neighbours"}, {kSlots - 1, "apart"}};
+    for (const auto &[slot, place] : pairs) {
+        const std::string row = std::string("mutex2/") + place + ":";
+        RegisterTwo(row + "ours", 0, slot);
+        RegisterSlot(row + "onethread", false, kSlots, 0);
+    }
+    for (const int fill : {1, 10, kSlots}) {
+        const std::string count = std::to_string(fill);
+        RegisterSlot("grow_mutex/" + count + ":ours", false, fill, fill - 1);
+        RegisterSlot("grow_semaphore/" + count + ":ours", true, fill, fill - 1);
+        bench::Add("grow_byname/" + count + ":ours", [fill](benchmark::State &state) {
+            const Table table(false, fill);
+            const std::string name = "bench" + std::to_string(fill - 1);
+            for (auto _ : state) {
+                benchmark::DoNotOptimize(VarnekPGL_GetMutexByName(name.c_str()));
+            }
+        });
+    }
+}
+
+}  // namespace
+
+int main(int argc, char **argv) {
+    return bench::Main(argc, argv, RegisterAll);
+}

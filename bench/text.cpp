@@ -1,0 +1,114 @@
+// Latin-15 to UTF-8: a service's name, and a long text with an accent in every tenth character.
+#include <iconv.h>
+#include <stdlib.h>
+#include <string.h>
+
+#include "Bench.h"
+#include "Varnek_LngPack.h"
+
+#ifdef HAVE_ICU
+#include <unicode/ucnv.h>
+#endif
+
+namespace {
+
+std::string Text(size_t length) {
+    constexpr unsigned char kAccents[] = {0xE9, 0xE3, 0xE7, 0xED, 0xA4};
+    std::string text(length, 'a');
+    for (size_t i = 0; i < length; i++) {
+        text[i] = static_cast<char>(i % 10 == 7 ? kAccents[i / 10 % sizeof kAccents]
+                                                : 'a' + static_cast<int>(i % 26));
+    }
+    return text;
+}
+
+void Ours(benchmark::State &state, const std::string &text) {
+    char *out = nullptr;
+    for (auto _ : state) {
+        const BOOL converted = VarnekPGL_ConvertLatin15toUTF8(
+            &out, text.c_str(), static_cast<unsigned int>(text.size()));
+        if (converted == FALSE) {
+            state.SkipWithError("not converted");
+            break;
+        }
+        benchmark::DoNotOptimize(out);
+    }
+    free(out);
+}
+
+bool SameAsOurs(const std::string &text, const char *other, size_t length) {
+    char *ours = nullptr;
+    VarnekPGL_ConvertLatin15toUTF8(&ours, text.c_str(), static_cast<unsigned int>(text.size()));
+    const bool same = ours != nullptr && std::string(ours) == std::string(other, length);
+    free(ours);
+    return same;
+}
+
+void Iconv(benchmark::State &state, const std::string &text) {
+    iconv_t converter = iconv_open("UTF-8", "ISO-8859-15");
+    std::vector<char> buffer(text.size() * 3 + 1);
+    std::string in = text;
+    size_t room = buffer.size();
+    for (auto _ : state) {
+        char *from = in.data();
+        size_t left = in.size();
+        char *to = buffer.data();
+        room = buffer.size();
+        benchmark::DoNotOptimize(iconv(converter, &from, &left, &to, &room));
+        benchmark::ClobberMemory();
+    }
+    iconv_close(converter);
+    bench::Require(state, SameAsOurs(text, buffer.data(), buffer.size() - room), "another text");
+}
+
+#ifdef HAVE_ICU
+void Icu(benchmark::State &state, const std::string &text) {
+    UErrorCode status = U_ZERO_ERROR;
+    UConverter *from = ucnv_open("ISO-8859-15", &status);
+    UConverter *to = ucnv_open("UTF-8", &status);
+    std::vector<char> buffer(text.size() * 3 + 1);
+    char *target = buffer.data();
+    for (auto _ : state) {
+        const char *source = text.data();
+        target = buffer.data();
+        ucnv_convertEx(to, from, &target, buffer.data() + buffer.size(), &source,
+                       text.data() + text.size(), nullptr, nullptr, nullptr, nullptr,
+                       /*reset*/ 1, /*flush*/ 1, &status);
+        benchmark::ClobberMemory();
+    }
+    ucnv_close(from);
+    ucnv_close(to);
+    bench::Require(state,
+                   U_SUCCESS(status) != 0 &&
+                       SameAsOurs(text, buffer.data(), static_cast<size_t>(target - buffer.data())),
+                   "another text");
+}
+#endif
+
+void Add(const std::string &name, size_t length,
+         void (*run)(benchmark::State &, const std::string &)) {
+    bench::Add(name, [length, run](benchmark::State &state) { run(state, Text(length)); });
+}
+
+void RegisterAll() {
+    for (const size_t length : {32u, 4096u}) {
+        const std::string row = "text/" + std::to_string(length) + ":";
+        Add(row + "ours", length, Ours);
+        Add(row + "iconv", length, Iconv);
+#ifdef HAVE_ICU
+        Add(row + "icu", length, Icu);
+#else
+        bench::AddMissing(row + "icu");
+#endif
+    }
+    for (const size_t length : {32u, 256u, 2048u, 16384u, 131072u}) {
+        Add("grow_text/" + std::to_string(length) + ":ours", length, Ours);
+        Add("grow_text/" + std::to_string(length) + ":iconv", length, Iconv);
+    }
+}
+
+}  // namespace
+
+int main(int argc, char **argv) {
+    return bench::Main(argc, argv, RegisterAll);
+}

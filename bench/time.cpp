@@ -1,0 +1,91 @@
+// Seconds to a calendar record and back, over days that the branch predictor does not know.
+#include <time.h>
+
+#include <chrono>
+
+#include "Bench.h"
+#include "Varnek_Time.h"
+
+namespace {
+
+constexpr uint32_t kStep = 86400 * 37 + 12345;
+constexpr uint32_t kEnd = 1900000000;  // 2030
+
+template <typename Convert>
+void Run(benchmark::State &state, Convert convert) {
+    uint32_t seconds = 0;
+    for (auto _ : state) {
+        seconds = seconds < kEnd - kStep ? seconds + kStep : seconds % 100000;
+        benchmark::DoNotOptimize(convert(seconds));
+    }
+}
+
+VarnekCDateTime ToRecord(uint32_t seconds) {
+    VarnekCDateTime record = {};
+    VarnekPGL_SecondsToDataTime(seconds, &record);
+    return record;
+}
+
+tm ToTm(uint32_t seconds) {
+    const time_t time = seconds;
+    tm broken = {};
+    gmtime_r(&time, &broken);
+    return broken;
+}
+
+VarnekCDateTime ToRecordByChrono(uint32_t seconds) {
+    using namespace std::chrono;
+    const sys_seconds time{std::chrono::seconds{seconds}};
+    const auto day = floor<days>(time);
+    const year_month_day date(day);
+    const hh_mm_ss clock(time - day);
+    return {static_cast<int>(date.year()),
+            static_cast<int>(static_cast<unsigned>(date.month())),
+            static_cast<int>(static_cast<unsigned>(date.day())),
+            static_cast<int>(clock.hours().count()),
+            static_cast<int>(clock.minutes().count()),
+            static_cast<int>(clock.seconds().count())};
+}
+
+uint32_t FromRecordByChrono(const VarnekCDateTime &record) {
+    using namespace std::chrono;
+    const sys_days day = year(record.iYear) / static_cast<int>(record.iMonth) / record.iDay;
+    const sys_seconds time =
+        day + hours(record.iHour) + minutes(record.iMinute) + seconds(record.iSecond);
+    return static_cast<uint32_t>(time.time_since_epoch().count());
+}
+
+// Records made in advance, so that only the way back is measured.
+template <typename Record, typename Convert>
+void RunBack(benchmark::State &state, Record (*make)(uint32_t), Convert convert) {
+    constexpr size_t kCount = 512;
+    std::vector<Record> records;
+    for (uint32_t i = 0; i < kCount; i++) {
+        records.push_back(make(i * kStep));
+    }
+    size_t i = 0;
+    for (auto _ : state) {
+        benchmark::DoNotOptimize(convert(records[++i % kCount]));
+    }
+}
+
+void RegisterAll() {
+    bench::Add("calendar/to:ours", [](benchmark::State &state) { Run(state, ToRecord); });
+    bench::Add("calendar/to:libc", [](benchmark::State &state) { Run(state, ToTm); });
+    bench::Add("calendar/to:limit", [](benchmark::State &state) { Run(state, ToRecordByChrono); });
+    bench::Add("calendar/from:ours", [](benchmark::State &state) {
+        RunBack(state, ToRecord,
+                [](const VarnekCDateTime &record) { return VarnekPGL_DateTimeToSeconds(&record); });
+    });
+    bench::Add("calendar/from:libc", [](benchmark::State &state) {
+        RunBack(state, ToTm, [](tm &broken) { return timegm(&broken); });
+    });
+    bench::Add("calendar/from:limit",
+               [](benchmark::State &state) { RunBack(state, ToRecord, FromRecordByChrono); });
+}
+
+}  // namespace
+
+int main(int argc, char **argv) {
+    return bench::Main(argc, argv, RegisterAll);
+}

@@ -1,0 +1,62 @@
+// Starting a timer and calling it off.
+#include <signal.h>
+#include <time.h>
+
+#include "Bench.h"
+#include "Varnek_Timer.h"
+
+namespace {
+
+constexpr uint32_t kTimeout = 60000;  // never reached
+
+void Ours(benchmark::State &state) {
+    const int32_t handle = VarnekPGL_CreateTimer("bench");
+    const uint32_t timer = static_cast<uint32_t>(handle);
+    for (auto _ : state) {
+        if (VarnekPGL_StartTimer(
+                timer, kTimeout, [](uint32_t, void *) {}, nullptr) == FALSE ||
+            VarnekPGL_CancelTimer(timer) == FALSE) {
+            state.SkipWithError("the timer is refused");
+            break;
+        }
+    }
+    VarnekPGL_DeleteTimer(timer);
+}
+
+// A timer of the system that is armed and disarmed, and with `asks` asked before each whether it is
+// armed, as the library has to.
+template <bool asks>
+void Raw(benchmark::State &state) {
+    sigevent event = {};
+    event.sigev_notify = SIGEV_THREAD;
+    event.sigev_notify_function = [](sigval) {};
+    timer_t timer = {};
+    if (!bench::Require(state, timer_create(CLOCK_REALTIME, &event, &timer) == 0, "no timer")) {
+        return;
+    }
+    itimerspec on = {};
+    on.it_value.tv_sec = kTimeout / 1000;
+    const itimerspec off = {};
+    for (auto _ : state) {
+        for (const itimerspec *time : {&std::as_const(on), &off}) {
+            itimerspec left = {};
+            if (asks) {
+                benchmark::DoNotOptimize(timer_gettime(timer, &left));
+            }
+            benchmark::DoNotOptimize(timer_settime(timer, 0, time, nullptr));
+        }
+    }
+    timer_delete(timer);
+}
+
+void RegisterAll() {
+    bench::Add("timer:ours", Ours);
+    bench::Add("timer:raw", Raw<false>);
+    bench::Add("timer:limit", Raw<true>);
+}
+
+}  // namespace
+
+int main(int argc, char **argv) {
+    return bench::Main(argc, argv, RegisterAll);
+}

@@ -1,0 +1,185 @@
+// A trace whose level is off, and one that goes into a log function which discards it.
+#include <dlfcn.h>
+#include <stdarg.h>
+#include <string.h>
+
+#include "Bench.h"
+#include "Varnek_Debug.h"
+#include "limit.h"
+
+#ifdef HAVE_SPDLOG
+#include <spdlog/sinks/base_sink.h>
+#include <spdlog/sinks/null_sink.h>
+#include <spdlog/spdlog.h>
+#endif
+
+// In the place of the platform's.
+extern "C" __attribute__((visibility("default"))) int __android_log_write(int, const char *,
+                                                                          const char *text) {
+    benchmark::DoNotOptimize(text);
+    return 1;
+}
+
+namespace {
+
+constexpr uint32_t kOff = VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON;
+constexpr uint32_t kOn = VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON;
+
+void OursOff(benchmark::State &state) {
+    int i = 0;
+    for (auto _ : state) {
+        VARNEK_TRACE(kOff, "section of table %d on pid %d", ++i, 18);
+    }
+}
+
+void OursOn(benchmark::State &state) {
+    int i = 0;
+    for (auto _ : state) {
+        VARNEK_TRACE(kOn, "section of table %d on pid %d", ++i, 18);
+    }
+}
+
+void LimitOff(benchmark::State &state) {
+    int i = 0;
+    for (auto _ : state) {
+        LimitTrace(kOff, "section of table %d on pid %d", ++i, 18);
+    }
+}
+
+__attribute__((noinline, format(printf, 1, 2))) void Format(const char *format, ...) {
+    char line[2048];
+    va_list args;
+    va_start(args, format);
+    vsnprintf(line, sizeof line, format, args);
+    va_end(args);
+    benchmark::DoNotOptimize(line);
+}
+
+void LimitOn(benchmark::State &state) {
+    int i = 0;
+    for (auto _ : state) {
+        Format("[%c][%s-%4d] section of table %d on pid %d", 'E', "trace.cpp", __LINE__, ++i, 18);
+    }
+}
+
+#ifdef HAVE_ANDROID_LOG
+using AndroidPrint = int (*)(int, const char *, const char *, ...);
+
+// Loaded beside the symbols that this program and the stand-in have under the same names.
+AndroidPrint LoadAndroidPrint() {
+    void *library = dlopen(HAVE_ANDROID_LOG, RTLD_NOW | RTLD_LOCAL | RTLD_DEEPBIND);
+    if (library == nullptr) {
+        return nullptr;
+    }
+    constexpr int32_t kError = 6;
+    const auto setMinimum = reinterpret_cast<int32_t (*)(int32_t)>(
+        dlsym(library, "__android_log_set_minimum_priority"));
+    if (setMinimum != nullptr) {
+        setMinimum(kError);
+    }
+    return reinterpret_cast<AndroidPrint>(dlsym(library, "__android_log_print"));
+}
+
+void AndroidOff(benchmark::State &state) {
+    static const AndroidPrint print = LoadAndroidPrint();
+    constexpr int kVerbose = 2;
+    if (!bench::Require(state, print != nullptr, "cannot be loaded") ||
+        !bench::Require(state, print(kVerbose, "SBTVD_COM", "%d", 1) <= 0, "is not filtered")) {
+        return;
+    }
+    int i = 0;
+    for (auto _ : state) {
+        print(kVerbose, "SBTVD_COM", "section of table %d on pid %d", ++i, 18);
+    }
+}
+#endif
+
+#ifdef HAVE_SPDLOG
+spdlog::logger &Spdlog() {
+    static const std::shared_ptr<spdlog::logger> logger = [] {
+        auto made = std::make_shared<spdlog::logger>(
+            "SBTVD_COM", std::make_shared<spdlog::sinks::null_sink_mt>());
+        made->set_level(spdlog::level::err);
+        return made;
+    }();
+    return *logger;
+}
+
+void SpdlogOff(benchmark::State &state) {
+    spdlog::logger &logger = Spdlog();
+    int i = 0;
+    for (auto _ : state) {
+        logger.debug("section of table {} on pid {}", ++i, 18);
+        benchmark::ClobberMemory();
+    }
+}
+
+// The null sink drops the message before a line is composed, so the text alone is formatted.
+void SpdlogOn(benchmark::State &state) {
+    spdlog::logger &logger = Spdlog();
+    int i = 0;
+    for (auto _ : state) {
+        logger.error("section of table {} on pid {}", ++i, 18);
+    }
+}
+
+// Drops the line when it is composed, as the log function that the library writes to does.
+class DiscardingSink final : public spdlog::sinks::base_sink<spdlog::details::null_mutex> {
+  protected:
+    void sink_it_(const spdlog::details::log_msg &message) override {
+        spdlog::memory_buf_t line;
+        formatter_->format(message, line);
+        benchmark::DoNotOptimize(line.data());
+    }
+    void flush_() override {}
+};
+
+void SpdlogLine(benchmark::State &state) {
+    spdlog::logger logger("SBTVD_COM", std::make_shared<DiscardingSink>());
+    logger.set_pattern("[%L][%s-%#] %v", spdlog::pattern_time_type::utc);
+    int i = 0;
+    for (auto _ : state) {
+        logger.log(spdlog::source_loc{__FILE__, __LINE__, ""}, spdlog::level::err,
+                   "section of table {} on pid {}", ++i, 18);
+    }
+}
+#endif
+
+void RegisterAll() {
+    for (const int threads : {1, 2}) {
+        const std::string row = threads == 1 ? "trace_off/one:" : "trace_off/two:";
+        const auto add = [threads, &row](const char *contender, void (*run)(benchmark::State &)) {
+            bench::Add(row + contender, [run](benchmark::State &state) {
+                bench::PinTo(state.thread_index());
+                run(state);
+            })->Threads(threads);
+        };
+        add("ours", OursOff);
+        add("limit", LimitOff);
+#ifdef HAVE_ANDROID_LOG
+        add("liblog", AndroidOff);
+#else
+        bench::AddMissing(row + "liblog");
+#endif
+#ifdef HAVE_SPDLOG
+        add("spdlog", SpdlogOff);
+#else
+        bench::AddMissing(row + "spdlog");
+#endif
+    }
+    bench::Add("trace_on:ours", OursOn);
+    bench::Add("trace_on:limit", LimitOn);
+#ifdef HAVE_SPDLOG
+    bench::Add("trace_on:spdlog", SpdlogOn);
+    bench::Add("trace_on:spdlog_line", SpdlogLine);
+#else
+    bench::AddMissing("trace_on:spdlog");
+    bench::AddMissing("trace_on:spdlog_line");
+#endif
+}
+
+}  // namespace
+
+int main(int argc, char **argv) {
+    return bench::Main(argc, argv, RegisterAll, "LogToUSB=1\nError=1\nCommon=1\n");
+}

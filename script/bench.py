@@ -1,0 +1,474 @@
+#!/usr/bin/env python3
+"""Which rows script/bench measures, against whom and with what goal; its table, and its charts.
+
+  bench.py list                      the rows' names
+  bench.py areas [ROW...]            the programs that measure these rows, each with a filter
+  bench.py receiver TOP MIB RUNS OUT  measures the receiver of the build tree TOP beside ffprobe
+  bench.py table DIR [ROW...]        prints what the JSON in DIR says; fails when one of ours is not in it
+  bench.py growth DIR                prints how cost grows
+  bench.py record DIR DOCS           writes it into DOCS/performance.md and the charts beside it
+"""
+import datetime
+import json
+import math
+import os
+import platform
+import resource
+import statistics
+import subprocess
+import sys
+import time
+from pathlib import Path
+
+
+class Row:
+    """A row; goals are (contender, label, highest ratio or None). `wall` counts waiting as well."""
+
+    def __init__(self, name, area, title, *goals, wall=False):
+        self.name, self.area, self.title, self.goals, self.wall = name, area, title, goals, wall
+
+
+ROWS = [
+    Row('crc/12', 'crc', 'CRC-32, 12 bytes', ('av_crc', 'av_crc', 1.1), ('dvbpsi', 'libdvbpsi', None),
+        ('boost', 'boost::crc', None), ('limit', 'limit: 16 tables inlined', 1.1)),
+    *[Row(f'crc/{n}', 'crc', f'CRC-32, {n} bytes', ('av_crc', 'av_crc', 0.55), ('dvbpsi', 'libdvbpsi', 0.2),
+          ('boost', 'boost::crc', 0.2), ('limit', 'limit: 16 tables inlined', 1.1)) for n in (184, 1024, 4096)],
+    Row('bits', 'bits', 'bit fields of PSI, 1020 bytes', ('gstreamer', 'gst_bit_reader', 0.8),
+        ('limit', 'limit: checked reader', 1.5)),
+    Row('ring/one', 'ring', 'ring, 188 bytes in and out', ('boost', 'circular_buffer', 0.5),
+        ('jack', 'JACK, no lock', None), ('limit', 'limit: memcpy, mutex', 1.8)),
+    Row('ring/two', 'ring', 'ring, 188 bytes, two threads', ('boost', 'circular_buffer', 0.85),
+        ('jack', 'JACK, no lock', None), ('limit', 'limit: memcpy, mutex', None), wall=True),
+    Row('message/same', 'messages', 'message, same thread', ('gasync', 'GAsyncQueue', 2.0),
+        ('mq', 'POSIX mq', 0.06), ('limit', 'limit: mallocs, list, locks', 2.0)),
+    Row('message/oneway', 'messages', 'message, one way', ('gasync', 'GAsyncQueue', 1.0),
+        ('mq', 'POSIX mq', None), ('limit', 'limit: mallocs, list, locks', 2.0), wall=True),
+    Row('message/pingpong1', 'messages', 'ping-pong on one core', ('gasync', 'GAsyncQueue', None),
+        ('mq', 'POSIX mq', 0.7), ('limit', 'limit: mallocs, list, locks', 2.0), wall=True),
+    Row('message/pingpong2', 'messages', 'ping-pong on two cores', ('gasync', 'GAsyncQueue', None),
+        ('mq', 'POSIX mq', 1.05), ('limit', 'limit: mallocs, list, locks', 2.0), wall=True),
+    *[Row(f'mutex/{slot}', 'locks', f'acquire + release, {slot} slot', ('bare', 'pthread mutex', 1.6),
+          ('limit', 'limit: library call', 1.3)) for slot in ('first', 'last')],
+    *[Row(f'mutex2/{where}', 'locks', f'two threads, {text}', ('onethread', 'one thread', 1.5))
+      for where, text in (('neighbours', 'next slots'), ('apart', 'slots apart'))],
+    *[Row(f'semaphore/{slot}', 'locks', f'signal + wait, {slot} slot', ('bare', 'bare semaphore', 3.0))
+      for slot in ('first', 'last')],
+    Row('trace_off/one', 'trace', 'trace that is off', ('liblog', 'liblog, filtered', 0.6),
+        ('spdlog', 'spdlog, below level', None), ('limit', 'limit: masked call', 1.6)),
+    Row('trace_off/two', 'trace', 'trace that is off, two threads', ('liblog', 'liblog, filtered', None),
+        ('spdlog', 'spdlog, below level', None), ('limit', 'limit: masked call', None)),
+    Row('trace_on', 'trace', 'trace into nothing', ('spdlog', 'spdlog, null sink', 1.0),
+        ('spdlog_line', 'spdlog, whole line', None),
+        ('limit', 'limit: vsnprintf', None)),
+    Row('text/32', 'text', 'Latin-15 to UTF-8, 32 bytes', ('iconv', 'iconv', 0.7), ('icu', 'ICU', 0.7)),
+    Row('text/4096', 'text', 'Latin-15 to UTF-8, 4 KiB', ('iconv', 'iconv', 0.5), ('icu', 'ICU', 0.5)),
+    Row('calendar/to', 'time', 'seconds to calendar', ('libc', 'gmtime_r', 0.5), ('limit', 'limit: chrono', 1.3)),
+    Row('calendar/from', 'time', 'calendar to seconds', ('libc', 'timegm', 0.2), ('limit', 'limit: chrono', 1.3)),
+    Row('timer', 'timer', 'timer start + cancel', ('raw', 'timer_settime twice', 1.1),
+        ('limit', 'limit: asks first', 1.1)),
+    Row('file/188', 'files', 'stream read, 188 bytes', ('libc', 'fread', 1.05)),
+    Row('file/64k', 'files', 'large-file read, 64 KiB', ('libc', 'read', 1.05)),
+    *[Row(f'lateness/{state}_p{p}', 'lateness', f'lateness, {state}, p{p}', ('raw', 'raw timer', 1.1),
+          ('timerfd', 'timerfd', None), wall=True) for state in ('idle', 'busy') for p in (50, 99)],
+    *[Row(f'string/{what}', 'strings', f'string {what}', ('std', 'std::string', None))
+      for what in ('append', 'copy', 'compare')],
+    Row('receiver', 'receiver', 'receiver, 512 MiB', ('ffprobe', 'ffprobe, all packets', 1.0),
+        ('programs', 'ffprobe, first programs', None), ('read', 'plain reading', None), wall=True),
+]
+
+# What grows, along what axis; each curve is (name, contender, label). `per` divides by the axis.
+GROWTH = [
+    ('fill', 'locks', 'Objects in the table', 'ns an operation', False,
+     (('grow_mutex', 'ours', 'mutex acquire + release'), ('grow_semaphore', 'ours', 'semaphore signal + wait'),
+      ('grow_byname', 'ours', 'mutex by name, the last one'))),
+    ('queue', 'messages', 'Messages in the queue', 'ns a message', False,
+     (('grow_queue', 'ours', 'send + receive'), ('grow_queue', 'limit', 'limit: mallocs, list, locks'))),
+    ('length', 'text crc bits', 'Bytes', 'ns a byte', True,
+     (('grow_text', 'ours', 'Latin-15 to UTF-8'), ('grow_text', 'iconv', 'the same, by iconv'),
+      ('grow_crc', 'ours', 'CRC-32'), ('grow_bits', 'ours', 'bit fields'))),
+]
+# An operation in one thread, and in each of two at once.
+THREADS = [
+    ('mutexes in slots side by side', ('mutex2/neighbours', 'onethread'), ('mutex2/neighbours', 'ours')),
+    ('mutexes in slots far apart', ('mutex2/apart', 'onethread'), ('mutex2/apart', 'ours')),
+    *[(f'trace that is off, {label}', ('trace_off/one', who), ('trace_off/two', who)) for who, label in
+      (('ours', 'ours'), ('limit', 'masked call'), ('liblog', 'liblog'), ('spdlog', 'spdlog'))],
+]
+AREAS = list(dict.fromkeys(row.area for row in ROWS))
+
+
+def chosen(prefixes):
+    rows = [row for row in ROWS if not prefixes or any(row.name.startswith(prefix) for prefix in prefixes)]
+    return rows or sys.exit(f'no such row: {" ".join(prefixes)}')
+
+
+# What was measured ----------------------------------------------------------------------------------
+
+
+class Figures:
+    """Nanoseconds of each repetition, by row and contender."""
+
+    def __init__(self, directory):
+        self.wall, self.cpu, self.errors = {}, {}, {}
+        for path in sorted(Path(directory).glob('*.json')):
+            for run in json.loads(path.read_text())['benchmarks']:
+                if run['run_type'] == 'iteration':
+                    self.add(run)
+
+    def add(self, run):
+        row, contender = run['name'].split(':', 1)
+        key = row, contender.split('/')[0]
+        if run.get('error_occurred'):
+            self.errors[key] = run['error_message']
+            return
+        scale = {'ns': 1, 'us': 1e3, 'ms': 1e6, 's': 1e9}[run['time_unit']]
+        wall = run['real_time'] * scale
+        # Of a batch the share of an item; of threads at once what each of them waited.
+        if 'items_per_second' in run:
+            wall = 1e9 / run['items_per_second']
+        self.wall.setdefault(key, []).append(wall * run.get('threads', 1))
+        self.cpu.setdefault(key, []).append(run.get('cpu_time', wall) * scale)
+
+    def of(self, row, contender, wall):
+        return (self.wall if wall else self.cpu).get((row, contender), [])
+
+
+def shown(ns):
+    for unit, factor in (('ns', 1), ('µs', 1e3), ('ms', 1e6), ('s', 1e9)):
+        if abs(ns) < 1000 * factor or unit == 's':
+            value = ns / factor
+            return f'{value:.{2 if value < 10 else 1 if value < 100 else 0}f} {unit}'
+    return ''
+
+
+def spread(samples):
+    return f'{shown(min(samples))} to {shown(max(samples))}'
+
+
+def lines(figures):
+    """(row, ours, spread, peer, time, ratio, goal, verdict) of each pair that was measured."""
+    for row in ROWS:
+        ours = figures.of(row.name, 'ours', row.wall)
+        if not ours:
+            continue
+        for contender, label, goal in row.goals:
+            theirs = figures.of(row.name, contender, row.wall)
+            head = row.title, shown(statistics.median(ours)), spread(ours), label
+            wanted = f'<= {goal}' if goal else ''
+            if not theirs:
+                yield *head, figures.errors.get((row.name, contender), 'not measured'), '', wanted, ''
+                continue
+            ratio = statistics.median(ours) / statistics.median(theirs)
+            verdict = '' if not goal else 'met' if round(ratio, 2) <= goal else 'MISSED'
+            yield *head, shown(statistics.median(theirs)), f'{ratio:.2f}', wanted, verdict
+
+
+HEAD = ('row', 'ours', 'ours, least to most', 'beside', 'theirs', 'ratio', 'goal', '')
+
+
+def print_table(figures, prefixes):
+    table = [HEAD, *lines(figures)]
+    widths = [max(len(line[i]) for line in table) for i in range(len(HEAD))]
+    last = None
+    for line in table:
+        fields = list(line)
+        if line[0] == last:
+            fields[:3] = '', '', ''
+        last = line[0]
+        print('  '.join(f'{field:<{width}}' for field, width in zip(fields, widths)).rstrip())
+    count = [line[-1] for line in table]
+    print(f'{count.count("met")} goals met, {count.count("MISSED")} missed')
+    absent = [row.name for row in chosen(prefixes) if not figures.of(row.name, 'ours', row.wall)]
+    if absent:
+        sys.exit(f'no figure of ours: {", ".join(absent)}')
+
+
+def curves(figures, chart):
+    _, _, _, _, per, names = chart
+    for name, contender, label in names:
+        points = {}
+        for (row, who), samples in figures.cpu.items():
+            if who == contender and row.startswith(name + '/'):
+                x = int(row.split('/')[1])
+                points[x] = statistics.median(samples) / (x if per else 1)
+        if points:
+            yield label, sorted(points.items())
+
+
+def print_growth(figures):
+    for chart in GROWTH:
+        for label, points in curves(figures, chart):
+            print(f'{label}, {chart[3]}: ' + ', '.join(f'{y:.3g} at {x}' for x, y in points))
+
+
+# The receiver ---------------------------------------------------------------------------------------
+
+
+def measure_receiver(top, megabytes, runs, out):
+    sample = Path(top, 'samples/sample.ts').read_bytes()
+    directory = '/dev/shm' if os.access('/dev/shm', os.W_OK) else str(Path(out).parent)
+    stream = Path(directory, f'varnek-bench-{os.getpid()}.ts')
+    probe = ['ffprobe', '-v', 'quiet', '-show_programs']
+    contenders = {
+        'ours': [f'{top}/bin/receiver', '--quiet', '--json', str(stream)],
+        'ffprobe': [*probe, '-count_packets', str(stream)],
+        'programs': [*probe, str(stream)],
+        'read': ['dd', f'if={stream}', 'of=/dev/null', 'bs=64K', 'status=none'],
+    }
+    results = []
+    try:
+        with stream.open('wb') as file:
+            for _ in range(-(-megabytes * 2**20 // len(sample))):
+                file.write(sample)
+        for _ in range(runs):
+            for contender, command in contenders.items():
+                result = {'run_type': 'iteration', 'name': f'receiver:{contender}', 'time_unit': 's'}
+                before = resource.getrusage(resource.RUSAGE_CHILDREN)
+                start = time.monotonic()
+                try:
+                    subprocess.run(command, check=True, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
+                                   stderr=subprocess.DEVNULL)
+                except FileNotFoundError:
+                    result |= {'error_occurred': True, 'error_message': 'not installed'}
+                else:
+                    result['real_time'] = time.monotonic() - start
+                    after = resource.getrusage(resource.RUSAGE_CHILDREN)
+                    result['cpu_time'] = (after.ru_utime + after.ru_stime - before.ru_utime - before.ru_stime)
+                results.append(result)
+        size = stream.stat().st_size
+    finally:
+        stream.unlink(missing_ok=True)
+    Path(out).write_text(json.dumps({'benchmarks': results, 'bytes': size}, indent=1))
+
+
+# Charts ---------------------------------------------------------------------------------------------
+
+INK, PALE, GRID = '#1f2933', '#7b8794', '#d9dee4'
+COLOURS = ['#1f6feb', '#d97706', '#2f855a', '#9f3a8c']
+
+
+class Svg:
+    def __init__(self, width, height, title):
+        self.parts = [
+            f'<svg xmlns="http://www.w3.org/2000/svg" viewBox="0 0 {width} {height}" width="{width}" '
+            f'height="{height}" font-family="system-ui, sans-serif" font-size="13" role="img">',
+            f'<title>{title}</title>', f'<rect width="{width}" height="{height}" fill="#ffffff"/>']
+
+    def text(self, x, y, text, anchor='start', colour=INK, extra=''):
+        text = text.replace('&', '&amp;').replace('<', '&lt;')
+        self.parts.append(f'<text x="{x:.1f}" y="{y:.1f}" text-anchor="{anchor}" fill="{colour}"{extra}>{text}</text>')
+
+    def line(self, x1, y1, x2, y2, colour=GRID, width=1.0, extra=''):
+        self.parts.append(f'<line x1="{x1:.1f}" y1="{y1:.1f}" x2="{x2:.1f}" y2="{y2:.1f}" stroke="{colour}" '
+                          f'stroke-width="{width}"{extra}/>')
+
+    def add(self, part):
+        self.parts.append(part)
+
+    def write(self, path):
+        Path(path).write_text('\n'.join([*self.parts, '</svg>', '']))
+
+
+def bar_chart(figures, path):
+    """A bar for each pair: ours as a multiple of theirs, on a logarithmic axis around 1."""
+    bars = [(line[0], line[3], float(line[5]), line[6], line[7]) for line in lines(figures) if line[5]]
+    left, right, top, step = 400, 76, 64, 20
+    width, height = 980, top + step * len(bars) + 50
+    low = math.log10(min([0.05, *(bar[2] for bar in bars)]))
+    high = math.log10(max([4, *(bar[2] for bar in bars)]) * 1.2)
+
+    def x(ratio):
+        return left + (math.log10(ratio) - low) / (high - low) * (width - left - right)
+
+    svg = Svg(width, height, 'Time of the library as a multiple of its peers')
+    svg.text(16, 24, 'Time of the library as a multiple of its peer’s (left of 1 is faster)', extra=' font-size="16"')
+    svg.text(16, 44, 'Medians. The black tick is the goal; a bar is blue where it is met, amber where it is missed, '
+                     'grey without one.', colour=PALE)
+    for tick in (0.01, 0.02, 0.05, 0.1, 0.2, 0.5, 1, 2, 5, 10, 20, 50, 100):
+        if low <= math.log10(tick) <= high:
+            svg.line(x(tick), top - 6, x(tick), height - 36, INK if tick == 1 else GRID)
+            svg.text(x(tick), height - 20, f'{tick:g}', 'middle', PALE)
+    svg.text((left + width - right) / 2, height - 4, 'ours divided by theirs, logarithmic', 'middle', PALE)
+    last = None
+    for i, (row, peer, ratio, goal, verdict) in enumerate(bars):
+        y = top + step * i
+        if row != last:
+            svg.line(16, y - 2, width - 16, y - 2)
+            svg.text(16, y + 13, row)
+        last = row
+        svg.text(left - 10, y + 13, peer, 'end', PALE)
+        colour = {'met': COLOURS[0], 'MISSED': COLOURS[1]}.get(verdict, '#a9b4c0')
+        begin, end = sorted((x(ratio), x(1)))
+        svg.add(f'<rect x="{begin:.1f}" y="{y + 2}" width="{max(end - begin, 1):.1f}" height="{step - 7}" fill="{colour}"/>')
+        if goal:
+            at = x(float(goal.split()[1]))
+            svg.line(at, y, at, y + step - 3, INK, 2)
+        svg.text(width - 16, y + 13, f'{ratio:.2f}', 'end')
+    svg.write(path)
+
+
+def nice_ceiling(value):
+    magnitude = 10 ** math.floor(math.log10(value))
+    return next(step * magnitude for step in (1, 2, 2.5, 5, 10) if step * magnitude >= value)
+
+
+def growth_chart(figures, chart, path):
+    name, _, xlabel, ylabel, per, _ = chart
+    drawn = list(curves(figures, chart))
+    if not drawn:
+        return
+    width, height, left, right, top, bottom = 720, 360, 70, 210, 30, 56
+    xs = sorted({x for _, points in drawn for x, _ in points})
+    ys = [y for _, points in drawn for _, y in points]
+    first, last = math.log10(xs[0]), math.log10(xs[-1])
+
+    def px(x):
+        return left + (math.log10(x) - first) / (last - first) * (width - left - right)
+
+    if per:  # lengths meet very different prices
+        low, high = math.log10(min(ys) / 1.4), math.log10(max(ys) * 1.4)
+        ticks = [m * 10.0 ** e for e in range(-3, 5) for m in (1, 2, 5) if low <= math.log10(m * 10.0 ** e) <= high]
+
+        def py(y):
+            return height - bottom - (math.log10(y) - low) / (high - low) * (height - top - bottom)
+    else:
+        ceiling = nice_ceiling(max(ys) * 1.05)
+        ticks = [ceiling * i / 5 for i in range(6)]
+
+        def py(y):
+            return height - bottom - y / ceiling * (height - top - bottom)
+
+    svg = Svg(width, height, f'{ylabel} against {xlabel.lower()}')
+    for tick in ticks:
+        svg.line(left, py(tick), width - right, py(tick))
+        svg.text(left - 8, py(tick) + 4, f'{tick:g}', 'end', PALE)
+    for x in xs:
+        if x in (p[0] for p in drawn[0][1]):
+            svg.line(px(x), height - bottom, px(x), height - bottom + 5, PALE)
+            svg.text(px(x), height - bottom + 20, f'{x:,}'.replace(',', ' '), 'middle', PALE)
+    svg.line(left, height - bottom, width - right, height - bottom, PALE)
+    svg.text((left + width - right) / 2, height - 12, f'{xlabel} (logarithmic)', 'middle')
+    svg.text(left - 50, top - 12, ylabel + (' (logarithmic)' if per else ''))
+    ends = []
+    for (label, points), colour in zip(drawn, COLOURS):
+        path_points = ' '.join(f'{px(x):.1f},{py(y):.1f}' for x, y in points)
+        svg.add(f'<polyline points="{path_points}" fill="none" stroke="{colour}" stroke-width="2"/>')
+        for x, y in points:
+            svg.add(f'<circle cx="{px(x):.1f}" cy="{py(y):.1f}" r="3.5" fill="{colour}"/>')
+        ends.append([py(points[-1][1]) + 4, label, colour])
+    ends.sort()
+    for i in range(1, len(ends)):
+        ends[i][0] = max(ends[i][0], ends[i - 1][0] + 17)
+    for y, label, colour in ends:
+        svg.text(width - right + 12, y, label, colour=colour)
+    svg.write(path)
+
+
+def thread_chart(figures, path):
+    """What an operation costs each of two threads at once, beside one thread alone."""
+    pairs = [(label, one, two) for label, *names in THREADS
+             for one, two in [[figures.of(*name, False) for name in names]] if one and two]
+    if not pairs:
+        return
+    left, top, step, width = 260, 56, 46, 720
+    height = top + step * len(pairs) + 50
+    ceiling = nice_ceiling(max(statistics.median(samples) for pair in pairs for samples in pair[1:]) * 1.05)
+    svg = Svg(width, height, 'Cost of an operation in one thread and in two at once')
+    svg.text(16, 24, 'ns an operation: one thread alone, and each of two threads at once', extra=' font-size="16"')
+    for i in range(6):
+        x = left + (width - left - 70) * i / 5
+        svg.line(x, top - 8, x, height - 40)
+        svg.text(x, height - 22, f'{ceiling * i / 5:g}', 'middle', PALE)
+    svg.text(left + (width - left - 70) / 2, height - 4, 'ns an operation', 'middle', PALE)
+    for i, (label, *pair) in enumerate(pairs):
+        y = top + step * i
+        svg.text(left - 10, y + 22, label, 'end')
+        for j, (samples, name) in enumerate(zip(pair, ('one', 'two'))):
+            median = statistics.median(samples)
+            length = median / ceiling * (width - left - 70)
+            svg.add(f'<rect x="{left}" y="{y + 17 * j}" width="{length:.1f}" height="15" fill="{COLOURS[j]}"/>')
+            svg.text(left + length + 6, y + 17 * j + 12, f'{median:.2f} {name}', extra=' font-size="11"')
+    svg.write(path)
+
+
+# The document ---------------------------------------------------------------------------------------
+
+
+def processor():
+    for line in Path('/proc/cpuinfo').read_text().splitlines():
+        if line.startswith('model name'):
+            return line.split(':', 1)[1].strip()
+    return platform.machine()
+
+
+def section(directory, figures):
+    table = list(lines(figures))
+    compiler = subprocess.run(['g++', '--version'], capture_output=True, text=True, check=True).stdout.splitlines()[0]
+    yield (f'Measured on {datetime.date.today().isoformat()}: {processor()}, {os.cpu_count()} cores, '
+           f'Linux {platform.release().split("-")[0]}, {compiler}.')
+    verdicts = [line[-1] for line in table]
+    yield f'{verdicts.count("met")} goals met, {verdicts.count("MISSED")} missed.'
+    yield ''
+    yield '| row | ours | least to most | beside | theirs | ratio | goal | |'
+    yield '|---|---|---|---|---|---|---|---|'
+    last = None
+    for line in table:
+        fields = list(line)
+        if line[0] == last:
+            fields[:3] = '', '', ''
+        last = line[0]
+        fields[-1] = {'MISSED': '**missed**'}.get(fields[-1], fields[-1])
+        yield '| ' + ' | '.join(field.replace('<= ', '≤ ') for field in fields) + ' |'
+    path = Path(directory, 'receiver.json')
+    if path.exists():
+        size = json.loads(path.read_text())['bytes']
+        speed = {who: size / statistics.median(figures.wall['receiver', who]) * 1e3
+                 for who in ('ours', 'ffprobe', 'read') if ('receiver', who) in figures.wall}
+        yield ''
+        yield ('The receiver reads ' + ', '.join(
+            f'{value:.0f} MB/s ({label})' for who, label, value in
+            ((who, {'ours': 'ours', 'ffprobe': 'ffprobe, all packets', 'read': 'plain reading'}[who], speed[who])
+             for who in speed)) + f'; that is {100 * speed["ours"] / speed["read"]:.1f} % of plain reading.')
+
+
+def record(directory, docs):
+    figures = Figures(directory)
+    bar_chart(figures, Path(docs, 'performance.svg'))
+    for chart in GROWTH:
+        growth_chart(figures, chart, Path(docs, f'performance-{chart[0]}.svg'))
+    thread_chart(figures, Path(docs, 'performance-threads.svg'))
+    page = Path(docs, 'performance.md')
+    begin, end = '<!-- results: script/bench --record -->', '<!-- end of results -->'
+    text = page.read_text()
+    head, rest = text.split(begin, 1)
+    page.write_text(head + begin + '\n' + '\n'.join(section(directory, figures)) + '\n' + end + rest.split(end, 1)[1])
+
+
+def print_areas(prefixes):
+    for area in AREAS:
+        names = [row.name for row in chosen(prefixes) if row.area == area]
+        if names:
+            # Google Benchmark takes an extended regular expression.
+            print(area, '.' if not prefixes else '^(' + '|'.join(names) + '):')
+
+
+def main(arguments):
+    match arguments:
+        case ['list']:
+            for row in ROWS:
+                print(f'{row.name:<20}{row.title}')
+        case ['areas', *prefixes]:
+            print_areas(prefixes)
+        case ['receiver', top, megabytes, runs, out]:
+            measure_receiver(top, int(megabytes), int(runs), out)
+        case ['table', directory, *prefixes]:
+            print_table(Figures(directory), prefixes)
+        case ['growth', directory]:
+            print_growth(Figures(directory))
+        case ['record', directory, docs]:
+            record(directory, docs)
+        case _:
+            sys.exit(__doc__)
+
+
+main(sys.argv[1:])
