@@ -54,6 +54,8 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
             static_cast<Fields &>(model) = before;
         } else if (kind >= 245) {
             ring = VarnekCRingBuffer(ring);
+            const VarnekCRingBuffer &same = ring;
+            ring = same;
         }
         DropTraces();
         const Operation operation{kind % 8, input.Int() % 512, kind / 8 % 4};

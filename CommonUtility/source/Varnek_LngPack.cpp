@@ -67,6 +67,32 @@ char *PutUtf8(char *out, unsigned int unit) {
     return out;
 }
 
+// Whether eight bytes are plain characters, 0x20 to 0x7E, which are the same in Latin-15 and UTF-8:
+// no top bit is set, before or after 0x20 is taken off or 1 is added in each byte.
+bool ArePlain(uint64_t bytes) {
+    constexpr uint64_t kOnes = 0x0101010101010101u;
+    return ((bytes | (bytes - 0x20 * kOnes) | (bytes + kOnes)) & 0x80 * kOnes) == 0;
+}
+
+// Converts `length` bytes straight to UTF-8, for which there is room. Returns where that ends.
+char *PutLatin15(char *out, const char *text, size_t length) {
+    for (size_t i = 0; i < length;) {
+        uint64_t eight = 0;
+        if (length - i >= sizeof eight) {
+            memcpy(&eight, text + i, sizeof eight);
+        }
+        if (ArePlain(eight)) {
+            memcpy(out, &eight, sizeof eight);
+            out += sizeof eight;
+            i += sizeof eight;
+            continue;
+        }
+        const unsigned int unit = UnitOf(static_cast<unsigned char>(text[i++]));
+        out = unit != 0 ? PutUtf8(out, unit) : out;
+    }
+    return out;
+}
+
 // Bytes of the character at `text`, of which `length` may be read, at least one; 0 when malformed.
 int CharLength(const unsigned char *text, int length) {
     if (text[0] < 0x80) {
@@ -292,13 +318,7 @@ static BOOL ConvertWithin(char *utf8, char **outputData, const char *szInput, si
         return FALSE;
     }
     // Both steps at once, without the units in between.
-    char *end = utf8;
-    for (size_t i = 0; i < length; ++i) {
-        const unsigned int unit = UnitOf(static_cast<unsigned char>(szInput[i]));
-        if (unit != 0) {
-            end = PutUtf8(end, unit);
-        }
-    }
+    char *end = PutLatin15(utf8, szInput, length);
     *end = '\0';
     TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: Convert String => %s !\n", utf8);
     const size_t textlen = static_cast<size_t>(end - utf8);
