@@ -30,15 +30,7 @@ class SlotTable {
             return -1;
         }
         const int hint = HintOf(handle).load(std::memory_order_relaxed);
-        if (IsLive(hint, handle)) {
-            return hint;
-        }
-        const int slot = ScanForHandle(handle);
-        // A hint left by a handle that is gone is mended; two live ones leave it to one of them.
-        if (slot != -1 && &HintOf(HandleOf(hint)) != &HintOf(handle)) {
-            HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
-        }
-        return slot;
+        return __builtin_expect(IsLive(hint, handle), 1) ? hint : ScanForHandle(handle, hint);
     }
 
     // The handle of the lowest live slot of this name, kInvalidHandle for none and for null.
@@ -106,11 +98,18 @@ class SlotTable {
         Info info;
     };
 
-    int ScanForHandle(int32_t handle) const {
+    // Kept out of line and out of the way of those who find their handle at once.
+    __attribute__((noinline, cold)) int ScanForHandle(int32_t handle, int hint) const {
         for (int slot = 0; slot < capacity; slot++) {
-            if (IsLive(slot, handle)) {
-                return slot;
+            if (!IsLive(slot, handle)) {
+                continue;
             }
+            // A hint left by a handle that is gone is mended; two live ones leave it to one of
+            // them.
+            if (&HintOf(HandleOf(hint)) != &HintOf(handle)) {
+                HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
+            }
+            return slot;
         }
         return -1;
     }
