@@ -94,7 +94,7 @@ uint32_t OurCrc(const unsigned char *data, size_t length) {
     return VarnekUtil_MakeCRC32(data, static_cast<int32_t>(length));
 }
 
-void RegisterPeers(const std::string &row, size_t length) {
+void RegisterPeers(const std::string &row, [[maybe_unused]] size_t length) {
 #ifdef HAVE_AVUTIL
     Register(row + "av_crc", length, [](const unsigned char *data, size_t size) {
         // Its register lies the other way round.

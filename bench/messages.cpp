@@ -4,6 +4,7 @@
 #include <pthread.h>
 #include <semaphore.h>
 #include <string.h>
+#include <unistd.h>
 
 #include <memory>
 #include <thread>
