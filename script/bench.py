@@ -73,7 +73,7 @@ ROWS = [
     *[Row(f'string/{what}', 'strings', f'string {what}', ('std', 'std::string', None))
       for what in ('append', 'copy', 'compare')],
     Row('receiver', 'receiver', 'receiver, 512 MiB', ('ffprobe', 'ffprobe, all packets', 1.0),
-        ('programs', 'ffprobe, first programs', None), ('read', 'plain reading', None), wall=True),
+        ('programs', 'ffprobe, first programs', 1.0), ('read', 'plain reading', None), wall=True),
 ]
 
 # What grows, along what axis; each curve is (name, contender, label). `per` divides by the axis.

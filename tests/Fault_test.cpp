@@ -455,6 +455,19 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
          {-101, -501, -500, -492, 0, 799, 800},
          true},
         {"copy", [&] { return content(), VarnekPGL_CopyFile(file.c_str(), copy.c_str()); }, 0, {-1}, true},
+        {"move", [&] { return content(), VarnekPGL_MoveFile(file.c_str(), copy.c_str()); }, 0, {-1}, true},
+        {"permissions", [&] { return content(), VarnekPGL_Chmod(file.c_str(), 666); }, 0, {-1}},
+        {"removal", [&] { return content(), VarnekPGL_DeleteFile(file.c_str()); }, 0, {-1}},
+        {"position",
+         [&] {
+             const PglFileHandle handle = VarnekPGL_OpenFile(file.c_str(), PGL_FILE_MODE_CREATE_RW);
+             const int32_t end = VarnekPGL_SeekFile(handle, 0, SEEK_END) + VarnekPGL_TellFile(handle);
+             return end + VarnekPGL_GetFileSizeByHandle(handle) + VarnekPGL_CloseFile(handle);
+         },
+         0,
+         {-1, -2, -3},
+         true},
+        {"large size", [&] { return content(), VarnekPGL_GetFileSize64Bits(file.c_str()); }, 8, {0, -1}, true},
         {"listing",
          [&] {
              VarnekPGL_MakeDir(directory.c_str());

@@ -165,7 +165,7 @@ VARNEK_API int32_t VarnekPGL_MakeDir(const char *path);
 
 // Deletes a directory tree, going on past entries that cannot be deleted. Links are removed, never
 // followed. An entry whose path would exceed 256 characters is left, with a log line, and so is
-// what a listing does not reach.
+// what a listing does not reach. Both names do the same.
 //   path     one final slash or backslash is ignored
 //   returns  0 when the directory and its contents are gone, -1 otherwise
 VARNEK_API int32_t VarnekPGL_DeleteDirEx(const char *path);

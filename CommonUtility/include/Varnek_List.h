@@ -31,8 +31,9 @@ typedef struct list_t {
 // Makes an empty list. Nodes that it had are forgotten, not freed.
 VARNEK_API void list_initialize(list_t *list);
 
-// Insert data at the head and at the tail.
+// Inserts data at the head.
 VARNEK_API void list_insertHead(list_t *list, void *data);
+// Insert data at the tail; both do the same.
 VARNEK_API void list_insertTail(list_t *list, void *data);
 VARNEK_API void list_insert(list_t *list, void *data);
 // Inserts data at a position from 0; one at or beyond the count appends, a negative one changes

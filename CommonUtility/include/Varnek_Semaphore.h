@@ -1,9 +1,10 @@
 // Named mutexes and named counting semaphores, each kept in one process-wide table of 40.
 //
 // Handles start at 1, rise by one with every creation and are never given out twice; mutexes and
-// semaphores count apart. Names have 1 to 31 characters and compare exactly. Any thread may call
-// any operation, and no call is needed to set the tables up. A failure is traced at Error. A
-// time-out and a name that is not found are no failures, and nothing is traced for them.
+// semaphores count apart. Names have 1 to 31 characters and compare exactly; two live objects have
+// one name only when two threads create them at the same moment. Any thread may call any operation,
+// and no call is needed to set the tables up. A failure is traced at Error. A time-out and a name
+// that is not found are no failures, and nothing is traced for them.
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H
 
@@ -55,7 +56,8 @@ VARNEK_API BOOL VarnekPGL_DeleteSemaphore(int32_t hSem);
 //   timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
 //   returns  TRUE when a unit was taken; FALSE on time-out and on every failure alike. A wait that
 //            a signal interrupts is not resumed
-//   traces   Low on entry; Error for an unknown handle or a failing OS wait; nothing on time-out
+//   traces   Low on entry, and after an unlimited wait; Error for an unknown handle or a failing OS
+//   wait; nothing on time-out
 VARNEK_API BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout);
 
 // Adds one unit, which wakes one waiter.

@@ -23,8 +23,8 @@ class SlotTable {
   public:
     Info &operator[](int slot) { return slots_[slot].info; }
 
-    // The slot of a live handle, -1 for none. One look for every slot; a scan only when two live
-    // handles share their place among the hints.
+    // The slot of a live handle, -1 for none. One look for every slot; a scan for an unknown
+    // handle, and where another one has the place among the hints.
     int FindByHandle(int32_t handle) const {
         if (handle <= kFree) {
             return -1;
@@ -106,7 +106,8 @@ class SlotTable {
             }
             // A hint left by a handle that is gone is mended; two live ones leave it to one of
             // them.
-            if (&HintOf(HandleOf(hint)) != &HintOf(handle)) {
+            const int32_t hinted = HandleOf(hint);
+            if (hinted == kFree || &HintOf(hinted) != &HintOf(handle)) {
                 HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
             }
             return slot;
