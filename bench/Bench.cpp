@@ -64,14 +64,14 @@ std::vector<unsigned char> Noise(size_t size) {
 }
 
 void PinTo(int core) {
-    cpu_set_t all;
-    cpu_set_t one;
-    CPU_ZERO(&one);
-    static const int cores = [&all] {
+    static const int cores = [] {
+        cpu_set_t all;
         CPU_ZERO(&all);
         sched_getaffinity(0, sizeof all, &all);
         return CPU_COUNT(&all);
     }();
+    cpu_set_t one;
+    CPU_ZERO(&one);
     CPU_SET(static_cast<size_t>(cores > 0 ? core % cores : 0), &one);
     pthread_setaffinity_np(pthread_self(), sizeof one, &one);
 }

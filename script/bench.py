@@ -166,18 +166,25 @@ def lines(figures):
 HEAD = ('row', 'ours', 'ours, least to most', 'beside', 'theirs', 'ratio', 'goal', '')
 
 
+def named_once(table):
+    """The lines of a table, with title and time of ours only in the first of each row."""
+    last = None
+    for line in table:
+        yield ['', '', '', *line[3:]] if line[0] == last else list(line)
+        last = line[0]
+
+
+def score(table):
+    verdicts = [line[-1] for line in table]
+    return f'{verdicts.count("met")} goals met, {verdicts.count("MISSED")} missed'
+
+
 def print_table(figures, prefixes):
     table = [HEAD, *lines(figures)]
     widths = [max(len(line[i]) for line in table) for i in range(len(HEAD))]
-    last = None
-    for line in table:
-        fields = list(line)
-        if line[0] == last:
-            fields[:3] = '', '', ''
-        last = line[0]
+    for fields in named_once(table):
         print('  '.join(f'{field:<{width}}' for field, width in zip(fields, widths)).rstrip())
-    count = [line[-1] for line in table]
-    print(f'{count.count("met")} goals met, {count.count("MISSED")} missed')
+    print(score(table))
     absent = [row.name for row in chosen(prefixes) if not figures.of(row.name, 'ours', row.wall)]
     if absent:
         sys.exit(f'no figure of ours: {", ".join(absent)}')
@@ -406,17 +413,11 @@ def section(directory, figures):
     compiler = subprocess.run(['g++', '--version'], capture_output=True, text=True, check=True).stdout.splitlines()[0]
     yield (f'Measured on {datetime.date.today().isoformat()}: {processor()}, {os.cpu_count()} cores, '
            f'Linux {platform.release().split("-")[0]}, {compiler}.')
-    verdicts = [line[-1] for line in table]
-    yield f'{verdicts.count("met")} goals met, {verdicts.count("MISSED")} missed.'
+    yield f'{score(table)}.'
     yield ''
     yield '| row | ours | least to most | beside | theirs | ratio | goal | |'
     yield '|---|---|---|---|---|---|---|---|'
-    last = None
-    for line in table:
-        fields = list(line)
-        if line[0] == last:
-            fields[:3] = '', '', ''
-        last = line[0]
+    for fields in named_once(table):
         fields[-1] = {'MISSED': '**missed**'}.get(fields[-1], fields[-1])
         yield '| ' + ' | '.join(field.replace('<= ', '≤ ') for field in fields) + ' |'
     path = Path(directory, 'receiver.json')

@@ -1,5 +1,6 @@
-// The bit input stream. Fields that end before the last byte does are taken as a whole; the others
-// go piece by piece through GetBits, which is the only place where the end is found.
+// The bit input stream. A field within the current byte, and one that four more bytes follow, is
+// taken as a whole; the others go piece by piece through GetBits, which is the only place where the
+// end is found.
 #include "Varnek_CBitInputStream.h"
 
 #include <limits.h>
@@ -110,10 +111,6 @@ unsigned int VarnekCBitInputStream::GetBits(int aNum, unsigned char &success) {
 }
 
 unsigned int VarnekCBitInputStream::ReadBit(unsigned char &success) {
-    if (bEndOfStream == 1) {
-        success = 0;
-        return 0;
-    }
     return ReadInt(1, success);
 }
 

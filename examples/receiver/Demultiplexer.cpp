@@ -57,7 +57,7 @@ void Demultiplexer::Push(const unsigned char *packet) {
     if (order == Order::kBroken) {
         ++counters_.continuity_errors;
     }
-    if (names_[header.pid] == 0 || order == Order::kRepeated) {
+    if (!Follows(header.pid) || order == Order::kRepeated) {
         return;
     }
     SectionAssembler &assembler = assemblers_.find(header.pid)->second;

@@ -35,7 +35,7 @@ class Demultiplexer {
     void Push(const unsigned char *packet);
 
     // Whether sections are taken from this PID at this point of the stream.
-    bool Follows(uint16_t pid) const { return assemblers_.count(pid) != 0; }
+    bool Follows(uint16_t pid) const { return names_[pid] != 0; }
 
     const DemultiplexerCounters &Counters() const { return counters_; }
 
