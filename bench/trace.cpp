@@ -6,6 +6,7 @@
 #include "Bench.h"
 #include "Varnek_Debug.h"
 #include "limit.h"
+#include "varnek_platform.h"
 
 #ifdef HAVE_SPDLOG
 #include <spdlog/sinks/base_sink.h>

@@ -7,6 +7,7 @@
 #include <cstring>
 
 #include "Varnek_Debug.h"
+#include "varnek_platform.h"
 
 extern "C" int LLVMFuzzerInitialize(int *argc, char ***argv);
 extern "C" const char *__asan_default_options();

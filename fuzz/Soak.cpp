@@ -18,6 +18,7 @@
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
 #include "Varnek_Timer.h"
+#include "varnek_platform.h"
 
 namespace {
 

@@ -11,13 +11,10 @@
 #include "Varnek_StrUtil.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
+#include "varnek_platform.h"
 
 #define CTRL_HIGH(...) VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
 #define CTRL_MID(...) VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
-
-// The platform's feature store. Null or the default when there is no such feature.
-extern "C" const char *VellNativeFeature_getStringWithDefault(const char *key,
-                                                              const char *defaultValue);
 
 static_assert(sizeof(VarnekConfigInfo) == 212, "callers and library agree on this record");
 static_assert(offsetof(VarnekConfigInfo, standardType) == 100,

@@ -18,22 +18,13 @@
 #include "Varnek_Lock.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
-
-extern "C" int __android_log_write(int priority, const char *tag, const char *text);
+#include "varnek_platform.h"
 
 const char *gszVarnekDbgFilePath = "";
 int32_t gVarnekDbgLineNum = 0;
 std::atomic<uint32_t> gDebugState{0};
 
 namespace {
-
-enum LogPriority {
-    LOG_VERBOSE = 2,
-    LOG_DEBUG = 3,
-    LOG_INFO = 4,
-    LOG_ERROR = 6,
-    LOG_FATAL = 7,
-};
 
 constexpr uint32_t kLevelBits = 0xF0000000u;
 constexpr uint32_t kModuleBits = 0x00000FFFu;
@@ -82,21 +73,21 @@ constexpr ConfigKey kConfigKeys[] = {
 
 struct LevelLook {
     char label;
-    LogPriority priority;
+    VarnekLogPriority priority;
 };
 
 LevelLook LookOfLevel(uint32_t mask) {
     switch (mask & 0xFF000000u) {
         case VARNEK_LEVEL_ERROR:
-            return {'E', LOG_ERROR};
+            return {'E', VARNEK_LOG_ERROR};
         case VARNEK_LEVEL_HIGH:
-            return {'H', LOG_INFO};
+            return {'H', VARNEK_LOG_INFO};
         case VARNEK_LEVEL_MID:
-            return {'M', LOG_DEBUG};
+            return {'M', VARNEK_LOG_DEBUG};
         case VARNEK_LEVEL_LOW:
-            return {'L', LOG_VERBOSE};
+            return {'L', VARNEK_LOG_VERBOSE};
         default:
-            return {'L', LOG_DEBUG};
+            return {'L', VARNEK_LOG_DEBUG};
     }
 }
 
@@ -150,12 +141,12 @@ int32_t CallerLine() {
 char *ReadConfig(const char *path, int32_t *size) {
     *size = VarnekPGL_CheckFile(path) ? VarnekPGL_GetFileSize(path) : 0;
     if (*size < 1) {
-        __android_log_write(LOG_ERROR, "SBTVD", "Debug Configuration File Doesn't exist!\n");
+        __android_log_write(VARNEK_LOG_ERROR, "SBTVD", "Debug Configuration File Doesn't exist!\n");
         return nullptr;
     }
     char *data = static_cast<char *>(malloc(static_cast<size_t>(*size) + 1));
     if (data == nullptr || VarnekPGL_ReadFile(path, data, static_cast<uint32_t>(*size)) != *size) {
-        __android_log_write(LOG_ERROR, "SBTVD", "Debug Configuration File reading fail!\n");
+        __android_log_write(VARNEK_LOG_ERROR, "SBTVD", "Debug Configuration File reading fail!\n");
         free(data);
         return nullptr;
     }
@@ -204,7 +195,7 @@ uint32_t ParseConfig(const char *data, size_t size) {
 void LogSummary(uint32_t enabled) {
     const auto on = [enabled](uint32_t bit) { return (enabled & bit) != 0 ? 1 : 0; };
     char line[kTraceLineSize];
-    const auto write = [&line] { __android_log_write(LOG_DEBUG, "SBTVD", line); };
+    const auto write = [&line] { __android_log_write(VARNEK_LOG_DEBUG, "SBTVD", line); };
     snprintf(line, sizeof line, "Log Config: Error=[%d]\tHigh=[%d]\tMid=[%d]\tLow=[%d]\n",
              on(VARNEK_LEVEL_ERROR), on(VARNEK_LEVEL_HIGH), on(VARNEK_LEVEL_MID),
              on(VARNEK_LEVEL_LOW));
@@ -239,7 +230,7 @@ void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
             char line[kTraceLineSize];
             snprintf(line, sizeof line,
                      "Default Log Configuration file doesn't exit! File Path=[%s]\n", defaultPath);
-            __android_log_write(LOG_ERROR, "SBTVD", line);
+            __android_log_write(VARNEK_LOG_ERROR, "SBTVD", line);
         }
     }
     uint32_t enabled = 0;
@@ -351,7 +342,7 @@ int32_t VarnekPGL_Panic() {
     char line[kTraceLineSize];
     snprintf(line, sizeof line, "#### [VarnekPanic]  File=[%s], line=[%d]!\n", CallerFileName(),
              static_cast<int>(CallerLine()));
-    return __android_log_write(LOG_FATAL, "Varnek", line);
+    return __android_log_write(VARNEK_LOG_FATAL, "Varnek", line);
 }
 
 int32_t VarnekPGL_SysGetLastErro() {

@@ -18,8 +18,7 @@
 
 #include "Varnek_FileLog.h"
 #include "Varnek_Support.h"
-
-extern "C" int __android_log_write(int priority, const char *tag, const char *text);
+#include "varnek_platform.h"
 
 static_assert(sizeof(PglDirEntry) == 560, "callers and library agree on this record");
 static_assert(offsetof(PglDirEntry, name) == 296, "callers and library agree on this record");
@@ -31,7 +30,6 @@ static_assert(offsetof(PglFmFileAttributes, size) == 32,
 
 namespace {
 
-constexpr int kLogError = 6;
 constexpr size_t kFileLogSize = 1024;
 constexpr size_t kChildPathSize = 257;
 constexpr size_t kCopyCommandSize = 532;
@@ -68,7 +66,7 @@ void __VarnekPGL_FileLog(const char *format, ...) {
     va_start(args, format);
     vsnprintf(line, sizeof line, format, args);
     va_end(args);
-    __android_log_write(kLogError, "SBTVD_File", line);
+    __android_log_write(VARNEK_LOG_ERROR, "SBTVD_File", line);
 }
 
 // Streams ----------------------------------------------------------------------------------------

@@ -5,6 +5,8 @@
 #include <time.h>
 #include <unistd.h>
 
+#include "varnek_platform.h"
+
 enum { LINE_SIZE = 4096 };
 
 static char PriorityLetter(int priority) {

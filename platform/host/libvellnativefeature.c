@@ -4,6 +4,8 @@
 #include <stdio.h>
 #include <string.h>
 
+#include "varnek_platform.h"
+
 enum { STORE_SIZE = 65536 };
 
 // Every line end is replaced by a terminator, and the last line is followed by one.

@@ -10,6 +10,8 @@
 #include <iterator>
 #include <mutex>
 
+#include "varnek_platform.h"
+
 void (*gLogHook)(const LogLine &line) = nullptr;
 const char *gFeature = "";
 
