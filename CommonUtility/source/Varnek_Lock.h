@@ -1,9 +1,12 @@
-// The library's own locks, and the scope that holds one. Under clang, -Wthread-safety checks that
-// what is VARNEK_GUARDED_BY a lock is used by its holder only. Private.
+// The library's own locks, the scope that holds one, and the scope that holds a named mutex. Under
+// clang, -Wthread-safety checks that what is VARNEK_GUARDED_BY a lock is used by its holder only.
+// Private.
 #ifndef VARNEK_SOURCE_LOCK_H
 #define VARNEK_SOURCE_LOCK_H
 
 #include <pthread.h>
+
+#include "Varnek_Semaphore.h"
 
 #if defined(__clang__)
 #define VARNEK_THREAD_SAFETY(attribute) __attribute__((attribute))
@@ -22,16 +25,20 @@ struct VARNEK_THREAD_SAFETY(capability("mutex")) Lock {
 };
 
 // Holds a lock to the end of the scope, or up to its release where a trace or a callback comes
-// after.
+// after. It may be taken again after that.
 class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
   public:
     explicit Hold(Lock &lock) VARNEK_THREAD_SAFETY(acquire_capability(lock)) : lock_(lock) {
-        lock.Acquire();
+        Acquire();
     }
     ~Hold() VARNEK_THREAD_SAFETY(release_capability()) { Release(); }
     Hold(const Hold &) = delete;
     Hold &operator=(const Hold &) = delete;
 
+    void Acquire() VARNEK_THREAD_SAFETY(acquire_capability()) {
+        lock_.Acquire();
+        held_ = true;
+    }
     void Release() VARNEK_THREAD_SAFETY(release_capability()) {
         if (held_) {
             held_ = false;
@@ -41,7 +48,32 @@ class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
 
   private:
     Lock &lock_;
-    bool held_ = true;
+    bool held_ = false;
+};
+
+// Holds a named mutex to the end of the scope, or up to its release. An object without a mutex
+// (kNoMutex) is not held, and neither is one whose mutex the system refuses; IsHeld says so.
+class HoldMutex {
+  public:
+    static constexpr int32_t kNoMutex = -1;
+
+    explicit HoldMutex(int32_t hMutex) : hMutex_(hMutex) { Acquire(); }
+    ~HoldMutex() { Release(); }
+    HoldMutex(const HoldMutex &) = delete;
+    HoldMutex &operator=(const HoldMutex &) = delete;
+
+    bool IsHeld() const { return held_; }
+    void Acquire() { held_ = hMutex_ != kNoMutex && VarnekPGL_AcquireMutex(hMutex_) != FALSE; }
+    void Release() {
+        if (held_) {
+            held_ = false;
+            VarnekPGL_ReleaseMutex(hMutex_);
+        }
+    }
+
+  private:
+    const int32_t hMutex_;
+    bool held_ = false;
 };
 
 #endif

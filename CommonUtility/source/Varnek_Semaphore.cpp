@@ -24,17 +24,11 @@ struct SEM_MGR_INFO {
     sem_t linuxSem;
 };
 
-// The lock guards every change of the table; the table and the count are read without.
+// A lock for each table. It guards every change of its table; lookups read the table without it.
 Lock gMutexArrLock;
 SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE> gMutexArr;
-std::atomic<int32_t> gMutexArrSize{0};
-int32_t gNextMutexHandle VARNEK_GUARDED_BY(gMutexArrLock) = 1;
-
-// Likewise.
 Lock gSemArrLock;
 SlotTable<SEM_MGR_INFO, MAX_SEM_MGR_INFO_ARR_SIZE> gSemArr;
-std::atomic<int32_t> gSemArrSize{0};
-int32_t gNextSemHandle VARNEK_GUARDED_BY(gSemArrLock) = 1;
 
 // Mutexes ----------------------------------------------------------------------------------------
 
@@ -49,7 +43,7 @@ int32_t __Varnek_create_mutex(const char *szMutexName) {
             -1, "***** __Varnek_create_mutex : Invalid Mutex Name. szMutexName = [%s], Len = [%d]",
             szMutexName, len);
     }
-    const int32_t count = gMutexArrSize.load(std::memory_order_relaxed);
+    const int32_t count = gMutexArr.Count();
     if (count >= MAX_MUTEX_MGR_INFO_ARR_SIZE) {
         return VARNEK_FAIL(
             -1, "***** __Varnek_create_mutex : Mutex pool is full. gMutexArrSize = [%d]", count);
@@ -70,9 +64,7 @@ int32_t __Varnek_create_mutex(const char *szMutexName) {
                            VarnekPGL_SysGetLastErro());
     }
     const int word = FirstWord(linuxMutex);  // before others can lock it
-    const int32_t hHandle = gNextMutexHandle++;
-    gMutexArr.Publish(slot, szMutexName, hHandle);
-    gMutexArrSize.fetch_add(1, std::memory_order_relaxed);
+    const int32_t hHandle = gMutexArr.Publish(slot, szMutexName);
     hold.Release();
 
     TRACE_LOW("***** END : __Varnek_create_mutex mutex handle = %d, linuxMutex=[%d]\n", hHandle,
@@ -116,7 +108,6 @@ BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
                            VarnekPGL_SysGetLastErro());
     }
     gMutexArr.Withdraw(slot);
-    gMutexArrSize.fetch_sub(1, std::memory_order_relaxed);
     hold.Release();
     TRACE_LOW("***** END : VarnekPGL_DeleteMutex");
     return TRUE;
@@ -170,7 +161,7 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
         return VARNEK_FAIL(-1, "__Varnek_create_semaphore: %d (strLenTmp == 0 || strLenTmp >= %d)",
                            strLenTmp, static_cast<int>(kNameSize));
     }
-    const int32_t size = gSemArrSize.load(std::memory_order_relaxed);
+    const int32_t size = gSemArr.Count();
     if (size >= MAX_SEM_MGR_INFO_ARR_SIZE) {
         return VARNEK_FAIL(
             -1, "__Varnek_create_semaphore: gSemArrSize(%d) >= MAX_SEM_MGR_INFO_ARR_SIZE(%d)", size,
@@ -182,19 +173,19 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
     }
 
     Hold hold(gSemArrLock);
-    const int arrIdx = gSemArr.FirstFree();
-    if (arrIdx == -1) {
+    const int slot = gSemArr.FirstFree();
+    if (slot == -1) {
         return VARNEK_FAIL(-1, "***** __Varnek_create_semaphore : Can't find empty index!!!!");
     }
-    sem_t &linuxSem = gSemArr[arrIdx].linuxSem;
+    sem_t &linuxSem = gSemArr[slot].linuxSem;
     if (sem_init(&linuxSem, 0, count) != 0) {
-        return VARNEK_FAIL(-1, "__Varnek_create_semaphore: retSem != 0. errCode = [%d]",
-                           VarnekPGL_SysGetLastErro());
+        const int error = VarnekPGL_SysGetLastErro();
+        hold.Release();
+        return VARNEK_FAIL(-1, "__Varnek_create_semaphore: retSem != 0. errCode = [%d]", error);
     }
     const int word = FirstWord(linuxSem);  // before others can change it
-    const int32_t hHandle = gNextSemHandle++;
-    gSemArr.Publish(arrIdx, szSemName, hHandle);
-    const int32_t newSize = gSemArrSize.fetch_add(1, std::memory_order_relaxed) + 1;
+    const int32_t hHandle = gSemArr.Publish(slot, szSemName);
+    const int32_t newSize = gSemArr.Count();
     hold.Release();
 
     TRACE_LOW("__Varnek_create_semaphore: ret [%d]. linux Semaphore=[%d],  size = [%d]\n", hHandle,
@@ -203,9 +194,9 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
 }
 
 // The unlimited wait. An interruption ends it like any failure.
-BOOL WaitForever(int32_t hSem, int arrIdx) {
-    const int retSem = sem_wait(&gSemArr[arrIdx].linuxSem);
-    TRACE_LOW("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
+BOOL WaitForever(int32_t hSem, int slot) {
+    const int retSem = sem_wait(&gSemArr[slot].linuxSem);
+    TRACE_LOW("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]\n", hSem, slot);
     if (retSem != 0) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: retSem != 0, errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
@@ -220,11 +211,11 @@ BOOL WaitUntilDeadline(int32_t hSem, uint32_t timeout) {
     int retSem = clock_gettime(CLOCK_REALTIME, &curTime);
     if (retSem == 0) {
         semTimeOut = DeadlineAfter(curTime, timeout);
-        const int arrIdx = gSemArr.FindByHandle(hSem);
-        if (arrIdx == -1) {
+        const int slot = gSemArr.FindByHandle(hSem);
+        if (slot == -1) {
             return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: arrIdx == -1, %d", hSem);
         }
-        retSem = sem_timedwait(&gSemArr[arrIdx].linuxSem, &semTimeOut);
+        retSem = sem_timedwait(&gSemArr[slot].linuxSem, &semTimeOut);
     }
     if (retSem == 0) {
         return TRUE;
@@ -254,38 +245,38 @@ int32_t VarnekPGL_CreateSemaphore(const char *szSemName, uint32_t count) {
 
 BOOL VarnekPGL_DeleteSemaphore(int32_t hSem) {
     Hold hold(gSemArrLock);
-    const int arrIdx = gSemArr.FindByHandle(hSem);
-    if (arrIdx == -1) {
+    const int slot = gSemArr.FindByHandle(hSem);
+    if (slot == -1) {
+        hold.Release();
         return VARNEK_FAIL(FALSE, "Varnek_delete_semaphore: arrIdx == -1, %d", hSem);
     }
-    gSemArr.Withdraw(arrIdx);
-    if (sem_destroy(&gSemArr[arrIdx].linuxSem) != 0) {
+    const int32_t size = gSemArr.Withdraw(slot);
+    if (sem_destroy(&gSemArr[slot].linuxSem) != 0) {
         TRACE_ERROR("Varnek_delete_semaphore: retSem != 0, errCode = [%d]",
                     VarnekPGL_SysGetLastErro());
     }
-    const int32_t size = gSemArrSize.fetch_sub(1, std::memory_order_relaxed) - 1;
     hold.Release();
     TRACE_LOW("Varnek_delete_semaphore: OK %d", size);
     return TRUE;
 }
 
 BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout) {
-    const int arrIdx = gSemArr.FindByHandle(hSem);
-    TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]", hSem, arrIdx);
-    if (arrIdx == -1) {
+    const int slot = gSemArr.FindByHandle(hSem);
+    TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]", hSem, slot);
+    if (slot == -1) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: arrIdx == -1, %d", hSem);
     }
-    return timeout == WAIT_FOREVER ? WaitForever(hSem, arrIdx) : WaitUntilDeadline(hSem, timeout);
+    return timeout == WAIT_FOREVER ? WaitForever(hSem, slot) : WaitUntilDeadline(hSem, timeout);
 }
 
 BOOL VarnekPGL_SignalSemaphore(int32_t hSem) {
-    const int arrIdx = gSemArr.FindByHandle(hSem);
-    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
-    if (arrIdx == -1) {
+    const int slot = gSemArr.FindByHandle(hSem);
+    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, slot);
+    if (slot == -1) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_SignalSemaphore: arrIdx == -1, %d", hSem);
     }
-    const int retSem = sem_post(&gSemArr[arrIdx].linuxSem);
-    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, arrIdx);
+    const int retSem = sem_post(&gSemArr[slot].linuxSem);
+    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, slot);
     if (retSem != 0) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_SignalSemaphore: retSem != 0, errCode = [%d]",
                            VarnekPGL_SysGetLastErro());

@@ -6,7 +6,8 @@
 // after the name's words, and since no handle ever comes back, the same handle twice means that the
 // words in between were its own: a sequence lock whose number cannot repeat.
 //
-// Who changes the table holds the family's guard. The table is zero when the library is loaded.
+// A thread that changes the table holds the family's guard. The table is zero when the library is
+// loaded.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 
@@ -23,8 +24,8 @@ class SlotTable {
   public:
     Info &operator[](int slot) { return slots_[slot].info; }
 
-    // The slot of a live handle, -1 for none. One look for every slot; a scan for an unknown
-    // handle, and where another one has the place among the hints.
+    // The slot of a live handle, -1 for none. One look when the hint is right, a scan when it is
+    // not: for an unknown handle, and when another handle has the same place among the hints.
     int FindByHandle(int32_t handle) const {
         if (handle <= kFree) {
             return -1;
@@ -56,9 +57,13 @@ class SlotTable {
     // The handle that the slot belongs to, 0 for none.
     int32_t HandleOf(int slot) const { return slots_[slot].handle.load(std::memory_order_acquire); }
 
-    // The lowest slot without a handle, -1 for none.
-    int FirstFree() const {
-        for (int slot = 0; slot < capacity; slot++) {
+    // The slots in use. Exact for the holder of the guard, a moment old for any other thread.
+    int32_t Count() const { return count_.load(std::memory_order_relaxed); }
+
+    // The lowest slot from `first` on that a new object may take. -1 for none, and for good once
+    // every handle has been given out.
+    int FirstFree(int first = 0) const {
+        for (int slot = first; slot < capacity && given_ < INT32_MAX; slot++) {
             if (HandleOf(slot) == kFree) {
                 return slot;
             }
@@ -66,18 +71,25 @@ class SlotTable {
         return -1;
     }
 
-    // Makes the slot visible under a name of at most 31 characters and a handle above 0. The slot's
-    // Info is complete by now.
-    void Publish(int slot, const char *name, int32_t handle) {
+    // The handle that the next publication gives out.
+    int32_t NextHandle() const { return given_ + 1; }
+
+    // Makes a free slot visible under a name of at most 31 characters. The slot's Info is complete
+    // by now. Returns its handle.
+    int32_t Publish(int slot, const char *name) {
+        const int32_t handle = ++given_;
         StoreName(slot, PackedName(name));
         HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
         slots_[slot].handle.store(handle, std::memory_order_release);
+        count_.fetch_add(1, std::memory_order_relaxed);
+        return handle;
     }
 
-    // Makes the slot invisible; its Info may be taken apart now.
-    void Withdraw(int slot) {
+    // Makes the slot invisible; its Info may be taken apart now. Returns how many are left in use.
+    int32_t Withdraw(int slot) {
         slots_[slot].handle.store(kFree, std::memory_order_relaxed);
         StoreName(slot, PackedName(""));
+        return count_.fetch_sub(1, std::memory_order_relaxed) - 1;
     }
 
   private:
@@ -98,14 +110,14 @@ class SlotTable {
         Info info;
     };
 
-    // Kept out of line and out of the way of those who find their handle at once.
+    // Kept out of line, so that it does not weigh on the lookups that find their handle at once.
     __attribute__((noinline, cold)) int ScanForHandle(int32_t handle, int hint) const {
         for (int slot = 0; slot < capacity; slot++) {
             if (!IsLive(slot, handle)) {
                 continue;
             }
-            // A hint left by a handle that is gone is mended; two live ones leave it to one of
-            // them.
+            // Two live handles may share a hint, which then belongs to one of them. A hint that
+            // points to no live handle of the two has been left behind, and is corrected.
             const int32_t hinted = HandleOf(hint);
             if (hinted == kFree || &HintOf(hinted) != &HintOf(handle)) {
                 HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
@@ -115,8 +127,8 @@ class SlotTable {
         return -1;
     }
 
-    // Acquire and release on the words order them before the second look at the handle: whoever
-    // reads a word of a later owner then finds that the earlier handle is gone.
+    // Acquire and release on the words order them before the second look at the handle: a lookup
+    // that reads a word of a later owner then finds that the earlier handle is gone.
     bool HasName(int slot, const PackedName &wanted) const {
         for (size_t i = 0; i < kNameWords; i++) {
             if (names_[slot][i].load(std::memory_order_acquire) != wanted.words[i]) {
@@ -138,7 +150,10 @@ class SlotTable {
 
     Slot slots_[kSlots];
     std::atomic<uint32_t> names_[kSlots][kNameWords];
+    // hints_[handle % kHints] is the slot at which to look first; the handle found there decides.
     mutable std::atomic<uint8_t> hints_[kHints];
+    std::atomic<int32_t> count_;
+    int32_t given_;  // handles given out so far, 1 to this one; used under the guard only
 };
 
 #endif

@@ -1,10 +1,15 @@
 // The thread registry and the message queues.
 //
 // The registry's guard is held while a record is made or removed. A queue's list has a lock of its
-// own. What keeps a record's queue and semaphore alive while a sender or a receiver is inside is
-// the record's count of users: a removal makes the record invisible at once, and whoever is the
-// last one out takes it apart. So no lock is ever held across a wait, and none while another is
+// own. A sender or a receiver that works with a record counts as one of its users, which keeps the
+// record's queue and semaphore alive: a removal makes the record invisible at once, and the last
+// user to leave takes it apart. So no lock is ever held across a wait, and none while another is
 // taken.
+//
+// A thread starts in ThreadEntry, which waits for its creator to release the guard. So the record
+// of a thread is visible before any of the caller's code runs in it. The entry leaves the handle
+// under a thread-specific key, which is how a thread knows itself: the system gives the ids of
+// ended threads to new ones, but what a key holds goes with its thread.
 #include "Varnek_Thread.h"
 
 #include <pthread.h>
@@ -25,49 +30,66 @@ static_assert(sizeof(THREAD_MSG) == 40, "every module of the stack counts on thi
 namespace {
 
 constexpr int MAX_THREAD_MGR_INFO_ARR_SIZE = 20;
+constexpr size_t kSystemNameSize = 16;  // of a thread's name in the system, with the terminator
 
 struct THREAD_MGR_INFO {
-    std::atomic<bool> bUsed;             // from its creation until it is taken apart
-    std::atomic<pthread_t> linuxThread;  // as the handle: complete before that is published
-    std::atomic<uint32_t> users;         // who is inside, and kRemoved
-    sem_t msgQSem;                       // counts the queue's messages
+    std::atomic<uint32_t> users;  // threads inside the record, and kRemoved
+    sem_t msgQSem;                // counts the queue's messages
     Lock queueLock;
     list_t MsgQ VARNEK_GUARDED_BY(queueLock);
-    const char *removedBy;  // the operation that removed the record, and the level at which it
-    uint32_t unreadMask;    // reports unread messages: for the last one out
+    pthread_t linuxThread;  // for a debugger
+    // For the last user of a removed record: the operation that removed it, and the level and
+    // module at which that operation reports unread messages.
+    const char *removedBy;
+    uint32_t unreadMask;
 };
 
+// What a new thread begins with. Made by its creator and freed by its entry, so that the record may
+// be removed meanwhile.
+struct Start {
+    int32_t hHandle;
+    void *(*function)(void *);
+    void *argument;
+    char systemName[kSystemNameSize];
+};
+
+// In `users` from a record's removal until it has been taken apart.
 constexpr uint32_t kRemoved = 0x80000000u;
 constexpr int kLeaveTries = 1000;  // of a millisecond
 
 SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE> gThreadInfoArr;
-std::atomic<int32_t> gThreadInfoArrSize{0};
-int32_t gNextThreadHandle = 1;  // guarded by the registry's guard
-
-// Set while a thread exists, or is about to, whose record is not visible yet. Written by the holder
-// of the guard. Who reads it clear sees the record of every thread that was running by then.
-std::atomic<bool> gThreadStarting{false};
 
 // The handle of the guard "VarnekThreadMutex"; kNoGuard until the first creation makes it.
-constexpr int32_t kNoGuard = -1;
+constexpr int32_t kNoGuard = HoldMutex::kNoMutex;
 constexpr int32_t kGuardInTheMaking = -2;
 std::atomic<int32_t> gThreadMutex{kNoGuard};
+std::atomic<pthread_t> gGuardMaker{};  // the thread that makes it, while it does
+
+// The key under which a registered thread finds its handle, plus one; 0 until the guard is made.
+std::atomic<uint32_t> gSelfKey{0};
 
 int32_t Guard() {
     const int32_t guard = gThreadMutex.load(std::memory_order_acquire);
     return guard != kGuardInTheMaking ? guard : kNoGuard;
 }
 
-// Ends a removal that found no record. A guard that does not exist yet is released all the same, so
-// that both of its lines are in the log; one that the system refused is not ours to release.
-void ReleaseGuard(int32_t guard, bool held) {
-    if (held || guard == kNoGuard) {
-        VarnekPGL_ReleaseMutex(guard);
+// Makes the key, unless an earlier call has made it.
+bool MakeSelfKey() {
+    if (gSelfKey.load(std::memory_order_relaxed) != 0) {
+        return true;
     }
+    pthread_key_t key = 0;
+    if (pthread_key_create(&key, nullptr) != 0) {
+        return false;
+    }
+    gSelfKey.store(static_cast<uint32_t>(key) + 1, std::memory_order_relaxed);
+    return true;
 }
 
-// Makes the guard on first use. Of several threads one makes it and the others wait that moment,
-// since a second mutex of its name would destroy the first.
+// Makes the guard and the key on first use. One thread makes them and others wait that moment,
+// since a second mutex of the guard's name would destroy the first. False when they cannot be made,
+// and for a log function that creates a thread while this thread's own call writes the line of the
+// guard's creation: that call would wait for itself.
 bool EnsureGuard() {
     for (;;) {
         int32_t guard = gThreadMutex.load(std::memory_order_acquire);
@@ -75,42 +97,23 @@ bool EnsureGuard() {
             return true;
         }
         if (guard == kNoGuard && gThreadMutex.compare_exchange_strong(guard, kGuardInTheMaking)) {
-            guard = VarnekPGL_CreateMutex("VarnekThreadMutex");
+            gGuardMaker.store(pthread_self(), std::memory_order_relaxed);
+            guard = MakeSelfKey() ? VarnekPGL_CreateMutex("VarnekThreadMutex") : kNoGuard;
+            gGuardMaker.store(pthread_t{}, std::memory_order_relaxed);
             gThreadMutex.store(guard, std::memory_order_release);
             return guard != kNoGuard;
+        }
+        if (pthread_equal(gGuardMaker.load(std::memory_order_relaxed), pthread_self())) {
+            return false;
         }
         sched_yield();
     }
 }
 
-// Holds the guard, but only while a thread is starting: a lookup finds the record of every thread
-// that was running when it began, the calling one included.
-class StartedThreads {
-  public:
-    StartedThreads()
-        : held_(gThreadStarting.load(std::memory_order_acquire) &&
-                VarnekPGL_AcquireMutex(Guard()) != FALSE) {}
-    ~StartedThreads() {
-        if (held_) {
-            VarnekPGL_ReleaseMutex(Guard());
-        }
-    }
-    StartedThreads(const StartedThreads &) = delete;
-    StartedThreads &operator=(const StartedThreads &) = delete;
-
-  private:
-    const bool held_;
-};
-
-int32_t HandleOfName(const char *szThreadName) {
-    const StartedThreads started;
-    return gThreadInfoArr.FindByName(szThreadName);
-}
-
 // Users of a record ------------------------------------------------------------------------------
 
-// Takes a removed record apart. Runs in the last thread that had to do with it, which is why the
-// queue needs no lock here.
+// Takes a removed record apart. Runs in the record's last user, which is why the queue needs no
+// lock here.
 void Dispose(int slot) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
     THREAD_MGR_INFO &info = gThreadInfoArr[slot];
     if (sem_destroy(&info.msgQSem) != 0) {
@@ -124,8 +127,7 @@ void Dispose(int slot) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
             free(message);
         }
     }
-    info.users.fetch_and(~kRemoved, std::memory_order_relaxed);
-    info.bUsed.store(false, std::memory_order_release);
+    info.users.fetch_and(~kRemoved, std::memory_order_release);
 }
 
 void Leave(int slot) {
@@ -179,11 +181,26 @@ class RecordUse {
     int slot_;
 };
 
-// Removes the record at `slot` for `operation`; the guard is held. Returns the new count.
-int32_t Remove(int slot, const char *operation, uint32_t unreadMask) {
+// Threads ----------------------------------------------------------------------------------------
+
+// Removes the record of a handle for `operation`, which reports unread messages with `unreadMask`.
+// FALSE, after its line, when there is none.
+BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
+    const int32_t guard = Guard();
+    if (guard == kNoGuard) {
+        VarnekPGL_AcquireMutex(guard);  // reports that there is no guard, as the release below does
+    }
+    HoldMutex hold(guard);
+    const int slot = hold.IsHeld() ? gThreadInfoArr.FindByHandle(hThread) : -1;
+    if (slot == -1) {
+        TRACE_ERROR("***** %s : Can't find thread info. thread handle = [%d]", operation, hThread);
+        if (guard == kNoGuard) {
+            VarnekPGL_ReleaseMutex(guard);
+        }
+        return FALSE;
+    }
     THREAD_MGR_INFO &info = gThreadInfoArr[slot];
-    gThreadInfoArr.Withdraw(slot);
-    const int32_t count = gThreadInfoArrSize.fetch_sub(1, std::memory_order_relaxed) - 1;
+    const int32_t count = gThreadInfoArr.Withdraw(slot);
     info.removedBy = operation;
     info.unreadMask = unreadMask;
     // The owner may be waiting for a message: this wakes it, and it finds its record gone. Without
@@ -192,29 +209,31 @@ int32_t Remove(int slot, const char *operation, uint32_t unreadMask) {
     if (info.users.fetch_or(kRemoved, std::memory_order_acq_rel) == 0) {
         Dispose(slot);
     }
-    return count;
+    hold.Release();
+    TRACE_LOW("***** END : %s, %d", operation, count);
+    return TRUE;
 }
-
-// Threads ----------------------------------------------------------------------------------------
 
 void __Varnek_delete_thread_info(int32_t hThread) {
-    TRACE_LOW("***** START : %s. thread handle=[%d]", __func__, hThread);
-    const int32_t guard = Guard();
-    const bool held = VarnekPGL_AcquireMutex(guard) != FALSE;
-    const int slot = held ? gThreadInfoArr.FindByHandle(hThread) : -1;
-    if (slot == -1) {
-        TRACE_ERROR("***** %s : Can't find thread info. thread handle = [%d]", __func__, hThread);
-        ReleaseGuard(guard, held);
-        return;
-    }
-    const int32_t count = Remove(slot, __func__, VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON);
-    VarnekPGL_ReleaseMutex(guard);
-    TRACE_LOW("***** END : %s, %d", __func__, count);
+    TRACE_LOW("***** START : __Varnek_delete_thread_info. thread handle=[%d]", hThread);
+    RemoveRecord(hThread, __func__, VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON);
 }
 
-// Starts the OS thread of a prepared record. Returns pthread_create's result.
-int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize,
-                void *(*function)(void *), void *argument) {
+// Where every thread of the registry starts: once its creator has made its record visible.
+void *ThreadEntry(void *begin) {
+    { const HoldMutex created(Guard()); }
+    const Start start = *static_cast<Start *>(begin);
+    free(begin);
+    const pthread_key_t key =
+        static_cast<pthread_key_t>(gSelfKey.load(std::memory_order_relaxed) - 1);
+    pthread_setspecific(key, reinterpret_cast<void *>(intptr_t{start.hHandle}));
+    pthread_setname_np(pthread_self(), start.systemName);
+    return start.function(start.argument);
+}
+
+// Starts a detached OS thread. Returns pthread_create's result; `start` is the thread's when it is
+// 0.
+int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize, Start *start) {
     pthread_attr_t attributes;
     const int result = pthread_attr_init(&attributes);
     if (result != 0) {
@@ -228,23 +247,13 @@ int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize,
     pthread_attr_setdetachstate(&attributes, PTHREAD_CREATE_DETACHED);
     pthread_attr_setschedparam(&attributes, &parameter);
     pthread_attr_setschedpolicy(&attributes, SCHED_OTHER);
-    const int created = pthread_create(linuxThread, &attributes, function, argument);
+    const int created = pthread_create(linuxThread, &attributes, ThreadEntry, start);
     pthread_attr_destroy(&attributes);
     return created;
 }
 
-int FirstUnused() {
-    for (int slot = 0; slot < MAX_THREAD_MGR_INFO_ARR_SIZE; slot++) {
-        if (!gThreadInfoArr[slot].bUsed.load(std::memory_order_acquire)) {
-            return slot;
-        }
-    }
-    return -1;
-}
-
 // Fills the record at `slot` and starts its thread; the guard is held. The record becomes visible
-// once the thread exists: a handle that is given back was never seen, and a new thread that looks
-// for itself earlier waits for the guard.
+// once the thread exists, so a handle that is given back was never seen.
 int32_t StartRecord(int slot, const char *szThreadName, int32_t priority, uint32_t stackSize,
                     void *(*function)(void *), void *argument) {
     THREAD_MGR_INFO &info = gThreadInfoArr[slot];
@@ -254,23 +263,46 @@ int32_t StartRecord(int slot, const char *szThreadName, int32_t priority, uint32
                            VarnekPGL_SysGetLastErro());
     }
     list_initialize(&info.MsgQ);
-    gThreadStarting.store(true, std::memory_order_release);
-    pthread_t linuxThread = {};
-    const int result = StartThread(&linuxThread, priority, stackSize, function, argument);
+    Start *start = static_cast<Start *>(malloc(sizeof(Start)));
+    int result = ENOMEM;
+    if (start != nullptr) {
+        *start = {gThreadInfoArr.NextHandle(), function, argument, ""};
+        memcpy(start->systemName, szThreadName, strnlen(szThreadName, kSystemNameSize - 1));
+        result = StartThread(&info.linuxThread, priority, stackSize, start);
+    }
     if (result != 0) {
-        gThreadStarting.store(false, std::memory_order_release);
         TRACE_ERROR("***** __Varnek_create_thread : pthread creation FAIL!! errCode = [%d]",
                     result);
+        free(start);
         sem_destroy(&info.msgQSem);
         return -1;
     }
-    const int32_t hHandle = gNextThreadHandle++;
-    info.bUsed.store(true, std::memory_order_relaxed);
-    info.linuxThread.store(linuxThread, std::memory_order_release);
-    gThreadInfoArrSize.fetch_add(1, std::memory_order_relaxed);
-    gThreadInfoArr.Publish(slot, szThreadName, hHandle);
-    gThreadStarting.store(false, std::memory_order_release);
-    return hHandle;
+    return gThreadInfoArr.Publish(slot, szThreadName);
+}
+
+// The lowest slot whose record is neither in use nor waiting for its last user; the guard is held.
+int FirstFreeRecord() {
+    int slot = gThreadInfoArr.FirstFree();
+    while (slot != -1 &&
+           (gThreadInfoArr[slot].users.load(std::memory_order_acquire) & kRemoved) != 0) {
+        slot = gThreadInfoArr.FirstFree(slot + 1);
+    }
+    return slot;
+}
+
+// Claims a slot, under the guard, which it may release and take again: a removed record is free
+// once its last user has left, and that takes a moment. -1 for none; the guard may then be lost.
+int ClaimRecord(HoldMutex *guard) {
+    int slot = FirstFreeRecord();
+    for (int i = 0; i < kLeaveTries && slot == -1 &&
+                    gThreadInfoArr.Count() < MAX_THREAD_MGR_INFO_ARR_SIZE && guard->IsHeld();
+         i++) {
+        guard->Release();
+        VarnekPGL_MSleep(1);
+        guard->Acquire();
+        slot = guard->IsHeld() ? FirstFreeRecord() : -1;
+    }
+    return slot;
 }
 
 int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint32_t stackSize,
@@ -294,45 +326,27 @@ int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint3
             -1, "***** __Varnek_create_thread : Invalid argument. priority=[%d], pFunc=[%x]",
             priority, static_cast<unsigned>(reinterpret_cast<uintptr_t>(function)));
     }
-    const int32_t count = gThreadInfoArrSize.load(std::memory_order_relaxed);
+    const int32_t count = gThreadInfoArr.Count();
     if (count >= MAX_THREAD_MGR_INFO_ARR_SIZE) {
         return VARNEK_FAIL(
             -1, "***** __Varnek_create_thread : Thread pool is full. gThreadInfoArrSize = [%d]",
             count);
     }
-    if (HandleOfName(szThreadName) != kInvalidHandle) {
+    if (gThreadInfoArr.FindByName(szThreadName) != kInvalidHandle) {
         return VARNEK_FAIL(-1,
                            "***** __Varnek_create_thread : Duplicated thread. thread name = [%s]",
                            szThreadName);
     }
 
-    const int32_t guard = Guard();
-    if (VarnekPGL_AcquireMutex(guard) == FALSE) {
-        return -1;
-    }
-    int slot = FirstUnused();
-    // A removed record is free once its last visitor has left, which takes a moment.
-    for (int i = 0;
-         i < kLeaveTries && slot == -1 &&
-         gThreadInfoArrSize.load(std::memory_order_relaxed) < MAX_THREAD_MGR_INFO_ARR_SIZE;
-         i++) {
-        VarnekPGL_ReleaseMutex(guard);
-        VarnekPGL_MSleep(1);
-        if (VarnekPGL_AcquireMutex(guard) == FALSE) {
-            return -1;
-        }
-        slot = FirstUnused();
-    }
+    HoldMutex guard(Guard());
+    const int slot = guard.IsHeld() ? ClaimRecord(&guard) : -1;
     if (slot == -1) {
-        TRACE_ERROR("***** __Varnek_create_thread : Can't find empty index!!!!");
-        VarnekPGL_ReleaseMutex(guard);
-        return -1;
+        return VARNEK_FAIL(-1, "***** __Varnek_create_thread : Can't find empty index!!!!");
     }
     const int32_t hHandle =
         StartRecord(slot, szThreadName, priority, stackSize, function, argument);
-    const int linuxThread =
-        static_cast<int>(gThreadInfoArr[slot].linuxThread.load(std::memory_order_relaxed));
-    VarnekPGL_ReleaseMutex(guard);
+    const int linuxThread = static_cast<int>(gThreadInfoArr[slot].linuxThread);
+    guard.Release();
     if (hHandle == -1) {
         return VARNEK_FAIL(-1, "***** END : __Varnek_create_thread, thread creation failed");
     }
@@ -341,21 +355,16 @@ int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint3
     return hHandle;
 }
 
-// The handle of the newest record with this thread id, since the system reuses the ids of threads
-// that ended; -1 for none. The handle is read before and after, as in a lookup by name.
-int32_t HandleOfThread(pthread_t linuxThread) {
-    const StartedThreads started;
-    int32_t newest = kInvalidHandle;
-    for (int slot = 0; slot < MAX_THREAD_MGR_INFO_ARR_SIZE; slot++) {
-        const int32_t hHandle = gThreadInfoArr.HandleOf(slot);
-        if (hHandle > 0 && hHandle > newest &&
-            pthread_equal(gThreadInfoArr[slot].linuxThread.load(std::memory_order_acquire),
-                          linuxThread) &&
-            gThreadInfoArr.IsLive(slot, hHandle)) {
-            newest = hHandle;
-        }
+// The calling thread's handle, kInvalidHandle when the registry has not started it or its record
+// has been removed. In a thread that the registry has not started nothing is under the key.
+int32_t HandleOfSelf() {
+    const uint32_t key = gSelfKey.load(std::memory_order_relaxed);
+    if (key == 0) {
+        return kInvalidHandle;
     }
-    return newest;
+    const void *self = pthread_getspecific(static_cast<pthread_key_t>(key - 1));
+    const int32_t hThread = static_cast<int32_t>(reinterpret_cast<intptr_t>(self));
+    return gThreadInfoArr.FindByHandle(hThread) != -1 ? hThread : kInvalidHandle;
 }
 
 }  // namespace
@@ -363,7 +372,7 @@ int32_t HandleOfThread(pthread_t linuxThread) {
 int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t priority, uint32_t stackSize,
                                void *(*function)(void *), void *argument) {
     TRACE_LOW("***** START : __Varnek_get_thread_by_name, szThreadName=[%s]", Shown(szThreadName));
-    const int32_t hOld = HandleOfName(szThreadName);
+    const int32_t hOld = gThreadInfoArr.FindByName(szThreadName);
     if (hOld != kInvalidHandle) {
         TRACE_LOW("***** END : __Varnek_get_thread_by_name. thread handle = [%d]\n", hOld);
         TRACE_ERROR("szThreadName=[%s]. Duplicated Thread. Old one will be destroyed!\n",
@@ -382,24 +391,12 @@ int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t priority, uint3
 
 BOOL VarnekPGL_DeleteThread(int32_t hThread) {
     TRACE_HIGH("***** START : VarnekPGL_DeleteThread. thread handle=[%d]", hThread);
-    const int32_t guard = Guard();
-    const bool held = VarnekPGL_AcquireMutex(guard) != FALSE;
-    const int slot = held ? gThreadInfoArr.FindByHandle(hThread) : -1;
-    if (slot == -1) {
-        TRACE_ERROR("***** VarnekPGL_DeleteThread : Can't find thread info. thread handle = [%d]",
-                    hThread);
-        ReleaseGuard(guard, held);
-        return FALSE;
-    }
-    const int32_t count = Remove(slot, __func__, VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON);
-    VarnekPGL_ReleaseMutex(guard);
-    TRACE_LOW("***** END : VarnekPGL_DeleteThread, %d", count);
-    return TRUE;
+    return RemoveRecord(hThread, __func__, VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON);
 }
 
 int32_t VarnekPGL_GetThreadByName(const char *szThreadName) {
     TRACE_LOW("***** START : VarnekPGL_GetThreadByName, szThreadName=[%s]", Shown(szThreadName));
-    const int32_t hThread = HandleOfName(szThreadName);
+    const int32_t hThread = gThreadInfoArr.FindByName(szThreadName);
     if (hThread != kInvalidHandle) {
         TRACE_LOW("***** END : VarnekPGL_GetThreadByName. thread handle = [%d]", hThread);
     }
@@ -410,7 +407,7 @@ int32_t VarnekPGL_GetCurrentThread() {
     const pthread_t self = pthread_self();
     TRACE_LOW_QUICK("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]",
                     static_cast<int>(self));
-    const int32_t hThread = HandleOfThread(self);
+    const int32_t hThread = HandleOfSelf();
     if (hThread == kInvalidHandle) {
         return VARNEK_FAIL(
             -1, "***** VarnekPGL_GetCurrentThread : Can't find thread Info. pthreadID = [%d]",
@@ -425,13 +422,13 @@ int32_t VarnekPGL_GetCurrentThread() {
 namespace {
 
 // Copies a message into a block of its own and puts it into the queue. False when memory is short;
-// nothing is left behind then.
-bool Enqueue(THREAD_MGR_INFO &info, const THREAD_MSG &message, void (*insert)(list_t *, void *)) {
-    void *block = malloc(sizeof message);
+// nothing is left behind then. Messages are copied as bytes: a caller's record may lie anywhere.
+bool Enqueue(THREAD_MGR_INFO &info, const void *message, void (*insert)(list_t *, void *)) {
+    void *block = malloc(sizeof(THREAD_MSG));
     if (block == nullptr) {
         return false;
     }
-    memcpy(block, &message, sizeof message);
+    memcpy(block, message, sizeof(THREAD_MSG));
     Hold hold(info.queueLock);
     const int32_t before = info.MsgQ.count;
     insert(&info.MsgQ, block);
@@ -444,7 +441,7 @@ bool Enqueue(THREAD_MGR_INFO &info, const THREAD_MSG &message, void (*insert)(li
 }
 
 // Moves the first message out of the queue. False when there is none.
-bool Dequeue(THREAD_MGR_INFO &info, THREAD_MSG *message, int32_t *count) {
+bool Dequeue(THREAD_MGR_INFO &info, void *message, int32_t *count) {
     Hold hold(info.queueLock);
     void *block = list_removeHead(&info.MsgQ);
     const int32_t left = info.MsgQ.count;
@@ -452,7 +449,7 @@ bool Dequeue(THREAD_MGR_INFO &info, THREAD_MSG *message, int32_t *count) {
     if (block == nullptr) {
         return false;
     }
-    memcpy(message, block, sizeof *message);
+    memcpy(message, block, sizeof(THREAD_MSG));
     free(block);
     *count = left;
     return true;
@@ -484,7 +481,7 @@ BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message) {
             FALSE, "***** VarnekPGL_SendMessage. Can't find thread info. thread = [%d]", hThread);
     }
     TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: ThreadMgr arrIdx = %d", use.Slot());
-    if (!Enqueue(use.Info(), *message, list_insert)) {
+    if (!Enqueue(use.Info(), message, list_insert)) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendMessage: memalloc failed");
     }
     sem_t *msgQSem = &use.Info().msgQSem;
@@ -513,7 +510,7 @@ BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message) {
             FALSE, "***** VarnekPGL_SendUrgentMessage. Can't find thread info. thread = [%d]",
             hThread);
     }
-    if (!Enqueue(use.Info(), *message, list_insertHead)) {
+    if (!Enqueue(use.Info(), message, list_insertHead)) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendUrgentMessage: memalloc failed");
     }
     if (sem_post(&use.Info().msgQSem) != 0) {
