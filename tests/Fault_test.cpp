@@ -1,5 +1,6 @@
 // Failing calls of the C library: result, line, and that everything is as before.
 #include <algorithm>
+#include <atomic>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
@@ -248,6 +249,22 @@ TEST_F(Fault, Timers) {
                    TRUE,
                    {"VarnekPGL_DeleteTimer. Delete Timer is FAIL. errCode = [-1]!"}}});
     EXPECT_EQ(VarnekPGL_CreateTimer("timer"), 0);
+}
+
+TEST_F(Fault, AStartWhoseDeliveryIsDroppedIsPaidByTheNext) {
+    const TimerCallbackFunc count = [](uint32_t, void *calls) { ++*static_cast<std::atomic<int> *>(calls); };
+    ASSERT_EQ(VarnekPGL_CreateTimer("timer"), 0);
+    for (const bool cancelled : {false, true}) {
+        std::atomic<int> first{0}, second{0};
+        const auto startSecond = [&] { return VarnekPGL_StartTimer(0, cancelled ? 60000 : 1, count, &second); };
+        DropDelivery();
+        ASSERT_TRUE(VarnekPGL_StartTimer(0, 1, count, &first));
+        ASSERT_TRUE(Eventually(IsDeliveryDropped));
+        ExpectFaults({{"malloc", ENOMEM, startSecond, FALSE, {"VarnekPGL_StartTimer. memalloc failed"}}});
+        EXPECT_TRUE(startSecond());
+        EXPECT_TRUE(!cancelled || VarnekPGL_CancelTimer(0));
+        EXPECT_TRUE(Eventually([&] { return first == 1 && second == (cancelled ? 0 : 1); }));
+    }
 }
 
 TEST_F(Fault, ABitStreamWithoutMemoryIsAtItsEnd) {

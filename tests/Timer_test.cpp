@@ -125,28 +125,51 @@ TEST_F(Timer, ACancelledStartNeverCallsBack) {
     EXPECT_THAT(TakeErrors(), IsEmpty());
 }
 
-TEST_F(Timer, ALateDeliveryMakesNoSecondCall) {
-    // Holds the first delivery until a later start has expired too.
-    static std::atomic<int> deliveries{0};
-    static std::atomic<bool> held{true};
-    gLogHook = [](const LogLine &line) {
-        if (line.text.find("Timer Callback: Timer") != std::string::npos && deliveries++ == 0) {
-            Eventually([] { return !held; });
-        }
-    };
+TEST_F(Timer, EachStartCallsBackOnceHoweverLateItsDelivery) {
     VarnekPGL_CreateTimer("timer");
-    Expiries first;
-    Expiries second;
-    EXPECT_TRUE(VarnekPGL_StartTimer(0, 1, CountExpiry, &first));
-    EXPECT_TRUE(Eventually([] { return deliveries == 1; }));
-    EXPECT_TRUE(VarnekPGL_CancelTimer(0));
-    EXPECT_TRUE(VarnekPGL_StartTimer(0, 1, CountExpiry, &second));
-    EXPECT_TRUE(Eventually([&] { return second.count == 1; }));
-    held = false;
-    std::this_thread::sleep_for(std::chrono::milliseconds(100));
-    EXPECT_EQ(first.count, 0);
-    EXPECT_EQ(second.count, 1);
-    gLogHook = nullptr;
+    const struct {
+        uint32_t secondTimeout;
+        bool cancelled;
+    } rows[] = {{1, false}, {60000, true}};
+    for (const auto &row : rows) {
+        // Holds the first delivery until the second start has been made.
+        static std::atomic<int> deliveries;
+        static std::atomic<bool> held;
+        deliveries = 0;
+        held = true;
+        gLogHook = [](const LogLine &line) {
+            if (line.text.find("Timer Callback: Timer") != std::string::npos && deliveries++ == 0) {
+                Eventually([] { return !held; });
+            }
+        };
+        Expiries first;
+        Expiries second;
+        EXPECT_TRUE(VarnekPGL_StartTimer(0, 1, CountExpiry, &first));
+        EXPECT_TRUE(Eventually([] { return deliveries == 1; }));
+        EXPECT_TRUE(VarnekPGL_StartTimer(0, row.secondTimeout, CountExpiry, &second));
+        if (row.cancelled) {
+            EXPECT_TRUE(VarnekPGL_CancelTimer(0));
+            EXPECT_FALSE(VarnekPGL_IsTimerActive(0));
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        held = false;
+        EXPECT_TRUE(Eventually([&] { return first.count == 1 && second.count == (row.cancelled ? 0 : 1); }));
+        std::this_thread::sleep_for(std::chrono::milliseconds(100));
+        EXPECT_EQ(first.count + second.count, row.cancelled ? 1 : 2);
+        gLogHook = nullptr;
+    }
+}
+
+TEST_F(Timer, AnOwnerThatPollsGetsACallForEachStart) {
+    VarnekPGL_CreateTimer("timer");
+    std::vector<Expiries> starts(1000);
+    for (Expiries &start : starts) {
+        ASSERT_TRUE(VarnekPGL_StartTimer(0, 1, CountExpiry, &start));
+        ASSERT_TRUE(Eventually([] { return !VarnekPGL_IsTimerActive(0); }));
+    }
+    for (const Expiries &start : starts) {
+        EXPECT_TRUE(Eventually([&] { return start.count == 1; }));
+    }
 }
 
 TEST_F(Timer, ACallbackMayUseItsOwnTimer) {

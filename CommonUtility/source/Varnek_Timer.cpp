@@ -1,9 +1,15 @@
 // The timer service: one POSIX timer a slot, made at the first start and kept until the deletion.
 // Every access to the table, the OS calls for a slot included, is under one lock, which is never
 // held while a callback runs.
+//
+// The system may deliver an expiry late, and drops it when the timer is armed again before that. So
+// a delivery says no more than that something may be due. A start that finds an expired one which
+// has not called back yet puts that one among the owed, and each delivery pays everything that is
+// due: the owed starts and, once its time is up, the last one.
 #include "Varnek_Timer.h"
 
 #include <signal.h>
+#include <stdlib.h>
 #include <time.h>
 
 #include "Varnek_Lock.h"
@@ -15,14 +21,22 @@ namespace {
 constexpr int MAX_TIMER_MGR_INFO_ARR_SIZE = 32;
 constexpr size_t kTimerNameSize = 41;  // with the terminator
 
+// An earlier start that has expired and not called back yet.
+struct OwedStart {
+    TimerCallbackFunc pfnCallback;
+    void *pUserData;
+    OwedStart *next;
+};
+
 struct TIMER_MGR_INFO {
     bool bUsed;
     timer_t timerId;  // while bTimerCreated
     char szTmName[kTimerNameSize];
-    TimerCallbackFunc pfnCallback;  // null until the first start
+    TimerCallbackFunc pfnCallback;  // of the last start; null until the first
     void *pUserData;
     bool bTimerCreated;
-    bool bAwaited;  // the last start has not called back yet
+    bool bAwaited;    // the last start has neither called back nor been cancelled
+    OwedStart *owed;  // the oldest one first
 };
 
 Lock gTimerArrLock;
@@ -61,19 +75,69 @@ timespec Milliseconds(int64_t milliseconds) {
     return time;
 }
 
-// Reads whether the OS timer has time left. Returns the call's result.
+// Reads whether the last start has time left. Returns the call's result.
 int ReadArmed(const TIMER_MGR_INFO &info, bool *armed) {
     itimerspec left = {};
     const int result = timer_gettime(info.timerId, &left);
-    *armed = left.it_value.tv_sec > 0 || left.it_value.tv_nsec > 0;
+    // An OS timer that runs for no start is the one that Disarm leaves for the owed.
+    *armed = info.bAwaited && (left.it_value.tv_sec > 0 || left.it_value.tv_nsec > 0);
     return result;
 }
 
-// Arms the OS timer once, or disarms it with a time of 0. Returns the call's result.
-int SetTime(const TIMER_MGR_INFO &info, uint32_t timeout) {
-    itimerspec time = {};
-    time.it_value = Milliseconds(timeout);
-    return timer_settime(info.timerId, 0, &time, nullptr);
+// Sets the OS timer to expire once; a time of 0 disarms it. Returns the call's result.
+int SetTime(const TIMER_MGR_INFO &info, const timespec &time) {
+    itimerspec expiry = {};
+    expiry.it_value = time;
+    return timer_settime(info.timerId, 0, &expiry, nullptr);
+}
+
+// Calls the last start off. The system drops a pending delivery with it, so that owed starts need
+// another one, at once. Returns the call's result.
+int Disarm(const TIMER_MGR_INFO &info) {
+    timespec time = {};
+    time.tv_nsec = info.owed != nullptr ? 1 : 0;
+    return SetTime(info, time);
+}
+
+// Puts the last start, which has expired, among the owed. False without memory.
+bool OweLastStart(TIMER_MGR_INFO *info) {
+    OwedStart *start = static_cast<OwedStart *>(malloc(sizeof(OwedStart)));
+    if (start == nullptr) {
+        return false;
+    }
+    *start = {info->pfnCallback, info->pUserData, nullptr};
+    OwedStart **end = &info->owed;
+    while (*end != nullptr) {
+        end = &(*end)->next;
+    }
+    *end = start;
+    info->bAwaited = false;
+    return true;
+}
+
+// Takes the oldest start that is due out of the record. A null callback for none.
+OwedStart TakeDue(TIMER_MGR_INFO *info) {
+    if (OwedStart *oldest = info->owed) {
+        const OwedStart due = *oldest;
+        info->owed = oldest->next;
+        free(oldest);
+        return due;
+    }
+    bool armed = false;
+    if (!info->bAwaited || (info->bTimerCreated && ReadArmed(*info, &armed) == 0 && armed)) {
+        return {};
+    }
+    info->bAwaited = false;
+    return {info->pfnCallback, info->pUserData, nullptr};
+}
+
+// Empties a record that is no longer in use.
+void Clear(TIMER_MGR_INFO *info) {
+    while (OwedStart *start = info->owed) {
+        info->owed = start->next;
+        free(start);
+    }
+    *info = {};
 }
 
 // Runs on a thread of the OS timer service at each expiry.
@@ -94,18 +158,14 @@ void TimerCallbackEntry(sigval value) {
         TRACE_ERROR("Timer Callback! But Timer Callback Function is NULL!");
         return;
     }
-    // A late delivery of an earlier start finds the timer armed or called off, or takes the place
-    // of the last start's own delivery, which then finds nobody waiting for it: at most one call a
-    // start, and never early.
-    bool armed = false;
-    if (!info->bAwaited || (info->bTimerCreated && ReadArmed(*info, &armed) == 0 && armed)) {
-        return;
+    // The timer may be deleted while a callback runs, and its slot may have another owner then.
+    for (OwedStart due = TakeDue(info); due.pfnCallback != nullptr;) {
+        hold.Release();
+        due.pfnCallback(timer, due.pUserData);
+        hold.Acquire();
+        info = FindTimer(timer);
+        due = info != nullptr ? TakeDue(info) : OwedStart{};
     }
-    info->bAwaited = false;
-    const TimerCallbackFunc pfnCallback = info->pfnCallback;
-    void *pUserData = info->pUserData;
-    hold.Release();
-    pfnCallback(timer, pUserData);
 }
 
 // Makes the OS timer of a slot. Returns the call's result.
@@ -181,7 +241,10 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
         }
         info->bTimerCreated = true;
     }
-    const int result = SetTime(*info, timeout);
+    if (info->bAwaited && !OweLastStart(info)) {
+        return VARNEK_FAIL(FALSE, "VarnekPGL_StartTimer. memalloc failed");
+    }
+    const int result = SetTime(*info, Milliseconds(timeout));
     if (result != 0) {
         TRACE_ERROR("VarnekPGL_StartTimer. Set Timer is FAIL. errCode = [%d]!", result);
         timer_delete(info->timerId);
@@ -219,7 +282,7 @@ BOOL VarnekPGL_CancelTimer(uint32_t timer) {
     }
     if (!armed) {
         TRACE_ERROR("VarnekPGL_CancelTimer. This timer(%s) is disarmed currently", info->szTmName);
-    } else if (SetTime(*info, 0) != 0) {
+    } else if (Disarm(*info) != 0) {
         const int error = VarnekPGL_SysGetLastErro();
         return VARNEK_FAIL(FALSE, "VarnekPGL_CancelTimer. Set Timer FAIL. errCode = [%d][%s]",
                            error, ErrorText(error));
@@ -245,7 +308,7 @@ BOOL VarnekPGL_DeleteTimer(uint32_t timer) {
             TRACE_ERROR("VarnekPGL_DeleteTimer. Delete Timer is FAIL. errCode = [%d]!", result);
         }
     }
-    *info = {};
+    Clear(info);
     gTimerArrSize--;
     hold.Release();
     TRACE_MID("END: VarnekPGL_DeleteTimer.");
@@ -261,9 +324,10 @@ int32_t VarnekPGL_GetTimerByName(const char *szTmName) {
 }
 
 BOOL VarnekPGL_IsTimerActive(uint32_t timer) {
-    const Hold hold(gTimerArrLock);
+    Hold hold(gTimerArrLock);
     const TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
+        hold.Release();
         return VARNEK_FAIL(FALSE, "VarnekPGL_IsTimerActive. Invalid Timer Handle=[%d]!",
                            static_cast<int>(timer));
     }
@@ -272,6 +336,7 @@ BOOL VarnekPGL_IsTimerActive(uint32_t timer) {
     }
     bool armed = false;
     const int result = ReadArmed(*info, &armed);
+    hold.Release();
     if (result != 0) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_IsTimerActive. Get Timer info FAIL. errCode = [%d]!",
                            result);

@@ -41,6 +41,22 @@ Call &Find(const char *name) {
     abort();
 }
 
+std::atomic<int> gDrops{0};
+void (*gDeliver)(sigval value) = nullptr;
+
+// Has the timer's deliveries pass a place where they can be dropped.
+sigevent *Droppable(sigevent *event) {
+    gDeliver = event->sigev_notify_function;
+    event->sigev_notify_function = [](sigval value) {
+        if (gDrops > 0) {
+            --gDrops;
+            return;
+        }
+        gDeliver(value);
+    };
+    return event;
+}
+
 }  // namespace
 
 // The library's call goes to __wrap_NAME, which hands it on to __real_NAME.
@@ -66,7 +82,7 @@ WRAP_POSIX(sem_getvalue, (sem_t * s, int *value), s, value)
 WRAP_POSIX(sem_wait, (sem_t * s), s)
 WRAP_POSIX(sem_timedwait, (sem_t * s, const timespec *time), s, time)
 WRAP_POSIX(clock_gettime, (clockid_t clock, timespec *time), clock, time)
-WRAP_POSIX(timer_create, (clockid_t clock, sigevent *event, timer_t *id), clock, event, id)
+WRAP_POSIX(timer_create, (clockid_t clock, sigevent *event, timer_t *id), clock, Droppable(event), id)
 WRAP_POSIX(timer_settime, (timer_t id, int flags, const itimerspec *now, itimerspec *old), id, flags, now, old)
 WRAP_POSIX(timer_gettime, (timer_t id, itimerspec *left), id, left)
 WRAP_POSIX(timer_delete, (timer_t id), id)
@@ -127,5 +143,9 @@ void FailCall(const char *function, int nth, int error) {
     call.error = error;
     call.left = nth;
 }
+
+void DropDelivery() { gDrops = 1; }
+
+bool IsDeliveryDropped() { return gDrops == 0; }
 
 bool IsStillToFail(const char *function) { return Find(function).left > 0; }

@@ -16,4 +16,8 @@ void FailCall(const char *function, int nth, int error);
 // Whether the call that FailCall() asked for has not been made yet.
 bool IsStillToFail(const char *function);
 
+// Has the system drop its next delivery of a timer's expiry, and whether that has happened.
+void DropDelivery();
+bool IsDeliveryDropped();
+
 #endif
