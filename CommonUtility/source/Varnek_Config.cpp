@@ -2,12 +2,18 @@
 // search, the loading and the saving.
 #include "Varnek_Config.h"
 
+#include <errno.h>
+#include <fcntl.h>
 #include <stddef.h>
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include "Varnek_File.h"
+#include "Varnek_Storage.h"
 #include "Varnek_StrUtil.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
@@ -32,7 +38,9 @@ constexpr size_t kLineSize = 255;  // of a line that is read, with its terminato
 constexpr size_t kFileSize = 900;  // of what is written, with a terminator
 
 constexpr char kConfigPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
+constexpr char kNewPath[] = VARNEK_DATA_DIR "Varnek_Config.new";  // until it is renamed
 static_assert(sizeof kConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
+constexpr int32_t kSaveFlags = PGL_FILE_MODE_CREATE_RW | PGL_FILE_MODE_WRITE;
 
 enum ConfigField {
     AREA_NAME,
@@ -123,7 +131,7 @@ void ReadLine(const char *line) {
     CTRL_HIGH(" ERROR :unknown line(%s)", line);
 }
 
-void ReadText(const char *text) {
+void ReadLines(const char *text) {
     for (;;) {
         while (IsLineEnd(*text)) {
             ++text;
@@ -148,6 +156,80 @@ void FormatFile(char (&text)[kFileSize]) {
              kKeys[PLAYER_DELAY], info.cprmPlayerDelay, kKeys[NATION], info.supportNation);
 }
 
+// The whole text of the open file. Null data, after its trace, when it cannot be read.
+FileText ReadFromStart(PglFileHandle file) {
+    VarnekPGL_SeekFile(file, 0, SEEK_END);
+    const int32_t length = VarnekPGL_TellFile(file);
+    VarnekPGL_SeekFile(file, 0, SEEK_SET);
+    CTRL_HIGH("  VarnekCfg_LoadConfigFile : readlen = %d", length);
+    const uint32_t size = length > 0 ? static_cast<uint32_t>(length) : 0;
+    const FileText text = ReadText(file, size);
+    if (text.data == nullptr) {
+        CTRL_HIGH("  VarnekCfg_LoadConfigFile : Out of memory!");
+        return text;
+    }
+    if (length < 0 || (size > 0 && text.count == 0) || ferror(StreamOf(file)) != 0) {
+        CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Read Config File!");
+        free(text.data);
+        return {};
+    }
+    return text;
+}
+
+// Whether a new file may take the place of what is there: nothing, or a file of our own that no
+// other name leads to. `*mode` is then its mode, 0 for none.
+bool MayReplace(mode_t *mode) {
+    struct stat64 old = {};
+    if (lstat64(kConfigPath, &old) != 0) {
+        *mode = 0;
+        return errno == ENOENT;
+    }
+    *mode = old.st_mode & 07777;
+    return S_ISREG(old.st_mode) && old.st_nlink == 1 && old.st_uid == geteuid();
+}
+
+// Writes the text beside the file, through to the disk, and renames it into place: a reader finds
+// the old text or the new one at any moment, whatever happens to this process. False when that
+// cannot be done; the file is as it was then.
+bool ReplaceFile(const char *text, mode_t mode) {
+    remove(kNewPath);
+    const PglFileHandle file = VarnekPGL_OpenFile(kNewPath, kSaveFlags);
+    if (file == -1) {
+        return false;
+    }
+    const int fd = fileno(StreamOf(file));
+    const uint32_t length = static_cast<uint32_t>(strlen(text));
+    const bool stored = VarnekPGL_WriteFileByHandle(file, text, length) == length &&
+                        VarnekPGL_FlushFile(file) == 0 && fsync(fd) == 0 &&
+                        (mode == 0 || fchmod(fd, mode) == 0);
+    const bool closed = VarnekPGL_CloseFile(file) == 0;
+    if (stored && closed && rename(kNewPath, kConfigPath) == 0) {
+        return true;
+    }
+    remove(kNewPath);
+    return false;
+}
+
+// ReplaceFile where it is possible, one process at a time: a lock on the directory, which goes with
+// its holder, keeps the others from the file beside.
+bool SaveBeside(const char *text) {
+    mode_t mode = 0;
+    if (access(VARNEK_DATA_DIR, W_OK) != 0 || !MayReplace(&mode)) {
+        return false;
+    }
+    const int directory = open(VARNEK_DATA_DIR, O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (directory < 0) {
+        return false;
+    }
+    int locked = -1;
+    do {
+        locked = flock(directory, LOCK_EX);
+    } while (locked != 0 && errno == EINTR);
+    const bool replaced = locked == 0 && ReplaceFile(text, mode);
+    close(directory);
+    return replaced;
+}
+
 void LoadUnlessLoaded() {
     if (gpVarnekConfigInfo.standardType == 0) {
         VarnekCfg_LoadConfigFile();
@@ -162,37 +244,26 @@ VarnekConfigInfo *VarnekCfg_GetConfigInfo() {
 
 void VarnekCfg_LoadConfigFile() {
     CTRL_HIGH("  VarnekCfg_LoadConfigFile : called!");
+    const FileKind kind = KindOfConfigFile(kConfigPath);
+    if (kind == FileKind::kOdd || kind == FileKind::kTooLarge) {
+        CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Read Config File!");
+        return;
+    }
     const PglFileHandle file = VarnekPGL_OpenFile(kConfigPath, PGL_FILE_MODE_READ);
     if (file == -1) {
         CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Open Config File!");
         return;
     }
-    const VarnekConfigInfo before = gpVarnekConfigInfo;
-    gpVarnekConfigInfo = {};
-    VarnekPGL_SeekFile(file, 0, SEEK_END);
-    const int32_t length = VarnekPGL_TellFile(file);
-    VarnekPGL_SeekFile(file, 0, SEEK_SET);
-    CTRL_HIGH("  VarnekCfg_LoadConfigFile : readlen = %d", length);
-    if (length > 0) {
-        char *text = static_cast<char *>(malloc(static_cast<size_t>(length) + 1));
-        const uint32_t count =
-            text != nullptr ? VarnekPGL_ReadFileByHandle(file, text, static_cast<uint32_t>(length))
-                            : 0;
-        // A file that cannot be read is no reason to lose the settings, which the next save would
-        // write over it.
-        if (count == 0) {
-            gpVarnekConfigInfo = before;
-            CTRL_HIGH("  VarnekCfg_LoadConfigFile : %s",
-                      text != nullptr ? "Cannot Read Config File!" : "Out of memory!");
-            VarnekPGL_CloseFile(file);
-            free(text);
-            return;
-        }
-        text[count] = '\0';
-        ReadText(text);
-        free(text);
-    }
+    // A file that cannot be read is no reason to lose the settings, which the next save would write
+    // over it. So the record is cleared once the text is here.
+    const FileText text = ReadFromStart(file);
     VarnekPGL_CloseFile(file);
+    if (text.data == nullptr) {
+        return;
+    }
+    gpVarnekConfigInfo = {};
+    ReadLines(text.data);
+    free(text.data);
     CTRL_HIGH(" __VarnekCfg_GetTempBuffer: End of Configuration\n");
     VarnekCfg_GetSupportNation();
 }
@@ -203,18 +274,20 @@ void VarnekCfg_SaveConfigFile() {
                      "VarnekCfg_SaveConfigFile: Root_Path(%s) is not Exist\n", VARNEK_DATA_DIR);
         return;
     }
-    // Opening empties the file, so everything is ready before.
+    // Opening in place empties the file, so everything is ready before.
     char text[kFileSize];
     FormatFile(text);
-    const PglFileHandle file =
-        VarnekPGL_OpenFile(kConfigPath, PGL_FILE_MODE_CREATE_RW | PGL_FILE_MODE_WRITE);
+    if (SaveBeside(text)) {
+        return;
+    }
+    const PglFileHandle file = VarnekPGL_OpenFile(kConfigPath, kSaveFlags);
     if (file == -1) {
         CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_OpenFile() fail.!");
         return;
     }
     const uint32_t length = static_cast<uint32_t>(strlen(text));
     const uint32_t written = VarnekPGL_WriteFileByHandle(file, text, length);
-    // A full disk may show only here.
+    // A full disk may show only when the stream is closed.
     if (VarnekPGL_CloseFile(file) != 0 || written != length) {
         CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_WriteFileByHandle() fail.!");
     }

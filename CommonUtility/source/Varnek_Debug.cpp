@@ -13,9 +13,11 @@
 #include <string.h>
 
 #include <atomic>
+#include <initializer_list>
 
 #include "Varnek_File.h"
 #include "Varnek_Lock.h"
+#include "Varnek_Storage.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 #include "varnek_platform.h"
@@ -38,88 +40,64 @@ constexpr size_t kTraceLineSize = 2048;
 constexpr size_t kTraceTextSize = 2018;  // the caller's text with its terminator
 constexpr size_t kConfigLineSize = 52;
 
-constexpr char kConfigName[] = "debug_ltn.ini";
-constexpr char kSettingsName[] = "Varnek_Config.cfg";
-constexpr size_t kPathSize = 256;
-static_assert(sizeof VARNEK_DATA_DIR + sizeof kSettingsName <= kPathSize,
-              "VARNEK_DATA_DIR is too long");
-static_assert(sizeof VARNEK_SYSTEM_DIR + sizeof kConfigName <= kPathSize,
-              "VARNEK_SYSTEM_DIR is too long");
+constexpr char kConfigPath[] = VARNEK_DATA_DIR "debug_ltn.ini";
+constexpr char kDefaultConfigPath[] = VARNEK_SYSTEM_DIR "debug_ltn.ini";
+constexpr char kSettingsPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
+static_assert(sizeof kSettingsPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
+static_assert(sizeof kDefaultConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_SYSTEM_DIR is too long");
 
-// In the order in which the keys are tried: the first one found in a line decides the line.
-struct ConfigKey {
-    const char *text;
+struct TraceLevel {
     uint32_t bit;
-};
-constexpr ConfigKey kConfigKeys[] = {
-    {"LogToUSB", kOutputOn},
-    {"Error", VARNEK_LEVEL_ERROR},
-    {"High", VARNEK_LEVEL_HIGH},
-    {"Mid", VARNEK_LEVEL_MID},
-    {"Low", VARNEK_LEVEL_LOW},
-    {"Common", VARNEK_MODULE_COMMON},
-    {"JNI", VARNEK_MODULE_JNI},
-    {"MainControl", VARNEK_MODULE_MAIN_CONTROL},
-    {"ESG", VARNEK_MODULE_ESG},
-    {"SessionManager", VARNEK_MODULE_SESSION_MANAGER},
-    {"SectionParser", VARNEK_MODULE_SECTION_PARSER},
-    {"DsmccDC", VARNEK_MODULE_DSMCC_DC},
-    {"DsmccOC", VARNEK_MODULE_DSMCC_OC},
-    {"TsDemux", VARNEK_MODULE_TS_DEMUX},
-    {"CPRM", VARNEK_MODULE_CPRM},
-    {"SMPlayer", VARNEK_MODULE_SM_PLAYER},
-    {"GingaAppMgr", VARNEK_MODULE_GINGA},
-};
-
-struct LevelLook {
-    char label;
+    const char *key;  // in the configuration file, and in the summary
+    char label;       // in a line
     VarnekLogPriority priority;
 };
+constexpr TraceLevel kLevels[] = {
+    {VARNEK_LEVEL_ERROR, "Error", 'E', VARNEK_LOG_ERROR},
+    {VARNEK_LEVEL_HIGH, "High", 'H', VARNEK_LOG_INFO},
+    {VARNEK_LEVEL_MID, "Mid", 'M', VARNEK_LOG_DEBUG},
+    {VARNEK_LEVEL_LOW, "Low", 'L', VARNEK_LOG_VERBOSE},
+};
+constexpr TraceLevel kManyLevels = {0, "", 'L', VARNEK_LOG_DEBUG};
 
-LevelLook LookOfLevel(uint32_t mask) {
-    switch (mask & 0xFF000000u) {
-        case VARNEK_LEVEL_ERROR:
-            return {'E', VARNEK_LOG_ERROR};
-        case VARNEK_LEVEL_HIGH:
-            return {'H', VARNEK_LOG_INFO};
-        case VARNEK_LEVEL_MID:
-            return {'M', VARNEK_LOG_DEBUG};
-        case VARNEK_LEVEL_LOW:
-            return {'L', VARNEK_LOG_VERBOSE};
-        default:
-            return {'L', VARNEK_LOG_DEBUG};
+struct TraceModule {
+    uint32_t bit;
+    const char *key;    // in the configuration file
+    const char *label;  // in the summary
+    const char *tag;    // of a line
+};
+constexpr TraceModule kModules[] = {
+    {VARNEK_MODULE_COMMON, "Common", "Common", "SBTVD_COM"},
+    {VARNEK_MODULE_JNI, "JNI", "JNI", "SBTVD_JNI"},
+    {VARNEK_MODULE_MAIN_CONTROL, "MainControl", "MainControl", "SBTVD_CTRL"},
+    {VARNEK_MODULE_ESG, "ESG", "ESG", "SBTVD_ESG"},
+    {VARNEK_MODULE_SESSION_MANAGER, "SessionManager", "SessionManager", "SBTVD_SessionMGR"},
+    {VARNEK_MODULE_SECTION_PARSER, "SectionParser", "SectionParser", "SBTVD_SI_Parser"},
+    {VARNEK_MODULE_DSMCC_DC, "DsmccDC", "DsmccDC", "SBTVD_Data_Carousel"},
+    {VARNEK_MODULE_DSMCC_OC, "DsmccOC", "DsmccOC", "SBTVD_Object_Carousel"},
+    {VARNEK_MODULE_TS_DEMUX, "TsDemux", "TS Demux", "SBTVD_Demux"},
+    {VARNEK_MODULE_CPRM, "CPRM", "CPRM Player", "SBTVD_CPRM"},
+    {VARNEK_MODULE_SM_PLAYER, "SMPlayer", "SMPlayer ", "SBTVD_SMPLAYER"},
+    {VARNEK_MODULE_GINGA, "GingaAppMgr", "Ginga", "SBTVD_GINGA"},
+};
+constexpr TraceModule kUnknownModule = {0, "", "", "SBTVD_Unknown"};
+
+const TraceLevel &LevelOf(uint32_t mask) {
+    for (const TraceLevel &level : kLevels) {
+        if ((mask & 0xFF000000u) == level.bit) {
+            return level;
+        }
     }
+    return kManyLevels;
 }
 
-const char *TagOfModule(uint32_t mask) {
-    switch (mask & 0x00FFFFFFu) {
-        case VARNEK_MODULE_COMMON:
-            return "SBTVD_COM";
-        case VARNEK_MODULE_JNI:
-            return "SBTVD_JNI";
-        case VARNEK_MODULE_MAIN_CONTROL:
-            return "SBTVD_CTRL";
-        case VARNEK_MODULE_ESG:
-            return "SBTVD_ESG";
-        case VARNEK_MODULE_SESSION_MANAGER:
-            return "SBTVD_SessionMGR";
-        case VARNEK_MODULE_SECTION_PARSER:
-            return "SBTVD_SI_Parser";
-        case VARNEK_MODULE_DSMCC_DC:
-            return "SBTVD_Data_Carousel";
-        case VARNEK_MODULE_DSMCC_OC:
-            return "SBTVD_Object_Carousel";
-        case VARNEK_MODULE_TS_DEMUX:
-            return "SBTVD_Demux";
-        case VARNEK_MODULE_CPRM:
-            return "SBTVD_CPRM";
-        case VARNEK_MODULE_GINGA:
-            return "SBTVD_GINGA";
-        case VARNEK_MODULE_SM_PLAYER:
-            return "SBTVD_SMPLAYER";
-        default:
-            return "SBTVD_Unknown";
+const TraceModule &ModuleOf(uint32_t mask) {
+    for (const TraceModule &module : kModules) {
+        if ((mask & 0x00FFFFFFu) == module.bit) {
+            return module;
+        }
     }
+    return kUnknownModule;
 }
 
 // The last component of the path of the code that traces.
@@ -136,31 +114,28 @@ int32_t CallerLine() {
     return __atomic_load_n(&gVarnekDbgLineNum, __ATOMIC_RELAXED);
 }
 
-// Reads the whole configuration file into a block that the caller frees; null, after its line in
-// the log, when there is nothing to parse.
-char *ReadConfig(const char *path, int32_t *size) {
-    *size = VarnekPGL_CheckFile(path) ? VarnekPGL_GetFileSize(path) : 0;
-    if (*size < 1) {
-        __android_log_write(VARNEK_LOG_ERROR, "SBTVD", "Debug Configuration File Doesn't exist!\n");
-        return nullptr;
-    }
-    char *data = static_cast<char *>(malloc(static_cast<size_t>(*size) + 1));
-    if (data == nullptr || VarnekPGL_ReadFile(path, data, static_cast<uint32_t>(*size)) != *size) {
-        __android_log_write(VARNEK_LOG_ERROR, "SBTVD", "Debug Configuration File reading fail!\n");
-        free(data);
-        return nullptr;
-    }
-    return data;
+void LogFailure(const char *text) {
+    __android_log_write(VARNEK_LOG_ERROR, "SBTVD", text);
 }
 
-// What one line enables. A key counts wherever it stands, and so does the '1'.
+// What one line enables. The first key found in a line decides the line, wherever it is, and so
+// does a '1' anywhere. The keys are tried in the order of the tables.
 uint32_t BitOfLine(const char *line) {
     if (line[0] == '#') {
         return 0;
     }
-    for (const ConfigKey &key : kConfigKeys) {
-        if (strstr(line, key.text) != nullptr) {
-            return strchr(line, '1') != nullptr ? key.bit : 0;
+    const bool enables = strchr(line, '1') != nullptr;
+    if (strstr(line, "LogToUSB") != nullptr) {
+        return enables ? kOutputOn : 0;
+    }
+    for (const TraceLevel &level : kLevels) {
+        if (strstr(line, level.key) != nullptr) {
+            return enables ? level.bit : 0;
+        }
+    }
+    for (const TraceModule &module : kModules) {
+        if (strstr(line, module.key) != nullptr) {
+            return enables ? module.bit : 0;
         }
     }
     return 0;
@@ -192,53 +167,90 @@ uint32_t ParseConfig(const char *data, size_t size) {
     return enabled;
 }
 
+// A line of the summary, as it is put together.
+class SummaryLine {
+  public:
+    void Add(const char *label, bool on) {
+        const int more = snprintf(text_ + length_, sizeof text_ - length_, "%s%s=[%d]", separator_,
+                                  label, on ? 1 : 0);
+        length_ += more > 0 ? static_cast<size_t>(more) : 0;
+        separator_ = "\t";
+    }
+    void Write(const char *end) {
+        snprintf(text_ + length_, sizeof text_ - length_, "%s", end);
+        __android_log_write(VARNEK_LOG_DEBUG, "SBTVD", text_);
+    }
+
+  private:
+    char text_[128] = {};  // more than any line's labels take
+    size_t length_ = 0;
+    const char *separator_ = "Log Config: ";
+};
+
 void LogSummary(uint32_t enabled) {
-    const auto on = [enabled](uint32_t bit) { return (enabled & bit) != 0 ? 1 : 0; };
-    char line[kTraceLineSize];
-    const auto write = [&line] { __android_log_write(VARNEK_LOG_DEBUG, "SBTVD", line); };
-    snprintf(line, sizeof line, "Log Config: Error=[%d]\tHigh=[%d]\tMid=[%d]\tLow=[%d]\n",
-             on(VARNEK_LEVEL_ERROR), on(VARNEK_LEVEL_HIGH), on(VARNEK_LEVEL_MID),
-             on(VARNEK_LEVEL_LOW));
-    write();
-    snprintf(line, sizeof line,
-             "Log Config: Common=[%d]\tJNI=[%d]\tMainControl=[%d]\tESG=[%d]\tSessionManager=[%d]",
-             on(VARNEK_MODULE_COMMON), on(VARNEK_MODULE_JNI), on(VARNEK_MODULE_MAIN_CONTROL),
-             on(VARNEK_MODULE_ESG), on(VARNEK_MODULE_SESSION_MANAGER));
-    write();
-    snprintf(line, sizeof line,
-             "Log Config: TS Demux=[%d]\tCPRM Player=[%d]\tSMPlayer =[%d]\tSectionParser=[%d]",
-             on(VARNEK_MODULE_TS_DEMUX), on(VARNEK_MODULE_CPRM), on(VARNEK_MODULE_SM_PLAYER),
-             on(VARNEK_MODULE_SECTION_PARSER));
-    write();
-    snprintf(line, sizeof line, "Log Config: DsmccDC=[%d]\tDsmccOC=[%d]\tGinga=[%d]",
-             on(VARNEK_MODULE_DSMCC_DC), on(VARNEK_MODULE_DSMCC_OC), on(VARNEK_MODULE_GINGA));
-    write();
+    SummaryLine levels;
+    for (const TraceLevel &level : kLevels) {
+        levels.Add(level.key, (enabled & level.bit) != 0);
+    }
+    levels.Write("\n");
+    constexpr uint32_t kLines[][5] = {
+        {VARNEK_MODULE_COMMON, VARNEK_MODULE_JNI, VARNEK_MODULE_MAIN_CONTROL, VARNEK_MODULE_ESG,
+         VARNEK_MODULE_SESSION_MANAGER},
+        {VARNEK_MODULE_TS_DEMUX, VARNEK_MODULE_CPRM, VARNEK_MODULE_SM_PLAYER,
+         VARNEK_MODULE_SECTION_PARSER},
+        {VARNEK_MODULE_DSMCC_DC, VARNEK_MODULE_DSMCC_OC, VARNEK_MODULE_GINGA},
+    };
+    for (const auto &bits : kLines) {
+        SummaryLine line;
+        for (const uint32_t bit : bits) {
+            if (bit != 0) {
+                line.Add(ModuleOf(bit).label, (enabled & bit) != 0);
+            }
+        }
+        line.Write("");
+    }
+}
+
+// Puts the shipped configuration where there is none yet.
+void SeedConfig() {
+    const FileKind kind = KindOfConfigFile(kDefaultConfigPath);
+    if (kind != FileKind::kOdd && VarnekPGL_CheckFile(kDefaultConfigPath)) {
+        (void)VarnekPGL_CopyFile(kDefaultConfigPath, kConfigPath);
+        return;
+    }
+    LogFailure("Default Log Configuration file doesn't exit! File Path=[" VARNEK_SYSTEM_DIR
+               "debug_ltn.ini]\n");
+}
+
+// What the configuration file enables. Nothing, after a line in the log, when it cannot be read.
+uint32_t ReadConfig() {
+    FileKind kind = KindOfConfigFile(kConfigPath);
+    bool exists = kind != FileKind::kOdd && VarnekPGL_CheckFile(kConfigPath);
+    if (kind == FileKind::kMissing) {
+        SeedConfig();
+        kind = KindOfConfigFile(kConfigPath);
+        exists = kind == FileKind::kReadable && VarnekPGL_CheckFile(kConfigPath);
+    }
+    const int32_t size = exists ? VarnekPGL_GetFileSize(kConfigPath) : 0;
+    if (size < 1) {
+        LogFailure("Debug Configuration File Doesn't exist!\n");
+        return 0;
+    }
+    char *data = kind == FileKind::kReadable ? ReadWholeFile(kConfigPath, size) : nullptr;
+    if (data == nullptr) {
+        LogFailure("Debug Configuration File reading fail!\n");
+        return 0;
+    }
+    const uint32_t enabled = ParseConfig(data, static_cast<size_t>(size));
+    free(data);
+    return enabled;
 }
 
 // One load, in the thread that holds gDebugLoadLock. While it runs nothing is traced, also when it
 // replaces an earlier load.
 void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     gDebugState.fetch_and(kInitialised, std::memory_order_relaxed);
-    char path[kPathSize];
-    snprintf(path, sizeof path, "%s%s", VARNEK_DATA_DIR, kConfigName);
-    if (!VarnekPGL_CheckFile(path)) {
-        char defaultPath[kPathSize];
-        snprintf(defaultPath, sizeof defaultPath, "%s%s", VARNEK_SYSTEM_DIR, kConfigName);
-        if (VarnekPGL_CheckFile(defaultPath)) {
-            (void)VarnekPGL_CopyFile(defaultPath, path);
-        } else {
-            char line[kTraceLineSize];
-            snprintf(line, sizeof line,
-                     "Default Log Configuration file doesn't exit! File Path=[%s]\n", defaultPath);
-            __android_log_write(VARNEK_LOG_ERROR, "SBTVD", line);
-        }
-    }
-    uint32_t enabled = 0;
-    int32_t size = 0;
-    if (char *data = ReadConfig(path, &size)) {
-        enabled = ParseConfig(data, static_cast<size_t>(size));
-        free(data);
-    }
+    const uint32_t enabled = ReadConfig();
     LogSummary(enabled);
     gDebugState.store(enabled | kInitialised, std::memory_order_release);
 }
@@ -298,14 +310,14 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
     if (format == nullptr) {
         format = "(null)";
     }
-    const LevelLook look = LookOfLevel(mask);
+    const TraceLevel &level = LevelOf(mask);
     char line[kTraceLineSize];
-    const size_t prefix = PutPrefix(line, look.label, CallerFileName(), CallerLine());
+    const size_t prefix = PutPrefix(line, level.label, CallerFileName(), CallerLine());
     const size_t room = sizeof line - prefix;
     line[prefix] = '\0';
     vsnprintf(line + prefix, room < kTraceTextSize ? room : kTraceTextSize, format, args);
     if ((gDebugState.load(std::memory_order_relaxed) & kOutputOn) != 0) {
-        __android_log_write(look.priority, TagOfModule(mask), line);
+        __android_log_write(level.priority, ModuleOf(mask).tag, line);
     }
 }
 
@@ -351,10 +363,7 @@ int32_t VarnekPGL_SysGetLastErro() {
 
 void VarnekPGL_changeModeForDebug() {
     VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, " VarnekCfg_changeDebugMode\n");
-    const char *const names[] = {kConfigName, kSettingsName};
-    for (const char *name : names) {
-        char path[kPathSize];
-        snprintf(path, sizeof path, "%s%s", VARNEK_DATA_DIR, name);
+    for (const char *path : {kConfigPath, kSettingsPath}) {
         if (VarnekPGL_CheckFile(path)) {
             (void)VarnekPGL_Chmod(path, 666);
         }

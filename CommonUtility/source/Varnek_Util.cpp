@@ -6,6 +6,7 @@
 #include <stdlib.h>
 
 #include "Varnek_File.h"
+#include "Varnek_Storage.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
@@ -53,16 +54,13 @@ uint32_t Shifted(uint32_t word) {
            kCrc.word[n + 1][word >> 8 & 0xFF] ^ kCrc.word[n][word & 0xFF];
 }
 
-// The whole file in a block from malloc, or null after the trace.
+// The whole file in a block that the caller frees, or null after the trace.
 unsigned char *ReadWhole(const char *path, int32_t size) {
-    unsigned char *buffer = static_cast<unsigned char *>(malloc(static_cast<size_t>(size)));
-    if (buffer != nullptr &&
-        VarnekPGL_ReadFile(path, buffer, static_cast<uint32_t>(size)) == size) {
-        return buffer;
+    char *data = ReadWholeFile(path, size);
+    if (data == nullptr) {
+        VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_DSMCC_DC, "File Reading Fail!\n");
     }
-    VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_DSMCC_DC, "File Reading Fail!\n");
-    free(buffer);
-    return nullptr;
+    return reinterpret_cast<unsigned char *>(data);
 }
 
 }  // namespace
