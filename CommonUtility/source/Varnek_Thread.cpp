@@ -219,11 +219,14 @@ void __Varnek_delete_thread_info(int32_t hThread) {
     RemoveRecord(hThread, __func__, VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON);
 }
 
-// Where every thread of the registry starts: once its creator has made its record visible.
+// Where every thread of the registry starts. The creator holds the guard until the record is visible,
+// so a thread that does not see its record yet waits for the guard.
 void *ThreadEntry(void *begin) {
-    { const HoldMutex created(Guard()); }
     const Start start = *static_cast<Start *>(begin);
     free(begin);
+    if (gThreadInfoArr.FindByHandle(start.hHandle) == -1) {
+        const HoldMutex created(Guard());
+    }
     const pthread_key_t key =
         static_cast<pthread_key_t>(gSelfKey.load(std::memory_order_relaxed) - 1);
     pthread_setspecific(key, reinterpret_cast<void *>(intptr_t{start.hHandle}));
