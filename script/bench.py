@@ -257,21 +257,22 @@ def growth_chart(figures, chart, path):
         return
     import matplotlib  # nothing but a recording needs it
     matplotlib.use('svg')
-    from matplotlib import pyplot
+    from matplotlib import pyplot, ticker
     # The same figures give the same file.
     pyplot.rcParams.update({'svg.fonttype': 'none', 'svg.hashsalt': name, 'font.family': 'sans-serif'})
     figure, axes = pyplot.subplots(figsize=(7.2, 3.6), layout='constrained')
     for label, points in drawn:
         axes.plot(*zip(*points), marker='o', markersize=4, label=label)
     axes.set_xscale('log')
-    axes.set_xticks(sorted({x for _, points in drawn for x, _ in points}))
+    axes.set_xticks([x for x, _ in drawn[0][1]])
     axes.xaxis.set_major_formatter('{x:.0f}')
-    axes.minorticks_off()
     if per:  # lengths meet very different prices
         axes.set_yscale('log')
+        axes.yaxis.set_major_locator(ticker.LogLocator(subs=(1, 2, 5)))
         axes.yaxis.set_major_formatter('{x:g}')
     else:
         axes.set_ylim(bottom=0)
+    axes.minorticks_off()
     axes.set_xlabel(f'{xlabel} (logarithmic)')
     axes.set_ylabel(ylabel + (' (logarithmic)' if per else ''))
     axes.grid(alpha=0.4)
