@@ -1,16 +1,15 @@
 #!/usr/bin/env python3
-"""Which rows script/bench measures, against whom and with what goal; its table, and its charts.
+"""Which rows script/bench measures, against whom and with what goal; its table and its charts.
 
   bench.py list                      the rows' names
   bench.py areas [ROW...]            the programs that measure these rows, each with a filter
   bench.py receiver TOP MIB RUNS OUT  measures the receiver of the build tree TOP beside ffprobe
   bench.py table DIR [ROW...]        prints what the JSON in DIR says; fails when one of ours is not in it
   bench.py growth DIR                prints how cost grows
-  bench.py record DIR DOCS           writes it into DOCS/performance.md and the charts beside it
+  bench.py record DIR DOCS           writes it into DOCS/performance.md and draws the charts beside it
 """
 import datetime
 import json
-import math
 import os
 import platform
 import resource
@@ -250,152 +249,35 @@ def measure_receiver(top, megabytes, runs, out):
 
 # Charts ---------------------------------------------------------------------------------------------
 
-INK, PALE, GRID = '#1f2933', '#7b8794', '#d9dee4'
-COLOURS = ['#1f6feb', '#d97706', '#2f855a', '#9f3a8c']
-
-
-class Svg:
-    def __init__(self, width, height, title):
-        self.parts = [
-            f'<svg xmlns="http://www.w3.org/2000/svg" viewBox="0 0 {width} {height}" width="{width}" '
-            f'height="{height}" font-family="system-ui, sans-serif" font-size="13" role="img">',
-            f'<title>{title}</title>', f'<rect width="{width}" height="{height}" fill="#ffffff"/>']
-
-    def text(self, x, y, text, anchor='start', colour=INK, extra=''):
-        text = text.replace('&', '&amp;').replace('<', '&lt;')
-        self.parts.append(f'<text x="{x:.1f}" y="{y:.1f}" text-anchor="{anchor}" fill="{colour}"{extra}>{text}</text>')
-
-    def line(self, x1, y1, x2, y2, colour=GRID, width=1.0, extra=''):
-        self.parts.append(f'<line x1="{x1:.1f}" y1="{y1:.1f}" x2="{x2:.1f}" y2="{y2:.1f}" stroke="{colour}" '
-                          f'stroke-width="{width}"{extra}/>')
-
-    def add(self, part):
-        self.parts.append(part)
-
-    def write(self, path):
-        Path(path).write_text('\n'.join([*self.parts, '</svg>', '']))
-
-
-def bar_chart(figures, path):
-    """A bar for each pair: ours as a multiple of theirs, on a logarithmic axis around 1."""
-    bars = [(line[0], line[3], float(line[5]), line[6], line[7]) for line in lines(figures) if line[5]]
-    left, right, top, step = 400, 76, 64, 20
-    width, height = 980, top + step * len(bars) + 50
-    low = math.log10(min([0.05, *(bar[2] for bar in bars)]))
-    high = math.log10(max([4, *(bar[2] for bar in bars)]) * 1.2)
-
-    def x(ratio):
-        return left + (math.log10(ratio) - low) / (high - low) * (width - left - right)
-
-    svg = Svg(width, height, 'Time of the library as a multiple of its peers')
-    svg.text(16, 24, 'Time of the library as a multiple of its peer’s (left of 1 is faster)', extra=' font-size="16"')
-    svg.text(16, 44, 'Medians. The black tick is the goal; a bar is blue where it is met, amber where it is missed, '
-                     'grey without one.', colour=PALE)
-    for tick in (0.01, 0.02, 0.05, 0.1, 0.2, 0.5, 1, 2, 5, 10, 20, 50, 100):
-        if low <= math.log10(tick) <= high:
-            svg.line(x(tick), top - 6, x(tick), height - 36, INK if tick == 1 else GRID)
-            svg.text(x(tick), height - 20, f'{tick:g}', 'middle', PALE)
-    svg.text((left + width - right) / 2, height - 4, 'ours divided by theirs, logarithmic', 'middle', PALE)
-    last = None
-    for i, (row, peer, ratio, goal, verdict) in enumerate(bars):
-        y = top + step * i
-        if row != last:
-            svg.line(16, y - 2, width - 16, y - 2)
-            svg.text(16, y + 13, row)
-        last = row
-        svg.text(left - 10, y + 13, peer, 'end', PALE)
-        colour = {'met': COLOURS[0], 'MISSED': COLOURS[1]}.get(verdict, '#a9b4c0')
-        begin, end = sorted((x(ratio), x(1)))
-        svg.add(f'<rect x="{begin:.1f}" y="{y + 2}" width="{max(end - begin, 1):.1f}" height="{step - 7}" fill="{colour}"/>')
-        if goal:
-            at = x(float(goal.split()[1]))
-            svg.line(at, y, at, y + step - 3, INK, 2)
-        svg.text(width - 16, y + 13, f'{ratio:.2f}', 'end')
-    svg.write(path)
-
-
-def nice_ceiling(value):
-    magnitude = 10 ** math.floor(math.log10(value))
-    return next(step * magnitude for step in (1, 2, 2.5, 5, 10) if step * magnitude >= value)
-
 
 def growth_chart(figures, chart, path):
     name, _, xlabel, ylabel, per, _ = chart
     drawn = list(curves(figures, chart))
     if not drawn:
         return
-    width, height, left, right, top, bottom = 720, 360, 70, 210, 30, 56
-    xs = sorted({x for _, points in drawn for x, _ in points})
-    ys = [y for _, points in drawn for _, y in points]
-    first, last = math.log10(xs[0]), math.log10(xs[-1])
-
-    def px(x):
-        return left + (math.log10(x) - first) / (last - first) * (width - left - right)
-
+    import matplotlib  # nothing but a recording needs it
+    matplotlib.use('svg')
+    from matplotlib import pyplot, ticker
+    # The same figures give the same file.
+    pyplot.rcParams.update({'svg.fonttype': 'none', 'svg.hashsalt': name, 'font.family': 'sans-serif'})
+    figure, axes = pyplot.subplots(figsize=(7.2, 3.6), layout='constrained')
+    for label, points in drawn:
+        axes.plot(*zip(*points), marker='o', markersize=4, label=label)
+    axes.set_xscale('log')
+    axes.set_xticks([x for x, _ in drawn[0][1]])
+    axes.xaxis.set_major_formatter('{x:.0f}')
     if per:  # lengths meet very different prices
-        low, high = math.log10(min(ys) / 1.4), math.log10(max(ys) * 1.4)
-        ticks = [m * 10.0 ** e for e in range(-3, 5) for m in (1, 2, 5) if low <= math.log10(m * 10.0 ** e) <= high]
-
-        def py(y):
-            return height - bottom - (math.log10(y) - low) / (high - low) * (height - top - bottom)
+        axes.set_yscale('log')
+        axes.yaxis.set_major_locator(ticker.LogLocator(subs=(1, 2, 5)))
+        axes.yaxis.set_major_formatter('{x:g}')
     else:
-        ceiling = nice_ceiling(max(ys) * 1.05)
-        ticks = [ceiling * i / 5 for i in range(6)]
-
-        def py(y):
-            return height - bottom - y / ceiling * (height - top - bottom)
-
-    svg = Svg(width, height, f'{ylabel} against {xlabel.lower()}')
-    for tick in ticks:
-        svg.line(left, py(tick), width - right, py(tick))
-        svg.text(left - 8, py(tick) + 4, f'{tick:g}', 'end', PALE)
-    for x in xs:
-        if x in (p[0] for p in drawn[0][1]):
-            svg.line(px(x), height - bottom, px(x), height - bottom + 5, PALE)
-            svg.text(px(x), height - bottom + 20, f'{x:,}'.replace(',', ' '), 'middle', PALE)
-    svg.line(left, height - bottom, width - right, height - bottom, PALE)
-    svg.text((left + width - right) / 2, height - 12, f'{xlabel} (logarithmic)', 'middle')
-    svg.text(left - 50, top - 12, ylabel + (' (logarithmic)' if per else ''))
-    ends = []
-    for (label, points), colour in zip(drawn, COLOURS):
-        path_points = ' '.join(f'{px(x):.1f},{py(y):.1f}' for x, y in points)
-        svg.add(f'<polyline points="{path_points}" fill="none" stroke="{colour}" stroke-width="2"/>')
-        for x, y in points:
-            svg.add(f'<circle cx="{px(x):.1f}" cy="{py(y):.1f}" r="3.5" fill="{colour}"/>')
-        ends.append([py(points[-1][1]) + 4, label, colour])
-    ends.sort()
-    for i in range(1, len(ends)):
-        ends[i][0] = max(ends[i][0], ends[i - 1][0] + 17)
-    for y, label, colour in ends:
-        svg.text(width - right + 12, y, label, colour=colour)
-    svg.write(path)
-
-
-def thread_chart(figures, path):
-    """What an operation costs each of two threads at once, beside one thread alone."""
-    pairs = [(label, one, two) for label, *names in THREADS
-             for one, two in [[figures.of(*name, False) for name in names]] if one and two]
-    if not pairs:
-        return
-    left, top, step, width = 260, 56, 46, 720
-    height = top + step * len(pairs) + 50
-    ceiling = nice_ceiling(max(statistics.median(samples) for pair in pairs for samples in pair[1:]) * 1.05)
-    svg = Svg(width, height, 'Cost of an operation in one thread and in two at once')
-    svg.text(16, 24, 'ns an operation: one thread alone, and each of two threads at once', extra=' font-size="16"')
-    for i in range(6):
-        x = left + (width - left - 70) * i / 5
-        svg.line(x, top - 8, x, height - 40)
-        svg.text(x, height - 22, f'{ceiling * i / 5:g}', 'middle', PALE)
-    svg.text(left + (width - left - 70) / 2, height - 4, 'ns an operation', 'middle', PALE)
-    for i, (label, *pair) in enumerate(pairs):
-        y = top + step * i
-        svg.text(left - 10, y + 22, label, 'end')
-        for j, (samples, name) in enumerate(zip(pair, ('one', 'two'))):
-            median = statistics.median(samples)
-            length = median / ceiling * (width - left - 70)
-            svg.add(f'<rect x="{left}" y="{y + 17 * j}" width="{length:.1f}" height="15" fill="{COLOURS[j]}"/>')
-            svg.text(left + length + 6, y + 17 * j + 12, f'{median:.2f} {name}', extra=' font-size="11"')
-    svg.write(path)
+        axes.set_ylim(bottom=0)
+    axes.minorticks_off()
+    axes.set_xlabel(f'{xlabel} (logarithmic)')
+    axes.set_ylabel(ylabel + (' (logarithmic)' if per else ''))
+    axes.grid(alpha=0.4)
+    axes.legend()
+    figure.savefig(path, metadata={'Date': None, 'Title': f'{ylabel} against {xlabel.lower()}'})
 
 
 # The document ---------------------------------------------------------------------------------------
@@ -420,6 +302,13 @@ def section(directory, figures):
     for fields in named_once(table):
         fields[-1] = {'MISSED': '**missed**'}.get(fields[-1], fields[-1])
         yield '| ' + ' | '.join(field.replace('<= ', '≤ ') for field in fields) + ' |'
+    yield ''
+    yield '| an operation of two threads at once | one thread alone | each of two |'
+    yield '|---|---|---|'
+    for label, *names in THREADS:
+        pair = [figures.of(*name, False) for name in names]
+        if all(pair):
+            yield '| ' + ' | '.join([label, *(shown(statistics.median(samples)) for samples in pair)]) + ' |'
     path = Path(directory, 'receiver.json')
     if path.exists():
         size = json.loads(path.read_text())['bytes']
@@ -434,10 +323,8 @@ def section(directory, figures):
 
 def record(directory, docs):
     figures = Figures(directory)
-    bar_chart(figures, Path(docs, 'performance.svg'))
     for chart in GROWTH:
         growth_chart(figures, chart, Path(docs, f'performance-{chart[0]}.svg'))
-    thread_chart(figures, Path(docs, 'performance-threads.svg'))
     page = Path(docs, 'performance.md')
     begin, end = '<!-- results: script/bench --record -->', '<!-- end of results -->'
     text = page.read_text()

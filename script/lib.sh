@@ -35,3 +35,24 @@ build() {
     quietly "configure-$preset" cmake --preset "$preset"
     quietly "build-$preset" cmake --build --preset "$preset" -j "$(nproc)" --target "$@"
 }
+
+# find_code PATTERN...: our files of these names, each ended by a NUL.
+find_code() {
+    local names=(-name "$1")
+    shift
+    for name in "$@"; do names+=(-o -name "$name"); done
+    find . \( -path './build*' -o -path ./.git \) -prune -o -type f \( "${names[@]}" \) -print0
+}
+
+# without_comments FILE: the file's lines but for those that are empty or begin with '#'.
+without_comments() { grep -vE '^(#|$)' "$1"; }
+
+# readme TEXT: the block of README.md that holds TEXT, without its fences.
+readme() {
+    local block
+    block=$(awk -v text="$1" '/^```/ { if (found) exit; inside = !inside; block = ""; next }
+        inside { block = block $0 "\n"; found = found || index($0, text) }
+        END { if (found) printf "%s", block }' README.md)
+    [ -n "$block" ] || die "README.md has no block with '$1'"
+    printf '%s\n' "$block"
+}

@@ -15,15 +15,6 @@ const std::string kPath = VARNEK_DATA_DIR "Varnek_Config.cfg";
 
 class ConfigAlone : public VarnekTest {
   protected:
-    void SetUp() override {
-        VarnekTest::SetUp();
-        std::filesystem::rename(kPath, kPath + ".aside", ignored_);
-    }
-    void TearDown() override {
-        std::filesystem::remove(kPath);
-        std::filesystem::rename(kPath + ".aside", kPath, ignored_);
-        VarnekTest::TearDown();
-    }
     // What is saved after this was loaded.
     static std::string Reloaded(const std::string &content) {
         WriteAll(kPath, content);
@@ -31,7 +22,6 @@ class ConfigAlone : public VarnekTest {
         VarnekCfg_SaveConfigFile();
         return ReadAll(kPath);
     }
-    std::error_code ignored_;
     VarnekConfigInfo &info_ = *VarnekCfg_GetConfigInfo();
 };
 
@@ -155,10 +145,10 @@ TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
     std::filesystem::create_directory(kPath);
     expect("SBTVD_CTRL", "() :  VarnekPGL_OpenFile() fail.!");
     const std::string data = std::filesystem::path(VARNEK_DATA_DIR).parent_path();
-    std::filesystem::rename(data, data + ".aside");
+    std::filesystem::rename(data, Path("aside"));
     expect("SBTVD_ESG", ": Root_Path(" VARNEK_DATA_DIR ") is not Exist\n");
     EXPECT_FALSE(std::filesystem::exists(data));
-    std::filesystem::rename(data + ".aside", data);
+    std::filesystem::rename(Path("aside"), data);
 }
 
 }  // namespace

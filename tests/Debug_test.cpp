@@ -19,16 +19,13 @@ constexpr char kDefault[] = VARNEK_SYSTEM_DIR "debug_ltn.ini";
 class DebugAlone : public ::testing::Test {
   protected:
     void SetUp() override {
-        for (const char *dir : {VARNEK_DATA_DIR, VARNEK_SYSTEM_DIR}) {
-            std::filesystem::remove_all(dir);
-            std::filesystem::create_directories(dir);
-        }
-        TakeLog();
+        LeaveClean();
+        std::filesystem::create_directories(VARNEK_SYSTEM_DIR);
+        std::filesystem::remove(kDefault);
     }
     void TearDown() override {
         gLogHook = nullptr;
-        std::filesystem::remove(kWorking);
-        std::filesystem::remove(kDefault);
+        WriteAll(kDefault, ReadAll(VARNEK_DEFAULTS "debug_ltn.ini"));
     }
 
     // Whether a trace from this line with this mask gets through.
@@ -190,7 +187,6 @@ TEST_F(DebugAlone, OpensTheDebugFilesToEveryUser) {
         ASSERT_EQ(stat(path.c_str(), &status), 0);
         EXPECT_EQ(status.st_mode & 0777u, 0666u) << path;
     }
-    std::filesystem::remove(settings);
 }
 
 class Trace : public VarnekTest {};

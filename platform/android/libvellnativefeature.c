@@ -2,7 +2,7 @@
 // device brings the code. Never installed.
 #include "varnek_platform.h"
 
-const char *VellNativeFeature_getStringWithDefault(const char *key, const char *fallback) {
+const char *VellNativeFeature_getStringWithDefault(const char *key, const char *defaultValue) {
     (void)key;
-    return fallback;
+    return defaultValue;
 }

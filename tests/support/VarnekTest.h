@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "Varnek_Debug.h"
+#include "support/Platform.h"
 
 struct LogLine {
     int priority;
@@ -20,7 +21,6 @@ struct LogLine {
     std::string text;
     pid_t thread;
 
-    bool IsTrace() const { return tag.rfind("SBTVD_", 0) == 0 && tag != "SBTVD_File"; }
     // The caller's text of a trace, without the prefix; other lines whole.
     std::string Body() const;
 };
@@ -47,9 +47,6 @@ void ExpectRows(const std::vector<Row> &rows);
 
 // Called for each line before it is captured, without a lock; null for none.
 extern void (*gLogHook)(const LogLine &line);
-
-// What the platform's feature store gives for the nation.
-extern const char *gFeature;
 
 std::string ReadAll(const std::string &path);
 void WriteAll(const std::string &path, const std::string &content);

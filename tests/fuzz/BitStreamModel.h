@@ -1,7 +1,7 @@
 // A model of the bit stream that moves single bits, works piece by piece, and composes the traces that
 // the stream owes.
-#ifndef VARNEK_FUZZ_BITSTREAMMODEL_H
-#define VARNEK_FUZZ_BITSTREAMMODEL_H
+#ifndef VARNEK_TESTS_FUZZ_BITSTREAMMODEL_H
+#define VARNEK_TESTS_FUZZ_BITSTREAMMODEL_H
 
 #include <algorithm>
 #include <cstdint>
@@ -63,11 +63,19 @@ struct BitStreamModel {
     int64_t ReadInt(int count, unsigned char &flag) { return Read(count, 32, flag); }
     void Skip(int count) {
         unsigned char flag;
-        count == 0 || end ? 0 : Pieces(count, flag);
+        if (count != 0 && !end) {
+            Pieces(count, flag);
+        }
     }
     int GetByteArray(unsigned char *dest, int count) {
-        if (end || consumed != 0 || count < 0 || count > size - index) {
-            return end ? -22 : consumed != 0 ? -1 : -10;
+        if (end) {
+            return -22;
+        }
+        if (consumed != 0) {
+            return -1;
+        }
+        if (count < 0 || count > size - index) {
+            return -10;
         }
         std::copy_n(bytes.begin() + index, count, dest);
         index += count;

@@ -40,12 +40,13 @@ int32_t Number(const std::string &text) {
     return static_cast<int32_t>(std::clamp<long>(number, INT32_MIN, INT32_MAX));
 }
 
-std::string Nation(const std::string &value) {
-    const size_t tag = gFeature.find("NATION:");
-    const std::string code = tag != std::string::npos ? gFeature.substr(tag + 7, 3) : "";
-    return !value.empty()                                                        ? value.substr(0, 99)
-           : code.size() == 3 && code.find_first_of("\r\n") == std::string::npos ? code
-                                                                                 : "BRA";
+std::string Nation(const std::string &value, const std::string &feature) {
+    if (!value.empty()) {
+        return value.substr(0, 99);
+    }
+    const size_t tag = feature.find("NATION:");
+    const std::string code = tag != std::string::npos ? feature.substr(tag + 7, 3) : "";
+    return code.size() == 3 && code.find_first_of("\r\n") == std::string::npos ? code : "BRA";
 }
 
 }  // namespace
@@ -54,7 +55,8 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     static const DataFile file("Varnek_Config.cfg");
     Input input(data, size);
     const std::string text = input.Text().data();
-    gFeature = input.Text().data();
+    const std::vector<char> feature = input.Text();
+    gFeature = feature.data();
     file.Write(text);
     const Values values = ValuesOf(text);
 
@@ -65,7 +67,7 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     CHECK(info->tsCaptureEnable == static_cast<uint8_t>(Number(values[2])));
     CHECK(info->tsFileSimulEnable == static_cast<uint8_t>(Number(values[3])));
     CHECK(info->cprmPlayerDelay == Number(values[4]));
-    CHECK(info->supportNation == Nation(values[5]));
+    CHECK(info->supportNation == Nation(values[5], gFeature));
     CHECK(VarnekCfg_IsSupportBML() == (strncmp(info->supportNation, "PHL", 3) == 0 ? TRUE : FALSE));
 
     VarnekConfigInfo saved;

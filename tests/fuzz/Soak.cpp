@@ -7,18 +7,17 @@
 #include <chrono>
 #include <cstdio>
 #include <cstring>
-#include <fstream>
 #include <random>
 #include <string>
 #include <thread>
 
-#include "Check.h"
 #include "Varnek_CRingBuffer.h"
 #include "Varnek_Debug.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
 #include "Varnek_Timer.h"
-#include "varnek_platform.h"
+#include "support/Check.h"
+#include "support/Platform.h"
 
 namespace {
 
@@ -246,23 +245,20 @@ long long Sum(Field field) {
     return sum;
 }
 
-}  // namespace
-
-// Takes the place of the platform's log function.
-extern "C" __attribute__((visibility("default"))) int __android_log_write(int, const char *tag, const char *text) {
-    CHECK(strnlen(text, 2048) < 2048);
+void OnLog(int, const char *tag, const char *text) {
     if (strcmp(tag, "SBTVD_GINGA") == 0) {
-        const char *body = strstr(text, "] soak ");
-        CHECK(text[1] == 'H' && body != nullptr && strcmp(body + 8, " end") == 0);
+        const char *body = BodyOf(tag, text);
+        CHECK(text[1] == 'H' && strncmp(body, "soak ", 5) == 0 && strcmp(body + 6, " end") == 0);
         ++gLines;
     }
-    return 1;
 }
+
+}  // namespace
 
 int main(int argc, char **argv) {
     const int seconds = argc > 1 ? atoi(argv[1]) : 1;
-    std::ofstream(VARNEK_DATA_DIR "debug_ltn.ini")
-        << "LogToUSB=1\nError=1\nHigh=1\nMid=1\nLow=1\nCommon=1\nGingaAppMgr=1\n";
+    StartClean();
+    gOnLog = OnLog;
     for (int i = 0; i < kThreads; ++i) {
         gWorkers[i].index = i;
         gWorkers[i].random.seed(static_cast<unsigned int>(i + 1));
@@ -311,5 +307,6 @@ int main(int argc, char **argv) {
     printf("traces               %lld\n", static_cast<long long>(gTraces));
     printf("room afterwards      %s, as before\n", room.c_str());
     printf("largest memory       %ld KiB\n", usage.ru_maxrss);
+    LeaveClean();
     return lost == 0 ? 0 : 1;
 }

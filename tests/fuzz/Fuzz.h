@@ -1,30 +1,24 @@
-// What the fuzz targets share: the input taken apart, the check that ends a run, and the log.
+// What the fuzz targets share: the input taken apart, the traces collected, and the library's files.
 //
-// A target runs in a directory of its own, which holds what the library reads and writes. Every
-// trace is on, so its formatting is part of the run, and every line is held against its limits.
-#ifndef VARNEK_FUZZ_H
-#define VARNEK_FUZZ_H
+// Every trace is on, so its formatting is part of the run.
+#ifndef VARNEK_TESTS_FUZZ_FUZZ_H
+#define VARNEK_TESTS_FUZZ_FUZZ_H
 
 #include <cstddef>
 #include <cstdint>
 #include <string>
 #include <vector>
 
-#include "Check.h"
+#include "support/Check.h"
+#include "support/Platform.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
 
-// Called for each line of the log; null for none.
-extern void (*gOnLog)(const char *tag, const char *text);
-
-// Collects the callers' texts of the traces, instead.
+// Collects the callers' texts of the traces from now on.
 void CollectTraces();
 void DropTraces();
 // Ends the run, and shows both, unless these were collected since the last call.
 void CheckTraces(const std::vector<std::string> &expected);
-
-// What the platform's feature store gives for the nation.
-extern std::string gFeature;
 
 // A file in the library's data directory, rewritten in place: a new file each time would cost more
 // than all the rest.
@@ -36,9 +30,6 @@ class DataFile {
   private:
     int fd_;
 };
-
-// Those that were written.
-void RemoveDataFiles();
 
 // The input's bytes in order; zeros behind its end.
 class Input {

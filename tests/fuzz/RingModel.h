@@ -1,6 +1,6 @@
 // A model of the byte ring that moves single bytes, and composes the traces that the ring owes.
-#ifndef VARNEK_FUZZ_RINGMODEL_H
-#define VARNEK_FUZZ_RINGMODEL_H
+#ifndef VARNEK_TESTS_FUZZ_RINGMODEL_H
+#define VARNEK_TESTS_FUZZ_RINGMODEL_H
 
 #include <string>
 #include <type_traits>
@@ -111,9 +111,13 @@ struct RingModel : Fields {
         if (n < 0 || n > most) {
             return Say(-10, names[origin], " Too long offset. aOffset=[", n, "]");
         }
-        r = origin == 0 ? n : origin == 1 ? r + n : (size - n + w) % size;
-        rl = origin == 1 ? Plus(rl, r / size) : w < r ? Plus(wl, -1) : wl;
-        r = origin == 1 ? r % size : r;
+        if (origin == 1) {
+            rl = Plus(rl, (r + n) / size);
+            r = (r + n) % size;
+            return 0;
+        }
+        r = origin == 0 ? n : (size - n + w) % size;
+        rl = w < r ? Plus(wl, -1) : wl;
         return 0;
     }
 };

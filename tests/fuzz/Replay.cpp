@@ -66,6 +66,6 @@ int main(int argc, char **argv) {
             corpus.push_back(std::move(input));
         }
     }
-    RemoveDataFiles();
+    LeaveClean();
     return 0;
 }

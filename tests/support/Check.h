@@ -1,6 +1,6 @@
 // What must hold at any moment. Its failure ends the process, where a debugger or a fuzzer sees it.
-#ifndef VARNEK_FUZZ_CHECK_H
-#define VARNEK_FUZZ_CHECK_H
+#ifndef VARNEK_TESTS_SUPPORT_CHECK_H
+#define VARNEK_TESTS_SUPPORT_CHECK_H
 
 #include <cstdio>
 #include <cstdlib>

@@ -58,7 +58,7 @@ uint32_t Expected(std::string_view text) {
 int gTraces;
 std::string gReport;
 
-void OnLog(const char *tag, const char *text) {
+void OnLog(int, const char *tag, const char *text) {
     if (strcmp(tag, "SBTVD") == 0) {
         gReport += text;
     } else {

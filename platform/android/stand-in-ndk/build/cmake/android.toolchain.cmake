@@ -1,6 +1,6 @@
 # Takes the place of an NDK where there is none: clang for Android's ARM target, with the headers of
 # Debian's cross C library and with import libraries that hold no more than the library may take on the
-# device (script/check makes them). It shows the build's Android side, not bionic's headers.
+# device (../../make makes them). It shows the build's Android side, not bionic's headers.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR armv7-a)
 set(ANDROID TRUE)
@@ -25,6 +25,6 @@ set(CMAKE_C_FLAGS_INIT "-mthumb -nostdlibinc -D__ARM_PCS_VFP -isystem ${headers}
 set(CMAKE_CXX_FLAGS_INIT "-mthumb -nostdlibinc -D__ARM_PCS_VFP -isystem ${cxx_headers} \
 -isystem ${cxx_headers}/arm-linux-gnueabihf -isystem ${headers}")
 set(CMAKE_SHARED_LINKER_FLAGS_INIT
-    "-nostdlib -Wno-unused-command-line-argument -fuse-ld=/usr/bin/arm-linux-gnueabihf-ld -L${CMAKE_CURRENT_LIST_DIR}/../../../../build/ndk")
+    "-nostdlib -Wno-unused-command-line-argument -fuse-ld=/usr/bin/arm-linux-gnueabihf-ld -L${CMAKE_CURRENT_LIST_DIR}/../../../../../build/ndk")
 set(CMAKE_C_STANDARD_LIBRARIES -lc)
 set(CMAKE_CXX_STANDARD_LIBRARIES -lc)

@@ -1,16 +1,15 @@
 #include "Varnek_Config.h"
-#include "Varnek_File.h"
 #include "support/VarnekTest.h"
 
 namespace {
 
-class SampleAlone : public VarnekTest {};
+class DefaultsAlone : public VarnekTest {};
 
-TEST_F(SampleAlone, FilesSayWhatTheirCommentsPromise) {
+TEST_F(DefaultsAlone, FilesSayWhatTheirCommentsPromise) {
     const std::string debug = "debug_ltn.ini";
     const std::string config = "Varnek_Config.cfg";
     for (const std::string &name : {debug, config}) {
-        WriteAll(VARNEK_DATA_DIR + name, ReadAll(VARNEK_SAMPLES + name));
+        WriteAll(VARNEK_DATA_DIR + name, ReadAll(VARNEK_DEFAULTS + name));
     }
     TakeLog();
     VarnekPGL_InitializeDebug();
@@ -28,7 +27,6 @@ TEST_F(SampleAlone, FilesSayWhatTheirCommentsPromise) {
     EXPECT_EQ(ReadAll(VARNEK_DATA_DIR + config),
               "CONFIG_CURRENTAREANAME=\nCONFIG_STANDARDTYPE=2\nCONFIG_TSCAPTURE=0\nCONFIG_TSFILESIMUL=0\n"
               "CONFIG_CPRMPLAYER_DELAY=68\nCONFIG_SUPPORT_NATION=BRA\n");
-    VarnekPGL_DeleteFile((VARNEK_DATA_DIR + config).c_str());
 }
 
 }  // namespace
