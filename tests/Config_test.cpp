@@ -2,8 +2,12 @@
 // where the nation comes from. The file is put back as it was.
 #include "Varnek_Config.h"
 
+#include <sys/stat.h>
+#include <unistd.h>
+
 #include <cstring>
 #include <filesystem>
+#include <functional>
 
 #include "support/VarnekTest.h"
 
@@ -101,6 +105,36 @@ TEST_F(ConfigAlone, AnyFileLoads) {
     info_.standardType = info_.cprmPlayerDelay = INT32_MIN;
     VarnekCfg_SaveConfigFile();
     EXPECT_EQ(ReadAll(kPath), File(cut, INT32_MIN, 0, 0, INT32_MIN, cut));
+}
+
+TEST_F(ConfigAlone, WhatCannotBeReadLeavesTheSettings) {
+    const std::pair<const char *, std::function<void()>> rows[] = {
+        {"a directory", [] { std::filesystem::create_directory(kPath); }},
+        {"a FIFO", [] { mkfifo(kPath.c_str(), 0666); }},
+        {"more than 1 MiB", [] { WriteAll(kPath, std::string((1 << 20) + 1, '\n')); }},
+    };
+    for (const auto &[what, make] : rows) {
+        make();
+        VarnekCfg_LoadConfigFile();
+        EXPECT_EQ(TakeBodies("SBTVD_CTRL").back(), "  VarnekCfg_LoadConfigFile : Cannot Read Config File!") << what;
+        EXPECT_EQ(info_.cprmPlayerDelay, 68) << what;
+        std::filesystem::remove(kPath);
+    }
+}
+
+TEST_F(ConfigAlone, ASaveKeepsTheModeAndWhatAnotherNameLeadsTo) {
+    const std::string other = std::filesystem::absolute(Path("other"));
+    WriteAll(kPath, "");
+    chmod(kPath.c_str(), 0640);
+    VarnekCfg_SaveConfigFile();
+    EXPECT_EQ(std::filesystem::status(kPath).permissions(), static_cast<std::filesystem::perms>(0640));
+    for (const bool hard : {true, false}) {
+        std::filesystem::remove(kPath);
+        WriteAll(other, "");
+        EXPECT_EQ((hard ? link : symlink)(other.c_str(), kPath.c_str()), 0);
+        VarnekCfg_SaveConfigFile();
+        EXPECT_EQ(ReadAll(other), File("", 2, 0, 0, 68, "")) << "saved in place";
+    }
 }
 
 TEST_F(ConfigAlone, TheNationComesFromFileThenPlatformThenDefault) {

@@ -125,10 +125,16 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
     VarnekPGL_InitializeDebug();
     EXPECT_EQ(TakeBodies("SBTVD").front(), missing);
 
+    for (const bool directory : {true, false}) {
+        std::filesystem::remove(kWorking);
+        EXPECT_EQ(directory ? mkdir(kWorking, 0777) : mkfifo(kWorking, 0666), 0);
+        VarnekPGL_InitializeDebug();
+        EXPECT_EQ(TakeBodies("SBTVD").front(), missing);
+    }
     std::filesystem::remove(kWorking);
-    std::filesystem::create_directory(kWorking);
+    WriteAll(kWorking, std::string((1 << 20) + 1, '#'));
     VarnekPGL_InitializeDebug();
-    EXPECT_EQ(TakeBodies("SBTVD").front(), missing);
+    EXPECT_EQ(TakeBodies("SBTVD").front(), "Debug Configuration File reading fail!\n") << "more than 1 MiB";
     std::filesystem::remove(kWorking);
 
     VarnekPGL_InitializeDebug();

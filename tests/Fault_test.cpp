@@ -347,6 +347,22 @@ TEST_F(FaultAlone, SettingsStayWhenAFileCannotBeRead) {
     EXPECT_EQ(VarnekCfg_GetStandard(), 5);
 }
 
+TEST_F(FaultAlone, OnlyAMissingDebugConfigurationIsSeeded) {
+    const std::string working = VARNEK_DATA_DIR "debug_ltn.ini", shipped = VARNEK_SYSTEM_DIR "debug_ltn.ini";
+    const std::string own = ReadAll(working);
+    WriteAll(shipped, "LogToUSB=1\n");
+    FailCall("fopen", 1, EMFILE);
+    VarnekPGL_InitializeDebug();
+    std::filesystem::remove(shipped);
+    EXPECT_EQ(ReadAll(working), own);
+}
+
+TEST_F(Fault, ASizeIsTheFilesWhateverTheStreamsPosition) {
+    const std::string file = Path("file");
+    WriteAll(file, "12345678");
+    ExpectFaults({{"ftell", EOVERFLOW, [&] { return VarnekPGL_GetFileSize(file.c_str()); }, 8, {}}});
+}
+
 // An operation that leaves nothing behind, made again and again, while the first, second, ... call of
 // each function fails, until there is none left to fail.
 struct Operation {

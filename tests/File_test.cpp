@@ -142,6 +142,19 @@ TEST_F(File, SizesAndPositions) {
     EXPECT_EQ(VarnekPGL_ReadFile(path.c_str(), buffer, 5), 5);
     EXPECT_EQ(VarnekPGL_GetFileSize(Path("").c_str()), 0) << "a directory has no size";
     EXPECT_THAT(TakeLog(), IsEmpty());
+
+    const std::string large = Path("large");
+    WriteAll(large, "");
+    std::filesystem::resize_file(large, 5LL << 30);
+    EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), 0);
+    const PglFileHandle beyond = VarnekPGL_OpenFile(large.c_str(), PGL_FILE_MODE_READ);
+    if (beyond != -1) {  // a 32-bit system may open no such stream
+        VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_SET);
+        VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_CUR);
+        EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(beyond), -1);
+        EXPECT_EQ(ftell(reinterpret_cast<FILE *>(beyond)), 2L * INT32_MAX);
+        VarnekPGL_CloseFile(beyond);
+    }
 }
 
 TEST_F(File, LogLinesOfThreadsAreCutAndNeverMix) {
@@ -290,6 +303,10 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
          -1,
          {"VarnekPGL_OpenDir : pDir() = NULL", "VarnekPGL_DeleteDirEx : No Eixst Dir! []"}},
         {VarnekPGL_DeleteDirEx(nullptr), -1, {"VarnekPGL_DeleteDirEx : No Eixst Dir! [(null)]"}},
+        {VarnekPGL_ClearDir(tooLong.c_str()),
+         -1,
+         {"VarnekPGL_MakeDir : exceed max file path length : " + tooLong,
+          "VarnekPGL_ClearDir : Directory Creation Fail. Dir Path=[" + tooLong + "]"}},
         {VarnekPGL_ClearDir(none.c_str()),
          -1,
          {openFail, gone, "VarnekPGL_ClearDir : Directory Deletion Fail. Dir Path=[" + none + "]"}},
@@ -359,6 +376,8 @@ TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
         }
         std::filesystem::create_directory_symlink("../outside", tree + "/link");
         std::filesystem::create_symlink("nowhere", tree + "/dangling");
+        // A 32-bit system cannot stat what has such times.
+        ASSERT_EQ(system(("touch -h -d @4102444800 " + tree + "/link").c_str()), 0);
         EXPECT_EQ(VarnekPGL_DeleteDir((tree + suffix).c_str()), 0) << suffix;
         EXPECT_FALSE(std::filesystem::exists(tree));
         EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
@@ -371,6 +390,26 @@ TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
     }
     EXPECT_EQ(VarnekPGL_ClearDir(outside.c_str()), 0);
     EXPECT_TRUE(std::filesystem::is_empty(outside));
+}
+
+TEST_F(Directory, ADirectoryThatIsSwappedForALinkIsNotEntered) {
+    const std::string outside = Path("outside"), inner = Path("tree/inner");
+    std::filesystem::create_directory(outside);
+    WriteAll(outside + "/kept", "kept");
+    for (int i = 0; i < 1000; i++) {
+        std::filesystem::create_directories(inner);
+        std::filesystem::create_directory_symlink(outside, Path("link"));
+        std::thread swapper([&] {
+            rename(inner.c_str(), Path("aside").c_str());
+            rename(Path("link").c_str(), inner.c_str());
+        });
+        VarnekPGL_DeleteDirEx(Path("tree").c_str());
+        swapper.join();
+        ASSERT_EQ(ReadAll(outside + "/kept"), "kept");
+        for (const char *left : {"tree", "aside", "link"}) {
+            std::filesystem::remove_all(Path(left));
+        }
+    }
 }
 
 TEST_F(Directory, WhatCannotBeDeletedStaysAndIsReported) {
@@ -393,6 +432,19 @@ TEST_F(Directory, WhatCannotBeDeletedStaysAndIsReported) {
 }
 
 class Command : public VarnekTest {};
+
+TEST_F(Command, TimesBeyond2038DoNoHarm) {
+    const std::string source = Path("source"), copy = Path("copy");
+    WriteAll(source, "content");
+    ASSERT_EQ(system(("touch -d @4102444800 " + source).c_str()), 0);
+    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), copy.c_str()), 0);
+    EXPECT_EQ(ReadAll(copy), "content");
+    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), (Path("") + "./source").c_str()), -1) << "onto itself";
+    EXPECT_EQ(ReadAll(source), "content");
+    PglFmFileAttributes attributes;
+    EXPECT_TRUE(VarnekPGL_FmGetFileAttributes(source.c_str(), &attributes));
+    EXPECT_EQ(attributes.size, 7u);
+}
 
 TEST_F(Command, AnyPathIsOneWord) {
     const std::filesystem::path home = std::filesystem::current_path();

@@ -42,6 +42,18 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
     EXPECT_TRUE(VarnekPGL_AcquireMutex(299) && VarnekPGL_ReleaseMutex(299));
 }
 
+TEST_F(Semaphore, ALogFunctionMayUseTheFamilyOnceTheLockIsFree) {
+    static int32_t inner = 0;
+    gLogHook = [](const LogLine &line) {
+        if (line.text.find("arrIdx == -1") != std::string::npos) {
+            inner = VarnekPGL_CreateSemaphore("inner", 0);
+        }
+    };
+    EXPECT_FALSE(VarnekPGL_DeleteSemaphore(77));
+    gLogHook = nullptr;
+    EXPECT_EQ(inner, 1);
+}
+
 TEST_F(Mutex, FailuresHaveTheirLineAndResult) {
     const int32_t held = VarnekPGL_CreateMutex("held");
     VarnekPGL_AcquireMutex(held);

@@ -1,5 +1,9 @@
 // Storms: for a second and a half each, threads do to one table at once whatever races could break,
 // and each result is held against what must be true at any moment.
+#include <signal.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
 #include <atomic>
 #include <chrono>
 #include <cstring>
@@ -8,6 +12,7 @@
 #include <random>
 #include <thread>
 
+#include "Varnek_Config.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
 #include "Varnek_Timer.h"
@@ -107,6 +112,40 @@ TEST_F(StormAlone, LookupsDuringCreationsAndDeletions) {
             }
         });
         EXPECT_GT(found, 0) << family.what;
+    }
+}
+
+TEST_F(StormAlone, SavesThatAreKilled) {
+    const std::string path = VARNEK_DATA_DIR "Varnek_Config.cfg";
+    VarnekConfigInfo &info = *VarnekCfg_GetConfigInfo();
+    const auto save = [&info](char letter) {
+        memset(info.currentAreaName, letter, sizeof info.currentAreaName - 1);
+        VarnekCfg_SaveConfigFile();
+    };
+    // Either text, whole.
+    save('a');
+    VarnekCfg_GetSupportNation();
+    save('a');
+    const size_t size = ReadAll(path).size();
+    const auto check = [&path, size] {
+        const std::string text = ReadAll(path);
+        const size_t start = strlen("CONFIG_CURRENTAREANAME=");
+        ASSERT_EQ(text.size(), size) << text;
+        ASSERT_EQ(text.substr(start, 99), std::string(99, text[start]));
+    };
+    std::mt19937 random(1);
+    const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(1500);
+    while (std::chrono::steady_clock::now() < end && !HasFatalFailure()) {
+        const pid_t child = fork();  // of this process's only thread
+        for (char letter = 'a'; child == 0; letter = letter == 'a' ? 'b' : 'a') {
+            save(letter);
+        }
+        for (auto i = random() % 20; i > 0; i--) {
+            check();
+        }
+        kill(child, SIGKILL);
+        waitpid(child, nullptr, 0);
+        check();
     }
 }
 

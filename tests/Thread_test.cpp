@@ -9,6 +9,7 @@
 #include <future>
 #include <thread>
 
+#include "../CommonUtility/source/Varnek_SlotTable.h"
 #include "Varnek_Semaphore.h"
 #include "support/VarnekTest.h"
 
@@ -171,12 +172,63 @@ TEST_F(Thread, AWaitersRecordIsReplacedInAFullTable) {
 TEST_F(Thread, AThreadFindsItselfFirstOfAll) {
     std::atomic<int> missed{0};
     for (int i = 0; i < 2000; i++) {
-        Worker worker([&missed] {
+        Worker worker([&missed, i] {
+            const THREAD_MSG message = {};
             const int32_t byName = VarnekPGL_GetThreadByName("worker");
-            missed += byName == -1 || byName != VarnekPGL_GetCurrentThread();
+            missed += byName == -1 || byName != VarnekPGL_GetCurrentThread() || !VarnekPGL_SendMessage(i + 1, &message);
         });
     }
     EXPECT_EQ(missed, 0);
+}
+
+TEST_F(Thread, AnEndedThreadsSystemIdTellsNothing) {
+    pthread_t ended{};
+    Worker worker([&ended] { ended = pthread_self(); });
+    worker.Wait();
+    for (int i = 0; i < 100; i++) {
+        bool same = false;
+        std::thread([&same, ended] {
+            same = pthread_equal(ended, pthread_self()) != 0;
+            EXPECT_EQ(VarnekPGL_GetCurrentThread(), -1);
+        }).join();
+        if (same) {
+            return;
+        }
+    }
+}
+
+TEST_F(Thread, TheSystemKnowsTheNamesBeginning) {
+    char name[32] = "";
+    Worker worker([&name] { pthread_getname_np(pthread_self(), name, sizeof name); }, "a name of more than 15");
+    worker.Wait();
+    EXPECT_STREQ(name, "a name of more ");
+}
+
+TEST_F(Thread, ALogFunctionGetsNoThreadWhileItsOwnCallMakesTheGuard) {
+    gLogHook = [](const LogLine &line) {
+        if (line.text.find("START : __Varnek_create_mutex") != std::string::npos) {
+            EXPECT_EQ(VarnekPGL_CreateThread("inner", 1, 0, Nothing, nullptr), -1);
+        }
+    };
+    EXPECT_EQ(VarnekPGL_CreateThread("outer", 1, 0, Nothing, nullptr), 1);
+    gLogHook = nullptr;
+    EXPECT_THAT(TakeErrors(), ElementsAre("***** __Varnek_create_thread : Thread Mutex Creation Fail!!",
+                                          "Thread Creation Fail! szThreadName=[inner]\n"));
+}
+
+// A table that has given out all handles but two.
+struct LateTable : SlotTable<int, 3> {
+    LateTable() { given_ = INT32_MAX - 2; }
+};
+
+TEST_F(Thread, HandlesEnd) {
+    static LateTable table;
+    EXPECT_EQ(table.Publish(table.FirstFree(), "a"), INT32_MAX - 1);
+    EXPECT_EQ(table.Publish(table.FirstFree(), "b"), INT32_MAX);
+    EXPECT_EQ(table.FindByHandle(INT32_MAX), 1);
+    EXPECT_EQ(table.FirstFree(), -1);
+    EXPECT_EQ(table.Withdraw(0), 1);
+    EXPECT_EQ(table.FirstFree(), -1) << "no handle is left for a free slot";
 }
 
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {

@@ -45,10 +45,12 @@ VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 // A message is copied in and copied out. A queue is bounded only by memory. What one thread sends
 // with VarnekPGL_SendMessage is received in that order.
 
-// One message of 40 bytes.
+// One message of 40 bytes, aligned to 8, so that modules may lay a record of their own over it. What
+// is in it is up to the modules that communicate; the library copies it as bytes, from and to any
+// address.
 typedef struct THREAD_MSG {
-    unsigned char data[40];  // what the communicating modules agree on; the library only copies it
-} THREAD_MSG;
+    unsigned char data[40];
+} __attribute__((aligned(8))) THREAD_MSG;
 
 // Appends a message to a thread's queue.
 //   returns  TRUE when it is queued and its reader signalled; FALSE for an unknown handle, a null

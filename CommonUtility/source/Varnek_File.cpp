@@ -23,11 +23,10 @@ uint32_t Countable(uint32_t length) {
     return length < INT32_MAX ? length : INT32_MAX;
 }
 
-// The size of a stream's regular file, with all that was written to the stream; -1 for any other
-// file. A 32-bit C library may let the position of a stream wrap at 4 GiB, so it is not asked.
+// The size of a stream's regular file as far as the stream has been flushed; -1 for any other file.
+// The stream's position is not asked: a 32-bit C library may let it wrap at 4 GiB.
 int64_t SizeOfRegularFile(FILE *stream) {
     struct stat64 status = {};
-    fflush(stream);
     return fstat64(fileno(stream), &status) == 0 && S_ISREG(status.st_mode) ? status.st_size : -1;
 }
 
@@ -154,9 +153,11 @@ uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer, ui
 
 int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
-    const int64_t regular = stream != nullptr ? SizeOfRegularFile(stream) : -1;
-    if (regular >= 0) {
-        return regular <= INT32_MAX ? static_cast<int32_t>(regular) : -1;
+    if (stream != nullptr && fflush(stream) == 0) {
+        const int64_t size = SizeOfRegularFile(stream);
+        if (size >= 0) {
+            return size <= INT32_MAX ? static_cast<int32_t>(size) : -1;
+        }
     }
     const int32_t position = VarnekPGL_TellFile(hFile);
     VarnekPGL_SeekFile(hFile, 0, SEEK_END);
@@ -239,9 +240,12 @@ int32_t VarnekPGL_GetFileSize(const char *path) {
         VarnekPGL_CloseFile(file);
         return 0;
     }
-    const int32_t size = VarnekPGL_GetFileSizeByHandle(file);
+    int64_t size = SizeOfRegularFile(StreamOf(file));
+    if (size < 0) {
+        size = VarnekPGL_TellFile(file);
+    }
     VarnekPGL_CloseFile(file);
-    return size > 0 ? size : 0;
+    return size > 0 && size <= INT32_MAX ? static_cast<int32_t>(size) : 0;
 }
 
 BOOL VarnekPGL_CheckFile(const char *path) {

@@ -153,6 +153,8 @@ class SlotTable {
     // hints_[handle % kHints] is the slot at which to look first; the handle found there decides.
     mutable std::atomic<uint8_t> hints_[kHints];
     std::atomic<int32_t> count_;
+
+  protected:
     int32_t given_;  // handles given out so far, 1 to this one; used under the guard only
 };
 

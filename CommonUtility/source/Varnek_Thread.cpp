@@ -25,7 +25,8 @@
 #include "Varnek_Timer.h"
 #include "Varnek_Trace.h"
 
-static_assert(sizeof(THREAD_MSG) == 40, "every module of the stack counts on this size");
+static_assert(sizeof(THREAD_MSG) == 40 && alignof(THREAD_MSG) == 8,
+              "every module of the stack counts on this size and alignment");
 
 namespace {
 

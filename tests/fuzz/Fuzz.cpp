@@ -37,14 +37,13 @@ void CheckTraces(const std::vector<std::string> &expected) {
     CHECK(gTraces == expected);
 }
 
-DataFile::DataFile(const char *name)
-    : fd_(open((VARNEK_DATA_DIR + std::string(name)).c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0666)) {
-    CHECK(fd_ >= 0);
-}
-
 void DataFile::Write(const std::string &content) const {
-    CHECK(pwrite(fd_, content.data(), content.size(), 0) == static_cast<ssize_t>(content.size()));
-    CHECK(ftruncate(fd_, static_cast<off_t>(content.size())) == 0);
+    // Opened each time: a save of the library's puts a new file in place.
+    const int fd = open((VARNEK_DATA_DIR + name_).c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0666);
+    CHECK(fd >= 0);
+    CHECK(write(fd, content.data(), content.size()) == static_cast<ssize_t>(content.size()));
+    CHECK(ftruncate(fd, static_cast<off_t>(content.size())) == 0);
+    close(fd);
 }
 
 int LLVMFuzzerInitialize(int *, char ***) {

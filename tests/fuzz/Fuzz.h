@@ -24,11 +24,11 @@ void CheckTraces(const std::vector<std::string> &expected);
 // than all the rest.
 class DataFile {
   public:
-    explicit DataFile(const char *name);
+    explicit DataFile(const char *name) : name_(name) {}
     void Write(const std::string &content) const;
 
   private:
-    int fd_;
+    const std::string name_;
 };
 
 // The input's bytes in order; zeros behind its end.

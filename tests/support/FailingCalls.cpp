@@ -1,9 +1,11 @@
 #include "support/FailingCalls.h"
 
 #include <dirent.h>
+#include <fcntl.h>
 #include <pthread.h>
 #include <semaphore.h>
 #include <signal.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/time.h>
 #include <time.h>
@@ -111,6 +113,12 @@ WRAP_POSIX(mkdir, (const char *path, mode_t mode), path, mode)
 WRAP(DIR *, nullptr, opendir, (const char *path), path)
 WRAP_POSIX(stat64, (const char *path, struct stat64 *info), path, info)
 WRAP_POSIX(lstat64, (const char *path, struct stat64 *info), path, info)
+WRAP_POSIX(openat, (int directory, const char *path, int flags), directory, path, flags)
+WRAP(DIR *, nullptr, fdopendir, (int fd), fd)
+WRAP_POSIX(unlinkat, (int directory, const char *path, int flags), directory, path, flags)
+WRAP_POSIX(rename, (const char *from, const char *to), from, to)
+WRAP_POSIX(flock, (int fd, int operation), fd, operation)
+WRAP_POSIX(fchmod, (int fd, mode_t mode), fd, mode)
 WRAP_POSIX(access, (const char *path, int mode), path, mode)
 WRAP_POSIX(fsync, (int fd), fd)
 WRAP(int, (__real_close(fd), errno = gCall_close.error, -1), close, (int fd), fd)
