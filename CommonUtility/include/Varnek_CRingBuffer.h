@@ -60,6 +60,8 @@ class VARNEK_API VarnekCRingBuffer {
     int Read(unsigned char *dest, int readLen);
 
   private:
+    friend struct VarnekRingState;  // the library's own
+
     unsigned char *pRingBuf = nullptr;
     int iRingSize = 0;
     int iWritePos = 0;

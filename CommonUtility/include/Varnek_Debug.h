@@ -18,18 +18,21 @@ extern "C" {
 extern VARNEK_API const char *gszVarnekDbgFilePath;
 extern VARNEK_API int32_t gVarnekDbgLineNum;
 
+// Stores both.
+static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
+    __atomic_store_n(&gszVarnekDbgFilePath, path, __ATOMIC_RELAXED);
+    __atomic_store_n(&gVarnekDbgLineNum, line, __ATOMIC_RELAXED);
+}
+
 // Stores the caller's place and traces. `mask` is one VARNEK_LEVEL_ bit with one VARNEK_MODULE_
 // bit; a printf format and its arguments follow. The trace adds no line end.
-#define VARNEK_TRACE(mask, ...)                                               \
-    (__atomic_store_n(&gszVarnekDbgFilePath, &__FILE__[0], __ATOMIC_RELAXED), \
-     __atomic_store_n(&gVarnekDbgLineNum, __LINE__, __ATOMIC_RELAXED),        \
-     VarnekPGL_TraceOut((mask), __VA_ARGS__))
+#define VARNEK_TRACE(mask, ...) \
+    (VarnekDbg_StorePlace(__FILE__, __LINE__), VarnekPGL_TraceOut((mask), __VA_ARGS__))
 
 // Reports that a condition which must hold does not. Returns; the caller goes on with its fallback.
 #define VARNEK_PANIC()                                                        \
-    (VarnekPGL_CheckAndInitDebug(),                                           \
-     __atomic_store_n(&gszVarnekDbgFilePath, &__FILE__[0], __ATOMIC_RELAXED), \
-     __atomic_store_n(&gVarnekDbgLineNum, __LINE__, __ATOMIC_RELAXED), (void)VarnekPGL_Panic())
+    (VarnekPGL_CheckAndInitDebug(), VarnekDbg_StorePlace(__FILE__, __LINE__), \
+     (void)VarnekPGL_Panic())
 
 // Writes one line to the Android log, when the configuration enables it.
 //   mask     level and module; a module of 0 is never written

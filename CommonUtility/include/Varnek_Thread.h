@@ -45,9 +45,9 @@ VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 // A message is copied in and copied out. A queue is bounded only by memory. What one thread sends
 // with VarnekPGL_SendMessage is received in that order.
 
-// One message of 40 bytes, aligned to 8, so that modules may lay a record of their own over it. What
-// is in it is up to the modules that communicate; the library copies it as bytes, from and to any
-// address.
+// One message of 40 bytes, aligned to 8, so that modules may lay a record of their own over it.
+// What is in it is up to the modules that communicate; the library copies it as bytes, from and to
+// any address.
 typedef struct THREAD_MSG {
     unsigned char data[40];
 } __attribute__((aligned(8))) THREAD_MSG;

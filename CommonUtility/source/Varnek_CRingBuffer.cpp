@@ -1,6 +1,5 @@
-// The byte ring. Loop counts wrap around, so the state is told from their difference. A position
-// stays below the size, but for a reader that was set to the end of the storage: its next byte is
-// the first.
+// The byte ring. A position stays below the size, but for a reader that was set to the end of the
+// storage: its next byte is the first.
 #include "Varnek_CRingBuffer.h"
 
 #include <stdio.h>
@@ -9,92 +8,80 @@
 
 #include <atomic>
 
+#include "Varnek_Lock.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Trace.h"
 
+// What the operations ask of a ring and do to it. The caller holds the ring's mutex, if it has one.
+struct VarnekRingState {
+    enum Order {
+        kInOrder,
+        kOverflow,   // the writer has lapped the reader
+        kUnderflow,  // the reader is a lap ahead of the writer, or more
+        kOvertaken,  // the reader is ahead of the writer in one lap
+    };
+
+    // The laps by which the writer is ahead. Loop counts wrap around, their difference does not.
+    static int Ahead(const VarnekCRingBuffer &ring) {
+        return static_cast<int>(static_cast<unsigned int>(ring.iWriteLoopCnt) -
+                                static_cast<unsigned int>(ring.iReadLoopCnt));
+    }
+
+    static Order OrderOf(const VarnekCRingBuffer &ring) {
+        const int ahead = Ahead(ring);
+        if (ahead < 0) {
+            return kUnderflow;
+        }
+        if (ahead == 0) {
+            return ring.iWritePos < ring.iReadPos ? kOvertaken : kInOrder;
+        }
+        return ring.iReadPos < ring.iWritePos ? kOverflow : kInOrder;
+    }
+
+    // The bytes that can be read from a ring in order. A writer that is several laps ahead counts
+    // as one that is one lap ahead.
+    static int Used(const VarnekCRingBuffer &ring) {
+        return ring.iWritePos - ring.iReadPos + (Ahead(ring) > 0 ? ring.iRingSize : 0);
+    }
+
+    // For a query: 0, or the result after its two lines for a state in which no operation should
+    // have left the ring.
+    static int Check(const VarnekCRingBuffer &ring);
+
+    static void Empty(VarnekCRingBuffer *ring) {
+        ring->iWritePos = ring->iReadPos = ring->iWriteLoopCnt = ring->iReadLoopCnt = 0;
+    }
+
+    // Empties a ring that was found in an abnormal state, as Reset does with the ring's own size:
+    // the mutex is released and taken again, and the ring keeps whatever size it has then.
+    static void Recover(VarnekCRingBuffer *ring, HoldMutex *hold);
+
+    // Sets the reader to a position in the writer's lap, or in the one before when the writer has
+    // not come that far.
+    static void SetReader(VarnekCRingBuffer *ring, int pos) {
+        ring->iReadPos = pos;
+        ring->iReadLoopCnt = AddLaps(ring->iWriteLoopCnt, ring->iWritePos < pos ? -1 : 0);
+    }
+
+    static int AddLaps(int laps, int more) {
+        return static_cast<int>(static_cast<unsigned int>(laps) + static_cast<unsigned int>(more));
+    }
+};
+
 namespace {
+
+using State = VarnekRingState;
 
 constexpr int kRefused = -8;
 constexpr int kNoSpace = -10;
 constexpr int kOffsetTooLong = -10;
 constexpr int kNoData = -11;
-constexpr int kOverflow = -32;
-constexpr int kUnderflow = -34;
+constexpr int kOverflowState = -32;
+constexpr int kUnderflowState = -34;
 
 // Numbers the mutex names of the process: a name that came twice would destroy another ring's
 // mutex.
 std::atomic<int32_t> gRingBufCount{0};
-
-// Holds a ring's mutex, if it has one.
-class RingLock {
-  public:
-    explicit RingLock(int32_t hMutex) : hMutex_(hMutex) { Acquire(); }
-    ~RingLock() { Release(); }
-    RingLock(const RingLock &) = delete;
-    RingLock &operator=(const RingLock &) = delete;
-
-    void Acquire() const {
-        if (hMutex_ != -1) {
-            VarnekPGL_AcquireMutex(hMutex_);
-        }
-    }
-    void Release() const {
-        if (hMutex_ != -1) {
-            VarnekPGL_ReleaseMutex(hMutex_);
-        }
-    }
-
-  private:
-    int32_t hMutex_;
-};
-
-// A ring's size, positions and loop counts at one moment.
-struct State {
-    int size;
-    int writePos;
-    int readPos;
-    int writeLaps;
-    int readLaps;
-};
-
-int AddLaps(int laps, int more) {
-    return static_cast<int>(static_cast<unsigned int>(laps) + static_cast<unsigned int>(more));
-}
-
-int LapsAhead(int writeLaps, int readLaps) {
-    return static_cast<int>(static_cast<unsigned int>(writeLaps) -
-                            static_cast<unsigned int>(readLaps));
-}
-
-int ReportAbnormal(const State &s) {
-    TRACE_ERROR("[Abnormal State] reading loop count=[%d], writing loop count=[%d]\n", s.readLaps,
-                s.writeLaps);
-    TRACE_ERROR("[Abnormal State] Reading Position=[%d], Writing Position=[%d]\n", s.readPos,
-                s.writePos);
-    return LapsAhead(s.writeLaps, s.readLaps) > 0 ? kOverflow : kUnderflow;
-}
-
-int SpaceReading(const State &s) {
-    const int ahead = LapsAhead(s.writeLaps, s.readLaps);
-    if (ahead == 0 && s.writePos >= s.readPos) {
-        return s.writePos - s.readPos;
-    }
-    if (ahead == 1 && s.writePos <= s.readPos) {
-        return s.writePos - s.readPos + s.size;
-    }
-    return ReportAbnormal(s);
-}
-
-int SpaceWriting(const State &s) {
-    const int ahead = LapsAhead(s.writeLaps, s.readLaps);
-    if (ahead == 0 && s.readPos <= s.writePos) {
-        return s.readPos - s.writePos + s.size;
-    }
-    if (ahead == 1 && s.readPos >= s.writePos) {
-        return s.readPos - s.writePos;
-    }
-    return ReportAbnormal(s);
-}
 
 // Moves a position on by `length` bytes, at most `size`.
 void Advance(int *pos, int *laps, int length, int size) {
@@ -104,7 +91,7 @@ void Advance(int *pos, int *laps, int length, int size) {
         return;
     }
     *pos = length - tail;
-    *laps = AddLaps(*laps, 1);
+    *laps = State::AddLaps(*laps, 1);
 }
 
 // A null pointer comes with nothing to copy.
@@ -116,12 +103,32 @@ void Copy(unsigned char *to, const unsigned char *from, int count) {
 
 unsigned char *AllocateStorage(int size) {
     unsigned char *storage = static_cast<unsigned char *>(malloc(static_cast<size_t>(size)));
-    return storage != nullptr
-               ? storage
-               : VARNEK_FAIL(storage, "Ring Buffer: Out of memory! size=[%d]\n", size);
+    if (storage == nullptr) {
+        TRACE_ERROR("Ring Buffer: Out of memory! size=[%d]\n", size);
+    }
+    return storage;
 }
 
 }  // namespace
+
+int VarnekRingState::Check(const VarnekCRingBuffer &ring) {
+    const int ahead = Ahead(ring);
+    if (OrderOf(ring) == kInOrder && ahead <= 1) {
+        return 0;
+    }
+    TRACE_ERROR("[Abnormal State] reading loop count=[%d], writing loop count=[%d]\n",
+                ring.iReadLoopCnt, ring.iWriteLoopCnt);
+    TRACE_ERROR("[Abnormal State] Reading Position=[%d], Writing Position=[%d]\n", ring.iReadPos,
+                ring.iWritePos);
+    return ahead > 0 ? kOverflowState : kUnderflowState;
+}
+
+void VarnekRingState::Recover(VarnekCRingBuffer *ring, HoldMutex *hold) {
+    hold->Release();
+    TRACE_MID("Ring Buffer will be reset!!!\n");
+    hold->Acquire();
+    Empty(ring);
+}
 
 VarnekCRingBuffer::VarnekCRingBuffer(int size) {
     if (size <= 0) {
@@ -160,7 +167,7 @@ VarnekCRingBuffer &VarnekCRingBuffer::operator=(const VarnekCRingBuffer &other) 
     }
     pRingBuf = AllocateStorage(iRingSize);
     if (pRingBuf == nullptr) {
-        iWritePos = iReadPos = iWriteLoopCnt = iReadLoopCnt = 0;
+        State::Empty(this);
         iRingSize = 0;
         return *this;
     }
@@ -182,8 +189,8 @@ int VarnekCRingBuffer::Reset(int size) {
         return VARNEK_FAIL(kRefused, "Invalid Ring Size! size=[%d]\n", size);
     }
     TRACE_MID("Ring Buffer will be reset!!!\n");
-    const RingLock lock(hRingMutex);
-    iWritePos = iReadPos = iWriteLoopCnt = iReadLoopCnt = 0;
+    const HoldMutex hold(hRingMutex);
+    State::Empty(this);
     if (size == iRingSize) {
         return 0;
     }
@@ -195,13 +202,13 @@ int VarnekCRingBuffer::Reset(int size) {
 
 int VarnekCRingBuffer::Flush() {
     TRACE_MID("Ring Buffer will be flushed!!!\n");
-    const RingLock lock(hRingMutex);
-    iWritePos = iReadPos = iWriteLoopCnt = iReadLoopCnt = 0;
+    const HoldMutex hold(hRingMutex);
+    State::Empty(this);
     return 0;
 }
 
 int VarnekCRingBuffer::Seek(int aOffset, int origin) {
-    const RingLock lock(hRingMutex);
+    const HoldMutex hold(hRingMutex);
     const bool possible = aOffset >= 0 && pRingBuf != nullptr;
     switch (origin) {
         case SEEK_SET:
@@ -209,26 +216,21 @@ int VarnekCRingBuffer::Seek(int aOffset, int origin) {
                 TRACE_HIGH("[SEEK_SET] Too long offset. aOffset=[%d]\n", aOffset);
                 return kOffsetTooLong;
             }
-            iReadPos = aOffset;
-            iReadLoopCnt = AddLaps(iWriteLoopCnt, iWritePos < iReadPos ? -1 : 0);
+            State::SetReader(this, aOffset);
             return 0;
-        case SEEK_CUR: {
-            const int readable =
-                SpaceReading({iRingSize, iWritePos, iReadPos, iWriteLoopCnt, iReadLoopCnt});
-            if (!possible || aOffset > readable) {
+        case SEEK_CUR:
+            if (State::Check(*this) != 0 || !possible || aOffset > State::Used(*this)) {
                 TRACE_HIGH("[SEEK_CUR] Too long offset. aOffset=[%d]\n", aOffset);
                 return kOffsetTooLong;
             }
             Advance(&iReadPos, &iReadLoopCnt, aOffset, iRingSize);
             return 0;
-        }
         case SEEK_END:
             if (!possible || aOffset > iRingSize) {
                 TRACE_HIGH("[SEEK_END] Too long offset. aOffset=[%d]\n", aOffset);
                 return kOffsetTooLong;
             }
-            iReadPos = iWritePos - aOffset + (aOffset > iWritePos ? iRingSize : 0);
-            iReadLoopCnt = AddLaps(iWriteLoopCnt, iWritePos < iReadPos ? -1 : 0);
+            State::SetReader(this, iWritePos - aOffset + (aOffset > iWritePos ? iRingSize : 0));
             return 0;
         default:
             return VARNEK_FAIL(kRefused, "Invalid origin value=[%d]\n", origin);
@@ -236,43 +238,31 @@ int VarnekCRingBuffer::Seek(int aOffset, int origin) {
 }
 
 int VarnekCRingBuffer::GetSpaceReading() const {
-    const RingLock lock(hRingMutex);
-    return SpaceReading({iRingSize, iWritePos, iReadPos, iWriteLoopCnt, iReadLoopCnt});
+    const HoldMutex hold(hRingMutex);
+    const int abnormal = State::Check(*this);
+    return abnormal != 0 ? abnormal : State::Used(*this);
 }
 
 int VarnekCRingBuffer::GetSpaceWriting() const {
-    const RingLock lock(hRingMutex);
-    return SpaceWriting({iRingSize, iWritePos, iReadPos, iWriteLoopCnt, iReadLoopCnt});
+    const HoldMutex hold(hRingMutex);
+    const int abnormal = State::Check(*this);
+    return abnormal != 0 ? abnormal : iRingSize - State::Used(*this);
 }
 
 int VarnekCRingBuffer::GetDistance() const {
-    const RingLock lock(hRingMutex);
+    const HoldMutex hold(hRingMutex);
     if (iRingSize == 0) {
         return 0;
     }
-    // In 64 bits: a hundred times the fill level of a large ring.
+    // In 64 bits: a hundred times the fill level of a large ring. Every lap counts here.
     const int64_t distance =
-        static_cast<int64_t>(LapsAhead(iWriteLoopCnt, iReadLoopCnt)) * iRingSize + iWritePos -
-        iReadPos;
+        static_cast<int64_t>(State::Ahead(*this)) * iRingSize + iWritePos - iReadPos;
     const int64_t percent = distance * 100 / iRingSize;
     return static_cast<int>(distance < 0 ? percent - 1 : percent);
 }
 
-namespace {
-
-// Empties a ring that was found in an abnormal state, as Reset does with the ring's own size: the
-// lock is given back and taken afresh, and whatever size the ring has then it keeps.
-void Recover(const RingLock &lock, int *writePos, int *readPos, int *writeLaps, int *readLaps) {
-    lock.Release();
-    TRACE_MID("Ring Buffer will be reset!!!\n");
-    lock.Acquire();
-    *writePos = *readPos = *writeLaps = *readLaps = 0;
-}
-
-}  // namespace
-
 int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
-    const RingLock lock(hRingMutex);
+    HoldMutex hold(hRingMutex);
     if (writelen < 0 || writelen > iRingSize || pRingBuf == nullptr) {
         return VARNEK_FAIL(kRefused, "Too long writelen=[%d]! Ring buffer size=[%d]\n", writelen,
                            iRingSize);
@@ -281,26 +271,26 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
         VARNEK_PANIC();
         return kRefused;
     }
-    const int ahead = LapsAhead(iWriteLoopCnt, iReadLoopCnt);
-    if (ahead > 0 && iReadPos < iWritePos) {
-        TRACE_ERROR(
-            "[Abnormal Sate] Ring Buffer is already overflowed! This data will be discarded\n");
-        Recover(lock, &iWritePos, &iReadPos, &iWriteLoopCnt, &iReadLoopCnt);
-        return kNoSpace;
+    switch (State::OrderOf(*this)) {
+        case State::kInOrder:
+            break;
+        case State::kOverflow:
+            TRACE_ERROR(
+                "[Abnormal Sate] Ring Buffer is already overflowed! This data will be discarded\n");
+            State::Recover(this, &hold);
+            return kNoSpace;
+        case State::kUnderflow:
+            TRACE_ERROR(
+                "[Abnormal State] Invalid Ring Buffer State! Underflow! This data will be "
+                "discarded!\n");
+            State::Recover(this, &hold);
+            return kNoData;
+        case State::kOvertaken:
+            // On purpose not emptied here; the next read does that.
+            return VARNEK_FAIL(
+                kNoData, "Invalid Ring Buffer State! Underflow! This data will be discarded!\n");
     }
-    if (ahead < 0) {
-        TRACE_ERROR(
-            "[Abnormal State] Invalid Ring Buffer State! Underflow! This data will be "
-            "discarded!\n");
-        Recover(lock, &iWritePos, &iReadPos, &iWriteLoopCnt, &iReadLoopCnt);
-        return kNoData;
-    }
-    if (ahead == 0 && iWritePos < iReadPos) {
-        // On purpose not emptied here; the next read does that.
-        return VARNEK_FAIL(kNoData,
-                           "Invalid Ring Buffer State! Underflow! This data will be discarded!\n");
-    }
-    const int space = iReadPos - iWritePos + (ahead == 0 ? iRingSize : 0);
+    const int space = iRingSize - State::Used(*this);
     if (space < writelen) {
         return VARNEK_FAIL(
             kNoSpace,
@@ -316,7 +306,7 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
 }
 
 int VarnekCRingBuffer::Read(unsigned char *dest, int readLen) {
-    const RingLock lock(hRingMutex);
+    HoldMutex hold(hRingMutex);
     if (readLen < 0 || readLen > iRingSize) {
         return VARNEK_FAIL(kRefused, "Too long readLen=[%d]! Ring buffer size=[%d]\n", readLen,
                            iRingSize);
@@ -325,26 +315,26 @@ int VarnekCRingBuffer::Read(unsigned char *dest, int readLen) {
         VARNEK_PANIC();
         return kRefused;
     }
-    const int ahead = LapsAhead(iWriteLoopCnt, iReadLoopCnt);
-    if (ahead > 0 && iReadPos < iWritePos) {
-        TRACE_ERROR("Abnormal Sate!! Buffer Already Overflow!\n");
-        Recover(lock, &iWritePos, &iReadPos, &iWriteLoopCnt, &iReadLoopCnt);
-        return kNoSpace;
+    switch (State::OrderOf(*this)) {
+        case State::kInOrder:
+            break;
+        case State::kOverflow:
+            TRACE_ERROR("Abnormal Sate!! Buffer Already Overflow!\n");
+            State::Recover(this, &hold);
+            return kNoSpace;
+        case State::kUnderflow:
+            TRACE_ERROR("Abnormal Sate!! Buffer Already Overflow!\n");
+            State::Recover(this, &hold);
+            return kNoData;
+        case State::kOvertaken:
+            TRACE_ERROR("Abnormal Sate!! Buffer Already Underflow!\n");
+            State::Recover(this, &hold);
+            return kNoData;
     }
-    if (ahead < 0) {
-        TRACE_ERROR("Abnormal Sate!! Buffer Already Overflow!\n");
-        Recover(lock, &iWritePos, &iReadPos, &iWriteLoopCnt, &iReadLoopCnt);
-        return kNoData;
-    }
-    if (ahead == 0 && iWritePos == iReadPos) {
+    if (iReadPos == iWritePos && iReadLoopCnt == iWriteLoopCnt) {
         return VARNEK_FAIL(kNoData, "No reading data!\n");
     }
-    if (ahead == 0 && iWritePos < iReadPos) {
-        TRACE_ERROR("Abnormal Sate!! Buffer Already Underflow!\n");
-        Recover(lock, &iWritePos, &iReadPos, &iWriteLoopCnt, &iReadLoopCnt);
-        return kNoData;
-    }
-    const int available = iWritePos - iReadPos + (ahead == 0 ? 0 : iRingSize);
+    const int available = State::Used(*this);
     if (available < readLen) {
         return VARNEK_FAIL(kNoData,
                            "Not enough reading buffer space. readLen=[%d], readiing buf=[%d]!\n",

@@ -14,15 +14,18 @@ void InsertBefore(list_t *list, list_node_t *next, void *data) {
     }
     list_node_t *prev = next != nullptr ? next->prev : list->tail;
     *node = {data, prev, next};
-    (prev != nullptr ? prev->next : list->head) = node;
-    (next != nullptr ? next->prev : list->tail) = node;
+    list_node_t **forward = prev != nullptr ? &prev->next : &list->head;
+    list_node_t **backward = next != nullptr ? &next->prev : &list->tail;
+    *forward = *backward = node;
     list->count++;
 }
 
 // Unlinks a node of the list, frees it and hands back its data.
 void *Unlink(list_t *list, list_node_t *node) {
-    (node->prev != nullptr ? node->prev->next : list->head) = node->next;
-    (node->next != nullptr ? node->next->prev : list->tail) = node->prev;
+    list_node_t **forward = node->prev != nullptr ? &node->prev->next : &list->head;
+    list_node_t **backward = node->next != nullptr ? &node->next->prev : &list->tail;
+    *forward = node->next;
+    *backward = node->prev;
     list->count--;
     void *data = node->data;
     free(node);

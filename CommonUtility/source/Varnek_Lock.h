@@ -51,8 +51,9 @@ class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
     bool held_ = false;
 };
 
-// Holds a named mutex to the end of the scope, or up to its release. An object without a mutex
-// (kNoMutex) is not held, and neither is one whose mutex the system refuses; IsHeld says so.
+// Holds a named mutex to the end of the scope, or up to its release; nothing for an object without
+// a mutex (kNoMutex). IsHeld says whether the mutex could be taken; one that could not is released
+// all the same, so that the log has the lines of both calls.
 class HoldMutex {
   public:
     static constexpr int32_t kNoMutex = -1;
@@ -63,16 +64,20 @@ class HoldMutex {
     HoldMutex &operator=(const HoldMutex &) = delete;
 
     bool IsHeld() const { return held_; }
-    void Acquire() { held_ = hMutex_ != kNoMutex && VarnekPGL_AcquireMutex(hMutex_) != FALSE; }
+    void Acquire() {
+        tried_ = hMutex_ != kNoMutex;
+        held_ = tried_ && VarnekPGL_AcquireMutex(hMutex_) != FALSE;
+    }
     void Release() {
-        if (held_) {
-            held_ = false;
+        if (tried_) {
             VarnekPGL_ReleaseMutex(hMutex_);
         }
+        tried_ = held_ = false;
     }
 
   private:
     const int32_t hMutex_;
+    bool tried_ = false;
     bool held_ = false;
 };
 

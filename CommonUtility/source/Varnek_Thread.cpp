@@ -220,8 +220,8 @@ void __Varnek_delete_thread_info(int32_t hThread) {
     RemoveRecord(hThread, __func__, VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON);
 }
 
-// Where every thread of the registry starts. The creator holds the guard until the record is visible,
-// so a thread that does not see its record yet waits for the guard.
+// Where every thread of the registry starts. The creator holds the guard until the record is
+// visible, so a thread that does not see its record yet waits for the guard.
 void *ThreadEntry(void *begin) {
     const Start start = *static_cast<Start *>(begin);
     free(begin);

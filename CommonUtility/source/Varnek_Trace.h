@@ -30,11 +30,10 @@ inline bool TraceIsOff(uint32_t mask) {
 #ifdef __OPTIMIZE_SIZE__
 #define TRACE_LOW_QUICK TRACE_LOW
 #else
-#define TRACE_LOW_QUICK(...)                                                  \
-    (__atomic_store_n(&gszVarnekDbgFilePath, &__FILE__[0], __ATOMIC_RELAXED), \
-     __atomic_store_n(&gVarnekDbgLineNum, __LINE__, __ATOMIC_RELAXED),        \
-     TraceIsOff(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON)                      \
-         ? (void)0                                                            \
+#define TRACE_LOW_QUICK(...)                             \
+    (VarnekDbg_StorePlace(__FILE__, __LINE__),           \
+     TraceIsOff(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON) \
+         ? (void)0                                       \
          : VarnekPGL_TraceOut(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON, __VA_ARGS__))
 #endif
 
