@@ -27,7 +27,7 @@ VarnekCDateTime ToRecord(uint32_t seconds) {
 }
 
 tm ToTm(uint32_t seconds) {
-    const time_t time = seconds;
+    const time_t time = static_cast<time_t>(seconds);
     tm broken = {};
     gmtime_r(&time, &broken);
     return broken;

@@ -1,9 +1,12 @@
-# 32-bit ARM Linux (armv7, hard float) with Debian's cross compiler; what it builds runs under qemu-user.
+# 32-bit ARM Linux (armv7, hard float) with Debian's cross compiler, or with the one that a preset names;
+# what it builds runs under qemu-user.
 # Pointer size, time_t, alignment and plain char are those of the device.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR arm)
-set(CMAKE_C_COMPILER arm-linux-gnueabihf-gcc)
-set(CMAKE_CXX_COMPILER arm-linux-gnueabihf-g++)
+if(NOT CMAKE_CXX_COMPILER)
+    set(CMAKE_C_COMPILER arm-linux-gnueabihf-gcc)
+    set(CMAKE_CXX_COMPILER arm-linux-gnueabihf-g++)
+endif()
 # No word on every container of the C++ library whose passing an old g++ got wrong.
 set(CMAKE_CXX_FLAGS_INIT -Wno-psabi)
 set(CMAKE_CROSSCOMPILING_EMULATOR qemu-arm -L /usr/arm-linux-gnueabihf)

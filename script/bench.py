@@ -32,7 +32,7 @@ ROWS = [
         ('boost', 'boost::crc', None), ('limit', 'limit: 16 tables inlined', 1.1)),
     *[Row(f'crc/{n}', 'crc', f'CRC-32, {n} bytes', ('av_crc', 'av_crc', 0.55), ('dvbpsi', 'libdvbpsi', 0.2),
           ('boost', 'boost::crc', 0.2), ('limit', 'limit: 16 tables inlined', 1.1)) for n in (184, 1024, 4096)],
-    Row('bits', 'bits', 'bit fields of PSI, 1020 bytes', ('gstreamer', 'gst_bit_reader', 0.8),
+    Row('bits', 'bits', '1200 bit fields of PSI', ('gstreamer', 'gst_bit_reader', 0.8),
         ('limit', 'limit: checked reader', 1.5)),
     Row('ring/one', 'ring', 'ring, 188 bytes in and out', ('boost', 'circular_buffer', 0.5),
         ('jack', 'JACK, no lock', None), ('limit', 'limit: memcpy, mutex', 1.8)),

@@ -56,6 +56,9 @@ class VARNEK_API VarnekCBitInputStream {
     int RwindToFirst();
 
   private:
+    template <typename Value, unsigned int most>
+    Value Read(int count, unsigned char &success);
+
     unsigned char bCopied = 0;
     unsigned char bEndOfStream = 1;
     int iCurByteIdx = 0;

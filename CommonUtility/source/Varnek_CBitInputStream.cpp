@@ -1,6 +1,6 @@
-// The bit input stream. A field within the current byte, and one that four more bytes follow, is
-// taken as a whole; the others go piece by piece through GetBits, which is the only place where the
-// end is found.
+// The bit input stream. A field within the current byte is taken from ucCurByte, and one that
+// leaves it from the buffer, as long as five bytes are left. The others go piece by piece through
+// GetBits, which is the only place where the end is found.
 #include "Varnek_CBitInputStream.h"
 
 #include <limits.h>
@@ -10,6 +10,12 @@
 
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
+
+// Values of bEndOfStream. Inside a byte that a rewind loaded afresh, ucCurByte is not what the
+// buffer and the bit index give, so fields go piece by piece until the byte is left.
+static constexpr unsigned char kReading = 0;
+static constexpr unsigned char kAtEnd = 1;
+static constexpr unsigned char kRewound = 2;
 
 static unsigned char *CopyOf(const unsigned char *source, unsigned int length) {
     unsigned char *copy = new (std::nothrow) unsigned char[length];
@@ -33,7 +39,7 @@ VarnekCBitInputStream::VarnekCBitInputStream(unsigned char *source, unsigned int
         return;
     }
     bCopied = copyMode == 1 ? 1 : 0;
-    bEndOfStream = 0;
+    bEndOfStream = kReading;
     uiBufLen = reachable;
     ucCurByte = pBuffer[0];
 }
@@ -62,7 +68,7 @@ VarnekCBitInputStream &VarnekCBitInputStream::operator=(const VarnekCBitInputStr
     pBuffer = CopyOf(other.pBuffer, uiBufLen);
     if (pBuffer == nullptr) {
         bCopied = 0;
-        bEndOfStream = 1;
+        bEndOfStream = kAtEnd;
         iCurByteIdx = 0;
         uiBufLen = 0;
         ucCurByte = 0;
@@ -85,7 +91,7 @@ unsigned int VarnekCBitInputStream::GetBits(int aNum, unsigned char &success) {
         success = 0;
         return 0;
     }
-    if (bEndOfStream == 1) {
+    if (bEndOfStream == kAtEnd) {
         TRACE_HIGH("BIS: GetBits Warning: End of Stream!\n");
         success = 0;
         return 0;
@@ -102,75 +108,84 @@ unsigned int VarnekCBitInputStream::GetBits(int aNum, unsigned char &success) {
         return value;
     }
     if (static_cast<unsigned int>(iCurByteIdx) == uiBufLen - 1) {
-        bEndOfStream = 1;
+        bEndOfStream = kAtEnd;
         return value;
     }
     ucCurByte = pBuffer[++iCurByteIdx];
     iBitIdxInCurByte = 0;
+    bEndOfStream = kReading;
     return value;
 }
 
+// A field of `width` bits where the current byte has `left`. Kept out of line and called last, so
+// that the other fields need no registers saved.
+template <typename Value>
+__attribute__((noinline, cold)) static Value ReadByPieces(VarnekCBitInputStream &stream, int left,
+                                                          int width, unsigned char &success) {
+    unsigned int value = stream.GetBits(width < left ? width : left, success);
+    for (width -= left; width > 8; width -= 8) {
+        value = value << 8 | stream.GetBits(8, success);
+    }
+    if (width > 0) {
+        value = value << width | stream.GetBits(width, success);
+    }
+    return static_cast<Value>(value);
+}
+
+// Inlined into each of the reads, since a table is thousands of short fields.
+template <typename Value, unsigned int most>
+__attribute__((always_inline)) inline Value VarnekCBitInputStream::Read(int count,
+                                                                        unsigned char &success) {
+    const unsigned int width = static_cast<unsigned int>(count);
+    if (__builtin_expect(width > most || bEndOfStream != kReading, 0)) {
+        if (width > most || bEndOfStream == kAtEnd) {
+            success = 0;
+            return 0;
+        }
+        return ReadByPieces<Value>(*this, 8 - iBitIdxInCurByte, count, success);
+    }
+    const unsigned int begin = static_cast<unsigned int>(iBitIdxInCurByte);
+    const unsigned int end = begin + width;
+    if (end < 8) {
+        const unsigned int current = ucCurByte;
+        ucCurByte = static_cast<unsigned char>(current << width);
+        iBitIdxInCurByte = static_cast<int>(end);
+        return static_cast<Value>(current >> (8 - width));
+    }
+    if (__builtin_expect(uiBufLen - static_cast<unsigned int>(iCurByteIdx) <= 4, 0)) {
+        return ReadByPieces<Value>(*this, 8 - iBitIdxInCurByte, count, success);
+    }
+    const unsigned char *const from = pBuffer + iCurByteIdx;
+    const uint32_t word = BigEndian(from);
+    iCurByteIdx += static_cast<int>(end / 8);
+    iBitIdxInCurByte = static_cast<int>(end % 8);
+    const uint32_t value = word << begin >> (32 - width);
+    if constexpr (most <= 16) {
+        ucCurByte = static_cast<unsigned char>(word << end >> 24);
+        return static_cast<Value>(value);
+    }
+    ucCurByte = static_cast<unsigned char>(from[end / 8] << (end % 8));
+    return static_cast<Value>(end <= 32 ? value : value | from[4] >> (40 - end));
+}
+
 unsigned int VarnekCBitInputStream::ReadBit(unsigned char &success) {
-    return ReadInt(1, success);
+    return Read<unsigned int, 1>(1, success);
 }
 
 unsigned char VarnekCBitInputStream::ReadByte(int count, unsigned char &success) {
-    if (count > 8) {
-        success = 0;
-        return 0;
-    }
-    return static_cast<unsigned char>(ReadInt(count, success));
+    return Read<unsigned char, 8>(count, success);
 }
 
 unsigned short VarnekCBitInputStream::ReadShort(int count, unsigned char &success) {
-    if (count > 16) {
-        success = 0;
-        return 0;
-    }
-    return static_cast<unsigned short>(ReadInt(count, success));
-}
-
-// The `left` bits of the current byte and `rest` more. Kept out of line, so that the other fields
-// need no registers saved.
-__attribute__((noinline)) static unsigned int ReadByPieces(VarnekCBitInputStream &stream, int left,
-                                                           unsigned int rest,
-                                                           unsigned char &success) {
-    unsigned int value = stream.GetBits(left, success);
-    for (; rest > 8; rest -= 8) {
-        value = value << 8 | stream.GetBits(8, success);
-    }
-    return rest > 0 ? value << rest | stream.GetBits(static_cast<int>(rest), success) : value;
+    return Read<unsigned short, 16>(count, success);
 }
 
 unsigned int VarnekCBitInputStream::ReadInt(int count, unsigned char &success) {
-    if (count < 0 || count > 32 || bEndOfStream == 1) {
-        success = 0;
-        return 0;
-    }
-    const int left = 8 - iBitIdxInCurByte;
-    if (count < left) {
-        const unsigned int value = static_cast<unsigned int>(ucCurByte) >> (8 - count);
-        ucCurByte = static_cast<unsigned char>(ucCurByte << count);
-        iBitIdxInCurByte += count;
-        return value;
-    }
-    const unsigned int rest = static_cast<unsigned int>(count - left);
-    const unsigned int next = static_cast<unsigned int>(iCurByteIdx) + 1;
-    if (next + sizeof(uint32_t) <= uiBufLen) {
-        // After a rewind from inside a byte, ucCurByte is not what the buffer and the bit index
-        // give. `rest` may be 0, which no shift by 32 - rest allows.
-        const unsigned int begun = static_cast<unsigned int>(ucCurByte) >> iBitIdxInCurByte;
-        const unsigned int value = begun << rest | BigEndian(pBuffer + next) >> 1 >> (31 - rest);
-        iCurByteIdx = static_cast<int>(next + rest / 8);
-        iBitIdxInCurByte = static_cast<int>(rest % 8);
-        ucCurByte = static_cast<unsigned char>(pBuffer[iCurByteIdx] << iBitIdxInCurByte);
-        return value;
-    }
-    return ReadByPieces(*this, left, rest, success);
+    return Read<unsigned int, 32>(count, success);
 }
 
 int VarnekCBitInputStream::GetByteArray(unsigned char *dest, int count) {
-    if (bEndOfStream == 1) {
+    if (bEndOfStream == kAtEnd) {
         return -22;
     }
     if (iBitIdxInCurByte != 0) {
@@ -186,7 +201,7 @@ int VarnekCBitInputStream::GetByteArray(unsigned char *dest, int count) {
     iCurByteIdx += count;
     iBitIdxInCurByte = 0;
     if (count == remaining) {
-        bEndOfStream = 1;
+        bEndOfStream = kAtEnd;
         return 0;
     }
     ucCurByte = pBuffer[iCurByteIdx];
@@ -194,7 +209,7 @@ int VarnekCBitInputStream::GetByteArray(unsigned char *dest, int count) {
 }
 
 void VarnekCBitInputStream::Skip(int count) {
-    if (count == 0 || bEndOfStream == 1) {
+    if (count == 0 || bEndOfStream == kAtEnd) {
         return;
     }
     unsigned char ignored = 1;
@@ -212,6 +227,7 @@ void VarnekCBitInputStream::Skip(int count) {
     } else {
         iCurByteIdx += static_cast<int>(jump);
         iBitIdxInCurByte = 0;
+        bEndOfStream = kReading;
         ucCurByte = pBuffer[iCurByteIdx];
         rest -= (jump - 1) * 8;
     }
@@ -222,15 +238,15 @@ void VarnekCBitInputStream::Skip(int count) {
 }
 
 int VarnekCBitInputStream::RewindBytes(int count) {
-    const int64_t from = bEndOfStream == 1 ? static_cast<int64_t>(uiBufLen) : iCurByteIdx;
+    const int64_t from = bEndOfStream == kAtEnd ? static_cast<int64_t>(uiBufLen) : iCurByteIdx;
     const int64_t target = from - count;
     if (target < 0 || target >= static_cast<int64_t>(uiBufLen)) {
         return 0;
     }
-    if (bEndOfStream == 1) {
-        bEndOfStream = 0;
+    if (bEndOfStream == kAtEnd) {
         iBitIdxInCurByte = 0;
     }
+    bEndOfStream = iBitIdxInCurByte == 0 ? kReading : kRewound;
     iCurByteIdx = static_cast<int>(target);
     ucCurByte = pBuffer[iCurByteIdx];
     return 0;
@@ -240,7 +256,7 @@ int VarnekCBitInputStream::RwindToFirst() {
     if (pBuffer == nullptr) {
         return 0;
     }
-    bEndOfStream = 0;
+    bEndOfStream = kReading;
     iCurByteIdx = 0;
     ucCurByte = pBuffer[0];
     iBitIdxInCurByte = 0;

@@ -45,7 +45,7 @@ constexpr Latin15Table MakeLatin15Table() {
 constexpr Latin15Table gWmLatin15CodeTable = MakeLatin15Table();
 
 // The unit of a byte; 0 for a control character, which has none.
-unsigned int UnitOf(unsigned char byte) {
+constexpr unsigned int UnitOf(unsigned char byte) {
     if (byte >= kFirstUpper) {
         return gWmLatin15CodeTable.row[byte - kFirstUpper].unicode;
     }
@@ -53,7 +53,7 @@ unsigned int UnitOf(unsigned char byte) {
 }
 
 // Appends the UTF-8 of a unit, one to three bytes. Returns where they end.
-char *PutUtf8(char *out, unsigned int unit) {
+constexpr char *PutUtf8(char *out, unsigned int unit) {
     if (unit < 0x80) {
         *out++ = static_cast<char>(unit);
     } else if (unit < 0x800) {
@@ -67,28 +67,67 @@ char *PutUtf8(char *out, unsigned int unit) {
     return out;
 }
 
-// Whether eight bytes are plain characters, 0x20 to 0x7E, which are the same in Latin-15 and UTF-8:
-// no top bit is set, before or after 0x20 is taken off or 1 is added in each byte.
-bool ArePlain(uint64_t bytes) {
-    constexpr uint64_t kOnes = 0x0101010101010101u;
-    return ((bytes | (bytes - 0x20 * kOnes) | (bytes + kOnes)) & 0x80 * kOnes) == 0;
+// Of four bytes, the first in the lowest place, marks those that are not plain characters: 0x20 to
+// 0x7E are the same in Latin-15 and UTF-8, and no top bit of theirs is set, before or after 0x20 is
+// taken off or 1 is added. What one byte carries over to the next cannot reach below the first
+// mark.
+uint32_t MarkOthers(uint32_t four) {
+    constexpr uint32_t kOnes = 0x01010101u;
+    return (four | (four - 0x20 * kOnes) | (four + kOnes)) & 0x80 * kOnes;
 }
 
-// Converts `length` bytes straight to UTF-8, for which there is room. Returns where that ends.
-char *PutLatin15(char *out, const char *text, size_t length) {
-    for (size_t i = 0; i < length;) {
-        uint64_t eight = 0;
-        if (length - i >= sizeof eight) {
-            memcpy(&eight, text + i, sizeof eight);
+// The UTF-8 of a Latin-15 byte: its bytes, the first in the lowest place, and in the highest how
+// many there are, which is none for a control character.
+struct Utf8Table {
+    uint32_t of[0x100];
+};
+
+constexpr Utf8Table MakeUtf8Table() {
+    Utf8Table table = {};
+    for (unsigned int byte = 0; byte <= 0xFF; ++byte) {
+        const unsigned int unit = UnitOf(static_cast<unsigned char>(byte));
+        char utf8[3] = {};
+        const long count = unit != 0 ? PutUtf8(utf8, unit) - utf8 : 0;
+        for (int i = 2; i >= 0; --i) {
+            table.of[byte] = table.of[byte] << 8 | static_cast<unsigned char>(utf8[i]);
         }
-        if (ArePlain(eight)) {
-            memcpy(out, &eight, sizeof eight);
-            out += sizeof eight;
-            i += sizeof eight;
-            continue;
+        table.of[byte] |= static_cast<uint32_t>(count) << 24;
+    }
+    return table;
+}
+
+constexpr Utf8Table kUtf8 = MakeUtf8Table();
+
+// Writes the UTF-8 of a byte, and whatever lies behind it, into four bytes. Returns where it ends.
+char *PutLatin15(char *out, unsigned char byte) {
+    const uint32_t utf8 = kUtf8.of[byte];
+    const uint32_t stored = LittleEndian(utf8);
+    memcpy(out, &stored, sizeof stored);
+    return out + (utf8 >> 24);
+}
+
+// Converts `length` bytes straight to UTF-8, for which there is room: three bytes for each, and one
+// more. Plain characters go four at a time. Returns where the output ends.
+char *PutLatin15(char *out, const unsigned char *in, size_t length) {
+    const unsigned char *const end = in + length;
+    while (end - in >= 4) {
+        uint32_t others = 0;
+        do {
+            const uint32_t loaded = Load(in);
+            memcpy(out, &loaded, sizeof loaded);
+            others = MarkOthers(LittleEndian(loaded));
+            in += sizeof loaded;
+            out += sizeof loaded;
+        } while (others == 0 && end - in >= 4);
+        if (others != 0) {
+            const int beyond = 4 - __builtin_ctz(others) / 8;
+            const unsigned char *const other = in - beyond;
+            in = other + 1;
+            out = PutLatin15(out - beyond, *other);
         }
-        const unsigned int unit = UnitOf(static_cast<unsigned char>(text[i++]));
-        out = unit != 0 ? PutUtf8(out, unit) : out;
+    }
+    while (in != end) {
+        out = PutLatin15(out, *in++);
     }
     return out;
 }
@@ -318,7 +357,7 @@ static BOOL ConvertWithin(char *utf8, char **outputData, const char *szInput, si
         return FALSE;
     }
     // Both steps at once, without the units in between.
-    char *end = PutLatin15(utf8, szInput, length);
+    char *end = PutLatin15(utf8, reinterpret_cast<const unsigned char *>(szInput), length);
     *end = '\0';
     TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: Convert String => %s !\n", utf8);
     const size_t textlen = static_cast<size_t>(end - utf8);

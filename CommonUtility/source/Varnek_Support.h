@@ -51,6 +51,18 @@ inline uint32_t BigEndian(const unsigned char *p) {
            static_cast<uint32_t>(p[2]) << 8 | p[3];
 }
 
+// Four bytes, the least significant first, from the machine's order or into it.
+inline uint32_t LittleEndian(uint32_t word) {
+    return __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? word : __builtin_bswap32(word);
+}
+
+// Four bytes as the machine loads them, wherever they lie.
+inline uint32_t Load(const unsigned char *p) {
+    uint32_t word = 0;
+    memcpy(&word, p, sizeof word);
+    return word;
+}
+
 // Seconds as the system takes them: where its own have 32 bits, those after 2038 are its last one.
 inline time_t SystemSeconds(int64_t seconds) {
     constexpr time_t kLast = std::numeric_limits<time_t>::max();

@@ -127,18 +127,21 @@ int32_t VarnekPGL_GetTimezoneOffset() {
 }
 
 uint32_t VarnekPGL_DateTimeToSeconds(const VarnekCDateTime *dt) {
-    if (dt == nullptr || dt->iYear < kFirstYear || dt->iYear > kLastYear) {
+    if (dt == nullptr) {
         return 0;
     }
-    if (dt->iMonth < 1 || dt->iMonth > 12) {
+    const uint32_t year = static_cast<uint32_t>(dt->iYear) - kFirstYear;
+    const uint32_t month = static_cast<uint32_t>(dt->iMonth) - 1;
+    if (year > kLastYear - kFirstYear || month > 11) {
         return 0;
     }
-    int32_t before = dt->iYear * 365 + (dt->iYear - 1901) / 4 + kCommonMonths[dt->iMonth - 1];
-    // In a leap year's later months the leap day has passed.
-    before -= dt->iYear % 4 != 0 || dt->iMonth <= 2 ? 719067 : 719066;
-    const uint32_t days = static_cast<uint32_t>(before) + static_cast<uint32_t>(dt->iDay);
-    return days * kDay + static_cast<uint32_t>(dt->iHour) * 3600 +
-           static_cast<uint32_t>(dt->iMinute) * 60 + static_cast<uint32_t>(dt->iSecond);
+    // The third year has the first leap day, which has passed from March on.
+    const uint32_t leapDays = (year + (month >= 2 ? 2 : 1)) / 4;
+    const uint32_t days = year * 365 + leapDays + static_cast<uint32_t>(kCommonMonths[month]) +
+                          static_cast<uint32_t>(dt->iDay);
+    const uint32_t minutes =
+        (days * 24 + static_cast<uint32_t>(dt->iHour)) * 60 + static_cast<uint32_t>(dt->iMinute);
+    return minutes * 60 + static_cast<uint32_t>(dt->iSecond);
 }
 
 BOOL VarnekPGL_SecondsToDataTime(uint32_t seconds, VarnekCDateTime *dt) {

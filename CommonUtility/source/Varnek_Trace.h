@@ -25,17 +25,12 @@ inline bool TraceIsOff(uint32_t mask) {
 #define TRACE_LOW(...) VARNEK_TRACE(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON, __VA_ARGS__)
 
 // TRACE_LOW for operations that are called often. The place is stored as ever, but the call is left
-// out when it would write nothing, and with it the arguments' way to the stack and back. A build
-// for size does without.
-#ifdef __OPTIMIZE_SIZE__
-#define TRACE_LOW_QUICK TRACE_LOW
-#else
+// out when it would write nothing, and with it the arguments' way to the stack and back.
 #define TRACE_LOW_QUICK(...)                             \
     (VarnekDbg_StorePlace(__FILE__, __LINE__),           \
      TraceIsOff(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON) \
          ? (void)0                                       \
          : VarnekPGL_TraceOut(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON, __VA_ARGS__))
-#endif
 
 // One row of a failure table: traces the Error line and is the result. The `return` stays with the
 // caller.

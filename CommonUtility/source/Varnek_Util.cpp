@@ -1,6 +1,7 @@
-// CRC-32 over memory, sections and stored files. The register takes 16 bytes a step through 16
-// tables where there is room for them, then 4, then single bytes; bytes are combined by value, so
-// neither the byte order of the machine nor the alignment of the data matters.
+// CRC-32 over memory, sections and stored files. The register takes the bytes of a step through as
+// many tables, 16 where there is room for them, then 4, then single ones. It is held with its bytes
+// reversed, the first in the lowest place: so a little-endian machine takes a word of data as it
+// lies. Bytes are combined by value, so neither byte order nor alignment matters to the result.
 #include "Varnek_Util.h"
 
 #include <stdlib.h>
@@ -17,41 +18,37 @@ constexpr uint32_t kInitial = 0xFFFFFFFFu;
 constexpr int32_t kTrailer = 4;     // bytes of a stored CRC
 constexpr int32_t kMinPayload = 4;  // bytes that a stored CRC covers at least
 
-// A table is 1 KiB. On the 32-bit target 16 would be half of the first cache and a quarter of the
-// library, for sections of a few hundred bytes at a megabyte or two a second.
-constexpr int kTables = sizeof(void *) == 8 ? 16 : 1;
+// A table is 1 KiB. On the 32-bit target 16 would be half of the first cache, for sections of a few
+// hundred bytes at a megabyte or two a second.
+constexpr bool kWide = sizeof(void *) == 8;
 
-// word[n][i] is the register after byte i in its top 8 bits and n more bytes of 0.
-struct CrcTables {
-    uint32_t word[kTables][256];
+// word[i] is the register, reversed, after byte i and some more bytes of 0.
+struct CrcTable {
+    uint32_t word[256];
 };
 
-constexpr CrcTables MakeCrcTables() {
-    CrcTables tables = {};
+constexpr CrcTable MakeCrcTable(int zeros) {
+    CrcTable table = {};
     for (uint32_t i = 0; i < 256; ++i) {
         uint32_t crc = i << 24;
-        for (int bit = 0; bit < 8; ++bit) {
+        for (int bit = 0; bit < 8 * (1 + zeros); ++bit) {
             crc = (crc << 1) ^ ((crc >> 31) != 0 ? kPolynomial : 0);
         }
-        tables.word[0][i] = crc;
+        table.word[i] = __builtin_bswap32(crc);
     }
-    for (int n = 1; n < kTables; ++n) {
-        for (int i = 0; i < 256; ++i) {
-            const uint32_t crc = tables.word[n - 1][i];
-            tables.word[n][i] = (crc << 8) ^ tables.word[0][crc >> 24];
-        }
-    }
-    return tables;
+    return table;
 }
 
-constexpr CrcTables kCrc = MakeCrcTables();
-static_assert(kCrc.word[0][1] == 0x04C11DB7u && kCrc.word[0][255] == 0xB1F740B4u);
+// Objects of their own, so that the address of each stays in a register.
+template <int zeros>
+constexpr CrcTable kCrc = MakeCrcTable(zeros);
+static_assert(kCrc<0>.word[1] == 0xB71DC104u && kCrc<0>.word[255] == 0xB440F7B1u);
 
-// The register after `word` and `n` more bytes of 0.
-template <int n>
-uint32_t Shifted(uint32_t word) {
-    return kCrc.word[n + 3][word >> 24] ^ kCrc.word[n + 2][word >> 16 & 0xFF] ^
-           kCrc.word[n + 1][word >> 8 & 0xFF] ^ kCrc.word[n][word & 0xFF];
+// The register, reversed, after the four bytes of `word` and `zeros` bytes of 0.
+template <int zeros>
+uint32_t After(uint32_t word) {
+    return kCrc<zeros + 3>.word[word & 0xFF] ^ kCrc<zeros + 2>.word[word >> 8 & 0xFF] ^
+           kCrc<zeros + 1>.word[word >> 16 & 0xFF] ^ kCrc<zeros>.word[word >> 24];
 }
 
 // The whole file in a block that the caller frees, or null after the trace.
@@ -73,19 +70,21 @@ uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t length) {
         return kInitial;
     }
     uint32_t crc = kInitial;
-    if constexpr (kTables >= 16) {
-        for (; length >= 16; length -= 16, data += 16) {
-            crc = Shifted<12>(crc ^ BigEndian(data)) ^ Shifted<8>(BigEndian(data + 4)) ^
-                  Shifted<4>(BigEndian(data + 8)) ^ Shifted<0>(BigEndian(data + 12));
-        }
-        for (; length >= 4; length -= 4, data += 4) {
-            crc = Shifted<0>(crc ^ BigEndian(data));
+    const unsigned char *const end = data + length;
+    if constexpr (kWide) {
+        for (const unsigned char *const stop = end - length % 16; data != stop; data += 16) {
+            crc = After<12>(crc ^ LittleEndian(Load(data))) ^
+                  After<8>(LittleEndian(Load(data + 4))) ^ After<4>(LittleEndian(Load(data + 8))) ^
+                  After<0>(LittleEndian(Load(data + 12)));
         }
     }
-    for (; length > 0; --length, ++data) {
-        crc = kCrc.word[0][*data ^ crc >> 24] ^ crc << 8;
+    for (const unsigned char *const stop = end - length % 4; data != stop; data += 4) {
+        crc = After<0>(crc ^ LittleEndian(Load(data)));
     }
-    return crc;
+    for (; data != end; ++data) {
+        crc = kCrc<0>.word[(*data ^ crc) & 0xFF] ^ crc >> 8;
+    }
+    return __builtin_bswap32(crc);
 }
 
 BOOL VarnekUtil_CheckSectionCRC32(const unsigned char *section) {
