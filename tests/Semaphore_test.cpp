@@ -1,5 +1,7 @@
 #include "Varnek_Semaphore.h"
 
+#include <semaphore.h>
+
 #include <chrono>
 #include <thread>
 
@@ -159,7 +161,7 @@ TEST_F(Semaphore, FailuresHaveTheirLineAndResult) {
         {VarnekPGL_WaitSemaphore(0, WAIT_FOREVER), FALSE, {lookup + "0"}},
         {VarnekPGL_SignalSemaphore(9), FALSE, {"VarnekPGL_SignalSemaphore: arrIdx == -1, 9"}},
         {VarnekPGL_SemaphoreByName(nullptr), -1, {}},
-        {VarnekPGL_CreateSemaphore("brimful", 0x7FFFFFFF), 1, {}},
+        {VarnekPGL_CreateSemaphore("brimful", SEM_VALUE_MAX), 1, {}},
         {VarnekPGL_SignalSemaphore(1), FALSE, {"VarnekPGL_SignalSemaphore: retSem != 0, errCode = [75]"}},
         {VarnekPGL_DeleteSemaphore(1), TRUE, {}},
     });

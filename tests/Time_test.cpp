@@ -165,8 +165,17 @@ TEST_F(Time, NullRecordsAreReported) {
 
 }  // namespace
 
+// As the C library declares it.
+#ifdef __GLIBC__
+using ZonePointer = void *;
+#define CLOCK_NOEXCEPT noexcept
+#else
+using ZonePointer = struct timezone *;
+#define CLOCK_NOEXCEPT
+#endif
+
 // The process's clock, for the library too. -2 is a clock that cannot be read.
-extern "C" int gettimeofday(timeval *out, void *) noexcept {
+extern "C" int gettimeofday(timeval *out, ZonePointer) CLOCK_NOEXCEPT {
     timespec now = {};
     clock_gettime(CLOCK_REALTIME, &now);
     out->tv_sec = gNow != -1 ? gNow : now.tv_sec;
@@ -174,7 +183,7 @@ extern "C" int gettimeofday(timeval *out, void *) noexcept {
     return gNow == -2 ? -1 : 0;
 }
 
-extern "C" time_t time(time_t *out) noexcept {
+extern "C" time_t time(time_t *out) CLOCK_NOEXCEPT {
     timeval now = {};
     gettimeofday(&now, nullptr);
     return out != nullptr ? *out = now.tv_sec : now.tv_sec;

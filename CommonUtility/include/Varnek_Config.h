@@ -30,11 +30,15 @@ VARNEK_API VarnekConfigInfo *VarnekCfg_GetConfigInfo(void);
 
 // Loads the file. Keys match without case and anywhere in a line; lines beyond 254 characters and
 // values beyond 99 are cut, numbers beyond 32 bits are the nearest that fits, and the switches take
-// a number's low 8 bits. A file that cannot be opened or read leaves the record as it is.
+// a number's low 8 bits. A file that cannot be opened or read leaves the record as it is, and so
+// does one that is no regular file or larger than 1 MiB.
 VARNEK_API void VarnekCfg_LoadConfigFile(void);
 
-// Writes the record over the file; the data directory must exist. A failure is traced. The file's
-// old content is gone once writing has begun.
+// Saves the record; the data directory must exist. A failure is traced. The new text is written
+// beside the file ("Varnek_Config.new"), flushed to the medium and renamed into place with the mode
+// of the old file: a reader finds the old text or the new one, whenever the process is killed.
+// Where that cannot be (no room or no permission for a second file; a link, another user's file or
+// no regular file in its place), the file itself is emptied and written.
 VARNEK_API void VarnekCfg_SaveConfigFile(void);
 
 // Sets the standard type, and saves when it is another one.

@@ -12,9 +12,10 @@
 extern "C" {
 #endif
 
-// Where the code that traces next stands. Every caller stores both before a trace or a panic
+// The place of the code that traces next. Every caller stores both before a trace or a panic
 // report; VARNEK_TRACE does so. When two threads trace at once, a line may show the other thread's
-// place.
+// place: so a path must stay readable as long as the process lives. A module that traces is never
+// unloaded; its makers link it with -Wl,-z,nodelete, as this library is.
 extern VARNEK_API const char *gszVarnekDbgFilePath;
 extern VARNEK_API int32_t gVarnekDbgLineNum;
 

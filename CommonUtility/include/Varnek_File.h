@@ -163,9 +163,10 @@ typedef struct PglFmFileAttributes {
 //   returns  0; -1 on failure, an existing directory included
 VARNEK_API int32_t VarnekPGL_MakeDir(const char *path);
 
-// Deletes a directory tree, going on past entries that cannot be deleted. Links are removed, never
-// followed. An entry whose path would exceed 256 characters is left, with a log line, and so is
-// what a listing does not reach. Both names do the same.
+// Deletes a directory tree, going on past entries that cannot be deleted. Links are removed and
+// never followed, not even one that takes a directory's place meanwhile. An open descriptor is
+// needed for each level. An entry whose path would exceed 256 characters is left, with a log line,
+// and so is what a listing does not reach. Both names do the same.
 //   path     one final slash or backslash is ignored
 //   returns  0 when the directory and its contents are gone, -1 otherwise
 VARNEK_API int32_t VarnekPGL_DeleteDirEx(const char *path);
@@ -173,7 +174,9 @@ VARNEK_API int32_t VarnekPGL_DeleteDir(const char *path);
 
 // Deletes a directory tree and makes the directory again. A link to a directory is replaced by a
 // new directory; what it led to stays as it is.
-//   returns  0, or -1; a directory that does not exist is not created
+//   returns  0, or -1; a directory that does not exist is not created, and one whose path is too
+//   long
+//            to be created again keeps its content
 VARNEK_API int32_t VarnekPGL_ClearDir(const char *path);
 
 // Opens a directory.
@@ -200,15 +203,18 @@ VARNEK_API BOOL VarnekPGL_CheckDir(const char *path);
 VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttributes *attr);
 
 // Commands ---------------------------------------------------------------------------------------
-// These run a shell command. Any path is safe: one that is not made of plain characters is quoted.
-// A command of 532 bytes or more (512 for the permissions) is refused.
+// These run a shell command; the shell finds cat, mv and chmod by PATH. Any path is safe: one that
+// is not made of plain characters is quoted. A command of 532 bytes or more (512 for the
+// permissions) is refused. In a process that ignores SIGCHLD, or in which another thread waits for
+// every child, a command's status is lost: it is carried out, and the result is -1 all the same.
 
 // Copies a file's content over another file's. A source that cannot be read, or that is the
 // destination itself, is refused and the destination keeps its content.
 //   returns  0, or -1
 VARNEK_API int32_t VarnekPGL_CopyFile(const char *source, const char *destination);
 
-// Moves or renames a file, over another file's place included.
+// Moves or renames a file, over another file's place included. A directory as destination takes the
+// file in under its own name.
 //   returns  0, or -1
 VARNEK_API int32_t VarnekPGL_MoveFile(const char *source, const char *destination);
 

@@ -4,7 +4,8 @@
 // semaphores count apart. Names have 1 to 31 characters and compare exactly; two live objects have
 // one name only when two threads create them at the same moment. Any thread may call any operation,
 // and no call is needed to set the tables up. A failure is traced at Error. A time-out and a name
-// that is not found are no failures, and nothing is traced for them.
+// that is not found are no failures, and nothing is traced for them. After 2147483647 creations a
+// family has no handle left, and its creations fail.
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H
 
@@ -15,7 +16,8 @@ extern "C" {
 #endif
 
 // Mutexes ----------------------------------------------------------------------------------------
-// Not recursive. A mutex is deleted only when no thread can still acquire or release it.
+// Not recursive. A mutex is deleted only when no thread can still acquire or release it. The names
+// "VarnekThreadMutex" and "VarnekRingBuf" with a number are the library's own.
 
 // Creates a mutex. A live mutex of this name is deleted first; when a thread holds that one, the
 // creation fails and it stays.
@@ -41,7 +43,7 @@ VARNEK_API int32_t VarnekPGL_GetMutexByName(const char *szMutexName);
 // Semaphores -------------------------------------------------------------------------------------
 // A semaphore is deleted only when no thread waits on it or can still signal it.
 
-// Creates a semaphore. A live semaphore of this name is deleted first.
+// Creates a semaphore. A live semaphore of this name is deleted first, whatever the count is.
 //   szSemName  1 to 31 characters
 //   count      units at the start, at most what the system's semaphores hold
 //   returns    the handle; -1 for a bad name, a full table or a failing OS call

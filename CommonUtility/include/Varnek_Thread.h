@@ -4,7 +4,8 @@
 // reached, and never stops, joins or cancels it. A thread must not be cancelled inside a call of
 // this library. 20 records; names have 1 to 31 characters, compare exactly and are unique, unless
 // two threads create one at the same moment. Any thread may call any operation. A failure is traced
-// at Error; a name that is not found is no failure.
+// at Error; a name that is not found is no failure. The named mutex "VarnekThreadMutex" is the
+// registry's own.
 #ifndef VARNEK_THREAD_H
 #define VARNEK_THREAD_H
 
@@ -16,20 +17,23 @@ extern "C" {
 
 // Threads ----------------------------------------------------------------------------------------
 
-// Starts a thread, which may use its record and queue from its first instruction on. A record of
-// this name is removed first, its unread messages freed; that thread runs on without a record.
+// Starts a thread. Its record is visible before `function` runs, and the first 15 characters of its
+// name are the thread's name in the system. A record of this name is removed first, whatever the
+// other arguments are, and its unread messages are freed; that thread runs on without a record.
 //   szThreadName  1 to 31 characters
 //   priority      1 to 99, kept for the scheduler's policy, which is the ordinary one
 //   stackSize     bytes; what the system refuses gives its default size
 //   function      runs in the new thread; its result is dropped
 //   argument      handed to `function` unchanged
-//   returns       the handle, never given out twice; -1 on failure
+//   returns       the handle, never given out twice; -1 on failure, and for good after 2147483647
+//                 creations
 VARNEK_API int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t priority,
                                           uint32_t stackSize, void *(*function)(void *),
                                           void *argument);
 
-// Removes a thread's record and frees its unread messages. The thread runs on; if it waits in a
-// receive, that returns FALSE.
+// Removes a thread's record and frees its unread messages: what they point to is not freed. Other
+// creations and deletions wait meanwhile (0.26 s for ten million messages on a PC). The thread runs
+// on; if it waits in a receive, that returns FALSE.
 //   returns  TRUE, or FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 
@@ -37,8 +41,10 @@ VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 //   returns  the handle of the thread of this name; -1 for none and for null
 VARNEK_API int32_t VarnekPGL_GetThreadByName(const char *szThreadName);
 
-// Who am I.
-//   returns  the calling thread's handle; -1, after an Error line, when it has no record
+// Tells which thread of the registry the calling thread is.
+//   returns  the calling thread's handle; -1, after an Error line, when the registry has not
+//   started
+//            it (as for main and timer callbacks) or its record has been removed
 VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 
 // Messages ---------------------------------------------------------------------------------------

@@ -13,30 +13,39 @@
 extern "C" {
 #endif
 
-// What a timer calls. Runs on a thread of the OS timer service, with no lock held; callbacks of
-// several timers may run at once. A callback may use its own timer, start it again included.
+// What a timer calls. Runs on a thread of the OS timer service, with no lock held; callbacks may
+// run at once, those of one timer included. A callback may use its own timer, start it again
+// included. It may begin after its timer has been cancelled or deleted, when the expiry came first:
+// `pUserData` should be a number, a handle, or memory that outlives the timer.
 typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 
 // Takes the lowest free slot; no OS timer exists before the first start.
 //   returns  the handle; -1 for null, a name that is too long or in use, or a full table
 VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 
-// Arms the timer once.
+// Arms the timer once. A start that succeeds and is neither cancelled nor deleted in time calls
+// back exactly once, with its own `callback` and `userData`, never before its time and at worst
+// late: an expiry that the system has not delivered when the timer is started again is not lost.
+// One exception: when the system can make no thread for an expiry, nothing is logged, and the call
+// comes with the timer's next expiry.
 //   timer     handle from VarnekPGL_CreateTimer
-//   timeout   milliseconds from now on the wall clock, 1 or more
+//   timeout   milliseconds from now, 1 or more; a step of the wall clock does not move it
 //   callback  called once at the expiry
-//   userData  handed to `callback` unchanged; both stay until the next start
+//   userData  handed to `callback` unchanged
 //   returns   TRUE when armed; FALSE for an unknown handle, an armed timer, a null callback, a time
-//             of 0 or a failing OS call
+//             of 0, a failing OS call or, while an earlier expiry is not delivered yet, too little
+//             memory
 VARNEK_API BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc callback,
                                      void *userData);
 
-// Disarms the timer. An expiry at the same moment may still call back.
+// Disarms the timer: the last start does not call back unless it has expired by now. An expiry of
+// an earlier start that is not delivered yet still calls back.
 //   returns  TRUE when it is disarmed now, with an Error line when it was already; FALSE for an
 //            unknown handle, a timer never started or a failing OS call
 VARNEK_API BOOL VarnekPGL_CancelTimer(uint32_t timer);
 
-// Frees the slot, disarming the timer. An expiry at the same moment may still call back.
+// Frees the slot and disarms the timer. A callback of an expiry at the same moment may begin after
+// the return; expiries that are not delivered yet are dropped.
 //   returns  TRUE, whatever the OS says; FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteTimer(uint32_t timer);
 
