@@ -14,9 +14,11 @@
 #include "BroadcastText.h"
 #include "BroadcastTime.h"
 #include "Demultiplexer.h"
+#include "JsonReport.h"
 #include "PacketSource.h"
-#include "Presentation.h"
+#include "Summary.h"
 #include "Tables.h"
+#include "TransportStream.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
 #include "Varnek_Util.h"
@@ -489,7 +491,7 @@ TEST(Receiver, KeepsWhatApplies) {
 }
 
 TEST(Receiver, ReadsTheSample) {
-    const std::string expected = ReadAll(VARNEK_SAMPLE_REPORT);
+    const std::string expected = ReadAll(VARNEK_EXPECTED_REPORT);
     EXPECT_EQ(ToJson(ReadStream(Sample())), expected);
     EXPECT_EQ(ToJson(ReadStream(Sample(), 1)), expected);
     const std::string summary = ToSummary(ReadStream(Sample()));

@@ -1,7 +1,7 @@
 // Packets are written a block at a time, since each write of the library is a system call.
 #include "Capture.h"
 
-#include "PacketSource.h"
+#include "TransportStream.h"
 #include "Varnek_File.h"
 
 namespace receiver {

@@ -4,15 +4,13 @@
 
 #include <utility>
 
-#include "Ids.h"
-#include "PacketSource.h"
 #include "Tables.h"
+#include "TransportStream.h"
 #include "Varnek_Util.h"
 
 namespace receiver {
 namespace {
 
-constexpr size_t kPidCount = 8192;
 constexpr size_t kSmallestCheckedSection = 7;  // a header and a CRC
 
 // Time and date, running status, stuffing and discontinuity information end without a CRC.
@@ -35,9 +33,9 @@ struct Demultiplexer::Header {
 };
 
 Demultiplexer::Demultiplexer(Handler handler)
-    : handler_(std::move(handler)), continuity_(kPidCount), names_(kPidCount) {
+    : handler_(std::move(handler)), continuity_(kPidCount), uses_(kPidCount) {
     for (const uint16_t pid : kTablePids) {
-        AddName(pid);
+        AddUse(pid);
     }
 }
 
@@ -53,11 +51,11 @@ void Demultiplexer::Push(const unsigned char *packet) {
     if (header.pid == kPidNull || header.reserved) {
         return;
     }
-    const Order order = Follow(header);
+    const Order order = CheckContinuity(header);
     if (order == Order::kBroken) {
         ++counters_.continuity_errors;
     }
-    if (!Follows(header.pid) || order == Order::kRepeated) {
+    if (!CarriesTables(header.pid) || order == Order::kRepeated) {
         return;
     }
     SectionAssembler &assembler = assemblers_.find(header.pid)->second;
@@ -100,7 +98,7 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
 
 // Where a packet stands behind the latest one of its PID. Only a payload moves the counter on; a
 // packet with one may be sent twice, and a counter may jump where the packet announces it.
-Demultiplexer::Order Demultiplexer::Follow(const Header &header) {
+Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header) {
     Continuity &state = continuity_[header.pid];
     const Continuity before = state;
     state = {header.counter, header.has_payload};
@@ -128,15 +126,15 @@ void Demultiplexer::OnSection(uint16_t pid, const unsigned char *section, size_t
     ++counters_.good;
     ++counters_.tables[table_id];
     if (pid == kPidPat && table_id == kTablePat) {
-        FollowPat(section, size);
+        UpdatePmtPids(section, size);
     }
     handler_(pid, section, size);
 }
 
-// A PID that the PAT no longer names may carry anything, so its assembler goes. New names come
+// A PID that the PAT no longer names may carry anything, so its assembler goes. New uses come
 // before old ones go: a repeated PAT must not disturb the section in progress on a PID that it
 // keeps.
-void Demultiplexer::FollowPat(const unsigned char *section, size_t size) {
+void Demultiplexer::UpdatePmtPids(const unsigned char *section, size_t size) {
     Pat pat;
     SectionHeader header{};
     if (!ParsePat(section, size, header, pat)) {
@@ -145,25 +143,25 @@ void Demultiplexer::FollowPat(const unsigned char *section, size_t size) {
     std::vector<uint16_t> pids;
     for (const Program &program : pat) {
         pids.push_back(program.pmt_pid);
-        AddName(program.pmt_pid);
+        AddUse(program.pmt_pid);
     }
     pids.swap(pat_sections_[header.number]);
-    RemoveNames(pids);
+    RemoveUses(pids);
     const auto beyond = pat_sections_.upper_bound(header.last);
     for (auto it = beyond; it != pat_sections_.end(); ++it) {
-        RemoveNames(it->second);
+        RemoveUses(it->second);
     }
     pat_sections_.erase(beyond, pat_sections_.end());
 }
 
-void Demultiplexer::AddName(uint16_t pid) {
-    ++names_[pid];
+void Demultiplexer::AddUse(uint16_t pid) {
+    ++uses_[pid];
     assemblers_[pid];
 }
 
-void Demultiplexer::RemoveNames(const std::vector<uint16_t> &pids) {
+void Demultiplexer::RemoveUses(const std::vector<uint16_t> &pids) {
     for (const uint16_t pid : pids) {
-        if (--names_[pid] == 0) {
+        if (--uses_[pid] == 0) {
             assemblers_.erase(pid);
         }
     }

@@ -34,8 +34,8 @@ class Demultiplexer {
     // Takes the 188 bytes of the stream's next packet.
     void Push(const unsigned char *packet);
 
-    // Whether sections are taken from this PID at this point of the stream.
-    bool Follows(uint16_t pid) const { return names_[pid] != 0; }
+    // Whether this PID carries tables at this point of the stream.
+    bool CarriesTables(uint16_t pid) const { return uses_[pid] != 0; }
 
     const DemultiplexerCounters &Counters() const { return counters_; }
 
@@ -48,17 +48,17 @@ class Demultiplexer {
     enum class Order { kNext, kRepeated, kBroken, kRestarted };
 
     static Header ParseHeader(const unsigned char *packet);
-    Order Follow(const Header &header);
+    Order CheckContinuity(const Header &header);
     void OnSection(uint16_t pid, const unsigned char *section, size_t size);
-    void FollowPat(const unsigned char *section, size_t size);
-    void AddName(uint16_t pid);
-    void RemoveNames(const std::vector<uint16_t> &pids);
+    void UpdatePmtPids(const unsigned char *section, size_t size);
+    void AddUse(uint16_t pid);
+    void RemoveUses(const std::vector<uint16_t> &pids);
 
     Handler handler_;
     DemultiplexerCounters counters_;
     std::vector<Continuity> continuity_;                     // one for each PID
-    std::map<uint16_t, SectionAssembler> assemblers_;        // by PID, where names_ is not 0
-    std::vector<unsigned> names_;                            // for each PID, fixed and PAT entries
+    std::map<uint16_t, SectionAssembler> assemblers_;        // by PID, where uses_ is not 0
+    std::vector<unsigned> uses_;                             // for each PID, fixed and PAT entries
     std::map<uint8_t, std::vector<uint16_t>> pat_sections_;  // PMT PIDs, by section_number
 };
 

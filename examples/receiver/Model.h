@@ -1,4 +1,4 @@
-// What the tables of a stream say: the parser fills it, the presentation shows it. Only what
+// What the tables of a stream say: the parser fills it, the report shows it. Only what
 // applies now and to this stream is kept, except for events, where other streams' fill in.
 #ifndef RECEIVER_MODEL_H
 #define RECEIVER_MODEL_H
@@ -8,6 +8,7 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -38,6 +39,14 @@ struct ServiceInfo {  // an SDT entry
     std::optional<uint8_t> type;
     Name provider;
     Name name;
+};
+
+struct EventKey {
+    uint16_t service_id;
+    uint16_t event_id;
+    bool operator<(const EventKey &other) const {
+        return std::tie(service_id, event_id) < std::tie(other.service_id, other.event_id);
+    }
 };
 
 struct Event {
@@ -85,9 +94,9 @@ struct Model {
     std::vector<LocalOffset> local_offsets;
     Sections<std::vector<Program>> pat;
     Sections<std::vector<ServiceInfo>> sdt;
-    std::map<uint16_t, ProgramMap> pmts;                    // by service_id
-    std::map<std::pair<uint16_t, uint16_t>, Event> events;  // by service_id and event_id
-    uint64_t events_left_out = 0;                           // for lack of room
+    std::map<uint16_t, ProgramMap> pmts;  // by service_id
+    std::map<EventKey, Event> events;
+    uint64_t events_left_out = 0;  // for lack of room
 };
 
 }  // namespace receiver

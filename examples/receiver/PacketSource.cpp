@@ -2,6 +2,8 @@
 // by byte, with a bounded look ahead. Both only move forward, so any input takes linear time.
 #include "PacketSource.h"
 
+#include "TransportStream.h"
+
 namespace receiver {
 namespace {
 

@@ -10,14 +10,6 @@
 
 namespace receiver {
 
-constexpr size_t kPacketSize = 188;
-
-// The PID of a packet.
-inline uint16_t PidOf(const unsigned char *packet) {
-    return static_cast<uint16_t>((packet[1] & 0x1F) << 8 | packet[2]);
-}
-constexpr unsigned char kSyncByte = 0x47;
-
 struct PacketCounters {
     uint64_t bytes = 0;        // all that was fed
     uint64_t packets = 0;      // whole ones; a packet that the end of the stream cuts is none

@@ -21,6 +21,7 @@
 #include "PacketSource.h"
 #include "Progress.h"
 #include "Tables.h"
+#include "TransportStream.h"
 #include "Varnek_CRingBuffer.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
@@ -181,7 +182,7 @@ void RunDemultiplexer(Pipeline &pipeline) {
         for (size_t at = 0; at < message.length; at += kPacketSize) {
             const unsigned char *packet = packets.data() + at;
             demultiplexer.Push(packet);
-            if (capture != nullptr && demultiplexer.Follows(PidOf(packet))) {
+            if (capture != nullptr && demultiplexer.CarriesTables(PidOf(packet))) {
                 capture->Push(packet);
             }
         }

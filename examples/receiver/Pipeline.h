@@ -7,7 +7,7 @@
 #include <string>
 
 #include "Capture.h"
-#include "Presentation.h"
+#include "Report.h"
 #include "StreamFile.h"
 
 namespace receiver {

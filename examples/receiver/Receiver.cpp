@@ -1,4 +1,4 @@
-// The command line, then the pipeline over the file, then the presentation of what it found.
+// The command line, then the pipeline over the file, then the report on what it found.
 #include "Receiver.h"
 
 #include <unistd.h>
@@ -8,9 +8,10 @@
 #include <system_error>
 
 #include "BroadcastText.h"
+#include "JsonReport.h"
 #include "Pipeline.h"
-#include "Presentation.h"
 #include "StreamFile.h"
+#include "Summary.h"
 #include "Varnek_Config.h"
 
 namespace receiver {

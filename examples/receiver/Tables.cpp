@@ -6,7 +6,7 @@
 
 #include "BroadcastText.h"
 #include "BroadcastTime.h"
-#include "Ids.h"
+#include "TransportStream.h"
 
 namespace receiver {
 namespace {
@@ -216,7 +216,7 @@ void TableParser::OnEit(uint8_t table_id, const SectionHeader &header, FieldRead
 // The latest wins, but another stream's account of an event never replaces this stream's own, and a
 // section without the name leaves it.
 void TableParser::KeepEvent(uint16_t service_id, uint16_t event_id, Event event) {
-    const std::pair<uint16_t, uint16_t> key{service_id, event_id};
+    const EventKey key{service_id, event_id};
     const auto found = model_.events.find(key);
     if (found == model_.events.end()) {
         if (model_.events.size() < Model::kMostEvents) {

@@ -7,9 +7,11 @@
 
 #include "Demultiplexer.h"
 #include "Fuzz.h"
+#include "JsonReport.h"
 #include "PacketSource.h"
-#include "Presentation.h"
+#include "Summary.h"
 #include "Tables.h"
+#include "TransportStream.h"
 #include "Varnek_Util.h"
 
 namespace {

@@ -1,22 +1,16 @@
-// Joins the tables into services and events, then writes them out, once for people and once for
-// programs. Nothing here changes what was read.
-#include "Presentation.h"
+// Joins the parts of a report and writes them for people: lines of bounded width, names as the
+// stream gives them.
+#include "Summary.h"
 
 #include <algorithm>
-#include <cstdarg>
-#include <cstdio>
+#include <iterator>
+#include <map>
+#include <vector>
 
-#include "Ids.h"
-#include "JsonWriter.h"
+#include "TransportStream.h"
 
 namespace receiver {
 namespace {
-
-struct Service {
-    std::optional<uint16_t> pmt_pid;
-    const ServiceInfo *info = nullptr;  // null without an SDT entry
-    const ProgramMap *map = nullptr;    // null without a PMT
-};
 
 struct Named {
     uint8_t value;
@@ -56,18 +50,6 @@ constexpr Named kTables[] = {
 constexpr size_t kEventsShown = 12;
 constexpr size_t kLineWidth = 100;
 
-std::string Format(const char *format, ...) __attribute__((format(printf, 1, 2)));
-
-// For short texts of bounded size; names are appended as they are.
-std::string Format(const char *format, ...) {
-    char text[160];
-    va_list arguments;
-    va_start(arguments, format);
-    std::vsnprintf(text, sizeof text, format, arguments);
-    va_end(arguments);
-    return text;
-}
-
 template <size_t Count>
 const char *NameOf(const Named (&names)[Count], uint8_t value) {
     const auto found = std::find_if(std::begin(names), std::end(names),
@@ -84,50 +66,6 @@ std::string NameOfComponent(const Component &component) {
     return name != nullptr ? name : Format("stream type 0x%02X", component.stream_type);
 }
 
-// Services that the PAT or the SDT names, by service_id. A PMT counts only when it came where the
-// PAT says.
-std::map<uint16_t, Service> JoinServices(const Model &model) {
-    std::map<uint16_t, Service> services;
-    for (const auto &section : model.pat) {
-        for (const Program &program : section.second) {
-            services[program.service_id].pmt_pid = program.pmt_pid;
-        }
-    }
-    for (const auto &section : model.sdt) {
-        for (const ServiceInfo &info : section.second) {
-            services[info.service_id].info = &info;
-        }
-    }
-    for (auto &entry : services) {
-        const auto map = model.pmts.find(entry.first);
-        if (map != model.pmts.end() && entry.second.pmt_pid == map->second.pmt_pid) {
-            entry.second.map = &map->second;
-        }
-    }
-    return services;
-}
-
-using EventEntry = const std::pair<const std::pair<uint16_t, uint16_t>, Event> *;
-
-// By start; those whose start is not known come last.
-std::vector<EventEntry> SortEvents(const Model &model) {
-    std::vector<EventEntry> events;
-    for (const auto &entry : model.events) {
-        events.push_back(&entry);
-    }
-    std::stable_sort(events.begin(), events.end(), [](EventEntry left, EventEntry right) {
-        const auto &first = left->second.start;
-        const auto &second = right->second.start;
-        return first && (!second || *first < *second);
-    });
-    return events;
-}
-
-std::string ToOffsetText(int minutes) {
-    const int size = minutes < 0 ? -minutes : minutes;
-    return Format("%c%02d:%02d", minutes < 0 ? '-' : '+', size / 60, size % 60);
-}
-
 // Columns that a text takes: its characters, which are its bytes but for continuation bytes.
 size_t WidthOf(const std::string &text) {
     return static_cast<size_t>(std::count_if(text.begin(), text.end(), [](char c) {
@@ -142,28 +80,6 @@ std::string Padded(const std::string &text, size_t width) {
 
 std::string NameOrDash(const std::string &name) {
     return name.empty() ? "-" : name;
-}
-
-// The offset that local times are shown with: the one for the receiver's nation, or else the first.
-const LocalOffset *OffsetFor(const Report &report) {
-    const std::vector<LocalOffset> &offsets = report.model.local_offsets;
-    const auto own = std::find_if(offsets.begin(), offsets.end(), [&](const LocalOffset &offset) {
-        return offset.country == report.settings.nation;
-    });
-    if (own != offsets.end()) {
-        return &*own;
-    }
-    return offsets.empty() ? nullptr : &offsets.front();
-}
-
-// Local time at a moment in UTC, with the offset that applies then; nothing when either is not
-// known.
-std::optional<DateTime> ToLocal(const std::optional<DateTime> &time, const LocalOffset *offset) {
-    if (!time || offset == nullptr) {
-        return std::nullopt;
-    }
-    const bool changed = offset->change && !(*time < *offset->change);
-    return Shifted(*time, changed ? offset->next_minutes : offset->minutes);
 }
 
 void AppendStream(const Report &report, std::string &out) {
@@ -247,7 +163,7 @@ void AppendEvents(const Report &report, const std::map<uint16_t, Service> &servi
     const std::vector<EventEntry> events = SortEvents(model);
     std::vector<EventEntry> shown;
     for (const EventEntry entry : events) {
-        if (services.count(entry->first.first) != 0 && shown.size() < kEventsShown) {
+        if (services.count(entry->first.service_id) != 0 && shown.size() < kEventsShown) {
             shown.push_back(entry);
         }
     }
@@ -256,9 +172,9 @@ void AppendEvents(const Report &report, const std::map<uint16_t, Service> &servi
         return;
     }
     const auto name_of = [&services](EventEntry entry) {
-        const ServiceInfo *info = services.at(entry->first.first).info;
+        const ServiceInfo *info = services.at(entry->first.service_id).info;
         const std::string name = info != nullptr ? info->name.Text() : "";
-        return !name.empty() ? name : Format("0x%04X", entry->first.first);
+        return !name.empty() ? name : Format("0x%04X", entry->first.service_id);
     };
     size_t width = 0;
     for (const EventEntry entry : shown) {
@@ -325,65 +241,6 @@ void AppendTables(const DemultiplexerCounters &sections, std::string &out) {
     }
 }
 
-void WriteServices(const Model &model, JsonWriter &json) {
-    json.BeginArray("services");
-    for (const auto &entry : JoinServices(model)) {
-        const Service &service = entry.second;
-        const ServiceInfo *info = service.info;
-        json.BeginObject(nullptr);
-        json.Number("id", entry.first);
-        json.Text("name", info != nullptr ? info->name.Text() : "");
-        json.Text("provider", info != nullptr ? info->provider.Text() : "");
-        json.Number("type", info != nullptr ? info->type : std::nullopt);
-        json.Number("pmt_pid", service.pmt_pid);
-        json.Number("pcr_pid",
-                    service.map != nullptr ? std::optional(service.map->pcr_pid) : std::nullopt);
-        json.BeginArray("components");
-        if (service.map != nullptr) {
-            for (const Component &component : service.map->components) {
-                json.BeginObject(nullptr);
-                json.Number("pid", component.pid);
-                json.Number("type", component.stream_type);
-                json.EndObject();
-            }
-        }
-        json.EndArray();
-        json.EndObject();
-    }
-    json.EndArray();
-}
-
-void WriteEvents(const Report &report, JsonWriter &json) {
-    json.BeginArray("events");
-    for (const EventEntry entry : SortEvents(report.model)) {
-        const Event &event = entry->second;
-        json.BeginObject(nullptr);
-        json.Number("service_id", entry->first.first);
-        json.Number("event_id", entry->first.second);
-        json.Text("start", ToText(event.start));
-        json.Text("local_start", ToText(ToLocal(event.start, OffsetFor(report))));
-        json.Text("duration", ToText(event.duration));
-        json.Text("name", event.name);
-        json.Text("text", event.text);
-        json.EndObject();
-    }
-    json.EndArray();
-}
-
-void WriteLocalOffsets(const Model &model, JsonWriter &json) {
-    json.BeginArray("local_time_offsets");
-    for (const LocalOffset &offset : model.local_offsets) {
-        json.BeginObject(nullptr);
-        json.Text("country", offset.country);
-        json.Number("region", offset.region);
-        json.Text("offset", ToOffsetText(offset.minutes));
-        json.Text("change", ToText(offset.change));
-        json.Text("next_offset", ToOffsetText(offset.next_minutes));
-        json.EndObject();
-    }
-    json.EndArray();
-}
-
 }  // namespace
 
 std::string ToSummary(const Report &report) {
@@ -395,47 +252,6 @@ std::string ToSummary(const Report &report) {
     AppendCounters(report, out);
     AppendTables(report.sections, out);
     return out;
-}
-
-std::string ToJson(const Report &report) {
-    const DemultiplexerCounters &sections = report.sections;
-    const Model &model = report.model;
-    const auto count = [](uint64_t value) { return static_cast<int64_t>(value); };
-    JsonWriter json;
-    json.BeginObject(nullptr);
-    json.Number("packets", count(report.packets.packets));
-    json.Number("packet_size", report.packets.packet_size);
-    json.Number("sync_losses", count(report.packets.sync_losses));
-    json.Number("continuity_errors", count(sections.continuity_errors));
-    json.Number("transport_errors", count(sections.transport_errors));
-    json.Number("scrambled", count(sections.scrambled));
-    json.BeginObject("sections");
-    json.Number("good", count(sections.good));
-    json.Number("bad_crc", count(sections.bad_crc));
-    json.Number("incomplete", count(sections.incomplete));
-    json.EndObject();
-    json.BeginObject("tables");
-    for (size_t table = 0; table < sections.tables.size(); ++table) {
-        if (sections.tables[table] != 0) {
-            json.Number(Format("0x%02X", static_cast<unsigned>(table)).c_str(),
-                        count(sections.tables[table]));
-        }
-    }
-    json.EndObject();
-    json.Number("transport_stream_id", model.transport_stream_id);
-    json.Number("network_id", model.network_id);
-    json.Text("network_name", model.network_name.Text());
-    json.Text("utc_time", ToText(model.utc_time));
-    json.Text("local_time", ToText(ToLocal(model.utc_time, OffsetFor(report))));
-    WriteLocalOffsets(model, json);
-    WriteServices(model, json);
-    WriteEvents(report, json);
-    json.Number("events_left_out", count(model.events_left_out));
-    json.Number("standard_type", report.settings.standard_type);
-    json.Text("nation", report.settings.nation);
-    json.Boolean("bml", report.settings.bml);
-    json.EndObject();
-    return json.Out() + '\n';
 }
 
 }  // namespace receiver

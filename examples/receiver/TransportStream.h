@@ -1,10 +1,20 @@
-// The PIDs and table_ids that the receiver tells apart.
-#ifndef RECEIVER_IDS_H
-#define RECEIVER_IDS_H
+// What packets look like, and the PIDs and table_ids that the receiver tells apart.
+#ifndef RECEIVER_TRANSPORTSTREAM_H
+#define RECEIVER_TRANSPORTSTREAM_H
 
+#include <cstddef>
 #include <cstdint>
 
 namespace receiver {
+
+constexpr size_t kPacketSize = 188;
+constexpr unsigned char kSyncByte = 0x47;
+constexpr size_t kPidCount = 8192;
+
+// The PID of a packet.
+inline uint16_t PidOf(const unsigned char *packet) {
+    return static_cast<uint16_t>((packet[1] & 0x1F) << 8 | packet[2]);
+}
 
 constexpr uint16_t kPidPat = 0x0000;
 constexpr uint16_t kPidNit = 0x0010;
