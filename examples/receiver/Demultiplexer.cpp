@@ -18,6 +18,15 @@ bool CarriesCrc(unsigned char table_id) {
     return table_id != kTableTdt && table_id != 0x71 && table_id != 0x72 && table_id != 0x7E;
 }
 
+// 33 bits of 90 kHz, six reserved ones, nine of 27 MHz.
+uint64_t ReadPcr(const unsigned char *bytes) {
+    uint64_t value = 0;
+    for (int i = 0; i < 6; ++i) {
+        value = value << 8 | bytes[i];
+    }
+    return (value >> 15) * 300 + (value & 0x1FF);
+}
+
 }  // namespace
 
 struct Demultiplexer::Header {
@@ -29,7 +38,8 @@ struct Demultiplexer::Header {
     bool has_payload;
     uint8_t counter;
     bool discontinuity;
-    size_t payload;  // offset, kPacketSize when there is none or it cannot be found
+    const unsigned char *pcr;  // null for none
+    size_t payload;            // offset, kPacketSize when there is none or it cannot be found
 };
 
 Demultiplexer::Demultiplexer(Handler handler)
@@ -39,21 +49,34 @@ Demultiplexer::Demultiplexer(Handler handler)
     }
 }
 
+DemultiplexerCounters Demultiplexer::Counters() const {
+    DemultiplexerCounters counters = counters_;
+    counters.clock = pcr_meter_.Longest();
+    return counters;
+}
+
 void Demultiplexer::Push(const unsigned char *packet) {
     const Header header = ParseHeader(packet);
+    const uint64_t position = position_++;
     if (header.transport_error) {
         ++counters_.transport_errors;
         return;
     }
+    PidCounters &own = counters_.pids[header.pid];
+    ++own.packets;
     if (header.scrambled) {
         ++counters_.scrambled;
     }
     if (header.pid == kPidNull || header.reserved) {
         return;
     }
+    if (header.pcr != nullptr) {
+        pcr_meter_.Push(header.pid, ReadPcr(header.pcr), position, header.discontinuity);
+    }
     const Order order = CheckContinuity(header);
     if (order == Order::kBroken) {
         ++counters_.continuity_errors;
+        ++own.continuity_errors;
     }
     if (!CarriesTables(header.pid) || order == Order::kRepeated) {
         return;
@@ -90,7 +113,9 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
     if (has_adaptation) {
         const size_t length = packet[kHeaderSize];
         const bool fits = kHeaderSize + 1 + length <= kPacketSize;
-        header.discontinuity = fits && length > 0 && (packet[kHeaderSize + 1] & 0x80) != 0;
+        const unsigned flags = fits && length > 0 ? packet[kHeaderSize + 1] : 0;
+        header.discontinuity = (flags & 0x80) != 0;
+        header.pcr = (flags & 0x10) != 0 && length > 6 ? packet + kHeaderSize + 2 : nullptr;
         header.payload = fits ? kHeaderSize + 1 + length : kPacketSize;
     }
     return header;

@@ -10,9 +10,16 @@
 #include <map>
 #include <vector>
 
+#include "PcrMeter.h"
 #include "SectionAssembler.h"
+#include "TransportStream.h"
 
 namespace receiver {
+
+struct PidCounters {
+    uint64_t packets = 0;  // but for those with a transport error, whose PID is uncertain
+    uint64_t continuity_errors = 0;
+};
 
 struct DemultiplexerCounters {
     uint64_t continuity_errors = 0;
@@ -22,6 +29,8 @@ struct DemultiplexerCounters {
     uint64_t bad_crc = 0;           // sections that are whole, but damaged
     uint64_t incomplete = 0;        // sections that were given up
     std::array<uint64_t, 256> tables{};  // good sections of each table_id
+    std::vector<PidCounters> pids = std::vector<PidCounters>(kPidCount);
+    PcrSpan clock;
 };
 
 class Demultiplexer {
@@ -37,7 +46,7 @@ class Demultiplexer {
     // Whether this PID carries tables at this point of the stream.
     bool CarriesTables(uint16_t pid) const { return uses_[pid] != 0; }
 
-    const DemultiplexerCounters &Counters() const { return counters_; }
+    DemultiplexerCounters Counters() const;
 
   private:
     struct Header;
@@ -55,7 +64,9 @@ class Demultiplexer {
     void RemoveUses(const std::vector<uint16_t> &pids);
 
     Handler handler_;
-    DemultiplexerCounters counters_;
+    DemultiplexerCounters counters_;  // but for the clock
+    uint64_t position_ = 0;           // packets so far
+    PcrMeter pcr_meter_;
     std::vector<Continuity> continuity_;                     // one for each PID
     std::map<uint16_t, SectionAssembler> assemblers_;        // by PID, where uses_ is not 0
     std::vector<unsigned> uses_;                             // for each PID, fixed and PAT entries

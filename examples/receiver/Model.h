@@ -1,5 +1,6 @@
 // What the tables of a stream say: the parser fills it, the report shows it. Only what
-// applies now and to this stream is kept, except for events, where other streams' fill in.
+// applies now and to this stream is kept, except for events, where other streams' fill in. Times
+// are as the stream carries them.
 #ifndef RECEIVER_MODEL_H
 #define RECEIVER_MODEL_H
 
@@ -8,11 +9,12 @@
 #include <map>
 #include <optional>
 #include <string>
-#include <tuple>
 #include <utility>
 #include <vector>
 
 #include "BroadcastTime.h"
+#include "Code.h"
+#include "Events.h"
 #include "Name.h"
 
 namespace receiver {
@@ -24,14 +26,32 @@ struct Program {  // a PAT entry
 
 struct Component {  // a PMT entry
     uint16_t pid;
+    uint16_t data_component_id;  // where the descriptor is the one of a data component
     uint8_t stream_type;
-    uint8_t descriptor;  // tag of the one that tells what private data is, 0 for none
+    uint8_t descriptor;  // tag of the one that tells what the data is, 0 for none
+    Code languages[2];   // of audio
 };
 
 struct ProgramMap {    // a PMT
     uint16_t pmt_pid;  // where it came
     uint16_t pcr_pid;
+    bool emergency;  // a warning to the population is on
     std::vector<Component> components;
+};
+
+struct NetworkStream {  // an entry of the NIT, about a transport stream
+    uint16_t transport_stream_id;
+    std::optional<uint8_t> remote_control_key;
+    std::string name;
+    std::optional<uint16_t> area_code;
+    std::optional<uint8_t> guard_interval;
+    bool dvb;                                // sent in a way that only DVB has
+    std::vector<uint16_t> one_seg_services;  // service_ids
+};
+
+struct NetworkSection {
+    bool emergency;
+    std::vector<NetworkStream> streams;
 };
 
 struct ServiceInfo {  // an SDT entry
@@ -41,26 +61,10 @@ struct ServiceInfo {  // an SDT entry
     Name name;
 };
 
-struct EventKey {
-    uint16_t service_id;
-    uint16_t event_id;
-    bool operator<(const EventKey &other) const {
-        return std::tie(service_id, event_id) < std::tie(other.service_id, other.event_id);
-    }
-};
-
-struct Event {
-    bool other_stream;
-    std::optional<DateTime> start;
-    std::optional<int> duration;  // seconds
-    std::string name;
-    std::string text;
-};
-
 struct LocalOffset {
-    std::string country;
+    Code country;
     uint8_t region;
-    int minutes;  // to be added to UTC
+    int minutes;  // to be added to the stream's time
     std::optional<DateTime> change;
     int next_minutes;  // from then on
 };
@@ -84,19 +88,17 @@ class Sections {
 };
 
 struct Model {
-    // Far more events than a week of every service takes; keeps memory bounded on hostile streams.
-    static constexpr size_t kMostEvents = 65536;
-
     std::optional<uint16_t> transport_stream_id;
     std::optional<uint16_t> network_id;
     Name network_name;
-    std::optional<DateTime> utc_time;  // the latest
+    std::optional<DateTime> time;  // the latest, as the stream carries it
     std::vector<LocalOffset> local_offsets;
     Sections<std::vector<Program>> pat;
     Sections<std::vector<ServiceInfo>> sdt;
+    Sections<NetworkSection> nit;
     std::map<uint16_t, ProgramMap> pmts;  // by service_id
-    std::map<EventKey, Event> events;
-    uint64_t events_left_out = 0;  // for lack of room
+    EventTable events;
+    EventTable other_events;  // of other transport streams, which must not push this stream's out
 };
 
 }  // namespace receiver

@@ -15,7 +15,8 @@ constexpr size_t kLargestDistance = 204;
 // Sync bytes in a row that make a start. The first byte of a stream and the distance already in use
 // need few, so that short stretches between losses count. Anywhere else it takes more, and headers
 // that packets may have: tables in all kinds of files hold a byte of this value at even distances.
-constexpr size_t kSyncsToFind = 8;
+// More than seven would miss streams in datagrams, which hold seven packets behind a header.
+constexpr size_t kSyncsToFind = 5;
 constexpr size_t kSyncsToResume = 3;
 constexpr size_t kLookAhead = (kSyncsToFind - 1) * kLargestDistance + 4;
 

@@ -150,12 +150,8 @@ void RunReader(Pipeline &pipeline) {
         }
     });
     std::vector<unsigned char> block(kBlockSize);
-    const std::atomic<bool> *stop = pipeline.options.stop;
-    while (stop == nullptr || !*stop) {
-        const size_t count = pipeline.file.Read(block.data(), block.size());
-        if (count == 0) {
-            break;
-        }
+    while (const size_t count =
+               pipeline.file.Read(block.data(), block.size(), pipeline.options.stop)) {
         source.Feed(block.data(), count);
         VarnekPGL_AcquireMutex(pipeline.mutex);
         pipeline.bytes_read += count;
@@ -200,7 +196,7 @@ void RunDemultiplexer(Pipeline &pipeline) {
 
 void RunParser(Pipeline &pipeline) {
     Model model;
-    TableParser parser(model);
+    TableParser parser(model, pipeline.options.language);
     for (Message message = Receive(); message.kind != Kind::kEnd; message = Receive()) {
         const SectionBatch sections = Take<SectionBatch>(message);
         VarnekPGL_SignalSemaphore(pipeline.section_room);

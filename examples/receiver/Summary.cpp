@@ -1,205 +1,204 @@
-// Joins the parts of a report and writes them for people: lines of bounded width, names as the
-// stream gives them.
+// Joins the parts of a report and writes them for people: names as the stream gives them, codes in
+// words.
 #include "Summary.h"
 
 #include <algorithm>
-#include <iterator>
 #include <map>
+#include <utility>
 #include <vector>
 
+#include "Paragraphs.h"
 #include "TransportStream.h"
+#include "Words.h"
 
 namespace receiver {
 namespace {
 
-struct Named {
-    uint8_t value;
-    const char *name;
-};
-
-constexpr Named kStreamTypes[] = {
-    {0x01, "MPEG-1 video"},  {0x02, "MPEG-2 video"},     {0x03, "MPEG-1 audio"},
-    {0x04, "MPEG-2 audio"},  {0x05, "private sections"}, {0x06, "private data"},
-    {0x07, "MHEG"},          {0x0A, "DSM-CC type A"},    {0x0B, "DSM-CC type B"},
-    {0x0C, "DSM-CC type C"}, {0x0D, "DSM-CC type D"},    {0x0F, "AAC audio (ADTS)"},
-    {0x10, "MPEG-4 video"},  {0x11, "AAC audio (LATM)"}, {0x1B, "H.264 video"},
-    {0x24, "HEVC video"},    {0x33, "VVC video"},        {0x81, "AC-3 audio"},
-    {0x87, "E-AC-3 audio"},
-};
-
-constexpr Named kPrivateData[] = {
-    {0x56, "teletext"},  {0x59, "subtitles"}, {0x6A, "AC-3 audio"},       {0x7A, "E-AC-3 audio"},
-    {0x7B, "DTS audio"}, {0x7C, "AAC audio"}, {0xFD, "captions or data"},
-};
-
-constexpr Named kServiceTypes[] = {
-    {0x01, "television"},    {0x02, "radio"},         {0x03, "teletext"},
-    {0x0A, "radio"},         {0x0C, "data"},          {0x11, "HD television"},
-    {0x16, "television"},    {0x19, "HD television"}, {0x1F, "HEVC television"},
-    {0xA1, "special video"}, {0xA4, "engineering"},   {0xA8, "prior storage data"},
-    {0xC0, "data"},
-};
-
-constexpr Named kTables[] = {
-    {0x00, "PAT"},           {0x01, "CAT"}, {0x02, "PMT"},       {0x03, "TSDT"}, {0x40, "NIT"},
-    {0x41, "NIT other"},     {0x42, "SDT"}, {0x46, "SDT other"}, {0x4A, "BAT"},  {0x4E, "EIT p/f"},
-    {0x4F, "EIT p/f other"}, {0x70, "TDT"}, {0x71, "RST"},       {0x72, "ST"},   {0x73, "TOT"},
-    {0xC3, "SDTT"},          {0xC4, "BIT"},
-};
-
 constexpr size_t kEventsShown = 12;
-constexpr size_t kLineWidth = 100;
+constexpr size_t kPidsShown = 24;
+constexpr size_t kWidestName = 24;  // of a column of service names
 
-template <size_t Count>
-const char *NameOf(const Named (&names)[Count], uint8_t value) {
-    const auto found = std::find_if(std::begin(names), std::end(names),
-                                    [value](const Named &entry) { return entry.value == value; });
-    return found == std::end(names) ? nullptr : found->name;
-}
+using Services = std::map<uint16_t, Service>;
 
-std::string NameOfComponent(const Component &component) {
-    const bool is_private = component.stream_type == 0x05 || component.stream_type == 0x06;
-    const char *name = is_private ? NameOf(kPrivateData, component.descriptor) : nullptr;
-    if (name == nullptr) {
-        name = NameOf(kStreamTypes, component.stream_type);
-    }
-    return name != nullptr ? name : Format("stream type 0x%02X", component.stream_type);
-}
-
-// Columns that a text takes: its characters, which are its bytes but for continuation bytes.
-size_t WidthOf(const std::string &text) {
-    return static_cast<size_t>(std::count_if(text.begin(), text.end(), [](char c) {
-        return (static_cast<unsigned char>(c) & 0xC0) != 0x80;
-    }));
-}
-
-std::string Padded(const std::string &text, size_t width) {
-    const size_t used = WidthOf(text);
-    return used < width ? text + std::string(width - used, ' ') : text;
+unsigned long long Printable(uint64_t value) {
+    return value;
 }
 
 std::string NameOrDash(const std::string &name) {
     return name.empty() ? "-" : name;
 }
 
-void AppendStream(const Report &report, std::string &out) {
+std::string NameOf(const Services &services, uint16_t service_id) {
+    const auto found = services.find(service_id);
+    const ServiceInfo *info = found != services.end() ? found->second.info : nullptr;
+    return info != nullptr ? info->name.Text() : "";
+}
+
+// Text with a comma in front, where there is text.
+std::string Further(const std::string &text) {
+    return text.empty() ? "" : ", " + text;
+}
+
+std::string Joined(const std::vector<std::string> &texts) {
+    std::string joined;
+    for (const std::string &text : texts) {
+        joined += joined.empty() ? text : Further(text);
+    }
+    return joined;
+}
+
+void AddStream(const Report &report, Paragraphs &out) {
     const Model &model = report.model;
-    out += "Stream    ";
-    out += model.transport_stream_id
-               ? Format("transport stream 0x%04X, ", *model.transport_stream_id)
-               : std::string();
-    out +=
-        Format("%llu packets of %u bytes\n",
-               static_cast<unsigned long long>(report.packets.packets), report.packets.packet_size);
-    out += "Receiver  nation " + report.settings.nation;
-    out += report.settings.bml ? ", BML supported" : ", BML not supported";
-    out += Format(", standard type %d\n", report.settings.standard_type);
-    out += "Network   " + NameOrDash(model.network_name.Text());
-    out += model.network_id ? Format(" (0x%04X)\n", *model.network_id) : "\n";
-    out += "Clock     ";
-    out += model.utc_time ? ToText(model.utc_time) + " UTC" : "-";
-    for (const LocalOffset &offset : model.local_offsets) {
-        out += ", " + offset.country;
-        out += offset.region != 0 ? Format(" region %d ", offset.region) : " ";
-        out += ToOffsetText(offset.minutes);
+    std::string text;
+    if (model.transport_stream_id) {
+        text = Format("transport stream 0x%04X, ", *model.transport_stream_id);
     }
-    const std::optional<DateTime> local = ToLocal(model.utc_time, OffsetFor(report));
-    out += local ? ", local " + ToText(local) + "\n" : "\n";
+    text += Format("%llu packets of %u bytes", Printable(report.packets.packets),
+                   report.packets.packet_size);
+    const std::optional<int64_t> duration = DurationOf(report);
+    const std::optional<int64_t> bit_rate = BitRateOf(report);
+    out.Add("Stream    ", text);
+    if (duration && bit_rate) {
+        out.Add("Duration  ",
+                Format("%.1f s at %.3f Mbit/s, by the clock reference",
+                       static_cast<double>(*duration) / 1e3, static_cast<double>(*bit_rate) / 1e6));
+    }
+    out.Add("Receiver  ", "nation " + report.settings.nation +
+                              (report.settings.bml ? ", BML supported" : ", BML not supported") +
+                              Format(", standard type %d", report.settings.standard_type));
+    out.Add("Network   ", NameOrDash(model.network_name.Text()) +
+                              (model.network_id ? Format(" (0x%04X)", *model.network_id) : ""));
 }
 
-// "one, two, three" over as many lines as it takes.
-void AppendWrapped(const std::vector<std::string> &items, size_t margin, std::string &out) {
-    const std::string indent(margin, ' ');
-    std::string line = indent;
-    for (size_t i = 0; i < items.size(); ++i) {
-        const std::string item = items[i] + (i + 1 < items.size() ? "," : "");
-        if (line.size() > indent.size() && line.size() + 1 + item.size() > kLineWidth) {
-            out += line + '\n';
-            line = indent;
-        }
-        line += (line.size() > indent.size() ? " " : "") + item;
-    }
-    out += line + '\n';
-}
-
-void AppendComponents(const ProgramMap &map, std::string &out) {
+void AddChannel(const NetworkStream &stream, Paragraphs &out) {
     std::vector<std::string> items;
-    for (const Component &component : map.components) {
-        items.push_back(Format("0x%04X ", component.pid) + NameOfComponent(component));
+    if (stream.remote_control_key) {
+        items.push_back(Format("remote control key %d", *stream.remote_control_key));
+        items.push_back(stream.name);
     }
-    AppendWrapped(items.empty() ? std::vector<std::string>{"no components"} : items, 10, out);
+    if (stream.area_code) {
+        items.push_back(Format("area code 0x%03X", *stream.area_code));
+        items.push_back("guard interval " + NameOfGuardInterval(stream.guard_interval.value_or(0)));
+    }
+    if (!items.empty()) {
+        out.Add("Channel   ", Joined(items));
+    }
 }
 
-void AppendServices(const std::map<uint16_t, Service> &services, std::string &out) {
-    out += services.empty() ? "\nServices  none named\n" : "\nServices\n";
+void AddClock(const Model &model, const StreamClock &clock, Paragraphs &out) {
+    const std::optional<DateTime> utc = clock.Utc(model.time);
+    const std::optional<DateTime> local = clock.Local(model.time);
+    std::string text = utc ? ToText(utc) + " UTC" : "-";
+    for (const LocalOffset &offset : model.local_offsets) {
+        text += Further(offset.country.Text());
+        text += offset.region != 0 ? Format(" region %d ", offset.region) : " ";
+        text += clock.OffsetText(offset.minutes);
+    }
+    out.Add("Clock     ", text + (local ? ", local " + ToText(local) : ""));
+}
+
+void AddServices(const Services &services, Paragraphs &out) {
+    out.AddEmptyLine();
+    out.Add("", services.empty() ? "Services  none named" : "Services");
     size_t width = 0;
     for (const auto &entry : services) {
-        width = std::max(
-            width, entry.second.info != nullptr ? WidthOf(entry.second.info->name.Text()) : 0);
+        width = std::max(width, WidthOf(NameOf(services, entry.first)));
     }
-    for (const auto &entry : services) {
-        const Service &service = entry.second;
-        out += Format("  0x%04X  ", entry.first);
-        out += Padded(service.info != nullptr ? NameOrDash(service.info->name.Text()) : "-", width);
+    width = std::min(width, kWidestName);
+    for (const auto &[id, service] : services) {
+        std::string text = Padded(NameOrDash(NameOf(services, id)), width);
+        std::vector<std::string> items;
         if (service.info != nullptr && service.info->type) {
-            const char *type = NameOf(kServiceTypes, *service.info->type);
-            out += "  ";
-            out += type != nullptr ? type : Format("service type 0x%02X", *service.info->type);
-            const std::string provider = service.info->provider.Text();
-            out += provider.empty() ? "" : ", " + provider;
+            items.push_back(NameOfServiceType(*service.info->type));
         }
-        out +=
-            service.pmt_pid ? Format("  (PMT 0x%04X)\n", *service.pmt_pid) : "  (not in the PAT)\n";
-        if (service.map != nullptr) {
-            AppendComponents(*service.map, out);
+        items.emplace_back(service.one_seg ? "one-seg" : "");
+        items.push_back(service.info != nullptr ? service.info->provider.Text() : "");
+        const std::string joined = Joined(items);
+        text += joined.empty() ? "" : "  " + joined;
+        text += service.pmt_pid ? Format("  (PMT 0x%04X)", *service.pmt_pid) : "  (not in the PAT)";
+        out.Add(Format("  0x%04X  ", id), text);
+        if (service.map == nullptr) {
+            continue;
         }
+        std::vector<std::string> components;
+        for (const Component &component : service.map->components) {
+            components.push_back(Format("0x%04X ", component.pid) + NameOfComponent(component));
+        }
+        out.AddList("          ",
+                    components.empty() ? std::vector<std::string>{"no components"} : components);
     }
 }
 
-void AppendEvents(const Report &report, const std::map<uint16_t, Service> &services,
-                  std::string &out) {
-    const Model &model = report.model;
-    const LocalOffset *offset = OffsetFor(report);
-    const std::vector<EventEntry> events = SortEvents(model);
-    std::vector<EventEntry> shown;
-    for (const EventEntry entry : events) {
-        if (services.count(entry->first.service_id) != 0 && shown.size() < kEventsShown) {
-            shown.push_back(entry);
+// Whether an event is over at this time; false when that cannot be told.
+bool IsOver(const Event &event, const std::optional<DateTime> &now) {
+    if (!now || !event.start || !event.duration) {
+        return false;
+    }
+    const std::optional<DateTime> end = Shifted(*event.start, *event.duration);
+    return end && !(*now < *end);
+}
+
+// Genre and the nation's own rating, in brackets.
+std::string DescribeContent(const Event &event, const Code &nation) {
+    std::vector<std::string> items;
+    for (const uint8_t genre : event.genres) {
+        const std::string name = NameOfGenre(genre, nation);
+        if (std::find(items.begin(), items.end(), name) == items.end()) {
+            items.push_back(name);
         }
     }
-    if (events.empty()) {
-        out += "\nEvents    none\n";
-        return;
+    for (const Rating &rating : event.ratings) {
+        if (rating.country == nation) {
+            items.push_back(NameOfRating(rating));
+        }
     }
-    const auto name_of = [&services](EventEntry entry) {
-        const ServiceInfo *info = services.at(entry->first.service_id).info;
-        const std::string name = info != nullptr ? info->name.Text() : "";
-        return !name.empty() ? name : Format("0x%04X", entry->first.service_id);
+    return items.empty() ? "" : " (" + Joined(items) + ")";
+}
+
+// This stream's events: what is on, what comes, and last what is over.
+void AddEvents(const Report &report, const Services &services, const StreamClock &clock,
+               Paragraphs &out) {
+    const Model &model = report.model;
+    std::vector<ListedEvent> events = ListEvents(model);
+    events.erase(std::remove_if(events.begin(), events.end(),
+                                [](const ListedEvent &event) { return event.other_stream; }),
+                 events.end());
+    const auto over = std::stable_partition(
+        events.begin(), events.end(),
+        [&](const ListedEvent &event) { return !IsOver(*event.event, model.time); });
+    const auto first_over = static_cast<size_t>(over - events.begin());
+    const size_t shown = std::min(events.size(), kEventsShown);
+    const auto name_of = [&](const ListedEvent &event) {
+        const std::string name = NameOf(services, event.key.service_id);
+        return !name.empty() ? name : Format("0x%04X", event.key.service_id);
     };
     size_t width = 0;
-    for (const EventEntry entry : shown) {
-        width = std::max(width, WidthOf(name_of(entry)));
+    for (size_t i = 0; i < shown; ++i) {
+        width = std::max(width, WidthOf(name_of(events[i])));
     }
-    out += offset != nullptr ? "\nEvents (UTC, local time)\n" : "\nEvents (UTC)\n";
-    for (const EventEntry entry : shown) {
-        const Event &event = entry->second;
-        out += "  " + Padded(event.start ? ToText(event.start) : "start not known", 19) + "  ";
-        if (offset != nullptr) {
-            out += Padded(NameOrDash(ToText(ToLocal(event.start, offset))), 19) + "  ";
-        }
-        out += Padded(NameOrDash(ToText(event.duration)), 8) + "  ";
-        out += Padded(name_of(entry), width) + "  " + NameOrDash(event.name) + '\n';
+    width = std::min(width, kWidestName);
+    const bool local = clock.Offset() != nullptr;
+    const std::string heading = local ? "Events (local time)" : "Events (UTC)";
+    out.AddEmptyLine();
+    out.Add("", events.empty() ? "Events    none" : heading);
+    for (size_t i = 0; i < shown; ++i) {
+        const Event &event = *events[i].event;
+        const std::string start = ToText(local ? clock.Local(event.start) : clock.Utc(event.start));
+        out.Add("  " + Padded(start.empty() ? "start not known" : start, 19) + "  " +
+                    Padded(NameOrDash(ToText(event.duration)), 8) + "  ",
+                Padded(name_of(events[i]), width) + "  " + NameOrDash(event.name) +
+                    DescribeContent(event, clock.Nation()) + (i < first_over ? "" : ", over"));
     }
-    if (events.size() > shown.size()) {
-        out += Format("  and %zu more\n", events.size() - shown.size());
+    if (events.size() > shown) {
+        out.Add("  ", Format("and %zu more", events.size() - shown));
     }
-    if (model.events_left_out != 0) {
-        out += Format("  %llu times an event was left out for lack of room\n",
-                      static_cast<unsigned long long>(model.events_left_out));
+    if (model.events.LeftOut() != 0) {
+        out.Add("  ", Format("%llu times an event was left out for lack of room",
+                             Printable(model.events.LeftOut())));
     }
 }
 
-void AppendCounters(const Report &report, std::string &out) {
+void AddCounters(const Report &report, Paragraphs &out) {
     const struct {
         const char *name;
         uint64_t value;
@@ -212,46 +211,100 @@ void AppendCounters(const Report &report, std::string &out) {
         {"sections with a bad CRC", report.sections.bad_crc},
         {"incomplete sections", report.sections.incomplete},
     };
-    out += "\nCounters\n";
+    out.AddEmptyLine();
+    out.Add("", "Counters");
     for (const auto &counter : counters) {
-        out +=
-            Format("  %-24s %9llu\n", counter.name, static_cast<unsigned long long>(counter.value));
+        out.Add("  ", Format("%-24s %9llu", counter.name, Printable(counter.value)));
     }
 }
 
-void AppendTables(const DemultiplexerCounters &sections, std::string &out) {
+void AddTables(const DemultiplexerCounters &sections, Paragraphs &out) {
     std::vector<std::string> items;
     for (size_t table = 0; table < sections.tables.size(); ++table) {
-        if (sections.tables[table] == 0) {
-            continue;
+        if (sections.tables[table] != 0) {
+            const auto id = static_cast<uint8_t>(table);
+            items.push_back(Format("0x%02X ", id) + NameOfTable(id) + ' ' +
+                            std::to_string(sections.tables[table]));
         }
-        const char *name = NameOf(kTables, static_cast<uint8_t>(table));
-        if (table >= kTableEitActualSchedule && table <= kTableEitLast) {
-            name = table < kTableEitOtherSchedule ? "EIT schedule" : "EIT schedule other";
-        }
-        items.push_back(Format("0x%02X %s: %llu", static_cast<unsigned>(table),
-                               name != nullptr ? name
-                               : table < 0x80  ? "other"
-                                               : "private",
-                               static_cast<unsigned long long>(sections.tables[table])));
     }
     if (!items.empty()) {
-        out += "\nGood sections by table\n";
-        AppendWrapped(items, 2, out);
+        out.AddEmptyLine();
+        out.Add("", "Good sections by table");
+        out.AddList("  ", items);
+    }
+}
+
+// What the services say of their PIDs.
+std::map<uint16_t, std::string> NamePids(const Services &services) {
+    std::map<uint16_t, std::string> names;
+    for (const auto &[id, service] : services) {
+        if (service.pmt_pid) {
+            names.emplace(*service.pmt_pid, "PMT");
+        }
+        if (service.map == nullptr) {
+            continue;
+        }
+        for (const Component &component : service.map->components) {
+            names.emplace(component.pid, NameOfComponent(component));
+        }
+        names.emplace(service.map->pcr_pid, "clock reference");
+    }
+    return names;
+}
+
+void AddPids(const Report &report, const Services &services, Paragraphs &out) {
+    const std::vector<PidCounters> &counters = report.sections.pids;
+    std::vector<uint16_t> pids;
+    for (size_t pid = 0; pid < counters.size(); ++pid) {
+        if (counters[pid].packets != 0) {
+            pids.push_back(static_cast<uint16_t>(pid));
+        }
+    }
+    if (pids.empty()) {
+        return;
+    }
+    std::stable_sort(pids.begin(), pids.end(), [&](uint16_t left, uint16_t right) {
+        return counters[left].packets > counters[right].packets;
+    });
+    const std::map<uint16_t, std::string> names = NamePids(services);
+    out.AddEmptyLine();
+    out.Add("", "PIDs (packets, share, continuity errors)");
+    const size_t shown = std::min(pids.size(), kPidsShown);
+    for (size_t i = 0; i < shown; ++i) {
+        const PidCounters &own = counters[pids[i]];
+        const auto found = names.find(pids[i]);
+        const double share =
+            100.0 * static_cast<double>(own.packets) / static_cast<double>(report.packets.packets);
+        out.Add(Format("  0x%04X  ", pids[i]),
+                Format("%9llu  %6.2f %%  %6llu  ", Printable(own.packets), share,
+                       Printable(own.continuity_errors)) +
+                    (found != names.end() ? found->second : NameOfPid(pids[i])));
+    }
+    if (pids.size() > shown) {
+        out.Add("  ", Format("and %zu more", pids.size() - shown));
     }
 }
 
 }  // namespace
 
-std::string ToSummary(const Report &report) {
-    const std::map<uint16_t, Service> services = JoinServices(report.model);
-    std::string out;
-    AppendStream(report, out);
-    AppendServices(services, out);
-    AppendEvents(report, services, out);
-    AppendCounters(report, out);
-    AppendTables(report.sections, out);
-    return out;
+void WriteSummary(const Report &report, size_t width, std::FILE *out) {
+    const Services services = JoinServices(report.model);
+    const NetworkStream *stream = FindOwnStream(report.model);
+    const StreamClock clock(report);
+    Paragraphs text(out, width);
+    AddStream(report, text);
+    if (stream != nullptr) {
+        AddChannel(*stream, text);
+    }
+    AddClock(report.model, clock, text);
+    if (IsEmergency(report.model, services)) {
+        text.Add("Warning   ", "EWBS signalled");
+    }
+    AddServices(services, text);
+    AddEvents(report, services, clock, text);
+    AddCounters(report, text);
+    AddTables(report.sections, text);
+    AddPids(report, services, text);
 }
 
 }  // namespace receiver

@@ -2,14 +2,15 @@
 #ifndef RECEIVER_SUMMARY_H
 #define RECEIVER_SUMMARY_H
 
-#include <string>
+#include <cstddef>
+#include <cstdio>
 
 #include "Report.h"
 
 namespace receiver {
 
-// UTF-8, about a screen, with a final line feed.
-std::string ToSummary(const Report &report);
+// Writes UTF-8, about a screen or two, in lines of at most `width` columns.
+void WriteSummary(const Report &report, size_t width, std::FILE *out);
 
 }  // namespace receiver
 

@@ -17,18 +17,25 @@ inline uint16_t PidOf(const unsigned char *packet) {
 }
 
 constexpr uint16_t kPidPat = 0x0000;
+constexpr uint16_t kPidCat = 0x0001;  // conditional access
 constexpr uint16_t kPidNit = 0x0010;
 constexpr uint16_t kPidSdt = 0x0011;
 constexpr uint16_t kPidEit = 0x0012;
 constexpr uint16_t kPidTime = 0x0014;
-constexpr uint16_t kPidEitMobile = 0x0026;  // events of portable reception
-constexpr uint16_t kPidEitOneSeg = 0x0027;
+constexpr uint16_t kPidSdtt = 0x0023;        // software downloads
+constexpr uint16_t kPidBit = 0x0024;         // broadcaster information
+constexpr uint16_t kPidNbit = 0x0025;        // information of networks and boards
+constexpr uint16_t kPidEitMobile = 0x0026;   // events of portable reception
+constexpr uint16_t kPidEitOneSeg = 0x0027;   // the same, of one segment
+constexpr uint16_t kPidSdttOneSeg = 0x0028;  // software downloads within one segment
+constexpr uint16_t kPidCdt = 0x0029;         // common data, such as logos
 constexpr uint16_t kPidNull = 0x1FFF;
 
-// Sections are assembled on these wherever they come: the above, and conditional access (0x0001)
-// and broadcaster information (0x0024), which are only counted.
-constexpr uint16_t kTablePids[] = {kPidPat,  0x0001, kPidNit,       kPidSdt,      kPidEit,
-                                   kPidTime, 0x0024, kPidEitMobile, kPidEitOneSeg};
+// Sections are assembled on these wherever they come; what nobody understands is only counted.
+constexpr uint16_t kTablePids[] = {
+    kPidPat, kPidCat,  kPidNit,       kPidSdt,       kPidEit,        kPidTime, kPidSdtt,
+    kPidBit, kPidNbit, kPidEitMobile, kPidEitOneSeg, kPidSdttOneSeg, kPidCdt,
+};
 
 constexpr uint8_t kTablePat = 0x00;
 constexpr uint8_t kTablePmt = 0x02;
