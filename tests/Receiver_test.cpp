@@ -120,9 +120,11 @@ TEST(Receiver, FindsPacketsInAnyCompany) {
                 continue;
             }
             Bytes numbers;
-            PacketSource source([&](const unsigned char *packet) {
-                EXPECT_EQ(packet[0], 0x47);
-                numbers.push_back(packet[5]);
+            PacketSource source([&](const unsigned char *packets, size_t count) {
+                for (size_t i = 0; i < count; ++i) {
+                    EXPECT_EQ(packets[i * kPacketSize], 0x47);
+                    numbers.push_back(packets[i * kPacketSize + 5]);
+                }
             });
             for (size_t at = 0; at < c.stream.size(); at += block) {
                 source.Feed(&c.stream[at], std::min(block, c.stream.size() - at));

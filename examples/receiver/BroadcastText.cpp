@@ -42,8 +42,15 @@ std::string ConvertLatin15(const std::string &line) {
     return result;
 }
 
-// Line by line, since the conversion drops control characters.
+bool IsControl(char c) {
+    return static_cast<unsigned char>(c) < 0x20 || static_cast<unsigned char>(c) == kBreak;
+}
+
+// Line by line, since the conversion drops control characters. Most texts have one line.
 std::string FromLatin15(const std::string &text) {
+    if (std::none_of(text.begin(), text.end(), IsControl)) {
+        return ConvertLatin15(text);
+    }
     std::string result;
     std::string line;
     for (size_t i = 0; i < text.size(); ++i) {

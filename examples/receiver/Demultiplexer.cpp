@@ -42,8 +42,7 @@ struct Demultiplexer::Header {
     size_t payload;            // offset, kPacketSize when there is none or it cannot be found
 };
 
-Demultiplexer::Demultiplexer(Handler handler)
-    : handler_(std::move(handler)), continuity_(kPidCount), uses_(kPidCount) {
+Demultiplexer::Demultiplexer(Handler handler) : handler_(std::move(handler)), pids_(kPidCount) {
     for (const uint16_t pid : kTablePids) {
         AddUse(pid);
     }
@@ -51,6 +50,9 @@ Demultiplexer::Demultiplexer(Handler handler)
 
 DemultiplexerCounters Demultiplexer::Counters() const {
     DemultiplexerCounters counters = counters_;
+    for (const PidState &state : pids_) {
+        counters.pids.push_back(state.counters);
+    }
     counters.clock = pcr_meter_.Longest();
     return counters;
 }
@@ -62,8 +64,8 @@ void Demultiplexer::Push(const unsigned char *packet) {
         ++counters_.transport_errors;
         return;
     }
-    PidCounters &own = counters_.pids[header.pid];
-    ++own.packets;
+    PidState &state = pids_[header.pid];
+    ++state.counters.packets;
     if (header.scrambled) {
         ++counters_.scrambled;
     }
@@ -73,27 +75,26 @@ void Demultiplexer::Push(const unsigned char *packet) {
     if (header.pcr != nullptr) {
         pcr_meter_.Push(header.pid, ReadPcr(header.pcr), position, header.discontinuity);
     }
-    const Order order = CheckContinuity(header);
+    const Order order = CheckContinuity(header, state);
     if (order == Order::kBroken) {
         ++counters_.continuity_errors;
-        ++own.continuity_errors;
+        ++state.counters.continuity_errors;
     }
-    if (!CarriesTables(header.pid) || order == Order::kRepeated) {
+    if (state.table_uses == 0 || order == Order::kRepeated) {
         return;
     }
-    SectionAssembler &assembler = assemblers_.find(header.pid)->second;
     const bool unusable = header.has_payload && (header.scrambled || header.payload == kPacketSize);
     if (order != Order::kNext || unusable) {
-        counters_.incomplete += static_cast<unsigned>(assembler.Drop());
+        counters_.incomplete += static_cast<unsigned>(state.assembler.Drop());
     }
     if (!header.has_payload || unusable) {
         return;
     }
-    const int given_up =
-        assembler.Push(packet + header.payload, kPacketSize - header.payload, header.unit_start,
-                       [this, &header](const unsigned char *section, size_t size) {
-                           OnSection(header.pid, section, size);
-                       });
+    const int given_up = state.assembler.Push(
+        packet + header.payload, kPacketSize - header.payload, header.unit_start,
+        [this, &header](const unsigned char *section, size_t size) {
+            OnSection(header.pid, section, size);
+        });
     counters_.incomplete += static_cast<unsigned>(given_up);
 }
 
@@ -123,22 +124,21 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
 
 // Where a packet stands behind the latest one of its PID. Only a payload moves the counter on; a
 // packet with one may be sent twice, and a counter may jump where the packet announces it.
-Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header) {
-    Continuity &state = continuity_[header.pid];
-    const Continuity before = state;
-    state = {header.counter, header.has_payload};
-    const int expected = header.has_payload ? (before.last + 1) & 0x0F : before.last;
-    if (before.last < 0 || header.counter == expected) {
+Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header, PidState &state) {
+    const int last = std::exchange(state.last, header.counter);
+    const bool repeatable = std::exchange(state.repeatable, header.has_payload);
+    const int expected = header.has_payload ? (last + 1) & 0x0F : last;
+    if (last < 0 || header.counter == expected) {
         return Order::kNext;
     }
     if (header.discontinuity) {
         return Order::kRestarted;
     }
-    if (header.counter != before.last) {
+    if (header.counter != last) {
         return Order::kBroken;
     }
     state.repeatable = false;
-    return header.has_payload && before.repeatable ? Order::kRepeated : Order::kBroken;
+    return header.has_payload && repeatable ? Order::kRepeated : Order::kBroken;
 }
 
 void Demultiplexer::OnSection(uint16_t pid, const unsigned char *section, size_t size) {
@@ -156,8 +156,8 @@ void Demultiplexer::OnSection(uint16_t pid, const unsigned char *section, size_t
     handler_(pid, section, size);
 }
 
-// A PID that the PAT no longer names may carry anything, so its assembler goes. New uses come
-// before old ones go: a repeated PAT must not disturb the section in progress on a PID that it
+// A PID that the PAT no longer names may carry anything, so its section in progress goes. New uses
+// come before old ones go: a repeated PAT must not disturb the section in progress on a PID that it
 // keeps.
 void Demultiplexer::UpdatePmtPids(const unsigned char *section, size_t size) {
     Pat pat;
@@ -180,14 +180,13 @@ void Demultiplexer::UpdatePmtPids(const unsigned char *section, size_t size) {
 }
 
 void Demultiplexer::AddUse(uint16_t pid) {
-    ++uses_[pid];
-    assemblers_[pid];
+    ++pids_[pid].table_uses;
 }
 
 void Demultiplexer::RemoveUses(const std::vector<uint16_t> &pids) {
     for (const uint16_t pid : pids) {
-        if (--uses_[pid] == 0) {
-            assemblers_.erase(pid);
+        if (--pids_[pid].table_uses == 0) {
+            pids_[pid].assembler.Drop();
         }
     }
 }

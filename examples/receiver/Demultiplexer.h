@@ -29,7 +29,7 @@ struct DemultiplexerCounters {
     uint64_t bad_crc = 0;           // sections that are whole, but damaged
     uint64_t incomplete = 0;        // sections that were given up
     std::array<uint64_t, 256> tables{};  // good sections of each table_id
-    std::vector<PidCounters> pids = std::vector<PidCounters>(kPidCount);
+    std::vector<PidCounters> pids;       // one for each PID
     PcrSpan clock;
 };
 
@@ -44,32 +44,33 @@ class Demultiplexer {
     void Push(const unsigned char *packet);
 
     // Whether this PID carries tables at this point of the stream.
-    bool CarriesTables(uint16_t pid) const { return uses_[pid] != 0; }
+    bool CarriesTables(uint16_t pid) const { return pids_[pid].table_uses != 0; }
 
     DemultiplexerCounters Counters() const;
 
   private:
     struct Header;
-    struct Continuity {
+    struct PidState {
+        PidCounters counters;
         int last = -1;            // counter of the PID's latest packet, -1 before the first
         bool repeatable = false;  // that packet had a payload and may come once more
+        unsigned table_uses = 0;  // one where tables are fixed, and one for each PAT entry
+        SectionAssembler assembler;
     };
     enum class Order { kNext, kRepeated, kBroken, kRestarted };
 
     static Header ParseHeader(const unsigned char *packet);
-    Order CheckContinuity(const Header &header);
+    static Order CheckContinuity(const Header &header, PidState &state);
     void OnSection(uint16_t pid, const unsigned char *section, size_t size);
     void UpdatePmtPids(const unsigned char *section, size_t size);
     void AddUse(uint16_t pid);
     void RemoveUses(const std::vector<uint16_t> &pids);
 
     Handler handler_;
-    DemultiplexerCounters counters_;  // but for the clock
+    DemultiplexerCounters counters_;  // but for those of the PIDs, and the clock
     uint64_t position_ = 0;           // packets so far
     PcrMeter pcr_meter_;
-    std::vector<Continuity> continuity_;                     // one for each PID
-    std::map<uint16_t, SectionAssembler> assemblers_;        // by PID, where uses_ is not 0
-    std::vector<unsigned> uses_;                             // for each PID, fixed and PAT entries
+    std::vector<PidState> pids_;
     std::map<uint8_t, std::vector<uint16_t>> pat_sections_;  // PMT PIDs, by section_number
 };
 

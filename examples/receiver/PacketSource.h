@@ -22,8 +22,8 @@ struct PacketCounters {
 // follow at the packet distance, and no byte belongs to two packets.
 class PacketSource {
   public:
-    // Called with the 188 bytes of a packet, valid during the call.
-    using Handler = std::function<void(const unsigned char *packet)>;
+    // Called with packets of 188 bytes, one right behind the other, valid during the call.
+    using Handler = std::function<void(const unsigned char *packets, size_t count)>;
 
     explicit PacketSource(Handler handler) : handler_(std::move(handler)) {}
 

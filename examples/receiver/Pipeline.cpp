@@ -10,6 +10,7 @@
 // thread's result is with control before the end gets there.
 #include "Pipeline.h"
 
+#include <algorithm>
 #include <cstring>
 #include <memory>
 #include <new>
@@ -143,10 +144,17 @@ void RunReader(Pipeline &pipeline) {
         Send(pipeline.threads[kDemultiplexer], {Kind::kPackets, nullptr, length});
         batch.clear();
     };
-    PacketSource source([&](const unsigned char *packet) {
-        batch.insert(batch.end(), packet, packet + kPacketSize);
-        if (batch.size() == kBatchSize) {
-            send_batch();
+    PacketSource source([&](const unsigned char *packets, size_t count) {
+        const unsigned char *const end = packets + count * kPacketSize;
+        while (packets < end) {
+            const size_t room = kBatchSize - batch.size();
+            const unsigned char *const part =
+                packets + std::min(room, static_cast<size_t>(end - packets));
+            batch.insert(batch.end(), packets, part);
+            packets = part;
+            if (batch.size() == kBatchSize) {
+                send_batch();
+            }
         }
     });
     std::vector<unsigned char> block(kBlockSize);

@@ -161,21 +161,55 @@ void ReadStreamDescriptor(uint8_t tag, FieldReader &body, NetworkStream &stream)
 
 // A text that several descriptors of an event carry on: named items, then free text. An item
 // without a name goes on with the one before.
-struct ExtendedText {
-    std::string items;
-    std::string text;
-
-    void Read(FieldReader &body) {
+class ExtendedText {
+  public:
+    // Takes a descriptor in the language of the first one, or in the wanted one from where that
+    // comes.
+    void Read(FieldReader &body, const Code &wanted) {
+        body.Skip(8);
+        const Code language = ReadCode(body);
+        if (!(language == language_) && !language_.IsEmpty()) {
+            if (!(language == wanted)) {
+                return;
+            }
+            items_.clear();
+            text_.clear();
+        }
+        language_ = language;
         FieldReader fields = body.Enter(body.U8());
         while (fields.BytesLeft() >= 2) {
             const std::string name = ToUtf8(fields.Bytes(fields.U8()));
             const std::string item = ToUtf8(fields.Bytes(fields.U8()));
-            items += name.empty() ? item : (items.empty() ? "" : "\n") + name + ": " + item;
+            items_ += name.empty() ? item : (items_.empty() ? "" : "\n") + name + ": " + item;
         }
-        text += ToUtf8(body.Bytes(body.U8()));
+        text_ += ToUtf8(body.Bytes(body.U8()));
     }
-    std::string Text() const { return items + (items.empty() || text.empty() ? "" : "\n") + text; }
+
+    std::string Text() const {
+        return items_ + (items_.empty() || text_.empty() ? "" : "\n") + text_;
+    }
+
+  private:
+    Code language_;
+    std::string items_;
+    std::string text_;
 };
+
+// The first name stays until one in the wanted language comes.
+void ReadShortEvent(FieldReader &body, const Code &wanted, Event &event) {
+    const Code language = ReadCode(body);
+    const bool named = !event.name.empty();
+    if (named && (!(language == wanted) || event.language == wanted)) {
+        return;
+    }
+    std::string name = ToUtf8(body.Bytes(body.U8()));
+    if (named && name.empty()) {
+        return;
+    }
+    event.language = language;
+    event.name = std::move(name);
+    event.text = ToUtf8(body.Bytes(body.U8()));
+}
 
 }  // namespace
 
@@ -321,20 +355,12 @@ Event TableParser::ReadEvent(FieldReader &fields) const {
     event.duration = DecodeBcdTime(fields.U32(24));
     fields.Skip(4);
     const uint16_t length = fields.U16(12);
-    const FieldReader loop = fields.Enter(length);
-    event.language = PickLanguage(loop, kDescriptorShortEvent);
-    const Code extended_language = PickLanguage(loop, kDescriptorExtendedEvent);
     ExtendedText extended;
-    ForEachDescriptor(loop, [&](uint8_t tag, FieldReader &body) {
-        if (tag == kDescriptorShortEvent && ReadCode(body) == event.language &&
-            event.name.empty()) {
-            event.name = ToUtf8(body.Bytes(body.U8()));
-            event.text = ToUtf8(body.Bytes(body.U8()));
+    ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
+        if (tag == kDescriptorShortEvent) {
+            ReadShortEvent(body, language_, event);
         } else if (tag == kDescriptorExtendedEvent) {
-            body.Skip(8);
-            if (ReadCode(body) == extended_language) {
-                extended.Read(body);
-            }
+            extended.Read(body, language_);
         } else if (tag == kDescriptorContent) {
             while (body.BytesLeft() >= 2) {
                 event.genres.push_back(body.U8());
@@ -355,22 +381,6 @@ Event TableParser::ReadEvent(FieldReader &fields) const {
     });
     event.extended_text = extended.Text();
     return event;
-}
-
-// The wanted language when the loop has a descriptor of this tag in it, else that of the first one.
-Code TableParser::PickLanguage(const FieldReader &loop, uint8_t tag) const {
-    std::optional<Code> first;
-    bool wanted = false;
-    ForEachDescriptor(loop, [&](uint8_t found, FieldReader &body) {
-        if (found != tag) {
-            return;
-        }
-        body.Skip(tag == kDescriptorExtendedEvent ? 8 : 0);
-        const Code language = ReadCode(body);
-        first = first.value_or(language);
-        wanted = wanted || (language == language_ && !language.IsEmpty());
-    });
-    return wanted ? language_ : first.value_or(Code());
 }
 
 void TableParser::OnTime(uint8_t table_id, FieldReader &fields) {

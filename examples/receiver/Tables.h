@@ -44,7 +44,6 @@ class TableParser {
     void OnEit(uint8_t table_id, const SectionHeader &header, FieldReader &fields);
     void OnTime(uint8_t table_id, FieldReader &fields);
     Event ReadEvent(FieldReader &fields) const;
-    Code PickLanguage(const FieldReader &loop, uint8_t tag) const;
 
     Model &model_;
     Code language_;

@@ -27,8 +27,11 @@ inline Report ReadStream(const Bytes &stream, size_t block = 4096) {
     Demultiplexer demultiplexer([&](uint16_t pid, const unsigned char *section, size_t size) {
         parser.Push(pid, Bytes(section, section + size).data(), size);
     });
-    PacketSource source(
-        [&](const unsigned char *packet) { demultiplexer.Push(Bytes(packet, packet + kPacketSize).data()); });
+    PacketSource source([&](const unsigned char *packets, size_t count) {
+        for (; count > 0; --count, packets += kPacketSize) {
+            demultiplexer.Push(Bytes(packets, packets + kPacketSize).data());
+        }
+    });
     for (size_t at = 0; at < stream.size(); at += block) {
         const auto begin = stream.begin() + static_cast<std::ptrdiff_t>(at);
         const Bytes exact(begin, begin + static_cast<std::ptrdiff_t>(std::min(block, stream.size() - at)));
