@@ -4,9 +4,8 @@
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
-#include <stdlib.h>
+#include <pty.h>
 #include <sys/stat.h>
-#include <termios.h>
 #include <unistd.h>
 
 #include <ctime>
@@ -34,11 +33,10 @@ Bytes Fill(size_t size, unsigned char value) { return Bytes(size, value); }
 unsigned char Low(size_t value) { return static_cast<unsigned char>(value); }
 
 // Packets that carry their number in the payload.
-Bytes Numbered(size_t first, size_t count, size_t lead = 0, size_t trail = 0) {
+Bytes Numbered(size_t first, size_t count, const Bytes &lead = {}, const Bytes &trail = {}) {
     Bytes out;
     for (size_t i = first; i < first + count; ++i) {
-        const Bytes packet = MakePacket(0x100, static_cast<unsigned>(i), {Low(i >> 8), Low(i)});
-        out = out + Fill(lead, 0x11) + packet + Fill(trail, 0x22);
+        out = out + lead + MakePacket(0x100, static_cast<unsigned>(i), {Low(i >> 8), Low(i)}) + trail;
     }
     return out;
 }
@@ -55,18 +53,16 @@ Bytes Random(std::mt19937 &random, size_t size) {
 
 TEST(Receiver, FindsPacketsInAnyCompany) {
     std::mt19937 random(47);
-    Bytes damaged = Numbered(0, 20);
-    damaged[1316] = 0x46;  // the eighth's
-    Bytes cut = Numbered(0, 20);
+    const Bytes stamp = Fill(4, 0x11), parity = Fill(16, 0x22), noise = Random(random, 300);
+    Bytes damaged = Numbered(0, 20), cut = Numbered(0, 20), table, datagrams, text;
+    damaged[1316] = 0x46;  // the eighth's sync byte
     cut.erase(cut.begin() + 1000, cut.begin() + 1040);
-    Bytes text;
-    while (text.size() < 5000) {
-        text = text + Bytes{'G', 'o', 'o', 'd', ' ', 'm', 'o', 'r', 'n', 'i', 'n', 'g', ' '};
+    for (size_t i = 0; i < 70; i += 7) {
+        datagrams = datagrams + Fill(12, 0x80) + Numbered(i, 7);
     }
-    const Bytes noise = Random(random, 300);
-    Bytes table;
-    for (int i = 0; i < 40; ++i) {
+    for (int i = 0; i < 400; ++i) {
         table = table + Bytes{0x47} + Fill(191, 0);
+        text = text + Raw("Good morning ");
     }
     const struct {
         const char *name;
@@ -74,43 +70,27 @@ TEST(Receiver, FindsPacketsInAnyCompany) {
         size_t packets, losses, size;
     } cases[] = {
         {"188", Numbered(0, 300), 300, 0, 188},
-        {"192", Numbered(0, 300, 4, 0), 300, 0, 192},
-        {"204", Numbered(0, 300, 0, 16), 300, 0, 204},
+        {"192", Numbered(0, 300, stamp), 300, 0, 192},
+        {"204", Numbered(0, 300, {}, parity), 300, 0, 204},
         {"one packet", Numbered(0, 1), 1, 0, 188},
-        {"one of 192", Numbered(0, 1, 4, 0), 1, 0, 192},
-        {"one of 204", Numbered(0, 1, 0, 16), 1, 0, 204},
-        {"time stamps that look like sync bytes",
-         [] {
-             Bytes out;
-             for (size_t i = 0; i < 9; ++i) {
-                 out = out + Bytes{0x47, 0x01, 0x00, 0x10} + Numbered(i, 1);
-             }
-             return out;
-         }(),
-         9, 0, 192},
+        {"one of 192", Numbered(0, 1, stamp), 1, 0, 192},
+        {"one of 204", Numbered(0, 1, {}, parity), 1, 0, 204},
+        {"time stamps that look like sync bytes", Numbered(0, 9, {0x47, 0x01, 0x00, 0x10}), 9, 0, 192},
         {"garbage in front", noise + Numbered(0, 20), 20, 1, 188},
-        {"garbage in front of 192", noise + Numbered(0, 20, 4, 0), 20, 1, 192},
+        {"garbage in front of 192", noise + Numbered(0, 20, stamp), 20, 1, 192},
         {"garbage between, twice", Numbered(0, 9) + noise + Numbered(9, 4) + noise + Numbered(13, 5), 18, 2, 188},
         {"garbage soon", Numbered(0, 3) + noise + Numbered(3, 17), 20, 1, 188},
-        {"a table with even strides", noise + table, 0, 0, 0},
         {"garbage before the last packet", Numbered(0, 9) + noise + Numbered(9, 1), 10, 1, 188},
         {"garbage behind", Numbered(0, 9) + Fill(500, 0), 9, 1, 188},
-        {"datagrams of seven",
-         [] {
-             Bytes out;
-             for (size_t i = 0; i < 10; ++i) {
-                 out = out + Fill(12, 0x80) + Numbered(i * 7, 7);
-             }
-             return out;
-         }(),
-         70, 10, 188},
+        {"datagrams of seven", datagrams, 70, 10, 188},
         {"a damaged sync byte", damaged, 19, 1, 188},
         {"bytes missing within a packet", cut, 19, 1, 188},
         {"cut in a packet", Numbered(0, 9) + Bytes{0x47, 0x01, 0x00}, 9, 0, 188},
-        {"cut in parity", Numbered(0, 9, 0, 16) + Numbered(9, 1), 10, 0, 204},
+        {"cut in parity", Numbered(0, 9, {}, parity) + Numbered(9, 1), 10, 0, 204},
         {"sync bytes and nothing else", Fill(188 * 50 + 7, 0x47), 50, 0, 188},
         {"nothing", {}, 0, 0, 0},
         {"less than a packet", Fill(187, 0x47), 0, 0, 0},
+        {"a table with even strides", noise + table, 0, 0, 0},
         {"text", text, 0, 0, 0},
         {"noise", Random(random, 3000000), 0, 0, 0},
     };
@@ -142,19 +122,12 @@ TEST(Receiver, FindsPacketsInAnyCompany) {
 }
 
 TEST(Receiver, FollowsContinuity) {
-    struct Kind {
-        unsigned flags;
-        Bytes field;
-    };
-    const Kind plain{kPayload, {}};
-    const Kind error{kTransportError | kScrambled | kPayload, {}};
-    const Kind scrambled{kScrambled | kPayload, {}};
-    const Kind no_field{0, {}};
-    const Kind empty{kAdaptation, {183, 0x00}};
-    const Kind jump{kAdaptation | kPayload, {1, 0x80}};
+    const Content plain{{}, kPayload}, scrambled{{}, kScrambled | kPayload}, nothing{{}, 0};
+    const Content error{{}, kTransportError | kScrambled | kPayload};
+    const Content empty{{183, 0x00}, kAdaptation}, jump{{1, 0x80}, kAdaptation | kPayload};
     const struct {
         const char *name;
-        std::vector<std::pair<unsigned, const Kind &>> packets;  // with their counters
+        std::vector<std::pair<unsigned, const Content &>> packets;  // with their counters
         uint64_t continuity, transport, scrambled;
         uint16_t pid;
     } cases[] = {
@@ -165,7 +138,7 @@ TEST(Receiver, FollowsContinuity) {
         {"without payload", {{1, plain}, {1, empty}, {1, empty}, {2, plain}}, 0, 0, 0, 0x100},
         {"counted without payload", {{1, plain}, {2, empty}, {3, plain}}, 1, 0, 0, 0x100},
         {"announced jump", {{1, plain}, {9, jump}, {10, plain}}, 0, 0, 0, 0x100},
-        {"no field at all", {{1, plain}, {7, no_field}, {2, plain}}, 0, 0, 0, 0x100},
+        {"no field at all", {{1, plain}, {7, nothing}, {2, plain}}, 0, 0, 0, 0x100},
         {"transport error", {{1, plain}, {9, error}, {2, plain}}, 0, 1, 0, 0x100},
         {"lost to a transport error", {{1, plain}, {2, error}, {3, plain}}, 1, 1, 0, 0x100},
         {"scrambled", {{1, scrambled}, {2, scrambled}, {4, plain}}, 1, 0, 2, 0x100},
@@ -173,8 +146,8 @@ TEST(Receiver, FollowsContinuity) {
     };
     for (const auto &c : cases) {
         Demultiplexer demultiplexer([](uint16_t, const unsigned char *, size_t) {});
-        for (const auto &[counter, kind] : c.packets) {
-            demultiplexer.Push(MakePacket(c.pid, counter, kind.field, kind.flags).data());
+        for (const auto &[counter, content] : c.packets) {
+            demultiplexer.Push(MakePacket(c.pid, counter, content.bytes, content.flags).data());
         }
         const DemultiplexerCounters counters = demultiplexer.Counters();
         EXPECT_EQ(counters.continuity_errors, c.continuity) << c.name;
@@ -188,37 +161,29 @@ TEST(Receiver, FollowsContinuity) {
 TEST(Receiver, MeasuresClocks) {
     constexpr uint64_t second = 27000000, cycle = (uint64_t{1} << 33) * 300;
     PcrMeter meter;
-    const struct {
-        uint16_t pid;
-        uint64_t pcr, position;
-        bool restart;
-    } references[] = {
-        {1, cycle - second / 2, 10, false},
-        {1, second / 2, 110, false},  // over the clock's end
-        {1, 7 * second, 130, false},  // a jump
-        {1, 6 * second, 140, false},  // back
-        {2, 0, 141, false},
-        {1, 6 * second + 9, 160, false},
-        {1, 6 * second + 99, 170, true},  // set anew
-        {2, second, 171, false},          // less than the first clock by nine
-    };
-    for (const auto &r : references) {
-        meter.Push(r.pid, r.pcr, r.position, r.restart);
-    }
+    meter.Push(1, cycle - second / 2, 10, false);
+    meter.Push(1, second / 2, 110, false);      // over the clock's end
+    meter.Push(1, 7 * second, 130, false);      // a jump
+    meter.Push(1, 6 * second, 140, false);      // back
+    meter.Push(2, 0, 141, false);               // another clock
+    meter.Push(1, 6 * second + 9, 160, false);  // in step again
+    meter.Push(1, 6 * second + 99, 170, true);  // set anew
+    meter.Push(2, second, 171, false);          // less than the first clock by nine
     EXPECT_EQ(meter.Longest().ticks, second + 9);
     EXPECT_EQ(meter.Longest().packets, 120u);
 }
 
 TEST(Receiver, AssemblesSections) {
     const Bytes small = MakeSection(0x4E, 1, Fill(20, 1));   // 32 bytes
-    const Bytes large = MakeSection(0x50, 1, Fill(388, 2));  // 400 bytes
-    const auto part = [&large](size_t from, size_t count) {
-        const auto begin = large.begin() + static_cast<std::ptrdiff_t>(from);
-        return Bytes(begin, begin + static_cast<std::ptrdiff_t>(count));
-    };
+    const Bytes large = MakeSection(0x50, 1, Fill(388, 2));  // 400 bytes, in three packets
     Bytes damaged = small;
     damaged[10] ^= 0x10;
     constexpr unsigned start = kUnitStart | kPayload;
+    const std::vector<Content> parts = SplitSections({large});
+    const Content &first = parts[0], &second = parts[1], &third = parts[2];
+    const Content late{second.bytes, kPayload | 1}, again{second.bytes, kPayload | 15};
+    const Content last_and_next = SplitSections({large, small})[2], cut_and_next{Fill(6, 5) + small, start};
+    const Content far{Bytes{184} + small, start}, inner{small, kPayload};
     const struct {
         const char *name;
         std::vector<Content> contents;  // the flags' low four bits: steps of the counter beside 1
@@ -226,36 +191,17 @@ TEST(Receiver, AssemblesSections) {
     } cases[] = {
         {"two in a packet", SplitSections({small, small}), 2, 0, 0},
         {"damaged between good ones", SplitSections({small, damaged, small}), 2, 1, 0},
-        {"over packets", SplitSections({large}), 1, 0, 0},
+        {"over packets", parts, 1, 0, 0},
         {"the longest", SplitSections({MakeSection(0x50, 1, Fill(4084, 3))}), 1, 0, 0},
         {"too long", SplitSections({MakeSection(0x50, 1, Fill(4085, 3))}), 0, 0, 1},
         {"too long for its table", SplitSections({MakeSection(0x42, 1, Fill(1013, 3))}), 0, 0, 1},
-        {"end, pointer and next", SplitSections({large, small}), 2, 0, 0},
+        {"end, pointer and next", {first, second, last_and_next}, 2, 0, 0},
         {"header over two packets", SplitSections({MakeSection(0x4E, 1, Fill(169, 1)), large}), 2, 0, 0},
-        {"start in mid-stream", {{part(183, 184), kPayload}, {Bytes{33} + part(367, 33) + small, start}}, 1, 0, 0},
-        {"a lost packet",
-         {{Bytes{0} + part(0, 183), start}, {part(183, 184), kPayload | 1}, {part(183, 184), kPayload}},
-         0,
-         0,
-         1},
-        {"a packet sent twice",
-         {{Bytes{0} + part(0, 183), start},
-          {part(183, 184), kPayload},
-          {part(183, 184), kPayload | 15},
-          {part(367, 33), kPayload}},
-         1,
-         0,
-         0},
-        {"cut short by the next",
-         {{Bytes{0} + part(0, 183), start}, {Bytes{5} + part(183, 5) + small, start}},
-         1,
-         0,
-         1},
-        {"pointer beyond the packet",
-         {{Bytes{0} + part(0, 183), start}, {Bytes{184} + small, start}, {small, kPayload}},
-         0,
-         0,
-         1},
+        {"start in mid-stream", {second, last_and_next}, 1, 0, 0},
+        {"a lost packet", {first, late, second}, 0, 0, 1},
+        {"a packet sent twice", {first, second, again, third}, 1, 0, 0},
+        {"cut short by the next", {first, cut_and_next}, 1, 0, 1},
+        {"pointer beyond the packet", {first, far, inner}, 0, 0, 1},
         {"no room for a CRC", {{{0, 0x4E, 0xB0, 0, 0x4E, 0xB0, 3, 1, 2, 3}, start}}, 0, 2, 0},
         {"no CRC to check", {{{0, 0x70, 0x70, 5, 0, 0, 0, 0, 0, 0x72, 0x70, 0, 0x71, 0x70, 0}, start}}, 3, 0, 0},
         {"nothing but stuffing", {{{0}, start}, {{}, kPayload}}, 0, 0, 0},
@@ -284,23 +230,11 @@ TEST(Receiver, DecodesTimes) {
         strftime(expected, sizeof expected, "%Y-%m-%d 23:59:58", &utc);
         ASSERT_EQ(ToText(DecodeDateTime(static_cast<uint16_t>(mjd), 0x235958)), expected);
     }
-    const struct {
-        uint16_t mjd;
-        uint32_t bcd;
-        const char *expected;
-    } cases[] = {
-        {0xC079, 0x124500, "1993-10-13 12:45:00"},
-        {15079, 0, "1900-03-01 00:00:00"},
-        {15078, 0, ""},
-        {0xFFFF, 0xFFFFFF, ""},
-        {50000, 0x240000, ""},
-        {50000, 0x0A0000, ""},
-        {50000, 0x006000, ""},
-        {50000, 0x000060, ""},
-        {50000, 0x00000F, ""},
-    };
-    for (const auto &c : cases) {
-        EXPECT_EQ(ToText(DecodeDateTime(c.mjd, c.bcd)), c.expected);
+    EXPECT_EQ(ToText(DecodeDateTime(0xC079, 0x124500)), "1993-10-13 12:45:00");
+    EXPECT_EQ(ToText(DecodeDateTime(15079, 0)), "1900-03-01 00:00:00");
+    EXPECT_EQ(ToText(DecodeDateTime(15078, 0)), "");
+    for (const uint32_t bcd : {0xFFFFFFu, 0x240000u, 0x0A0000u, 0x006000u, 0x000060u, 0x00000Fu}) {
+        EXPECT_EQ(ToText(DecodeDateTime(50000, bcd)), "") << bcd;
     }
     EXPECT_EQ(ToText(DecodeBcdTime(0x995959)), "99:59:59");
     EXPECT_EQ(ToText(DecodeBcdTime(0xA00000)), "");
@@ -558,7 +492,7 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
     WriteAll(Path("text"), std::string(9999, 'x'));
     WriteAll(Path("cut.ts"), SampleText().substr(0, 100000));
     WriteAll(Path("-dash"), SampleText());
-    const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, 4) + Fill(9000, 0x11);
+    const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, Fill(4, 0)) + Fill(9000, 0x11);
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
     const struct {
         std::vector<std::string> arguments;
@@ -598,13 +532,11 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
 
 // The first end of a terminal gives an error when the second one is closed, behind what was written.
 TEST_F(ReceiverFiles, TellsOfAReadError) {
-    const int input = posix_openpt(O_RDWR | O_NOCTTY);
-    ASSERT_TRUE(input >= 0 && grantpt(input) == 0 && unlockpt(input) == 0);
-    const int terminal = open(ptsname(input), O_RDWR | O_NOCTTY);
-    termios modes{};
-    ASSERT_EQ(tcgetattr(terminal, &modes), 0);
-    cfmakeraw(&modes);
-    ASSERT_EQ(tcsetattr(terminal, TCSANOW, &modes), 0);
+    int input = -1, terminal = -1;
+    termios raw{};
+    cfmakeraw(&raw);
+    cfsetspeed(&raw, B9600);
+    ASSERT_EQ(openpty(&input, &terminal, nullptr, &raw, nullptr), 0);
     const Bytes packets = Numbered(0, 10);
     ASSERT_EQ(write(terminal, packets.data(), packets.size()), static_cast<ssize_t>(packets.size()));
     close(terminal);
@@ -719,18 +651,10 @@ TEST_F(ReceiverFiles, SurvivesDamage) {
         Bytes stream = Raw(SampleText());
         for (size_t damage = random() % 200; damage > 0; --damage) {
             const auto place = stream.begin() + static_cast<std::ptrdiff_t>(random() % (stream.size() - 2000));
-            const auto count = static_cast<std::ptrdiff_t>(random() % 1000);
-            switch (random() % 20) {
-                case 0:
-                    stream.erase(place, place + count);
-                    break;
-                case 1: {
-                    const Bytes noise = Random(random, static_cast<size_t>(count));
-                    stream.insert(place, noise.begin(), noise.end());
-                    break;
-                }
-                default:
-                    *place = Low(random());
+            if (random() % 10 == 0) {
+                stream.erase(place, place + static_cast<std::ptrdiff_t>(random() % 1000));
+            } else {
+                *place = Low(random());
             }
         }
         WriteAll(Path("damaged.ts"), std::string(stream.begin(), stream.end()));

@@ -164,6 +164,7 @@ void WriteJson(const Report &report, std::FILE *out) {
     WriteTime(model, clock, json);
     json.Boolean("ewbs", IsEmergency(model, services));
     WriteServices(services, json);
+    json.Number("components_left_out", Number(model.components_left_out));
     json.BeginArray("events");
     for (const ListedEvent &event : ListEvents(model)) {
         WriteEvent(event, clock, json);

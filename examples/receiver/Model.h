@@ -88,6 +88,9 @@ class Sections {
 };
 
 struct Model {
+    // Of all PMTs together, far more than any stream has.
+    static constexpr size_t kMostComponents = 65536;
+
     std::optional<uint16_t> transport_stream_id;
     std::optional<uint16_t> network_id;
     Name network_name;
@@ -97,6 +100,8 @@ struct Model {
     Sections<std::vector<ServiceInfo>> sdt;
     Sections<NetworkSection> nit;
     std::map<uint16_t, ProgramMap> pmts;  // by service_id
+    size_t components = 0;                // in these
+    uint64_t components_left_out = 0;     // for lack of room
     EventTable events;
     EventTable other_events;  // of other transport streams, which must not push this stream's out
 };

@@ -108,8 +108,8 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     Options options;
     const std::string wrong = ParseArguments(arguments, options);
     if (!wrong.empty()) {
-        std::fprintf(err, "receiver: %s\n", wrong.c_str());
-        WriteHelp(err, TerminalWidth(err));
+        std::fprintf(err, "receiver: %s\nusage: receiver [OPTION...] FILE (--help tells more)\n",
+                     wrong.c_str());
         return 2;
     }
     if (options.help) {

@@ -53,8 +53,10 @@ void AddStream(const Report &report, Paragraphs &out) {
     if (model.transport_stream_id) {
         text = Format("transport stream 0x%04X, ", *model.transport_stream_id);
     }
-    text += Format("%llu packets of %u bytes", Printable(report.packets.packets),
-                   report.packets.packet_size);
+    text += Format("%llu packets", Printable(report.packets.packets));
+    if (report.packets.packets != 0) {
+        text += Format(" of %u bytes", report.packets.packet_size);
+    }
     const std::optional<int64_t> duration = DurationOf(report);
     const std::optional<int64_t> bit_rate = BitRateOf(report);
     out.Add("Stream    ", text);

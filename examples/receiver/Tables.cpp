@@ -287,7 +287,15 @@ void TableParser::OnPmt(uint16_t pid, const SectionHeader &header, FieldReader &
         });
         map.components.push_back(component);
     }
-    model_.pmts[header.extension] = std::move(map);
+    ProgramMap &kept = model_.pmts[header.extension];
+    model_.components -= kept.components.size();
+    const size_t fitting =
+        std::min(map.components.size(), Model::kMostComponents - model_.components);
+    model_.components_left_out += map.components.size() - fitting;
+    model_.components += fitting;
+    kept = std::move(map);
+    kept.components.resize(fitting);
+    kept.components.shrink_to_fit();
 }
 
 void TableParser::OnNit(const SectionHeader &header, FieldReader &fields) {
