@@ -56,43 +56,52 @@ constexpr struct {
     {"--help", nullptr, Set<&Options::help>, "show this"},
 };
 
+// Takes the option at `i`, and its value, where it has one.
+//   returns  empty; else what is wrong with it
+std::string TakeOption(const std::vector<std::string> &arguments, size_t &i, Options &options) {
+    const std::string name = arguments[i] == "-h" ? "--help" : arguments[i];
+    const auto *option = std::find_if(std::begin(kOptions), std::end(kOptions),
+                                      [&](const auto &known) { return known.name == name; });
+    if (option == std::end(kOptions)) {
+        return "unknown option " + name;
+    }
+    if (option->value == nullptr) {
+        return option->set(options, "");
+    }
+    if (i + 1 == arguments.size()) {
+        return name + " needs a value";
+    }
+    return option->set(options, arguments[++i]);
+}
+
+std::string TakeFile(const std::string &path, Options &options) {
+    if (path.empty()) {
+        return "an empty file name";
+    }
+    if (!options.path.empty()) {
+        return "more than one file: " + options.path + " and " + path;
+    }
+    options.path = path;
+    return {};
+}
+
 }  // namespace
 
 std::string ParseArguments(const std::vector<std::string> &arguments, Options &options) {
     bool only_files = false;
-    for (size_t i = 0; i < arguments.size(); ++i) {
+    std::string wrong;
+    for (size_t i = 0; i < arguments.size() && wrong.empty(); ++i) {
         const std::string &argument = arguments[i];
-        const bool is_option = !only_files && argument.size() > 1 && argument[0] == '-';
-        if (is_option && argument == "--") {
+        if (only_files || argument.size() < 2 || argument[0] != '-') {
+            wrong = TakeFile(argument, options);
+        } else if (argument == "--") {
             only_files = true;
-            continue;
-        }
-        if (!is_option) {
-            if (argument.empty()) {
-                return "an empty file name";
-            }
-            if (!options.path.empty()) {
-                return "more than one file: " + options.path + " and " + argument;
-            }
-            options.path = argument;
-            continue;
-        }
-        const std::string name = argument == "-h" ? "--help" : argument;
-        const auto *option = std::find_if(std::begin(kOptions), std::end(kOptions),
-                                          [&](const auto &known) { return known.name == name; });
-        if (option == std::end(kOptions)) {
-            return "unknown option " + argument;
-        }
-        if (option->value != nullptr && i + 1 == arguments.size()) {
-            return argument + " needs a value";
-        }
-        const std::string wrong =
-            option->set(options, option->value != nullptr ? arguments[++i] : std::string());
-        if (!wrong.empty()) {
-            return wrong;
+        } else {
+            wrong = TakeOption(arguments, i, options);
         }
     }
-    return options.help || options.version || !options.path.empty() ? "" : "no file";
+    const bool complete = options.help || options.version || !options.path.empty();
+    return !wrong.empty() || complete ? wrong : "no file";
 }
 
 void WriteHelp(std::FILE *out, size_t width) {

@@ -112,11 +112,10 @@ StreamClock::StreamClock(const Report &report) {
         offset_ = &offsets.front();
     }
     const NetworkStream *stream = FindOwnStream(report.model);
-    if (has_own) {
-        nation_ = own;
-    } else if (!offsets.empty()) {
+    const bool is_dvb = stream != nullptr && stream->dvb;
+    if (!offsets.empty() && !has_own) {
         nation_ = offsets.front().country;
-    } else if (stream == nullptr || !stream->dvb) {
+    } else if (has_own || !is_dvb) {
         nation_ = own;
     }
 }

@@ -180,7 +180,10 @@ class ExtendedText {
         while (fields.BytesLeft() >= 2) {
             const std::string name = ToUtf8(fields.Bytes(fields.U8()));
             const std::string item = ToUtf8(fields.Bytes(fields.U8()));
-            items_ += name.empty() ? item : (items_.empty() ? "" : "\n") + name + ": " + item;
+            if (!name.empty()) {
+                items_.append(items_.empty() ? "" : "\n").append(name).append(": ");
+            }
+            items_ += item;
         }
         text_ += ToUtf8(body.Bytes(body.U8()));
     }

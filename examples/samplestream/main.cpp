@@ -144,7 +144,7 @@ Bytes Entry(const Programme &programme, unsigned running) {
         const Bytes audio = Bytes{0xF2, 0x01, 0x10, 0x11, 0xFF, 0xC1} + Raw("poreng");
         descriptors = descriptors + Credits() + Descriptor(0xC4, audio);
     }
-    const unsigned rating = programme.content << 4u | programme.age;
+    const unsigned rating = unsigned{programme.content} << 4 | programme.age;
     descriptors = descriptors + Descriptor(0x54, U8(programme.genre) + U8(0xFF)) +
                   Descriptor(0x55, Raw("BRA") + U8(rating));
     return MakeEvent(programme.id, MakeDateTime(kDay, programme.start), Bcd(programme.duration),
