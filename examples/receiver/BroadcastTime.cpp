@@ -47,15 +47,15 @@ std::optional<DateTime> DecodeDateTime(uint16_t mjd, uint32_t bcd) {
                     *time / 3600,       *time / 60 % 60,       *time % 60};
 }
 
-std::optional<DateTime> Shifted(const DateTime &time, int minutes) {
+std::optional<DateTime> Shifted(const DateTime &time, int seconds) {
     VarnekCDateTime point = {time.year, time.month, time.day, time.hour, time.minute, time.second};
-    const VarnekCDateTime span = {0, 0, 0, std::abs(minutes) / 60, std::abs(minutes) % 60, 0};
-    const uint32_t seconds = VarnekPGL_DateTimeToSeconds(&point);
+    const VarnekCDateTime span = {0, 0, 0, 0, 0, std::abs(seconds)};
+    const uint32_t elapsed = VarnekPGL_DateTimeToSeconds(&point);
     // Outside the library's calendar a point counts as 0 seconds.
-    if (seconds == 0 || (minutes < 0 && seconds < span.GetElapsedSeconds())) {
+    if (elapsed == 0 || (seconds < 0 && elapsed < span.GetElapsedSeconds())) {
         return std::nullopt;
     }
-    if (minutes < 0) {
+    if (seconds < 0) {
         point -= span;
     } else {
         point += span;

@@ -23,9 +23,9 @@ std::optional<int> DecodeBcdTime(uint32_t bcd);
 //            before 1900-03-01, where the calendar rule that broadcasting uses begins
 std::optional<DateTime> DecodeDateTime(uint16_t mjd, uint32_t bcd);
 
-// The time that is `minutes` later, or earlier when they are negative.
+// The time that is `seconds` later, or earlier when they are negative.
 //   returns  nothing when either time lies outside 1970 to 2030
-std::optional<DateTime> Shifted(const DateTime &time, int minutes);
+std::optional<DateTime> Shifted(const DateTime &time, int seconds);
 
 // "YYYY-MM-DD hh:mm:ss" and "hh:mm:ss"; empty when not known.
 std::string ToText(const std::optional<DateTime> &time);

@@ -1,7 +1,11 @@
 // Packets are written a block at a time, since each write of the library is a system call.
 #include "Capture.h"
 
-#include "PacketSource.h"
+#include <unistd.h>
+
+#include <cerrno>
+
+#include "TransportStream.h"
 #include "Varnek_File.h"
 
 namespace receiver {
@@ -31,11 +35,10 @@ Capture::~Capture() {
 }
 
 bool Capture::Open(const std::string &path) {
-    // The open of a large file never truncates.
-    if (VarnekPGL_WriteFile(path.c_str(), "", 0) != 0) {
-        return false;
-    }
     file_ = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_WRITE);
+    if (file_ < 0) {
+        file_ = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_CREATE_RW);
+    }
     return file_ >= 0;
 }
 
@@ -56,6 +59,14 @@ void Capture::Finish() {
 }
 
 void Capture::Write() {
+    if (!empty_) {
+        // The library never truncates. A device or a pipe has no length.
+        if (ftruncate(file_, 0) != 0 && errno != EINVAL) {
+            failure_ = "the old content could not be removed";
+            return;
+        }
+        empty_ = true;
+    }
     const auto size = static_cast<uint32_t>(waiting_.size());
     const int32_t result = VarnekPGL_WriteFileByHandle64Bits(file_, waiting_.data(), size);
     if (result != static_cast<int32_t>(size)) {

@@ -17,7 +17,8 @@ class Capture {
     Capture &operator=(const Capture &) = delete;
     ~Capture();
 
-    // Empties or creates the file.
+    // Opens the file, and creates it if need be. What is in it stays until there is something to
+    // write.
     //   returns  false when it cannot be written
     bool Open(const std::string &path);
     bool IsOpen() const { return file_ >= 0; }
@@ -33,6 +34,7 @@ class Capture {
     void Write();
 
     int32_t file_ = -1;
+    bool empty_ = false;  // nothing of an earlier file is left
     std::vector<unsigned char> waiting_;
     std::string failure_;
 };

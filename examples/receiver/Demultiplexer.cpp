@@ -4,20 +4,27 @@
 
 #include <utility>
 
-#include "Ids.h"
-#include "PacketSource.h"
 #include "Tables.h"
+#include "TransportStream.h"
 #include "Varnek_Util.h"
 
 namespace receiver {
 namespace {
 
-constexpr size_t kPidCount = 8192;
 constexpr size_t kSmallestCheckedSection = 7;  // a header and a CRC
 
 // Time and date, running status, stuffing and discontinuity information end without a CRC.
 bool CarriesCrc(unsigned char table_id) {
     return table_id != kTableTdt && table_id != 0x71 && table_id != 0x72 && table_id != 0x7E;
+}
+
+// 33 bits of 90 kHz, six reserved ones, nine of 27 MHz.
+uint64_t ReadPcr(const unsigned char *bytes) {
+    uint64_t value = 0;
+    for (int i = 0; i < 6; ++i) {
+        value = value << 8 | bytes[i];
+    }
+    return (value >> 15) * 300 + (value & 0x1FF);
 }
 
 }  // namespace
@@ -31,48 +38,63 @@ struct Demultiplexer::Header {
     bool has_payload;
     uint8_t counter;
     bool discontinuity;
-    size_t payload;  // offset, kPacketSize when there is none or it cannot be found
+    const unsigned char *pcr;  // null for none
+    size_t payload;            // offset, kPacketSize when there is none or it cannot be found
 };
 
-Demultiplexer::Demultiplexer(Handler handler)
-    : handler_(std::move(handler)), continuity_(kPidCount), names_(kPidCount) {
+Demultiplexer::Demultiplexer(Handler handler) : handler_(std::move(handler)), pids_(kPidCount) {
     for (const uint16_t pid : kTablePids) {
-        AddName(pid);
+        AddUse(pid);
     }
+}
+
+DemultiplexerCounters Demultiplexer::Counters() const {
+    DemultiplexerCounters counters = counters_;
+    for (const PidState &state : pids_) {
+        counters.pids.push_back(state.counters);
+    }
+    counters.clock = pcr_meter_.Longest();
+    return counters;
 }
 
 void Demultiplexer::Push(const unsigned char *packet) {
     const Header header = ParseHeader(packet);
+    const uint64_t position = position_++;
     if (header.transport_error) {
         ++counters_.transport_errors;
         return;
     }
+    PidState &state = pids_[header.pid];
+    ++state.counters.packets;
     if (header.scrambled) {
         ++counters_.scrambled;
     }
     if (header.pid == kPidNull || header.reserved) {
         return;
     }
-    const Order order = Follow(header);
+    if (header.pcr != nullptr) {
+        pcr_meter_.Push(header.pid, ReadPcr(header.pcr), position, header.discontinuity);
+    }
+    const Order order = CheckContinuity(header, state);
     if (order == Order::kBroken) {
         ++counters_.continuity_errors;
+        ++state.counters.continuity_errors;
     }
-    if (!Follows(header.pid) || order == Order::kRepeated) {
+    if (state.table_uses == 0 || order == Order::kRepeated) {
         return;
     }
-    SectionAssembler &assembler = assemblers_.find(header.pid)->second;
     const bool unusable = header.has_payload && (header.scrambled || header.payload == kPacketSize);
     if (order != Order::kNext || unusable) {
-        counters_.incomplete += static_cast<unsigned>(assembler.Drop());
+        counters_.incomplete += static_cast<unsigned>(state.assembler.Drop());
     }
     if (!header.has_payload || unusable) {
         return;
     }
-    const int given_up =
-        assembler.Push(packet + header.payload, kPacketSize - header.payload, header.unit_start,
-                       [this, &header](const unsigned char *section, size_t size) {
-                           OnSection(header.pid, section, size);
-                       });
+    const int given_up = state.assembler.Push(
+        packet + header.payload, kPacketSize - header.payload, header.unit_start,
+        [this, &header](const unsigned char *section, size_t size) {
+            OnSection(header.pid, section, size);
+        });
     counters_.incomplete += static_cast<unsigned>(given_up);
 }
 
@@ -92,7 +114,9 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
     if (has_adaptation) {
         const size_t length = packet[kHeaderSize];
         const bool fits = kHeaderSize + 1 + length <= kPacketSize;
-        header.discontinuity = fits && length > 0 && (packet[kHeaderSize + 1] & 0x80) != 0;
+        const unsigned flags = fits && length > 0 ? packet[kHeaderSize + 1] : 0;
+        header.discontinuity = (flags & 0x80) != 0;
+        header.pcr = (flags & 0x10) != 0 && length > 6 ? packet + kHeaderSize + 2 : nullptr;
         header.payload = fits ? kHeaderSize + 1 + length : kPacketSize;
     }
     return header;
@@ -100,22 +124,21 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
 
 // Where a packet stands behind the latest one of its PID. Only a payload moves the counter on; a
 // packet with one may be sent twice, and a counter may jump where the packet announces it.
-Demultiplexer::Order Demultiplexer::Follow(const Header &header) {
-    Continuity &state = continuity_[header.pid];
-    const Continuity before = state;
-    state = {header.counter, header.has_payload};
-    const int expected = header.has_payload ? (before.last + 1) & 0x0F : before.last;
-    if (before.last < 0 || header.counter == expected) {
+Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header, PidState &state) {
+    const int last = std::exchange(state.last, header.counter);
+    const bool repeatable = std::exchange(state.repeatable, header.has_payload);
+    const int expected = header.has_payload ? (last + 1) & 0x0F : last;
+    if (last < 0 || header.counter == expected) {
         return Order::kNext;
     }
     if (header.discontinuity) {
         return Order::kRestarted;
     }
-    if (header.counter != before.last) {
+    if (header.counter != last) {
         return Order::kBroken;
     }
     state.repeatable = false;
-    return header.has_payload && before.repeatable ? Order::kRepeated : Order::kBroken;
+    return header.has_payload && repeatable ? Order::kRepeated : Order::kBroken;
 }
 
 void Demultiplexer::OnSection(uint16_t pid, const unsigned char *section, size_t size) {
@@ -128,15 +151,15 @@ void Demultiplexer::OnSection(uint16_t pid, const unsigned char *section, size_t
     ++counters_.good;
     ++counters_.tables[table_id];
     if (pid == kPidPat && table_id == kTablePat) {
-        FollowPat(section, size);
+        UpdatePmtPids(section, size);
     }
     handler_(pid, section, size);
 }
 
-// A PID that the PAT no longer names may carry anything, so its assembler goes. New names come
-// before old ones go: a repeated PAT must not disturb the section in progress on a PID that it
+// A PID that the PAT no longer names may carry anything, so its section in progress goes. New uses
+// come before old ones go: a repeated PAT must not disturb the section in progress on a PID that it
 // keeps.
-void Demultiplexer::FollowPat(const unsigned char *section, size_t size) {
+void Demultiplexer::UpdatePmtPids(const unsigned char *section, size_t size) {
     Pat pat;
     SectionHeader header{};
     if (!ParsePat(section, size, header, pat)) {
@@ -145,26 +168,25 @@ void Demultiplexer::FollowPat(const unsigned char *section, size_t size) {
     std::vector<uint16_t> pids;
     for (const Program &program : pat) {
         pids.push_back(program.pmt_pid);
-        AddName(program.pmt_pid);
+        AddUse(program.pmt_pid);
     }
     pids.swap(pat_sections_[header.number]);
-    RemoveNames(pids);
+    RemoveUses(pids);
     const auto beyond = pat_sections_.upper_bound(header.last);
     for (auto it = beyond; it != pat_sections_.end(); ++it) {
-        RemoveNames(it->second);
+        RemoveUses(it->second);
     }
     pat_sections_.erase(beyond, pat_sections_.end());
 }
 
-void Demultiplexer::AddName(uint16_t pid) {
-    ++names_[pid];
-    assemblers_[pid];
+void Demultiplexer::AddUse(uint16_t pid) {
+    ++pids_[pid].table_uses;
 }
 
-void Demultiplexer::RemoveNames(const std::vector<uint16_t> &pids) {
+void Demultiplexer::RemoveUses(const std::vector<uint16_t> &pids) {
     for (const uint16_t pid : pids) {
-        if (--names_[pid] == 0) {
-            assemblers_.erase(pid);
+        if (--pids_[pid].table_uses == 0) {
+            pids_[pid].assembler.Drop();
         }
     }
 }

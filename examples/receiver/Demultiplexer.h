@@ -10,9 +10,16 @@
 #include <map>
 #include <vector>
 
+#include "PcrMeter.h"
 #include "SectionAssembler.h"
+#include "TransportStream.h"
 
 namespace receiver {
+
+struct PidCounters {
+    uint64_t packets = 0;  // but for those with a transport error, whose PID is uncertain
+    uint64_t continuity_errors = 0;
+};
 
 struct DemultiplexerCounters {
     uint64_t continuity_errors = 0;
@@ -22,6 +29,8 @@ struct DemultiplexerCounters {
     uint64_t bad_crc = 0;           // sections that are whole, but damaged
     uint64_t incomplete = 0;        // sections that were given up
     std::array<uint64_t, 256> tables{};  // good sections of each table_id
+    std::vector<PidCounters> pids;       // one for each PID
+    PcrSpan clock;
 };
 
 class Demultiplexer {
@@ -34,31 +43,34 @@ class Demultiplexer {
     // Takes the 188 bytes of the stream's next packet.
     void Push(const unsigned char *packet);
 
-    // Whether sections are taken from this PID at this point of the stream.
-    bool Follows(uint16_t pid) const { return names_[pid] != 0; }
+    // Whether this PID carries tables at this point of the stream.
+    bool CarriesTables(uint16_t pid) const { return pids_[pid].table_uses != 0; }
 
-    const DemultiplexerCounters &Counters() const { return counters_; }
+    DemultiplexerCounters Counters() const;
 
   private:
     struct Header;
-    struct Continuity {
+    struct PidState {
+        PidCounters counters;
         int last = -1;            // counter of the PID's latest packet, -1 before the first
         bool repeatable = false;  // that packet had a payload and may come once more
+        unsigned table_uses = 0;  // one where tables are fixed, and one for each PAT entry
+        SectionAssembler assembler;
     };
     enum class Order { kNext, kRepeated, kBroken, kRestarted };
 
     static Header ParseHeader(const unsigned char *packet);
-    Order Follow(const Header &header);
+    static Order CheckContinuity(const Header &header, PidState &state);
     void OnSection(uint16_t pid, const unsigned char *section, size_t size);
-    void FollowPat(const unsigned char *section, size_t size);
-    void AddName(uint16_t pid);
-    void RemoveNames(const std::vector<uint16_t> &pids);
+    void UpdatePmtPids(const unsigned char *section, size_t size);
+    void AddUse(uint16_t pid);
+    void RemoveUses(const std::vector<uint16_t> &pids);
 
     Handler handler_;
-    DemultiplexerCounters counters_;
-    std::vector<Continuity> continuity_;                     // one for each PID
-    std::map<uint16_t, SectionAssembler> assemblers_;        // by PID, where names_ is not 0
-    std::vector<unsigned> names_;                            // for each PID, fixed and PAT entries
+    DemultiplexerCounters counters_;  // but for those of the PIDs, and the clock
+    uint64_t position_ = 0;           // packets so far
+    PcrMeter pcr_meter_;
+    std::vector<PidState> pids_;
     std::map<uint8_t, std::vector<uint16_t>> pat_sections_;  // PMT PIDs, by section_number
 };
 

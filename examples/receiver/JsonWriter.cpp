@@ -1,7 +1,7 @@
 // Every value goes through Member, which knows about commas, lines and keys.
 #include "JsonWriter.h"
 
-#include <cstdio>
+#include <cinttypes>
 
 namespace receiver {
 
@@ -12,17 +12,31 @@ void JsonWriter::Text(const char *key, const std::string &value) {
 
 void JsonWriter::Number(const char *key, int64_t value) {
     Member(key);
-    out_ += std::to_string(value);
+    std::fprintf(out_, "%" PRId64, value);
+}
+
+void JsonWriter::Thousandths(const char *key, const std::optional<int64_t> &value) {
+    if (!value) {
+        Null(key);
+        return;
+    }
+    Member(key);
+    std::fprintf(out_, "%" PRId64 ".%03d", *value / 1000, static_cast<int>(*value % 1000));
 }
 
 void JsonWriter::Boolean(const char *key, bool value) {
     Member(key);
-    out_ += value ? "true" : "false";
+    std::fputs(value ? "true" : "false", out_);
+}
+
+void JsonWriter::Null(const char *key) {
+    Member(key);
+    std::fputs("null", out_);
 }
 
 void JsonWriter::Begin(const char *key, char open) {
     Member(key);
-    out_ += open;
+    std::fputc(open, out_);
     open_ += open;
     first_ = true;
 }
@@ -31,43 +45,53 @@ void JsonWriter::End(char close) {
     const bool lines = OwnLines() && !first_;
     open_.pop_back();
     if (lines) {
-        out_ += '\n' + std::string(open_.size() * 2, ' ');
+        NewLine();
     }
-    out_ += close;
+    std::fputc(close, out_);
     first_ = false;
 }
 
 void JsonWriter::Member(const char *key) {
     if (!first_) {
-        out_ += ',';
+        std::fputc(',', out_);
     }
     if (OwnLines()) {
-        out_ += '\n' + std::string(open_.size() * 2, ' ');
+        NewLine();
     } else if (!first_) {
-        out_ += ' ';
+        std::fputc(' ', out_);
     }
     first_ = false;
     if (key != nullptr) {
         Quote(key);
-        out_ += ": ";
+        std::fputs(": ", out_);
     }
 }
 
+void JsonWriter::NewLine() {
+    std::fprintf(out_, "\n%*s", static_cast<int>(open_.size() * 2), "");
+}
+
+// What needs no escape goes out together.
 void JsonWriter::Quote(const std::string &text) {
-    out_ += '"';
-    for (const char c : text) {
-        if (static_cast<unsigned char>(c) < 0x20) {
-            char escape[8];
-            std::snprintf(escape, sizeof escape, "\\u%04x", static_cast<unsigned>(c));
-            out_ += escape;
+    std::fputc('"', out_);
+    size_t plain = 0;  // begins what has not been written
+    for (size_t i = 0; i < text.size(); ++i) {
+        const unsigned char c = static_cast<unsigned char>(text[i]);
+        if (c >= 0x20 && c != '"' && c != '\\') {
             continue;
         }
-        if (c == '"' || c == '\\') {
-            out_ += '\\';
+        std::fwrite(text.data() + plain, 1, i - plain, out_);
+        plain = i + 1;
+        if (c == '\n') {
+            std::fputs("\\n", out_);
+        } else if (c < 0x20) {
+            std::fprintf(out_, "\\u%04x", static_cast<unsigned>(c));
+        } else {
+            std::fprintf(out_, "\\%c", c);
         }
-        out_ += c;
     }
-    out_ += '"';
+    std::fwrite(text.data() + plain, 1, text.size() - plain, out_);
+    std::fputc('"', out_);
 }
 
 bool JsonWriter::OwnLines() const {

@@ -1,9 +1,10 @@
-// Writes JSON text (RFC 8259): each member of the outermost object on a line, and each element of
-// an array there; what lies deeper stays on its line.
+// Writes JSON text (RFC 8259) to a file: each member of the outermost object on a line, and each
+// element of an array there; what lies deeper stays on its line.
 #ifndef RECEIVER_JSONWRITER_H
 #define RECEIVER_JSONWRITER_H
 
 #include <cstdint>
+#include <cstdio>
 #include <optional>
 #include <string>
 
@@ -11,6 +12,8 @@ namespace receiver {
 
 class JsonWriter {
   public:
+    explicit JsonWriter(std::FILE *out) : out_(out) {}
+
     // `key` is null for the elements of an array and for the outermost object.
     void BeginObject(const char *key) { Begin(key, '{'); }
     void EndObject() { End('}'); }
@@ -25,21 +28,22 @@ class JsonWriter {
         if (value) {
             Number(key, int64_t{*value});
         } else {
-            Member(key);
-            out_ += "null";
+            Null(key);
         }
     }
-
-    const std::string &Out() const { return out_; }
+    // Writes a number that is counted in thousandths.
+    void Thousandths(const char *key, const std::optional<int64_t> &value);
 
   private:
     void Begin(const char *key, char open);
     void End(char close);
     void Member(const char *key);
+    void Null(const char *key);
+    void NewLine();
     void Quote(const std::string &text);
     bool OwnLines() const;
 
-    std::string out_;
+    std::FILE *out_;
     std::string open_;   // brackets that are open
     bool first_ = true;  // nothing yet within the innermost
 };

@@ -1,5 +1,6 @@
-// What the tables of a stream say: the parser fills it, the presentation shows it. Only what
-// applies now and to this stream is kept, except for events, where other streams' fill in.
+// What the tables of a stream say: the parser fills it, the report shows it. Only what
+// applies now and to this stream is kept, except for events, where other streams' fill in. Times
+// are as the stream carries them.
 #ifndef RECEIVER_MODEL_H
 #define RECEIVER_MODEL_H
 
@@ -12,6 +13,8 @@
 #include <vector>
 
 #include "BroadcastTime.h"
+#include "Code.h"
+#include "Events.h"
 #include "Name.h"
 
 namespace receiver {
@@ -23,14 +26,32 @@ struct Program {  // a PAT entry
 
 struct Component {  // a PMT entry
     uint16_t pid;
+    uint16_t data_component_id;  // where the descriptor is the one of a data component
     uint8_t stream_type;
-    uint8_t descriptor;  // tag of the one that tells what private data is, 0 for none
+    uint8_t descriptor;  // tag of the one that tells what the data is, 0 for none
+    Code languages[2];   // of audio
 };
 
 struct ProgramMap {    // a PMT
     uint16_t pmt_pid;  // where it came
     uint16_t pcr_pid;
+    bool emergency;  // a warning to the population is on
     std::vector<Component> components;
+};
+
+struct NetworkStream {  // an entry of the NIT, about a transport stream
+    uint16_t transport_stream_id;
+    std::optional<uint8_t> remote_control_key;
+    std::string name;
+    std::optional<uint16_t> area_code;
+    std::optional<uint8_t> guard_interval;
+    bool dvb;                                // sent in a way that only DVB has
+    std::vector<uint16_t> one_seg_services;  // service_ids
+};
+
+struct NetworkSection {
+    bool emergency;
+    std::vector<NetworkStream> streams;
 };
 
 struct ServiceInfo {  // an SDT entry
@@ -40,18 +61,10 @@ struct ServiceInfo {  // an SDT entry
     Name name;
 };
 
-struct Event {
-    bool other_stream;
-    std::optional<DateTime> start;
-    std::optional<int> duration;  // seconds
-    std::string name;
-    std::string text;
-};
-
 struct LocalOffset {
-    std::string country;
+    Code country;
     uint8_t region;
-    int minutes;  // to be added to UTC
+    int minutes;  // to be added to the stream's time
     std::optional<DateTime> change;
     int next_minutes;  // from then on
 };
@@ -75,19 +88,22 @@ class Sections {
 };
 
 struct Model {
-    // Far more events than a week of every service takes; keeps memory bounded on hostile streams.
-    static constexpr size_t kMostEvents = 65536;
+    // Of all PMTs together, far more than any stream has.
+    static constexpr size_t kMostComponents = 65536;
 
     std::optional<uint16_t> transport_stream_id;
     std::optional<uint16_t> network_id;
     Name network_name;
-    std::optional<DateTime> utc_time;  // the latest
+    std::optional<DateTime> time;  // the latest, as the stream carries it
     std::vector<LocalOffset> local_offsets;
     Sections<std::vector<Program>> pat;
     Sections<std::vector<ServiceInfo>> sdt;
-    std::map<uint16_t, ProgramMap> pmts;                    // by service_id
-    std::map<std::pair<uint16_t, uint16_t>, Event> events;  // by service_id and event_id
-    uint64_t events_left_out = 0;                           // for lack of room
+    Sections<NetworkSection> nit;
+    std::map<uint16_t, ProgramMap> pmts;  // by service_id
+    size_t components = 0;                // in these
+    uint64_t components_left_out = 0;     // for lack of room
+    EventTable events;
+    EventTable other_events;  // of other transport streams, which must not push this stream's out
 };
 
 }  // namespace receiver

@@ -2,6 +2,10 @@
 // by byte, with a bounded look ahead. Both only move forward, so any input takes linear time.
 #include "PacketSource.h"
 
+#include <algorithm>
+
+#include "TransportStream.h"
+
 namespace receiver {
 namespace {
 
@@ -13,7 +17,8 @@ constexpr size_t kLargestDistance = 204;
 // Sync bytes in a row that make a start. The first byte of a stream and the distance already in use
 // need few, so that short stretches between losses count. Anywhere else it takes more, and headers
 // that packets may have: tables in all kinds of files hold a byte of this value at even distances.
-constexpr size_t kSyncsToFind = 8;
+// More than seven would miss streams in datagrams, which hold seven packets behind a header.
+constexpr size_t kSyncsToFind = 5;
 constexpr size_t kSyncsToResume = 3;
 constexpr size_t kLookAhead = (kSyncsToFind - 1) * kLargestDistance + 4;
 
@@ -24,9 +29,39 @@ constexpr size_t Lead(size_t distance) {
 
 }  // namespace
 
+// While packets follow one another, they are handed on from where they lie; a packet that two
+// blocks share is put together first.
 void PacketSource::Feed(const unsigned char *bytes, size_t count) {
-    pending_.insert(pending_.end(), bytes, bytes + count);
     counters_.bytes += count;
+    if (locked_ && !pending_.empty()) {
+        const size_t missing = std::min(count, next_ + kPacketSize - pending_.size());
+        pending_.insert(pending_.end(), bytes, bytes + missing);
+        Run(false);
+        bytes += missing;
+        count -= missing;
+    }
+    if (locked_ && pending_.empty()) {
+        const size_t distance = counters_.packet_size;
+        const auto is_packet = [&](size_t start) {
+            return start + kPacketSize <= count && bytes[start] == kSyncByte;
+        };
+        size_t at = next_;
+        while (is_packet(at)) {
+            size_t together = 1;
+            while (distance == kPacketSize && is_packet(at + together * kPacketSize)) {
+                ++together;
+            }
+            counters_.packets += together;
+            handler_(bytes + at, together);
+            at += together * distance;
+        }
+        const size_t used = std::min(at, count);
+        pending_offset_ += used;
+        next_ = at - used;
+        bytes += used;
+        count -= used;
+    }
+    pending_.insert(pending_.end(), bytes, bytes + count);
     Run(false);
 }
 
@@ -48,10 +83,10 @@ void PacketSource::Run(bool at_end) {
             break;
         }
         ++counters_.packets;
-        handler_(&pending_[next_]);
+        handler_(&pending_[next_], 1);
         next_ += counters_.packet_size;
     }
-    const size_t used = next_ < pending_.size() ? next_ : pending_.size();
+    const size_t used = std::min(next_, pending_.size());
     pending_.erase(pending_.begin(), pending_.begin() + static_cast<std::ptrdiff_t>(used));
     pending_offset_ += used;
     next_ -= used;

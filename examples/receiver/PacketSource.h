@@ -10,14 +10,6 @@
 
 namespace receiver {
 
-constexpr size_t kPacketSize = 188;
-
-// The PID of a packet.
-inline uint16_t PidOf(const unsigned char *packet) {
-    return static_cast<uint16_t>((packet[1] & 0x1F) << 8 | packet[2]);
-}
-constexpr unsigned char kSyncByte = 0x47;
-
 struct PacketCounters {
     uint64_t bytes = 0;        // all that was fed
     uint64_t packets = 0;      // whole ones; a packet that the end of the stream cuts is none
@@ -30,8 +22,8 @@ struct PacketCounters {
 // follow at the packet distance, and no byte belongs to two packets.
 class PacketSource {
   public:
-    // Called with the 188 bytes of a packet, valid during the call.
-    using Handler = std::function<void(const unsigned char *packet)>;
+    // Called with packets of 188 bytes, one right behind the other, valid during the call.
+    using Handler = std::function<void(const unsigned char *packets, size_t count)>;
 
     explicit PacketSource(Handler handler) : handler_(std::move(handler)) {}
 

@@ -10,6 +10,7 @@
 // thread's result is with control before the end gets there.
 #include "Pipeline.h"
 
+#include <algorithm>
 #include <cstring>
 #include <memory>
 #include <new>
@@ -21,6 +22,7 @@
 #include "PacketSource.h"
 #include "Progress.h"
 #include "Tables.h"
+#include "TransportStream.h"
 #include "Varnek_CRingBuffer.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
@@ -142,19 +144,22 @@ void RunReader(Pipeline &pipeline) {
         Send(pipeline.threads[kDemultiplexer], {Kind::kPackets, nullptr, length});
         batch.clear();
     };
-    PacketSource source([&](const unsigned char *packet) {
-        batch.insert(batch.end(), packet, packet + kPacketSize);
-        if (batch.size() == kBatchSize) {
-            send_batch();
+    PacketSource source([&](const unsigned char *packets, size_t count) {
+        const unsigned char *const end = packets + count * kPacketSize;
+        while (packets < end) {
+            const size_t room = kBatchSize - batch.size();
+            const unsigned char *const part =
+                packets + std::min(room, static_cast<size_t>(end - packets));
+            batch.insert(batch.end(), packets, part);
+            packets = part;
+            if (batch.size() == kBatchSize) {
+                send_batch();
+            }
         }
     });
     std::vector<unsigned char> block(kBlockSize);
-    const std::atomic<bool> *stop = pipeline.options.stop;
-    while (stop == nullptr || !*stop) {
-        const size_t count = pipeline.file.Read(block.data(), block.size());
-        if (count == 0) {
-            break;
-        }
+    while (const size_t count =
+               pipeline.file.Read(block.data(), block.size(), pipeline.options.stop)) {
         source.Feed(block.data(), count);
         VarnekPGL_AcquireMutex(pipeline.mutex);
         pipeline.bytes_read += count;
@@ -181,7 +186,7 @@ void RunDemultiplexer(Pipeline &pipeline) {
         for (size_t at = 0; at < message.length; at += kPacketSize) {
             const unsigned char *packet = packets.data() + at;
             demultiplexer.Push(packet);
-            if (capture != nullptr && demultiplexer.Follows(PidOf(packet))) {
+            if (capture != nullptr && demultiplexer.CarriesTables(PidOf(packet))) {
                 capture->Push(packet);
             }
         }
@@ -199,7 +204,7 @@ void RunDemultiplexer(Pipeline &pipeline) {
 
 void RunParser(Pipeline &pipeline) {
     Model model;
-    TableParser parser(model);
+    TableParser parser(model, pipeline.options.language);
     for (Message message = Receive(); message.kind != Kind::kEnd; message = Receive()) {
         const SectionBatch sections = Take<SectionBatch>(message);
         VarnekPGL_SignalSemaphore(pipeline.section_room);

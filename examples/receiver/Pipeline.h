@@ -7,7 +7,7 @@
 #include <string>
 
 #include "Capture.h"
-#include "Presentation.h"
+#include "Report.h"
 #include "StreamFile.h"
 
 namespace receiver {
@@ -16,6 +16,7 @@ struct PipelineOptions {
     std::FILE *progress = nullptr;            // a terminal for the progress line; null for none
     Capture *capture = nullptr;               // an open capture; null for none
     const std::atomic<bool> *stop = nullptr;  // ends the reading early when set; may be null
+    Code language;                            // of events' texts, where they come in several
 };
 
 // Reads an open file to its end, in bounded memory. The threads and everything made for them are

@@ -1,102 +1,79 @@
-// The command line, then the pipeline over the file, then the presentation of what it found.
+// The command line, then the pipeline over the file, then the report on what it found.
 #include "Receiver.h"
 
+#include <fcntl.h>
+#include <sys/ioctl.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <filesystem>
+#include <csignal>
 #include <system_error>
 
 #include "BroadcastText.h"
+#include "CommandLine.h"
+#include "JsonReport.h"
+#include "Paragraphs.h"
 #include "Pipeline.h"
-#include "Presentation.h"
 #include "StreamFile.h"
+#include "Summary.h"
 #include "Varnek_Config.h"
+#include "Words.h"
 
 namespace receiver {
 namespace {
 
-constexpr char kUsage[] =
-    "usage: receiver [--json] [--quiet] [--capture FILE] FILE\n"
-    "  Reads a transport stream and shows its services, events and counters.\n"
-    "  --json          show them as one JSON object\n"
-    "  --quiet         no progress line\n"
-    "  --capture FILE  write the packets of the tables to a file; where the configuration has its\n"
-    "                  capture switch on, the default is the stream's name with \".capture\"\n";
-
 constexpr int kInterrupted = 130;  // as shells have it for a program that Ctrl-C ended
-
-struct Options {
-    bool help = false;
-    bool json = false;
-    bool quiet = false;
-    std::string capture;
-    std::string path;
-};
-
-bool ParseArguments(const std::vector<std::string> &arguments, Options &options) {
-    bool only_files = false;
-    for (size_t i = 0; i < arguments.size(); ++i) {
-        const std::string &argument = arguments[i];
-        const bool is_option = !only_files && argument.size() > 1 && argument[0] == '-';
-        if (is_option && argument == "--") {
-            only_files = true;
-        } else if (is_option && argument == "--json") {
-            options.json = true;
-        } else if (is_option && argument == "--quiet") {
-            options.quiet = true;
-        } else if (is_option && argument == "--capture" && i + 1 < arguments.size()) {
-            options.capture = arguments[++i];
-        } else if (is_option && (argument == "--help" || argument == "-h")) {
-            options.help = true;
-        } else if (is_option || argument.empty() || !options.path.empty()) {
-            return false;
-        } else {
-            options.path = argument;
-        }
-    }
-    return options.help || !options.path.empty();
-}
-
-// Why a file that could be opened gave no packet.
-std::string DescribeFailure(const std::string &path, const PacketCounters &packets) {
-    if (packets.bytes != 0) {
-        return "no transport stream packets in " + std::to_string(packets.bytes) + " bytes";
-    }
-    return VarnekPGL_CheckDir(path.c_str()) != FALSE ? "is a directory"
-                                                     : "is empty or cannot be read";
-}
 
 int Fail(std::FILE *err, const std::string &path, const std::string &message) {
     std::fprintf(err, "receiver: %s: %s\n", path.c_str(), message.c_str());
     return 1;
 }
 
+std::string SystemText(int error) {
+    return std::generic_category().message(error);
+}
+
+// Why what could be opened is not shown; empty when it is.
+std::string FindFault(const Report &report, int read_error) {
+    const PacketCounters &packets = report.packets;
+    const std::string bytes = std::to_string(packets.bytes) + " bytes";
+    if (packets.packets == 0) {
+        if (read_error != 0) {
+            return "read failed: " + SystemText(read_error);
+        }
+        return packets.bytes == 0 ? "is empty" : "no transport stream packets in " + bytes;
+    }
+    return IsHardlyStream(report)
+               ? "hardly a transport stream: " + std::to_string(packets.packets) + " packets in " +
+                     bytes
+               : "";
+}
+
 // The library's configuration: the file when there is one, else its initial values.
-Settings LoadSettings() {
+Settings LoadSettings(const Options &options) {
     VarnekCfg_LoadConfigFile();
     Settings settings;
     settings.standard_type = VarnekCfg_GetStandard();
     settings.nation = ToUtf8(VarnekCfg_GetSupportNation());
     settings.bml = VarnekCfg_IsSupportBML() != FALSE;
+    settings.region = options.region;
     return settings;
 }
 
-// Opens the capture that is asked for, if any.
+// Opens the capture that is asked for, if any. Standard input has no place beside it.
 //   returns  empty; else what is wrong with it
-std::string OpenCapture(const Options &options, Capture &capture) {
+std::string OpenCapture(const Options &options, const StreamFile &file, Capture &capture) {
     std::string path = options.capture;
-    if (path.empty() && VarnekCfg_GetTSCaptueEnable() != 0) {
+    if (path.empty() && options.path != "-" && VarnekCfg_GetTSCaptueEnable() != 0) {
         path = options.path + ".capture";
     }
-    std::error_code ignored;
-    if (!path.empty() && std::filesystem::equivalent(path, options.path, ignored)) {
+    if (path.empty()) {
+        return {};
+    }
+    if (file.IsSameAs(path)) {
         return "the capture would overwrite the stream";
     }
-    if (!path.empty() && !capture.Open(path)) {
-        return "the capture " + path + " cannot be written";
-    }
-    return {};
+    return capture.Open(path) ? "" : "the capture " + path + " cannot be written";
 }
 
 bool IsTerminal(std::FILE *file) {
@@ -104,54 +81,96 @@ bool IsTerminal(std::FILE *file) {
     return descriptor >= 0 && isatty(descriptor) != 0;
 }
 
+size_t TerminalWidth(std::FILE *file) {
+    winsize size{};
+    const bool known = fileno(file) >= 0 && ioctl(fileno(file), TIOCGWINSZ, &size) == 0;
+    return known && size.ws_col != 0 ? size.ws_col : Paragraphs::kUsualWidth;
+}
+
+// Leads descriptor 2 into a file, or nowhere when there is no such place.
+void DivertLog(const char *path) {
+    constexpr int kFlags = O_WRONLY | O_CREAT | O_TRUNC | O_APPEND | O_CLOEXEC;
+    int log = open(path, kFlags, 0666);
+    if (log < 0) {
+        log = open("/dev/null", O_WRONLY | O_CLOEXEC);
+    }
+    if (log >= 0) {
+        dup2(log, STDERR_FILENO);
+        close(log);
+    }
+}
+
 }  // namespace
 
-int RunReceiver(const std::vector<std::string> &arguments, std::FILE *out, std::FILE *err,
-                const std::atomic<bool> *stop) {
+int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &surroundings) {
+    std::FILE *const out = surroundings.out;
+    std::FILE *const err = surroundings.err;
     Options options;
-    if (!ParseArguments(arguments, options)) {
-        std::fputs(kUsage, err);
+    const std::string wrong = ParseArguments(arguments, options);
+    if (!wrong.empty()) {
+        std::fprintf(err, "receiver: %s\nusage: receiver [OPTION...] FILE (--help tells more)\n",
+                     wrong.c_str());
         return 2;
     }
     if (options.help) {
-        std::fputs(kUsage, out);
+        WriteHelp(out, TerminalWidth(out));
         return 0;
     }
+    if (options.version) {
+        std::fputs("receiver " RECEIVER_VERSION "\n", out);
+        return 0;
+    }
+    if (surroundings.log_path != nullptr && !options.log) {
+        DivertLog(surroundings.log_path);
+    }
+    const auto stopped = [&] { return surroundings.stop != nullptr && *surroundings.stop; };
     StreamFile file;
     errno = 0;
-    if (!file.Open(options.path.c_str())) {
+    if (!file.Open(options.path) && !stopped()) {
         // An open that is refused without asking the system leaves no error number.
-        const int error = errno;
         return Fail(err, options.path,
-                    std::string("cannot be opened") +
-                        (error != 0 ? ": " + std::generic_category().message(error) : ""));
+                    "cannot be opened" + (errno != 0 ? ": " + SystemText(errno) : ""));
     }
     Report report;
-    report.settings = LoadSettings();
+    report.settings = LoadSettings(options);
     Capture capture;
-    const std::string unfit = OpenCapture(options, capture);
+    const std::string unfit = OpenCapture(options, file, capture);
     if (!unfit.empty()) {
         return Fail(err, options.path, unfit);
     }
     PipelineOptions pipeline;
     pipeline.progress = !options.quiet && IsTerminal(err) ? err : nullptr;
     pipeline.capture = capture.IsOpen() ? &capture : nullptr;
-    pipeline.stop = stop;
+    pipeline.stop = surroundings.stop;
+    pipeline.language = LanguageOf(Code::Of(report.settings.nation.c_str()));
     const std::string missing = RunPipeline(file, pipeline, report);
     if (!missing.empty()) {
         return Fail(err, options.path, "the " + missing + " could not be created");
     }
-    if (report.packets.packets == 0) {
-        return Fail(err, options.path, DescribeFailure(options.path, report.packets));
+    const std::string fault = FindFault(report, file.Error());
+    if (!fault.empty() && !stopped()) {
+        return Fail(err, options.path, fault);
     }
-    const std::string text = options.json ? ToJson(report) : ToSummary(report);
-    if (std::fputs(text.c_str(), out) == EOF || std::fflush(out) != 0) {
+    if (surroundings.stop != nullptr) {
+        // The reading is over: nothing is left to stop but the program, and a signal must not cut
+        // the result short.
+        std::signal(SIGINT, SIG_DFL);
+    }
+    if (options.json) {
+        WriteJson(report, out);
+    } else {
+        WriteSummary(report, TerminalWidth(out), out);
+    }
+    if (std::fflush(out) != 0 || std::ferror(out) != 0) {
         return Fail(err, options.path, "the result could not be written");
+    }
+    if (file.Error() != 0) {
+        return Fail(err, options.path, "read failed: " + SystemText(file.Error()));
     }
     if (!capture.Failure().empty()) {
         return Fail(err, options.path, "the capture ended early: " + capture.Failure());
     }
-    return stop != nullptr && *stop ? kInterrupted : 0;
+    return stopped() ? kInterrupted : 0;
 }
 
 }  // namespace receiver

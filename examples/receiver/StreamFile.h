@@ -1,11 +1,12 @@
-// The file that the receiver reads, through the library's operations for large files.
+// The stream that the receiver reads, a file or standard input, through the library's operations
+// for large files.
 #ifndef RECEIVER_STREAMFILE_H
 #define RECEIVER_STREAMFILE_H
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
-
-#include "Varnek_File.h"
+#include <string>
 
 namespace receiver {
 
@@ -14,34 +15,29 @@ class StreamFile {
     StreamFile() = default;
     StreamFile(const StreamFile &) = delete;
     StreamFile &operator=(const StreamFile &) = delete;
-    ~StreamFile() {
-        if (handle_ >= 0) {
-            VarnekPGL_CloseFile64Bits(handle_);
-        }
-    }
+    ~StreamFile();
 
-    // Opens a file, once.
+    // Opens a file, once; "-" is standard input.
     //   returns  false when it cannot be opened, with errno as it was left
-    bool Open(const char *path) {
-        handle_ = VarnekPGL_OpenFile64Bits(path, PGL_FILE_MODE_READ);
-        return handle_ >= 0;
-    }
+    bool Open(const std::string &path);
 
-    //   returns  the bytes read; 0 at the end and on an error
-    size_t Read(unsigned char *buffer, size_t size) const {
-        const int32_t count =
-            VarnekPGL_ReadFileByHandle64Bits(handle_, buffer, static_cast<uint32_t>(size));
-        return count > 0 ? static_cast<size_t>(count) : 0;
-    }
+    // Waits for bytes, as long as `stop` is not set; null waits for ever.
+    //   returns  the bytes read; 0 at the end, on an error, and when it was stopped
+    size_t Read(unsigned char *buffer, size_t size, const std::atomic<bool> *stop);
+
+    // The system's number of the error that ended the reading; 0 for none.
+    int Error() const { return error_; }
 
     //   returns  the size in bytes; 0 when it is not known
-    uint64_t Size() const {
-        const int64_t size = VarnekPGL_GetFileSizeByHandle64Bits(handle_);
-        return size > 0 ? static_cast<uint64_t>(size) : 0;
-    }
+    uint64_t Size() const;
+
+    // Whether this path names the same file.
+    bool IsSameAs(const std::string &path) const;
 
   private:
     int32_t handle_ = -1;
+    bool owned_ = false;
+    int error_ = 0;
 };
 
 }  // namespace receiver

@@ -2,23 +2,45 @@
 // where the loop ends.
 #include "Tables.h"
 
+#include <algorithm>
+#include <iterator>
 #include <utility>
 
 #include "BroadcastText.h"
 #include "BroadcastTime.h"
-#include "Ids.h"
+#include "TransportStream.h"
 
 namespace receiver {
 namespace {
 
 constexpr int kCrcSize = 4;
 
+constexpr uint8_t kDescriptorLanguage = 0x0A;
 constexpr uint8_t kDescriptorNetworkName = 0x40;
 constexpr uint8_t kDescriptorService = 0x48;
 constexpr uint8_t kDescriptorShortEvent = 0x4D;
+constexpr uint8_t kDescriptorExtendedEvent = 0x4E;
+constexpr uint8_t kDescriptorContent = 0x54;
+constexpr uint8_t kDescriptorParentalRating = 0x55;
 constexpr uint8_t kDescriptorLocalOffset = 0x58;
-// Tell what a component of private data is: teletext, subtitles, sound codings, data component.
-constexpr uint8_t kDescriptorsOfContent[] = {0x56, 0x59, 0x6A, 0x7A, 0x7B, 0x7C, 0xFD};
+constexpr uint8_t kDescriptorAudioComponent = 0xC4;
+constexpr uint8_t kDescriptorTsInformation = 0xCD;
+constexpr uint8_t kDescriptorTerrestrialDelivery = 0xFA;
+constexpr uint8_t kDescriptorPartialReception = 0xFB;
+constexpr uint8_t kDescriptorEmergency = 0xFC;
+constexpr uint8_t kDescriptorDataComponent = 0xFD;
+
+// Tell what a component is beside its stream_type: teletext, subtitles, sound codings, application
+// signalling, data component.
+constexpr uint8_t kDescriptorsOfContent[] = {0x56, 0x59, 0x6A, 0x6F,
+                                             0x7A, 0x7B, 0x7C, kDescriptorDataComponent};
+// Delivery by satellite, by cable and on the ground, as only DVB has it.
+constexpr uint8_t kDescriptorsOfDvb[] = {0x43, 0x44, 0x5A};
+
+template <size_t Count>
+bool Contains(const uint8_t (&tags)[Count], uint8_t tag) {
+    return std::find(std::begin(tags), std::end(tags), tag) != std::end(tags);
+}
 
 // Calls `visit(tag, body)` for each whole descriptor of a loop.
 template <typename Visit>
@@ -60,10 +82,14 @@ int ReadOffset(FieldReader &fields, bool negative) {
     return negative ? -minutes : minutes;
 }
 
+Code ReadCode(FieldReader &fields) {
+    return Code(fields.U32(24));
+}
+
 void ReadLocalOffsets(FieldReader &body, std::vector<LocalOffset> &offsets) {
     while (true) {
         LocalOffset offset{};
-        offset.country = ToUtf8(body.Bytes(3));
+        offset.country = ReadCode(body);
         offset.region = body.U8(6);
         body.Skip(1);
         const bool negative = body.U8(1) != 0;
@@ -73,8 +99,119 @@ void ReadLocalOffsets(FieldReader &body, std::vector<LocalOffset> &offsets) {
         if (!body.Ok()) {
             return;
         }
-        offsets.push_back(std::move(offset));
+        offsets.push_back(offset);
     }
+}
+
+// Whether a warning is on in any of the areas that the descriptor lists.
+bool ReadsAsEmergency(FieldReader &body) {
+    while (body.BytesLeft() >= 4) {
+        body.Skip(16);
+        const bool started = body.U8(1) != 0;
+        body.Skip(7);
+        const uint8_t length = body.U8();
+        body.Enter(length);
+        if (started && body.Ok()) {
+            return true;
+        }
+    }
+    return false;
+}
+
+// The language and, of a component with two of them, the second one.
+void ReadAudioLanguages(FieldReader &body, Code (&languages)[2]) {
+    body.Skip(40);
+    const bool two = body.U8(1) != 0;
+    body.Skip(7);
+    languages[0] = ReadCode(body);
+    languages[1] = two ? ReadCode(body) : Code();
+}
+
+void ReadComponentDescriptor(uint8_t tag, FieldReader &body, Component &component) {
+    if (tag == kDescriptorLanguage) {
+        for (Code &language : component.languages) {
+            language = ReadCode(body);
+            body.Skip(8);
+        }
+    } else if (tag == kDescriptorAudioComponent) {
+        ReadAudioLanguages(body, component.languages);
+    } else if (component.descriptor == 0 && Contains(kDescriptorsOfContent, tag)) {
+        component.data_component_id = tag == kDescriptorDataComponent ? body.U16() : uint16_t{0};
+        component.descriptor = body.Ok() ? tag : uint8_t{0};
+    }
+}
+
+void ReadStreamDescriptor(uint8_t tag, FieldReader &body, NetworkStream &stream) {
+    if (tag == kDescriptorTsInformation && body.BytesLeft() >= 2) {
+        stream.remote_control_key = body.U8();
+        const uint8_t length = body.U8(6);
+        body.Skip(2);
+        stream.name = ToUtf8(body.Bytes(length));
+    } else if (tag == kDescriptorTerrestrialDelivery && body.BytesLeft() >= 2) {
+        stream.area_code = body.U16(12);
+        stream.guard_interval = body.U8(2);
+    } else if (tag == kDescriptorPartialReception) {
+        while (body.BytesLeft() >= 2) {
+            stream.one_seg_services.push_back(body.U16());
+        }
+    } else if (Contains(kDescriptorsOfDvb, tag)) {
+        stream.dvb = true;
+    }
+}
+
+// A text that several descriptors of an event carry on: named items, then free text. An item
+// without a name goes on with the one before.
+class ExtendedText {
+  public:
+    // Takes a descriptor in the language of the first one, or in the wanted one from where that
+    // comes.
+    void Read(FieldReader &body, const Code &wanted) {
+        body.Skip(8);
+        const Code language = ReadCode(body);
+        if (!(language == language_) && !language_.IsEmpty()) {
+            if (!(language == wanted)) {
+                return;
+            }
+            items_.clear();
+            text_.clear();
+        }
+        language_ = language;
+        FieldReader fields = body.Enter(body.U8());
+        while (fields.BytesLeft() >= 2) {
+            const std::string name = ToUtf8(fields.Bytes(fields.U8()));
+            const std::string item = ToUtf8(fields.Bytes(fields.U8()));
+            if (!name.empty()) {
+                items_.append(items_.empty() ? "" : "\n").append(name).append(": ");
+            }
+            items_ += item;
+        }
+        text_ += ToUtf8(body.Bytes(body.U8()));
+    }
+
+    std::string Text() const {
+        return items_ + (items_.empty() || text_.empty() ? "" : "\n") + text_;
+    }
+
+  private:
+    Code language_;
+    std::string items_;
+    std::string text_;
+};
+
+// The first name stays until one in the wanted language comes.
+void ReadShortEvent(FieldReader &body, const Code &wanted, Event &event) {
+    const Code language = ReadCode(body);
+    const bool named = !event.name.empty();
+    if (named && (!(language == wanted) || event.language == wanted)) {
+        return;
+    }
+    std::string name = ToUtf8(body.Bytes(body.U8()));
+    if (named && name.empty()) {
+        return;
+    }
+    event.language = language;
+    event.name = std::move(name);
+    event.text = ToUtf8(body.Bytes(body.U8()));
 }
 
 }  // namespace
@@ -138,7 +275,9 @@ void TableParser::OnPmt(uint16_t pid, const SectionHeader &header, FieldReader &
     map.pcr_pid = fields.U16(13);
     fields.Skip(4);
     const uint16_t info_length = fields.U16(12);
-    fields.Enter(info_length);
+    ForEachDescriptor(fields.Enter(info_length), [&](uint8_t tag, FieldReader &body) {
+        map.emergency = map.emergency || (tag == kDescriptorEmergency && ReadsAsEmergency(body));
+    });
     while (fields.BytesLeft() >= 5) {
         Component component{};
         component.stream_type = fields.U8();
@@ -146,27 +285,48 @@ void TableParser::OnPmt(uint16_t pid, const SectionHeader &header, FieldReader &
         component.pid = fields.U16(13);
         fields.Skip(4);
         const uint16_t length = fields.U16(12);
-        ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &) {
-            for (const uint8_t known : kDescriptorsOfContent) {
-                if (tag == known && component.descriptor == 0) {
-                    component.descriptor = tag;
-                }
-            }
+        ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
+            ReadComponentDescriptor(tag, body, component);
         });
         map.components.push_back(component);
     }
-    model_.pmts[header.extension] = std::move(map);
+    ProgramMap &kept = model_.pmts[header.extension];
+    model_.components -= kept.components.size();
+    const size_t fitting =
+        std::min(map.components.size(), Model::kMostComponents - model_.components);
+    model_.components_left_out += map.components.size() - fitting;
+    model_.components += fitting;
+    kept = std::move(map);
+    kept.components.resize(fitting);
+    kept.components.shrink_to_fit();
 }
 
 void TableParser::OnNit(const SectionHeader &header, FieldReader &fields) {
     model_.network_id = header.extension;
+    NetworkSection section{};
     fields.Skip(4);
     const uint16_t length = fields.U16(12);
     ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
         if (tag == kDescriptorNetworkName) {
             model_.network_name = ToUtf8(body.Bytes(body.BytesLeft()));
+        } else if (tag == kDescriptorEmergency) {
+            section.emergency = ReadsAsEmergency(body);
         }
     });
+    fields.Skip(4);
+    const uint16_t streams_length = fields.U16(12);
+    FieldReader streams = fields.Enter(streams_length);
+    while (streams.BytesLeft() >= 6) {
+        NetworkStream stream{};
+        stream.transport_stream_id = streams.U16();
+        streams.Skip(16 + 4);
+        const uint16_t stream_length = streams.U16(12);
+        ForEachDescriptor(streams.Enter(stream_length), [&](uint8_t tag, FieldReader &body) {
+            ReadStreamDescriptor(tag, body, stream);
+        });
+        section.streams.push_back(std::move(stream));
+    }
+    model_.nit.Replace(header.number, header.last, std::move(section));
 }
 
 void TableParser::OnSdt(const SectionHeader &header, FieldReader &fields) {
@@ -192,49 +352,46 @@ void TableParser::OnSdt(const SectionHeader &header, FieldReader &fields) {
 
 void TableParser::OnEit(uint8_t table_id, const SectionHeader &header, FieldReader &fields) {
     const bool other = table_id == kTableEitOther || table_id >= kTableEitOtherSchedule;
+    EventTable &events = other ? model_.other_events : model_.events;
     fields.Skip(48);
     while (fields.BytesLeft() >= 12) {
-        Event event{};
-        event.other_stream = other;
         const uint16_t event_id = fields.U16();
-        event.start = ReadDateTime(fields);
-        event.duration = DecodeBcdTime(fields.U32(24));
-        fields.Skip(4);
-        const uint16_t length = fields.U16(12);
-        ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
-            if (tag != kDescriptorShortEvent || !event.name.empty()) {
-                return;
-            }
-            body.Skip(24);
-            event.name = ToUtf8(body.Bytes(body.U8()));
-            event.text = ToUtf8(body.Bytes(body.U8()));
-        });
-        KeepEvent(header.extension, event_id, std::move(event));
+        events.Keep({header.extension, event_id}, ReadEvent(fields));
     }
 }
 
-// The latest wins, but another stream's account of an event never replaces this stream's own, and a
-// section without the name leaves it.
-void TableParser::KeepEvent(uint16_t service_id, uint16_t event_id, Event event) {
-    const std::pair<uint16_t, uint16_t> key{service_id, event_id};
-    const auto found = model_.events.find(key);
-    if (found == model_.events.end()) {
-        if (model_.events.size() < Model::kMostEvents) {
-            model_.events.emplace(key, std::move(event));
-        } else {
-            ++model_.events_left_out;
+Event TableParser::ReadEvent(FieldReader &fields) const {
+    Event event{};
+    event.start = ReadDateTime(fields);
+    event.duration = DecodeBcdTime(fields.U32(24));
+    fields.Skip(4);
+    const uint16_t length = fields.U16(12);
+    ExtendedText extended;
+    ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
+        if (tag == kDescriptorShortEvent) {
+            ReadShortEvent(body, language_, event);
+        } else if (tag == kDescriptorExtendedEvent) {
+            extended.Read(body, language_);
+        } else if (tag == kDescriptorContent) {
+            while (body.BytesLeft() >= 2) {
+                event.genres.push_back(body.U8());
+                body.Skip(8);
+            }
+        } else if (tag == kDescriptorParentalRating) {
+            while (body.BytesLeft() >= 4) {
+                const Code country = ReadCode(body);
+                event.ratings.push_back({country, body.U8()});
+            }
+        } else if (tag == kDescriptorAudioComponent) {
+            Code languages[2];
+            ReadAudioLanguages(body, languages);
+            std::copy_if(std::begin(languages), std::end(languages),
+                         std::back_inserter(event.audio_languages),
+                         [](const Code &language) { return !language.IsEmpty(); });
         }
-        return;
-    }
-    Event &kept = found->second;
-    if (event.other_stream && !kept.other_stream) {
-        return;
-    }
-    if (event.name.empty()) {
-        event.name = std::move(kept.name);
-        event.text = std::move(kept.text);
-    }
-    kept = std::move(event);
+    });
+    event.extended_text = extended.Text();
+    return event;
 }
 
 void TableParser::OnTime(uint8_t table_id, FieldReader &fields) {
@@ -244,7 +401,7 @@ void TableParser::OnTime(uint8_t table_id, FieldReader &fields) {
     fields.Skip(24);
     const std::optional<DateTime> time = ReadDateTime(fields);
     if (fields.Ok() && time) {
-        model_.utc_time = time;
+        model_.time = time;
     }
     if (table_id != kTableTot) {
         return;

@@ -30,7 +30,8 @@ bool ParsePat(const unsigned char *section, size_t size, SectionHeader &header, 
 class TableParser {
   public:
     // The model must outlive the parser.
-    explicit TableParser(Model &model) : model_(model) {}
+    //   language  the one that is taken of an event's texts in several; else the first
+    explicit TableParser(Model &model, Code language = {}) : model_(model), language_(language) {}
 
     // Takes a whole section with a right CRC, or none to check.
     void Push(uint16_t pid, const unsigned char *section, size_t size);
@@ -42,9 +43,10 @@ class TableParser {
     void OnSdt(const SectionHeader &header, FieldReader &fields);
     void OnEit(uint8_t table_id, const SectionHeader &header, FieldReader &fields);
     void OnTime(uint8_t table_id, FieldReader &fields);
-    void KeepEvent(uint16_t service_id, uint16_t event_id, Event event);
+    Event ReadEvent(FieldReader &fields) const;
 
     Model &model_;
+    Code language_;
 };
 
 }  // namespace receiver

@@ -1,4 +1,7 @@
 // receiver [OPTION...] FILE: shows what a transport stream carries.
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <csignal>
 
 #include "Receiver.h"
@@ -14,13 +17,41 @@ void OnInterrupt(int /*signal*/) {
     gStop = true;
 }
 
+// Without SA_RESTART, so that a wait for the other end of a pipe ends too.
+void CatchInterrupt() {
+    struct sigaction action = {};
+    action.sa_handler = OnInterrupt;
+    action.sa_flags = static_cast<int>(SA_RESETHAND);
+    sigaction(SIGINT, &action, nullptr);
+}
+
+// A standard descriptor that is closed would be given to the next file that is opened. It is taken
+// by one instead that can do nothing of what is asked of it, so that reads and writes fail.
+void TakeStandardDescriptors() {
+    for (int descriptor = STDIN_FILENO; descriptor <= STDERR_FILENO; ++descriptor) {
+        if (fcntl(descriptor, F_GETFD) < 0) {
+            open("/dev/null", descriptor == STDIN_FILENO ? O_WRONLY : O_RDONLY);
+        }
+    }
+}
+
+// Messages go where stderr goes, by a descriptor of their own: the log is led away from that one.
+std::FILE *OpenMessages() {
+    const int descriptor = fcntl(STDERR_FILENO, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+    std::FILE *messages = descriptor < 0 ? nullptr : fdopen(descriptor, "w");
+    if (messages != nullptr) {
+        std::setvbuf(messages, nullptr, _IONBF, 0);
+    }
+    return messages;
+}
+
 }  // namespace
 
 int main(int argc, char **argv) {
-    struct sigaction action = {};
-    action.sa_handler = OnInterrupt;
-    action.sa_flags = static_cast<int>(SA_RESTART | SA_RESETHAND);
-    sigaction(SIGINT, &action, nullptr);
+    TakeStandardDescriptors();
+    CatchInterrupt();
+    std::FILE *const messages = OpenMessages();
     return receiver::RunReceiver(std::vector<std::string>(argv + (argc > 0 ? 1 : 0), argv + argc),
-                                 stdout, stderr, &gStop);
+                                 {stdout, messages != nullptr ? messages : stderr, &gStop,
+                                  messages != nullptr ? RECEIVER_LOG : nullptr});
 }

@@ -1,0 +1,120 @@
+// Each option is a row of one table, which both the parsing and the help go by.
+#include "CommandLine.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <iterator>
+
+#include "Paragraphs.h"
+
+namespace receiver {
+namespace {
+
+constexpr unsigned kLargestRegion = 63;
+
+//   returns  empty; else what is wrong with the value
+using Setter = std::string (*)(Options &options, const std::string &value);
+
+std::string SetRegion(Options &options, const std::string &value) {
+    const bool digits = !value.empty() && value.size() <= 2 &&
+                        value.find_first_not_of("0123456789") == std::string::npos;
+    const unsigned long region = digits ? std::strtoul(value.c_str(), nullptr, 10) : ~0UL;
+    if (region > kLargestRegion) {
+        return "no region '" + value + "': a number from 0 to 63";
+    }
+    options.region = static_cast<uint8_t>(region);
+    return {};
+}
+
+std::string SetCapture(Options &options, const std::string &value) {
+    options.capture = value;
+    return value.empty() ? "--capture needs the name of a file" : "";
+}
+
+template <bool Options::*Flag>
+std::string Set(Options &options, const std::string & /*none*/) {
+    options.*Flag = true;
+    return {};
+}
+
+constexpr struct {
+    const char *name;
+    const char *value;  // null for an option without one
+    Setter set;
+    const char *help;
+} kOptions[] = {
+    {"--json", nullptr, Set<&Options::json>, "show all as one JSON object"},
+    {"--region", "N", SetRegion,
+     "show local times of this region, where the nation has several; without it, the first one's"},
+    {"--capture", "FILE", SetCapture,
+     "write the packets of the tables to a file; where the configuration has its capture switch "
+     "on, "
+     "the default is the stream's name with \".capture\""},
+    {"--quiet", nullptr, Set<&Options::quiet>, "no progress line"},
+    {"--log", nullptr, Set<&Options::log>, "the library's log goes to stderr, not to its file"},
+    {"--version", nullptr, Set<&Options::version>, "show the version"},
+    {"--help", nullptr, Set<&Options::help>, "show this"},
+};
+
+// Takes the option at `i`, and its value, where it has one.
+//   returns  empty; else what is wrong with it
+std::string TakeOption(const std::vector<std::string> &arguments, size_t &i, Options &options) {
+    const std::string name = arguments[i] == "-h" ? "--help" : arguments[i];
+    const auto *option = std::find_if(std::begin(kOptions), std::end(kOptions),
+                                      [&](const auto &known) { return known.name == name; });
+    if (option == std::end(kOptions)) {
+        return "unknown option " + name;
+    }
+    if (option->value == nullptr) {
+        return option->set(options, "");
+    }
+    if (i + 1 == arguments.size()) {
+        return name + " needs a value";
+    }
+    return option->set(options, arguments[++i]);
+}
+
+std::string TakeFile(const std::string &path, Options &options) {
+    if (path.empty()) {
+        return "an empty file name";
+    }
+    if (!options.path.empty()) {
+        return "more than one file: " + options.path + " and " + path;
+    }
+    options.path = path;
+    return {};
+}
+
+}  // namespace
+
+std::string ParseArguments(const std::vector<std::string> &arguments, Options &options) {
+    bool only_files = false;
+    std::string wrong;
+    for (size_t i = 0; i < arguments.size() && wrong.empty(); ++i) {
+        const std::string &argument = arguments[i];
+        if (only_files || argument.size() < 2 || argument[0] != '-') {
+            wrong = TakeFile(argument, options);
+        } else if (argument == "--") {
+            only_files = true;
+        } else {
+            wrong = TakeOption(arguments, i, options);
+        }
+    }
+    const bool complete = options.help || options.version || !options.path.empty();
+    return !wrong.empty() || complete ? wrong : "no file";
+}
+
+void WriteHelp(std::FILE *out, size_t width) {
+    Paragraphs text(out, width);
+    text.Add("usage: ", "receiver [OPTION...] FILE");
+    text.Add("  ",
+             "Reads a transport stream, from standard input where FILE is \"-\", and shows its "
+             "services, events and counters.");
+    for (const auto &option : kOptions) {
+        std::string lead = std::string("  ") + option.name;
+        lead += option.value != nullptr ? std::string(" ") + option.value : "";
+        text.Add(Padded(lead, 18), option.help);
+    }
+}
+
+}  // namespace receiver

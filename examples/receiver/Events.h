@@ -1,0 +1,68 @@
+// The events of a stream's programme, in bounded memory.
+#ifndef RECEIVER_EVENTS_H
+#define RECEIVER_EVENTS_H
+
+#include <cstddef>
+#include <cstdint>
+#include <map>
+#include <optional>
+#include <string>
+#include <tuple>
+#include <vector>
+
+#include "BroadcastTime.h"
+#include "Code.h"
+
+namespace receiver {
+
+struct EventKey {
+    uint16_t service_id;
+    uint16_t event_id;
+    bool operator<(const EventKey &other) const {
+        return std::tie(service_id, event_id) < std::tie(other.service_id, other.event_id);
+    }
+};
+
+struct Rating {
+    Code country;  // whose rules the value goes by
+    uint8_t value;
+};
+
+struct Event {
+    std::optional<DateTime> start;
+    std::optional<int> duration;  // seconds
+    Code language;                // of the name and the text
+    std::string name;
+    std::string text;
+    std::string extended_text;
+    std::vector<Rating> ratings;
+    std::vector<uint8_t> genres;  // both levels, four bits each
+    std::vector<Code> audio_languages;
+};
+
+class EventTable {
+  public:
+    // Far more than a week of every service takes; keeps memory bounded on hostile streams.
+    static constexpr size_t kMostEvents = 65536;
+    static constexpr size_t kMostBytes = 16 << 20;  // of what the events hold beside themselves
+
+    // Keeps the latest account of an event. Its sections come from tables of different depth, so
+    // what one leaves out stays as it was.
+    void Keep(const EventKey &key, Event event);
+
+    // How often there was no room for an event, or for what is new of it.
+    uint64_t LeftOut() const { return left_out_; }
+
+    bool Has(const EventKey &key) const { return events_.count(key) != 0; }
+    auto begin() const { return events_.begin(); }
+    auto end() const { return events_.end(); }
+
+  private:
+    std::map<EventKey, Event> events_;
+    size_t bytes_ = 0;
+    uint64_t left_out_ = 0;
+};
+
+}  // namespace receiver
+
+#endif

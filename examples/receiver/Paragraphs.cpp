@@ -1,0 +1,80 @@
+// Everything goes out through Add, so no line can be wider than it should.
+#include "Paragraphs.h"
+
+#include <algorithm>
+
+namespace receiver {
+namespace {
+
+bool BeginsCharacter(char c) {
+    return (static_cast<unsigned char>(c) & 0xC0) != 0x80;
+}
+
+// The bytes of the next `count` characters, or of those that are left.
+size_t BytesOf(const std::string &text, size_t from, size_t count) {
+    size_t at = from;
+    while (at < text.size()) {
+        if (BeginsCharacter(text[at])) {
+            if (count == 0) {
+                break;
+            }
+            --count;
+        }
+        ++at;
+    }
+    return at - from;
+}
+
+}  // namespace
+
+size_t WidthOf(const std::string &text) {
+    return static_cast<size_t>(std::count_if(text.begin(), text.end(), BeginsCharacter));
+}
+
+std::string Padded(const std::string &text, size_t width) {
+    const size_t used = WidthOf(text);
+    return used < width ? text + std::string(width - used, ' ') : text;
+}
+
+Paragraphs::Paragraphs(std::FILE *out, size_t width)
+    : out_(out), width_(std::max(width, kLeastWidth)) {}
+
+void Paragraphs::Add(const std::string &lead, const std::string &text) {
+    std::string rest = text;
+    std::replace(rest.begin(), rest.end(), '\n', ' ');
+    const size_t indent = std::min(WidthOf(lead), width_ / 2);
+    std::string line = lead;
+    size_t room = width_ - WidthOf(lead);
+    size_t at = 0;
+    do {
+        size_t count = BytesOf(rest, at, room);
+        if (at + count < rest.size() && rest[at + count] != ' ') {
+            const size_t blank = rest.rfind(' ', at + count);
+            count = blank != std::string::npos && blank > at ? blank - at : count;
+        }
+        line.append(rest, at, count);
+        line.erase(line.find_last_not_of(' ') + 1);
+        std::fprintf(out_, "%s\n", line.c_str());
+        at = std::min(rest.find_first_not_of(' ', at + count), rest.size());
+        line.assign(indent, ' ');
+        room = width_ - indent;
+    } while (at < rest.size());
+}
+
+void Paragraphs::AddList(const std::string &lead, const std::vector<std::string> &items) {
+    const size_t room = width_ - WidthOf(lead);
+    std::string margin = lead;
+    std::string line;
+    for (size_t i = 0; i < items.size(); ++i) {
+        const std::string item = items[i] + (i + 1 < items.size() ? "," : "");
+        if (!line.empty() && WidthOf(line) + 1 + WidthOf(item) > room) {
+            Add(margin, line);
+            margin.assign(WidthOf(lead), ' ');
+            line.clear();
+        }
+        line += (line.empty() ? "" : " ") + item;
+    }
+    Add(margin, line);
+}
+
+}  // namespace receiver

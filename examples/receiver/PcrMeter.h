@@ -1,0 +1,38 @@
+// Measures a stream's duration and bit rate by its program clock references.
+#ifndef RECEIVER_PCRMETER_H
+#define RECEIVER_PCRMETER_H
+
+#include <cstdint>
+#include <map>
+
+namespace receiver {
+
+// What went by between the clock references of one PID. Stretches over which the clock was set anew
+// do not count.
+struct PcrSpan {
+    uint64_t ticks = 0;    // of 27 MHz
+    uint64_t packets = 0;  // of the whole stream
+};
+
+class PcrMeter {
+  public:
+    // Takes a clock reference.
+    //   position  packets of the stream that came before
+    //   restart   the packet announces that the clock was set anew
+    void Push(uint16_t pid, uint64_t pcr, uint64_t position, bool restart);
+
+    // The span of the PID whose clock was seen longest.
+    PcrSpan Longest() const;
+
+  private:
+    struct Clock {
+        uint64_t pcr = 0;
+        uint64_t position = 0;
+        PcrSpan span;
+    };
+    std::map<uint16_t, Clock> clocks_;  // by PID
+};
+
+}  // namespace receiver
+
+#endif

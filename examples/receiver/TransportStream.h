@@ -1,0 +1,54 @@
+// What packets look like, and the PIDs and table_ids that the receiver tells apart.
+#ifndef RECEIVER_TRANSPORTSTREAM_H
+#define RECEIVER_TRANSPORTSTREAM_H
+
+#include <cstddef>
+#include <cstdint>
+
+namespace receiver {
+
+constexpr size_t kPacketSize = 188;
+constexpr unsigned char kSyncByte = 0x47;
+constexpr size_t kPidCount = 8192;
+
+// The PID of a packet.
+inline uint16_t PidOf(const unsigned char *packet) {
+    return static_cast<uint16_t>((packet[1] & 0x1F) << 8 | packet[2]);
+}
+
+constexpr uint16_t kPidPat = 0x0000;
+constexpr uint16_t kPidCat = 0x0001;  // conditional access
+constexpr uint16_t kPidNit = 0x0010;
+constexpr uint16_t kPidSdt = 0x0011;
+constexpr uint16_t kPidEit = 0x0012;
+constexpr uint16_t kPidTime = 0x0014;
+constexpr uint16_t kPidSdtt = 0x0023;        // software downloads
+constexpr uint16_t kPidBit = 0x0024;         // broadcaster information
+constexpr uint16_t kPidNbit = 0x0025;        // information of networks and boards
+constexpr uint16_t kPidEitMobile = 0x0026;   // events of portable reception
+constexpr uint16_t kPidEitOneSeg = 0x0027;   // the same, of one segment
+constexpr uint16_t kPidSdttOneSeg = 0x0028;  // software downloads within one segment
+constexpr uint16_t kPidCdt = 0x0029;         // common data, such as logos
+constexpr uint16_t kPidNull = 0x1FFF;
+
+// Sections are assembled on these wherever they come; what nobody understands is only counted.
+constexpr uint16_t kTablePids[] = {
+    kPidPat, kPidCat,  kPidNit,       kPidSdt,       kPidEit,        kPidTime, kPidSdtt,
+    kPidBit, kPidNbit, kPidEitMobile, kPidEitOneSeg, kPidSdttOneSeg, kPidCdt,
+};
+
+constexpr uint8_t kTablePat = 0x00;
+constexpr uint8_t kTablePmt = 0x02;
+constexpr uint8_t kTableNitActual = 0x40;
+constexpr uint8_t kTableSdtActual = 0x42;
+constexpr uint8_t kTableEitActual = 0x4E;          // present and following
+constexpr uint8_t kTableEitOther = 0x4F;           // of another transport stream
+constexpr uint8_t kTableEitActualSchedule = 0x50;  // to 0x5F
+constexpr uint8_t kTableEitOtherSchedule = 0x60;   // to 0x6F
+constexpr uint8_t kTableEitLast = 0x6F;
+constexpr uint8_t kTableTdt = 0x70;
+constexpr uint8_t kTableTot = 0x73;
+
+}  // namespace receiver
+
+#endif
