@@ -58,10 +58,11 @@ def name(type_id):
 def describe(node):
     own = node.get("name")
     if node.tag == "typedef-decl":
-        base = node
-        while base.tag == "typedef-decl" and by_id[base.get("type-id")].get("name", "").startswith("__"):
+        # A name of the C library's own is another one in the next release.
+        base = by_id[node.get("type-id")]
+        while base.tag == "typedef-decl" and base.get("name").startswith("__"):
             base = by_id[base.get("type-id")]
-        return f"typedef {own} = {name(base.get('type-id'))}"
+        return f"typedef {own} = {name(base.get('id'))}"
     if node.tag == "enum-decl":
         return f"enum {own}: " + ", ".join(f"{e.get('name')} {e.get('value')}" for e in node.findall("enumerator"))
     if node.get("is-declaration-only") == "yes":
@@ -75,7 +76,7 @@ def describe(node):
     return "\n".join(lines)
 
 
-symbols = [s.get("name") for s in root.iter("elf-symbol")]
+symbols = [s.get("name") for s in root.iter("elf-symbol") if s.get("is-defined") == "yes"]
 readable = dict(zip(symbols, subprocess.run(["c++filt"], input="\n".join(symbols), text=True, check=True,
                                             stdout=subprocess.PIPE).stdout.split("\n")))
 exports = set()

@@ -56,3 +56,6 @@ readme() {
     [ -n "$block" ] || die "README.md has no block with '$1'"
     printf '%s\n' "$block"
 }
+
+# log_of FILE: a log as logcat shows it, without dates, times, processes and threads.
+log_of() { sed -E 's/^[0-9-]+ [0-9:.]+ +[0-9]+ +[0-9]+ //' "$1"; }

@@ -47,7 +47,11 @@ TEST_F(String, BehavesLikeAnOptionalText) {
                 break;
             case 2:
                 strings[i].SetMemAllocedString(NewArray(text));
-                given ? void(next = given) : lines.push_back("Argument String is NULL!\n");
+                if (given) {
+                    next = given;
+                } else {
+                    lines.push_back("Argument String is NULL!\n");
+                }
                 break;
             case 3:
                 append(given, !given, "Adding String is NULL!\n");
@@ -62,12 +66,14 @@ TEST_F(String, BehavesLikeAnOptionalText) {
             default: {
                 const VarnekCString &a = strings[i], &b = strings[j];
                 const int order = old && other ? strcmp(old->c_str(), other->c_str()) : 0;
-                const std::vector<int> found = {a == b, a<b, a <= b, a> b, a >= b};
-                ASSERT_EQ(found, old && other
-                                     ? (std::vector<int>{order == 0, order<0, order <= 0, order> 0, order >= 0})
-                                     : (std::vector<int>{old == other, 0, 0, 0, 0}));
-                lines.assign(old && other ? 0 : 5, one);
-                old || other ? void() : void(lines[0] = "Two strings are NULL!\n");
+                std::vector<int> expected = {old == other, 0, 0, 0, 0};
+                if (old && other) {
+                    expected = {order == 0, order > 0, order < 0, order >= 0, order <= 0};
+                } else {
+                    lines.assign(5, one);
+                    lines[0] = old || other ? one : "Two strings are NULL!\n";
+                }
+                ASSERT_EQ((std::vector<int>{a == b, a > b, a < b, a >= b, a <= b}), expected);
             }
         }
         ASSERT_EQ(TextOf(strings[i]), models[i] = next) << step;

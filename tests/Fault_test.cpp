@@ -401,8 +401,8 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         {"timer",
          [] {
              const uint32_t timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("new"));
-             const BOOL started = VarnekPGL_StartTimer(
-                 timer, 60000, [](uint32_t, void *) {}, nullptr);
+             const auto nothing = [](uint32_t, void *) {};
+             const BOOL started = VarnekPGL_StartTimer(timer, 60000, nothing, nullptr);
              return started + VarnekPGL_IsTimerActive(timer) + VarnekPGL_CancelTimer(timer) +
                     VarnekPGL_DeleteTimer(timer);
          },

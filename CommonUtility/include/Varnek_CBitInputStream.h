@@ -28,6 +28,8 @@ class VARNEK_API VarnekCBitInputStream {
     // the copy the stream is at its end, as without a source.
     VarnekCBitInputStream(const VarnekCBitInputStream &other);
     VarnekCBitInputStream &operator=(const VarnekCBitInputStream &other);
+
+    // Frees a private copy.
     ~VarnekCBitInputStream();
 
     // The next bit, 0 or 1.

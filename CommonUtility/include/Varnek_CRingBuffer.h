@@ -30,6 +30,8 @@ class VARNEK_API VarnekCRingBuffer {
     // Takes state and bytes, not the mutex: the target keeps what it has.
     VarnekCRingBuffer(const VarnekCRingBuffer &other);
     VarnekCRingBuffer &operator=(const VarnekCRingBuffer &other);
+
+    // Frees the storage and deletes the mutex. No other thread may be inside the ring.
     ~VarnekCRingBuffer();
 
     // Empties the ring, and gives it a new storage when the size is another one. Returns 0; -8 for

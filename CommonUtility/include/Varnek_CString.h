@@ -14,6 +14,8 @@ class VARNEK_API VarnekCString {
     // A copy of `text`; null gives a null string.
     VarnekCString(char const *text);
     VarnekCString(const VarnekCString &other);
+
+    // Frees the text.
     ~VarnekCString();
 
     // A new copy of the text, which the caller releases with delete[]; null for a null string

@@ -220,18 +220,16 @@ int Room(Create create, Delete destroy) {
     return count;
 }
 
+void *Nothing(void *) { return nullptr; }
+
 std::string RoomInTables() {
     const int mutexes = Room(VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex);
     const int semaphores =
         Room([](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); }, VarnekPGL_DeleteSemaphore);
     const int timers =
         Room(VarnekPGL_CreateTimer, [](int32_t timer) { return VarnekPGL_DeleteTimer(static_cast<uint32_t>(timer)); });
-    const int threads = Room(
-        [](const char *name) {
-            return VarnekPGL_CreateThread(
-                name, 1, 0, [](void *) -> void * { return nullptr; }, nullptr);
-        },
-        VarnekPGL_DeleteThread);
+    const int threads = Room([](const char *name) { return VarnekPGL_CreateThread(name, 1, 0, Nothing, nullptr); },
+                             VarnekPGL_DeleteThread);
     return std::to_string(mutexes) + " mutexes, " + std::to_string(semaphores) + " semaphores, " +
            std::to_string(timers) + " timers, " + std::to_string(threads) + " threads";
 }

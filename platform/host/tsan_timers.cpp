@@ -1,6 +1,7 @@
-// POSIX timers with thread notification on ordinary threads, for ThreadSanitizer, which does not
-// survive the C library's own. One thread a timer; one-shot, relative times, as the library uses
-// them.
+// POSIX timers with thread notification on ordinary threads, for programs under ThreadSanitizer,
+// which does not survive the C library's own. Compile this file into the program; it takes the
+// place of the C library's timer_ functions. Each timer has a thread. Times are relative and timers
+// expire once, as varnekutils_ltn uses them.
 #include <signal.h>
 #include <time.h>
 
@@ -40,7 +41,9 @@ struct Timer {
     }
 };
 
-Timer *Of(timer_t id) { return static_cast<Timer *>(id); }
+Timer *Of(timer_t id) {
+    return static_cast<Timer *>(id);
+}
 
 }  // namespace
 
@@ -59,7 +62,8 @@ int timer_create(clockid_t, sigevent *event, timer_t *id) {
 
 int timer_settime(timer_t id, int, const itimerspec *time, itimerspec *) {
     const std::lock_guard<std::mutex> guard(Of(id)->lock);
-    const auto span = std::chrono::seconds(time->it_value.tv_sec) + std::chrono::nanoseconds(time->it_value.tv_nsec);
+    const auto span = std::chrono::seconds(time->it_value.tv_sec) +
+                      std::chrono::nanoseconds(time->it_value.tv_nsec);
     Of(id)->armed = span.count() > 0;
     Of(id)->due = Clock::now() + span;
     Of(id)->changed.notify_one();
