@@ -153,7 +153,7 @@ TEST_F(File, SizesAndPositions) {
         VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_SET);
         VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_CUR);
         EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(beyond), -1);
-        EXPECT_EQ(ftell(reinterpret_cast<FILE *>(beyond)), 2L * INT32_MAX);
+        EXPECT_EQ(int64_t{ftell(reinterpret_cast<FILE *>(beyond))}, 2LL * INT32_MAX);
         VarnekPGL_CloseFile(beyond);
     }
 }

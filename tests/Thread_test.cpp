@@ -3,6 +3,7 @@
 #include <pthread.h>
 #include <sched.h>
 
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <functional>
@@ -11,6 +12,7 @@
 
 #include "../CommonUtility/source/Varnek_SlotTable.h"
 #include "Varnek_Semaphore.h"
+#include "Varnek_Timer.h"
 #include "support/VarnekTest.h"
 
 namespace {
@@ -258,6 +260,69 @@ TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
         EXPECT_NE(VarnekPGL_GetThreadByName(("t" + std::to_string(i)).c_str()), -1);
     }
 }
+
+#if defined(__has_feature)
+#define IS_INSTRUMENTED __has_feature(thread_sanitizer) || __has_feature(address_sanitizer)
+#else
+#define IS_INSTRUMENTED 0
+#endif
+#if defined(__OPTIMIZE__) && !IS_INSTRUMENTED
+
+// The bytes of its stack that a thread uses for `work`, the log function of this program included.
+size_t StackOf(void (*work)()) {
+    constexpr size_t kSize = 256 * 1024;
+    static char stack[kSize] __attribute__((aligned(4096)));
+    memset(stack, 0xA5, kSize);
+    pthread_attr_t attributes;
+    pthread_attr_init(&attributes);
+    pthread_attr_setstack(&attributes, stack, kSize);
+    pthread_t thread;
+    const auto run = [](void *what) -> void * {
+        reinterpret_cast<void (*)()>(what)();
+        return nullptr;
+    };
+    EXPECT_EQ(pthread_create(&thread, &attributes, run, reinterpret_cast<void *>(work)), 0);
+    pthread_join(thread, nullptr);
+    const char *deepest = std::find_if(stack, stack + kSize, [](char c) { return c != '\xA5'; });
+    return static_cast<size_t>(stack + kSize - deepest);
+}
+
+TEST_F(Thread, CallsFitASmallStack) {
+    const struct {
+        const char *what;
+        void (*work)();
+    } rows[] = {
+        {"load", VarnekPGL_InitializeDebug},
+        {"trace", [] { VARNEK_TRACE(0x80000001, "%s %d %5.2f", "text", 1, 1.5); }},
+        {"mutex", [] { VarnekPGL_AcquireMutex(VarnekPGL_CreateMutex("mutex")); }},
+        {"semaphore", [] { VarnekPGL_WaitSemaphore(VarnekPGL_CreateSemaphore("semaphore", 0), 1); }},
+        {"thread", [] { VarnekPGL_DeleteThread(VarnekPGL_CreateThread("thread", 1, 0, Nothing, nullptr)); }},
+        {"timer",
+         [] {
+             const auto timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("timer"));
+             VarnekPGL_StartTimer(
+                 timer, 60000, [](uint32_t, void *) {}, nullptr);
+             VarnekPGL_DeleteTimer(timer);
+         }},
+        {"message",
+         [] {
+             THREAD_MSG message = {};
+             int32_t count = 0;
+             VarnekPGL_SendMessage(VarnekPGL_GetThreadByName("sink"), &message);
+             VarnekPGL_ReceiveMessage(0, &message, &count);
+         }},
+    };
+    VarnekPGL_CreateThread("sink", 1, 0, Nothing, nullptr);
+    const size_t start = StackOf([] {});
+    for (const auto &row : rows) {
+        StackOf(row.work);  // the first call may have the loader bind functions
+        const size_t used = StackOf(row.work) - start;
+        EXPECT_LT(used, 8192u) << row.what;
+        RecordProperty(row.what, static_cast<int>(used));
+    }
+}
+
+#endif
 
 TEST_F(MessageQueue, UrgentMessagesOvertake) {
     std::string received;
