@@ -149,7 +149,7 @@ TEST_F(File, SizesAndPositions) {
     std::filesystem::resize_file(large, 5LL << 30);
     EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), 0);
     const PglFileHandle beyond = VarnekPGL_OpenFile(large.c_str(), PGL_FILE_MODE_READ);
-    if (beyond != -1) {  // a 32-bit system may open no such stream
+    if (beyond != -1 && sizeof(long) == 8) {  // on 32 bits there is no such position
         VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_SET);
         VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_CUR);
         EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(beyond), -1);

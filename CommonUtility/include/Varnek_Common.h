@@ -1,4 +1,9 @@
 // Types and constants that every module of the stack shares. Compiles as C11 and as C++17.
+//
+// A call takes part of its thread's stack. On 32-bit ARM with all traces on, up to: trace,
+// assertion and tasking 3.9 KiB, a load of the debug configuration 2.1, files 2.9, the deletion of
+// a tree 3.3 whatever its depth, the settings 4.1; and what the platform's log function takes
+// besides.
 #ifndef VARNEK_COMMON_H
 #define VARNEK_COMMON_H
 

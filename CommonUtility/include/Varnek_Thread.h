@@ -22,7 +22,8 @@ extern "C" {
 // other arguments are, and its unread messages are freed; that thread runs on without a record.
 //   szThreadName  1 to 31 characters
 //   priority      1 to 99, kept for the scheduler's policy, which is the ordinary one
-//   stackSize     bytes; what the system refuses gives its default size
+//   stackSize     bytes; what the system refuses gives its default size. A thread that calls this
+//                 library needs 12 KiB or more where a guard page is taken out of it
 //   function      runs in the new thread; its result is dropped
 //   argument      handed to `function` unchanged
 //   returns       the handle, never given out twice; -1 on failure, and for good after 2147483647
@@ -63,8 +64,8 @@ typedef struct THREAD_MSG {
 //            message, too little memory, or a failing OS call (the message stays queued then)
 VARNEK_API BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message);
 
-// Puts a message in front of everything that is queued now, earlier urgent messages included. Results
-// are those of VarnekPGL_SendMessage.
+// Puts a message in front of everything that is queued now, earlier urgent messages included.
+// Results are those of VarnekPGL_SendMessage.
 VARNEK_API BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message);
 
 // Takes the first message of the calling thread's queue, waiting up to `timeout` for one.
