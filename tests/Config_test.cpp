@@ -2,6 +2,8 @@
 // where the nation comes from. The file is put back as it was.
 #include "Varnek_Config.h"
 
+#include <fcntl.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -135,6 +137,13 @@ TEST_F(ConfigAlone, ASaveKeepsTheModeAndWhatAnotherNameLeadsTo) {
         VarnekCfg_SaveConfigFile();
         EXPECT_EQ(ReadAll(other), File("", 2, 0, 0, 68, "")) << "saved in place";
     }
+    // A process that stands still in a save does not stop this one.
+    std::filesystem::remove(kPath);
+    const int directory = open(VARNEK_DATA_DIR, O_RDONLY | O_CLOEXEC);
+    EXPECT_EQ(flock(directory, LOCK_EX), 0);
+    VarnekCfg_SaveConfigFile();
+    EXPECT_EQ(ReadAll(kPath), File("", 2, 0, 0, 68, ""));
+    close(directory);
 }
 
 TEST_F(ConfigAlone, TheNationComesFromFileThenPlatformThenDefault) {

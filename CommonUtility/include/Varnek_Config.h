@@ -37,8 +37,9 @@ VARNEK_API void VarnekCfg_LoadConfigFile(void);
 // Saves the record; the data directory must exist. A failure is traced. The new text is written
 // beside the file ("Varnek_Config.new"), flushed to the medium and renamed into place with the mode
 // of the old file: a reader finds the old text or the new one, whenever the process is killed.
-// Where that cannot be (no room or no permission for a second file; a link, another user's file or
-// no regular file in its place), the file itself is emptied and written.
+// Where that cannot be (no room or no permission for a second file; a second process that saves for
+// longer than a second; a link, another user's file or no regular file in its place), the file
+// itself is emptied and written.
 VARNEK_API void VarnekCfg_SaveConfigFile(void);
 
 // Sets the standard type, and saves when it is another one.

@@ -16,6 +16,7 @@
 #include "Varnek_Storage.h"
 #include "Varnek_StrUtil.h"
 #include "Varnek_Support.h"
+#include "Varnek_Timer.h"
 #include "Varnek_Trace.h"
 #include "varnek_platform.h"
 
@@ -40,6 +41,7 @@ constexpr size_t kFileSize = 900;  // of what is written, with a terminator
 constexpr char kConfigPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
 constexpr char kNewPath[] = VARNEK_DATA_DIR "Varnek_Config.new";  // until it is renamed
 static_assert(sizeof kConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
+constexpr int kLockTries = 1000;  // of a millisecond
 constexpr int32_t kSaveFlags = PGL_FILE_MODE_CREATE_RW | PGL_FILE_MODE_WRITE;
 
 enum ConfigField {
@@ -210,8 +212,19 @@ bool ReplaceFile(const char *text, mode_t mode) {
     return false;
 }
 
-// ReplaceFile where it is possible, one process at a time: a lock on the directory, which goes with
-// its holder, keeps the others from the file beside.
+// Takes the lock that keeps the saves of other processes from the file beside. It goes with its
+// holder, but a holder may be stopped, or leave a child that holds it on: so the wait has an end.
+bool LockDirectory(int directory) {
+    for (int i = 0; i < kLockTries; i++) {
+        if (flock(directory, LOCK_EX | LOCK_NB) == 0) {
+            return true;
+        }
+        VarnekPGL_MSleep(1);
+    }
+    return false;
+}
+
+// ReplaceFile, where it is possible.
 bool SaveBeside(const char *text) {
     mode_t mode = 0;
     if (access(VARNEK_DATA_DIR, W_OK) != 0 || !MayReplace(&mode)) {
@@ -221,11 +234,12 @@ bool SaveBeside(const char *text) {
     if (directory < 0) {
         return false;
     }
-    int locked = -1;
-    do {
-        locked = flock(directory, LOCK_EX);
-    } while (locked != 0 && errno == EINTR);
-    const bool replaced = locked == 0 && ReplaceFile(text, mode);
+    bool replaced = false;
+    if (LockDirectory(directory)) {
+        replaced = ReplaceFile(text, mode);
+        // For a child, too, that was forked meanwhile and has the descriptor.
+        flock(directory, LOCK_UN);
+    }
     close(directory);
     return replaced;
 }
