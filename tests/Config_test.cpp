@@ -128,7 +128,11 @@ TEST_F(ConfigAlone, ASaveKeepsTheModeAndWhatAnotherNameLeadsTo) {
     const std::string other = std::filesystem::absolute(Path("other"));
     WriteAll(kPath, "");
     chmod(kPath.c_str(), 0640);
+    const bool mayChange = chown(kPath.c_str(), static_cast<uid_t>(-1), 1234) == 0;  // only root may
     VarnekCfg_SaveConfigFile();
+    struct stat saved = {};
+    EXPECT_EQ(stat(kPath.c_str(), &saved), 0);
+    EXPECT_TRUE(saved.st_gid == 1234 || !mayChange);
     EXPECT_EQ(std::filesystem::status(kPath).permissions(), static_cast<std::filesystem::perms>(0640));
     for (const bool hard : {true, false}) {
         std::filesystem::remove(kPath);

@@ -130,6 +130,7 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
         EXPECT_EQ(directory ? mkdir(kWorking, 0777) : mkfifo(kWorking, 0666), 0);
         VarnekPGL_InitializeDebug();
         EXPECT_EQ(TakeBodies("SBTVD").front(), missing);
+        VarnekPGL_changeModeForDebug();
     }
     std::filesystem::remove(kWorking);
     WriteAll(kWorking, std::string((1 << 20) + 1, '#'));

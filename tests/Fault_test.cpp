@@ -360,7 +360,18 @@ TEST_F(FaultAlone, OnlyAMissingDebugConfigurationIsSeeded) {
 TEST_F(Fault, ASizeIsTheFilesWhateverTheStreamsPosition) {
     const std::string file = Path("file");
     WriteAll(file, "12345678");
-    ExpectFaults({{"ftell", EOVERFLOW, [&] { return VarnekPGL_GetFileSize(file.c_str()); }, 8, {}}});
+    const PglFileHandle handle = VarnekPGL_OpenFile(file.c_str(), PGL_FILE_MODE_READ);
+    ExpectFaults({
+        {"ftell", EOVERFLOW, [&] { return VarnekPGL_GetFileSize(file.c_str()); }, 8, {}},
+        {"ftell", EOVERFLOW, [&] { return VarnekPGL_GetFileSizeByHandle(handle); }, 8, {}},
+        {"fflush",
+         EBADF,
+         [&] { return FailCall("ftell", 1, EOVERFLOW), VarnekPGL_GetFileSizeByHandle(handle); },
+         8,
+         {}},
+    });
+    FailCall("ftell", 0, 0);
+    VarnekPGL_CloseFile(handle);
 }
 
 // An operation that leaves nothing behind, made again and again, while the first, second, ... call of
@@ -545,7 +556,7 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
          },
          68,
          {0}},
-        {"debug configuration", [] { return VarnekPGL_InitializeDebug(), 0; }, 0, {}},
+        {"debug configuration", [] { return VarnekPGL_InitializeDebug(), 0; }, 0, {}, true},
     };
     int forced = 0;
     for (const Operation &operation : operations) {

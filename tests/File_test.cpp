@@ -383,7 +383,7 @@ TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
         EXPECT_FALSE(std::filesystem::exists(tree));
         EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
     }
-    for (const char *suffix : {"", "/", "//"}) {
+    for (const char *suffix : {"", "/", "//", "/.", "/.//"}) {
         std::filesystem::create_directory_symlink("outside", Path("root"));
         EXPECT_EQ(VarnekPGL_DeleteDirEx((Path("root") + suffix).c_str()), 0) << suffix;
         EXPECT_FALSE(std::filesystem::exists(std::filesystem::symlink_status(Path("root"))));
@@ -440,7 +440,8 @@ TEST_F(Command, TimesBeyond2038DoNoHarm) {
     ASSERT_EQ(system(("touch -d @4102444800 " + source).c_str()), 0);
     EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), copy.c_str()), 0);
     EXPECT_EQ(ReadAll(copy), "content");
-    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), (Path("") + "./source").c_str()), -1) << "onto itself";
+    ASSERT_EQ(link(source.c_str(), Path("same").c_str()), 0);
+    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), Path("same").c_str()), -1) << "onto itself";
     EXPECT_EQ(ReadAll(source), "content");
     PglFmFileAttributes attributes;
     EXPECT_TRUE(VarnekPGL_FmGetFileAttributes(source.c_str(), &attributes));

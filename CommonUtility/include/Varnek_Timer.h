@@ -14,9 +14,10 @@ extern "C" {
 #endif
 
 // What a timer calls. Runs on a thread of the OS timer service, with no lock held; callbacks may
-// run at once, those of one timer included. A callback may use its own timer, start it again
-// included. It may begin after its timer has been cancelled or deleted, when the expiry came first:
-// `pUserData` should be a number, a handle, or memory that outlives the timer.
+// run at once, those of one timer included, or one after the other. A callback may use its own
+// timer, start it again included. It may begin after its timer has been cancelled or deleted, when
+// the expiry came first: `pUserData` should be a number, a handle, or memory that outlives the
+// timer.
 typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 
 // Takes the lowest free slot; no OS timer exists before the first start.
@@ -26,8 +27,8 @@ VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 // Arms the timer once. A start that succeeds and is neither cancelled nor deleted in time calls
 // back exactly once, with its own `callback` and `userData`, never before its time and at worst
 // late: an expiry that the system has not delivered when the timer is started again is not lost.
-// One exception: when the system can make no thread for an expiry, nothing is logged, and the call
-// comes with the timer's next expiry.
+// When the system can make no thread for an expiry, nothing is logged, and the call comes with the
+// timer's next expiry; so it does when a later start takes the undelivered expiry along and fails.
 //   timer     handle from VarnekPGL_CreateTimer
 //   timeout   milliseconds from now, 1 or more; a step of the wall clock does not move it
 //   callback  called once at the expiry

@@ -179,21 +179,30 @@ FileText ReadFromStart(PglFileHandle file) {
 }
 
 // Whether a new file may take the place of what is there: nothing, or a file of our own that no
-// other name leads to. `*mode` is then its mode, 0 for none.
-bool MayReplace(mode_t *mode) {
-    struct stat64 old = {};
-    if (lstat64(kConfigPath, &old) != 0) {
-        *mode = 0;
+// other name leads to. Fills `*old`, with zeros for nothing.
+bool MayReplace(struct stat64 *old) {
+    *old = {};
+    if (lstat64(kConfigPath, old) != 0) {
         return errno == ENOENT;
     }
-    *mode = old.st_mode & 07777;
-    return S_ISREG(old.st_mode) && old.st_nlink == 1 && old.st_uid == geteuid();
+    return S_ISREG(old->st_mode) && old->st_nlink == 1 && old->st_uid == geteuid();
+}
+
+// Gives the new file what readers of the old one go by, as late as it can: another process may
+// change it meanwhile.
+bool TakeOver(int fd) {
+    struct stat64 old = {};
+    if (!MayReplace(&old)) {
+        return false;
+    }
+    return old.st_mode == 0 || (fchown(fd, static_cast<uid_t>(-1), old.st_gid) == 0 &&
+                                fchmod(fd, old.st_mode & 07777) == 0);
 }
 
 // Writes the text beside the file, through to the disk, and renames it into place: a reader finds
 // the old text or the new one at any moment, whatever happens to this process. False when that
 // cannot be done; the file is as it was then.
-bool ReplaceFile(const char *text, mode_t mode) {
+bool ReplaceFile(const char *text) {
     remove(kNewPath);
     const PglFileHandle file = VarnekPGL_OpenFile(kNewPath, kSaveFlags);
     if (file == -1) {
@@ -202,8 +211,7 @@ bool ReplaceFile(const char *text, mode_t mode) {
     const int fd = fileno(StreamOf(file));
     const uint32_t length = static_cast<uint32_t>(strlen(text));
     const bool stored = VarnekPGL_WriteFileByHandle(file, text, length) == length &&
-                        VarnekPGL_FlushFile(file) == 0 && fsync(fd) == 0 &&
-                        (mode == 0 || fchmod(fd, mode) == 0);
+                        VarnekPGL_FlushFile(file) == 0 && fsync(fd) == 0 && TakeOver(fd);
     const bool closed = VarnekPGL_CloseFile(file) == 0;
     if (stored && closed && rename(kNewPath, kConfigPath) == 0) {
         return true;
@@ -226,8 +234,8 @@ bool LockDirectory(int directory) {
 
 // ReplaceFile, where it is possible.
 bool SaveBeside(const char *text) {
-    mode_t mode = 0;
-    if (access(VARNEK_DATA_DIR, W_OK) != 0 || !MayReplace(&mode)) {
+    struct stat64 old = {};
+    if (access(VARNEK_DATA_DIR, W_OK) != 0 || !MayReplace(&old)) {
         return false;
     }
     const int directory = open(VARNEK_DATA_DIR, O_RDONLY | O_DIRECTORY | O_CLOEXEC);
@@ -236,7 +244,7 @@ bool SaveBeside(const char *text) {
     }
     bool replaced = false;
     if (LockDirectory(directory)) {
-        replaced = ReplaceFile(text, mode);
+        replaced = ReplaceFile(text);
         // For a child, too, that was forked meanwhile and has the descriptor.
         flock(directory, LOCK_UN);
     }

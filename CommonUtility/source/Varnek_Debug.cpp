@@ -364,7 +364,7 @@ int32_t VarnekPGL_SysGetLastErro() {
 void VarnekPGL_changeModeForDebug() {
     VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, " VarnekCfg_changeDebugMode\n");
     for (const char *path : {kConfigPath, kSettingsPath}) {
-        if (VarnekPGL_CheckFile(path)) {
+        if (KindOfConfigFile(path) != FileKind::kOdd && VarnekPGL_CheckFile(path)) {
             (void)VarnekPGL_Chmod(path, 666);
         }
     }

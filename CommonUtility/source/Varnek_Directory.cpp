@@ -6,8 +6,11 @@
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
+
+#include <initializer_list>
 
 #include "Varnek_File.h"
 #include "Varnek_Storage.h"
@@ -86,9 +89,10 @@ class TreeDeletion {
     explicit TreeDeletion(char *path) : path_(path) {}
 
     int32_t Run() {
-        // The final slashes that the path may still have would have the system follow a link.
+        // A final slash or "/." would have the system follow a link.
         size_t bare = strlen(path_);
-        while (bare > 1 && path_[bare - 1] == '/') {
+        while (bare > 1 &&
+               (path_[bare - 1] == '/' || (path_[bare - 1] == '.' && path_[bare - 2] == '/'))) {
             bare--;
         }
         const char cut = path_[bare];
@@ -393,22 +397,33 @@ class ShellCommand {
     bool fits_ = true;
 };
 
-// Whether two existing paths lead to one file.
+// Whether two files are one, where stat cannot say so: a lock on one of them then keeps the other
+// from being locked.
+bool ShareALock(const char *a, const char *b) {
+    const int first = open(a, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    const int second = open(b, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    const bool apart = first >= 0 && second >= 0 && flock(first, LOCK_EX | LOCK_NB) == 0 &&
+                       flock(second, LOCK_EX | LOCK_NB) == 0;
+    for (const int fd : {first, second}) {
+        if (fd >= 0) {
+            close(fd);
+        }
+    }
+    return !apart;
+}
+
+// Whether two paths lead to one file. Times beyond 2038 do not fit a 32-bit system's record: that
+// fails for both paths, if they do.
 bool IsSameFile(const char *a, const char *b) {
     struct stat64 first = {};
     struct stat64 second = {};
-    if (stat64(a, &first) == 0 && stat64(b, &second) == 0) {
-        return first.st_dev == second.st_dev && first.st_ino == second.st_ino;
+    const int firstError = stat64(a, &first) == 0 ? 0 : errno;
+    const int secondError = stat64(b, &second) == 0 ? 0 : errno;
+    if (firstError == EOVERFLOW && secondError == EOVERFLOW) {
+        return ShareALock(a, b);
     }
-    if (errno != EOVERFLOW) {
-        return false;
-    }
-    char *realA = realpath(a, nullptr);
-    char *realB = realpath(b, nullptr);
-    const bool same = realA != nullptr && realB != nullptr && strcmp(realA, realB) == 0;
-    free(realA);
-    free(realB);
-    return same;
+    return firstError == 0 && secondError == 0 && first.st_dev == second.st_dev &&
+           first.st_ino == second.st_ino;
 }
 
 // Whether a copy may run: the shell empties the destination before it reads the source, so a source

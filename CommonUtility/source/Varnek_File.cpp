@@ -153,7 +153,8 @@ uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer, ui
 
 int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
-    if (stream != nullptr && fflush(stream) == 0) {
+    if (stream != nullptr) {
+        fflush(stream);  // some systems refuse it for a stream that is only read
         const int64_t size = SizeOfRegularFile(stream);
         if (size >= 0) {
             return size <= INT32_MAX ? static_cast<int32_t>(size) : -1;
@@ -271,10 +272,9 @@ int32_t VarnekPGL_DeleteFile(const char *path) {
 FileKind KindOfConfigFile(const char *path) {
     struct stat64 status = {};
     if (stat64(path, &status) != 0) {
-        // Times beyond 2038 do not fit a 32-bit system's record, but the file is there.
-        return errno == EOVERFLOW ? FileKind::kReadable
-               : errno == ENOENT  ? FileKind::kMissing
-                                  : FileKind::kOdd;
+        // Of other failures the open says why. One of them is none: times beyond 2038 do not fit a
+        // 32-bit system's record.
+        return errno == ENOENT ? FileKind::kMissing : FileKind::kReadable;
     }
     if (!S_ISREG(status.st_mode)) {
         return FileKind::kOdd;

@@ -63,13 +63,16 @@ class SlotTable {
     // The lowest slot from `first` on that a new object may take. -1 for none, and for good once
     // every handle has been given out.
     int FirstFree(int first = 0) const {
-        for (int slot = first; slot < capacity && given_ < INT32_MAX; slot++) {
+        for (int slot = first; slot < capacity && HasHandles(); slot++) {
             if (HandleOf(slot) == kFree) {
                 return slot;
             }
         }
         return -1;
     }
+
+    // Whether there is a handle left to give out.
+    bool HasHandles() const { return given_ < INT32_MAX; }
 
     // The handle that the next publication gives out.
     int32_t NextHandle() const { return given_ + 1; }

@@ -36,8 +36,8 @@ inline unsigned ShownHandle(intptr_t handle) {
 // its reader, or take all the memory.
 enum class FileKind {
     kMissing,
-    kReadable,
-    kOdd,       // no regular file, or nothing that can be looked at
+    kReadable,  // as far as can be seen without opening it
+    kOdd,       // no regular file
     kTooLarge,  // more than kMaxConfigSize bytes
 };
 constexpr int64_t kMaxConfigSize = 1024 * 1024;

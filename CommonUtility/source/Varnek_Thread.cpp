@@ -74,13 +74,20 @@ int32_t Guard() {
     return guard != kGuardInTheMaking ? guard : kNoGuard;
 }
 
+// Runs when a thread ends. The system has cleared the value by then; the destructors of other keys
+// may still ask who they run in, or read messages.
+void KeepSelf(void *self) {
+    pthread_setspecific(static_cast<pthread_key_t>(gSelfKey.load(std::memory_order_relaxed) - 1),
+                        self);
+}
+
 // Makes the key, unless an earlier call has made it.
 bool MakeSelfKey() {
     if (gSelfKey.load(std::memory_order_relaxed) != 0) {
         return true;
     }
     pthread_key_t key = 0;
-    if (pthread_key_create(&key, nullptr) != 0) {
+    if (pthread_key_create(&key, KeepSelf) != 0) {
         return false;
     }
     gSelfKey.store(static_cast<uint32_t>(key) + 1, std::memory_order_relaxed);
@@ -298,8 +305,9 @@ int FirstFreeRecord() {
 // once its last user has left, and that takes a moment. -1 for none; the guard may then be lost.
 int ClaimRecord(HoldMutex *guard) {
     int slot = FirstFreeRecord();
-    for (int i = 0; i < kLeaveTries && slot == -1 &&
-                    gThreadInfoArr.Count() < MAX_THREAD_MGR_INFO_ARR_SIZE && guard->IsHeld();
+    for (int i = 0;
+         i < kLeaveTries && slot == -1 && gThreadInfoArr.Count() < MAX_THREAD_MGR_INFO_ARR_SIZE &&
+         gThreadInfoArr.HasHandles() && guard->IsHeld();
          i++) {
         guard->Release();
         VarnekPGL_MSleep(1);
