@@ -266,8 +266,8 @@ TEST(Receiver, DecodesTexts) {
     }
 }
 
-// The sections in the order given, each in packets of its own. What does not fit the first packet
-// of one comes behind the first packet of the next.
+// Reads the sections in the order given, each in packets of its own. The further packets of one come
+// behind the first packet of the next.
 Report ReadSections(const std::vector<std::pair<uint16_t, Bytes>> &sections) {
     StreamWriter writer;
     std::pair<uint16_t, std::vector<Content>> rest;
@@ -414,8 +414,7 @@ TEST(Receiver, KeepsWhatApplies) {
     }
 }
 
-// Events of every service there is, with texts as long as they can be: what is kept has an end, and
-// other streams' events take no room from this one's.
+// A table of events has its bounds, in their number and in the length of their texts.
 TEST(Receiver, BoundsEvents) {
     EventTable few, long_ones;
     Event event;
@@ -529,7 +528,7 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
     std::fclose(full);
 }
 
-// The first end of a terminal gives an error when the second one is closed, behind what was written.
+// The first end of a terminal gives the bytes of the second one, and an error after that is closed.
 TEST_F(ReceiverFiles, TellsOfAReadError) {
     int input = -1, terminal = -1;
     termios raw{};
@@ -546,7 +545,7 @@ TEST_F(ReceiverFiles, TellsOfAReadError) {
     EXPECT_EQ(result.err, "receiver: -: read failed: Input/output error\n");
 }
 
-// A pipe whose other end says nothing.
+// The other end of the pipe says nothing.
 TEST_F(ReceiverFiles, StopsWhileItWaits) {
     ASSERT_EQ(mkfifo(Path("pipe").c_str(), 0600), 0);
     const int other_end = open(Path("pipe").c_str(), O_RDWR);
@@ -643,7 +642,7 @@ TEST_F(ReceiverFiles, Captures) {
     EXPECT_THAT(full.out, HasSubstr("1600 packets")) << "the reading goes on";
 }
 
-// The threads of the program come to what one thread makes of the same bytes.
+// The threads of the program come to the same result as one thread.
 TEST_F(ReceiverFiles, SurvivesDamage) {
     std::mt19937 random(20240615);
     for (int round = 0; round < 15; ++round) {
