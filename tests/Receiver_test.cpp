@@ -489,7 +489,11 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
     WriteAll(Path("empty"), "");
     WriteAll(Path("text"), std::string(9999, 'x'));
     WriteAll(Path("cut.ts"), SampleText().substr(0, 100000));
-    WriteAll(Path("-dash"), SampleText());
+    std::string long_stream;  // more than may wait between two threads
+    for (int i = 0; i < 12; ++i) {
+        long_stream += SampleText();
+    }
+    WriteAll(Path("-dash"), long_stream);
     const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, Fill(4, 0)) + Fill(9000, 0x11);
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
     const struct {
@@ -512,7 +516,7 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
         {{Path("text")}, 1, "", "no transport stream packets in 9999 bytes"},
         {{Path("accident")}, 1, "", "hardly a transport stream: 5 packets in 18960 bytes"},
         {{Path("cut.ts"), "--json"}, 0, "{\n  \"packets\": 531,\n", ""},
-        {{"--", Path("-dash")}, 0, "1600 packets of 188 bytes", ""},
+        {{"--", Path("-dash")}, 0, "19200 packets of 188 bytes", ""},
     };
     for (const auto &c : cases) {
         const Result result = RunProgram(c.arguments);
