@@ -192,6 +192,7 @@ TEST(Receiver, AssemblesSections) {
         {"two in a packet", SplitSections({small, small}), 2, 0, 0},
         {"damaged between good ones", SplitSections({small, damaged, small}), 2, 1, 0},
         {"over packets", parts, 1, 0, 0},
+        {"behind an adaptation field", {{Bytes{1, 0x00, 0} + small, start | kAdaptation}}, 1, 0, 0},
         {"the longest", SplitSections({MakeSection(0x50, 1, Fill(4084, 3))}), 1, 0, 0},
         {"too long", SplitSections({MakeSection(0x50, 1, Fill(4085, 3))}), 0, 0, 1},
         {"too long for its table", SplitSections({MakeSection(0x42, 1, Fill(1013, 3))}), 0, 0, 1},
@@ -357,10 +358,11 @@ TEST(Receiver, KeepsWhatApplies) {
          {{0x12, MakeEit(0x4E, 1, 1,
                          At(1, 18,
                             english + MakeShortEvent("por", "", "") + MakeShortEvent("por", "Sim", "") +
-                                Descriptor(0x55, ratings)) +
+                                Descriptor(0x55, ratings) +
+                                Descriptor(0xC4, Bytes{0xF2, 1, 0x10, 0x11, 0xFF, 0x40} + Raw("spa"))) +
                              At(2, 19, german + english))},
           {0x12, MakeEit(0x58, 1, 1, At(1, 18, extended("eng", "wrong") + extended("por", "X")))}},
-         {R"("language": "por", "name": "Sim", "text": "", "extended_text": "X", )",
+         {R"("language": "por", "name": "Sim", "text": "", "extended_text": "X", "audio_languages": ["spa"])",
           R"([{"country": "ARG", "rating": "from 12"}, {"country": "BRA", "rating": "from 16, drugs, violence, sex"}])",
           R"("language": "deu", "name": "Ja")"},
          {"wrong"}},
