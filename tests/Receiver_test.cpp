@@ -74,21 +74,17 @@ TEST(Receiver, FindsPacketsInAnyCompany) {
         {"204", Numbered(0, 300, {}, parity), 300, 0, 204},
         {"one packet", Numbered(0, 1), 1, 0, 188},
         {"one of 192", Numbered(0, 1, stamp), 1, 0, 192},
-        {"one of 204", Numbered(0, 1, {}, parity), 1, 0, 204},
         {"time stamps that look like sync bytes", Numbered(0, 9, {0x47, 0x01, 0x00, 0x10}), 9, 0, 192},
         {"garbage in front", noise + Numbered(0, 20), 20, 1, 188},
-        {"garbage in front of 192", noise + Numbered(0, 20, stamp), 20, 1, 192},
         {"garbage between, twice", Numbered(0, 9) + noise + Numbered(9, 4) + noise + Numbered(13, 5), 18, 2, 188},
         {"garbage soon", Numbered(0, 3) + noise + Numbered(3, 17), 20, 1, 188},
         {"garbage before the last packet", Numbered(0, 9) + noise + Numbered(9, 1), 10, 1, 188},
-        {"garbage behind", Numbered(0, 9) + Fill(500, 0), 9, 1, 188},
         {"datagrams of seven", datagrams, 70, 10, 188},
         {"a damaged sync byte", damaged, 19, 1, 188},
         {"bytes missing within a packet", cut, 19, 1, 188},
         {"cut in a packet", Numbered(0, 9) + Bytes{0x47, 0x01, 0x00}, 9, 0, 188},
         {"cut in parity", Numbered(0, 9, {}, parity) + Numbered(9, 1), 10, 0, 204},
         {"sync bytes and nothing else", Fill(188 * 50 + 7, 0x47), 50, 0, 188},
-        {"nothing", {}, 0, 0, 0},
         {"less than a packet", Fill(187, 0x47), 0, 0, 0},
         {"a table with even strides", noise + table, 0, 0, 0},
         {"text", text, 0, 0, 0},
@@ -192,6 +188,7 @@ TEST(Receiver, AssemblesSections) {
         {"two in a packet", SplitSections({small, small}), 2, 0, 0},
         {"damaged between good ones", SplitSections({small, damaged, small}), 2, 1, 0},
         {"over packets", parts, 1, 0, 0},
+        {"behind an adaptation field", {{Bytes{1, 0x00, 0} + small, start | kAdaptation}}, 1, 0, 0},
         {"the longest", SplitSections({MakeSection(0x50, 1, Fill(4084, 3))}), 1, 0, 0},
         {"too long", SplitSections({MakeSection(0x50, 1, Fill(4085, 3))}), 0, 0, 1},
         {"too long for its table", SplitSections({MakeSection(0x42, 1, Fill(1013, 3))}), 0, 0, 1},
@@ -266,8 +263,8 @@ TEST(Receiver, DecodesTexts) {
     }
 }
 
-// The sections in the order given, each in packets of its own. What does not fit the first packet
-// of one comes behind the first packet of the next.
+// Reads the sections in the order given, each in packets of its own. The further packets of one come
+// behind the first packet of the next.
 Report ReadSections(const std::vector<std::pair<uint16_t, Bytes>> &sections) {
     StreamWriter writer;
     std::pair<uint16_t, std::vector<Content>> rest;
@@ -357,10 +354,11 @@ TEST(Receiver, KeepsWhatApplies) {
          {{0x12, MakeEit(0x4E, 1, 1,
                          At(1, 18,
                             english + MakeShortEvent("por", "", "") + MakeShortEvent("por", "Sim", "") +
-                                Descriptor(0x55, ratings)) +
+                                Descriptor(0x55, ratings) +
+                                Descriptor(0xC4, Bytes{0xF2, 1, 0x10, 0x11, 0xFF, 0x40} + Raw("spa"))) +
                              At(2, 19, german + english))},
           {0x12, MakeEit(0x58, 1, 1, At(1, 18, extended("eng", "wrong") + extended("por", "X")))}},
-         {R"("language": "por", "name": "Sim", "text": "", "extended_text": "X", )",
+         {R"("language": "por", "name": "Sim", "text": "", "extended_text": "X", "audio_languages": ["spa"])",
           R"([{"country": "ARG", "rating": "from 12"}, {"country": "BRA", "rating": "from 16, drugs, violence, sex"}])",
           R"("language": "deu", "name": "Ja")"},
          {"wrong"}},
@@ -414,8 +412,7 @@ TEST(Receiver, KeepsWhatApplies) {
     }
 }
 
-// Events of every service there is, with texts as long as they can be: what is kept has an end, and
-// other streams' events take no room from this one's.
+// A table of events has its bounds, in their number and in the length of their texts.
 TEST(Receiver, BoundsEvents) {
     EventTable few, long_ones;
     Event event;
@@ -490,7 +487,11 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
     WriteAll(Path("empty"), "");
     WriteAll(Path("text"), std::string(9999, 'x'));
     WriteAll(Path("cut.ts"), SampleText().substr(0, 100000));
-    WriteAll(Path("-dash"), SampleText());
+    std::string long_stream;  // more than may wait between two threads
+    for (int i = 0; i < 12; ++i) {
+        long_stream += SampleText();
+    }
+    WriteAll(Path("-dash"), long_stream);
     const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, Fill(4, 0)) + Fill(9000, 0x11);
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
     const struct {
@@ -503,7 +504,6 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
         {{Path("text"), Path("text")}, 2, "", "more than one file: "},
         {{Path("text"), "--capture"}, 2, "", "--capture needs a value"},
         {{"--region", "64", Path("text")}, 2, "", "no region '64'"},
-        {{"--region", "1x", Path("text")}, 2, "", "no region '1x'"},
         {{"--help"}, 0, "usage: ", ""},
         {{"--version"}, 0, "receiver 1.", ""},
         {{Path("missing")}, 1, "", "cannot be opened: No such file or directory"},
@@ -513,7 +513,7 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
         {{Path("text")}, 1, "", "no transport stream packets in 9999 bytes"},
         {{Path("accident")}, 1, "", "hardly a transport stream: 5 packets in 18960 bytes"},
         {{Path("cut.ts"), "--json"}, 0, "{\n  \"packets\": 531,\n", ""},
-        {{"--", Path("-dash")}, 0, "1600 packets of 188 bytes", ""},
+        {{"--", Path("-dash")}, 0, "19200 packets of 188 bytes", ""},
     };
     for (const auto &c : cases) {
         const Result result = RunProgram(c.arguments);
@@ -529,7 +529,7 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
     std::fclose(full);
 }
 
-// The first end of a terminal gives an error when the second one is closed, behind what was written.
+// The first end of a terminal gives the bytes of the second one, and an error after that is closed.
 TEST_F(ReceiverFiles, TellsOfAReadError) {
     int input = -1, terminal = -1;
     termios raw{};
@@ -546,7 +546,7 @@ TEST_F(ReceiverFiles, TellsOfAReadError) {
     EXPECT_EQ(result.err, "receiver: -: read failed: Input/output error\n");
 }
 
-// A pipe whose other end says nothing.
+// The other end of the pipe says nothing.
 TEST_F(ReceiverFiles, StopsWhileItWaits) {
     ASSERT_EQ(mkfifo(Path("pipe").c_str(), 0600), 0);
     const int other_end = open(Path("pipe").c_str(), O_RDWR);
@@ -643,22 +643,17 @@ TEST_F(ReceiverFiles, Captures) {
     EXPECT_THAT(full.out, HasSubstr("1600 packets")) << "the reading goes on";
 }
 
-// The threads of the program come to what one thread makes of the same bytes.
+// The threads of the program come to the same result as one thread.
 TEST_F(ReceiverFiles, SurvivesDamage) {
     std::mt19937 random(20240615);
     for (int round = 0; round < 15; ++round) {
-        Bytes stream = Raw(SampleText());
+        std::string stream = SampleText();
         for (size_t damage = random() % 200; damage > 0; --damage) {
-            const auto place = stream.begin() + static_cast<std::ptrdiff_t>(random() % (stream.size() - 2000));
-            if (random() % 10 == 0) {
-                stream.erase(place, place + static_cast<std::ptrdiff_t>(random() % 1000));
-            } else {
-                *place = Low(random());
-            }
+            const size_t length = random() % 10 == 0 ? random() % 1000 : 1;
+            stream.replace(random() % (stream.size() - 2000), length, 1, static_cast<char>(random()));
         }
-        WriteAll(Path("damaged.ts"), std::string(stream.begin(), stream.end()));
-        const Result result = RunProgram({"--json", Path("damaged.ts")});
-        ASSERT_EQ(result.out, ToJson(ReadStream(stream, 1 + random() % 9000))) << result.err;
+        WriteAll(Path("damaged.ts"), stream);
+        ASSERT_EQ(RunProgram({"--json", Path("damaged.ts")}).out, ToJson(ReadStream(Raw(stream), 1 + random() % 9000)));
     }
 }
 

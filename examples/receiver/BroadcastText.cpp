@@ -1,4 +1,5 @@
-// The conversions are the library's; here is what comes before them: the character table selector.
+// The library converts the characters. This file handles the character table selector in front,
+// line breaks, and characters that the conversions cannot hold.
 #include "BroadcastText.h"
 
 #include <algorithm>
@@ -121,7 +122,7 @@ std::string FromUnicode(const std::string &text) {
 size_t MeasureCharacter(const unsigned char *text, size_t size, bool &valid) {
     const unsigned char lead = text[0];
     const size_t length = lead < 0x80 ? 1 : lead < 0xC2 ? 0 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
-    // The second byte decides on overlong forms, surrogates and what lies beyond Unicode.
+    // The second byte tells overlong forms, surrogates and code points beyond Unicode.
     const unsigned char least = lead == 0xE0 ? 0xA0 : lead == 0xF0 ? 0x90 : 0x80;
     const unsigned char most = lead == 0xED ? 0x9F : lead == 0xF4 ? 0x8F : 0xBF;
     size_t count = 1;

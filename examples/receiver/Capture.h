@@ -17,7 +17,7 @@ class Capture {
     Capture &operator=(const Capture &) = delete;
     ~Capture();
 
-    // Opens the file, and creates it if need be. What is in it stays until there is something to
+    // Opens the file, and creates it if need be. Its old content stays until there is something to
     // write.
     //   returns  false when it cannot be written
     bool Open(const std::string &path);

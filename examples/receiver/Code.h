@@ -22,7 +22,7 @@ class Code {
     static constexpr Code Of(const char *text) {
         uint32_t bytes = 0;
         int length = 0;
-        for (; text[length] != '\0' && length < 4; ++length) {
+        for (; length < 4 && text[length] != '\0'; ++length) {
             bytes = bytes << 8 | static_cast<unsigned char>(text[length]);
         }
         return length == 3 ? Code(bytes) : Code();

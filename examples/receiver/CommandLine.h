@@ -1,4 +1,4 @@
-// What the user asks for.
+// The user's wishes.
 #ifndef RECEIVER_COMMANDLINE_H
 #define RECEIVER_COMMANDLINE_H
 

@@ -98,7 +98,7 @@ void Demultiplexer::Push(const unsigned char *packet) {
     counters_.incomplete += static_cast<unsigned>(given_up);
 }
 
-// By hand and not field by field, since every packet of the stream comes through here.
+// Reads by hand and not field by field, since every packet of the stream comes through here.
 Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
     constexpr size_t kHeaderSize = 4;
     Header header{};
@@ -122,7 +122,7 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
     return header;
 }
 
-// Where a packet stands behind the latest one of its PID. Only a payload moves the counter on; a
+// Tells how a packet follows the latest one of its PID. Only a payload moves the counter on; a
 // packet with one may be sent twice, and a counter may jump where the packet announces it.
 Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header, PidState &state) {
     const int last = std::exchange(state.last, header.counter);

@@ -43,7 +43,7 @@ class Demultiplexer {
     // Takes the 188 bytes of the stream's next packet.
     void Push(const unsigned char *packet);
 
-    // Whether this PID carries tables at this point of the stream.
+    // Tells whether this PID carries tables at this point of the stream.
     bool CarriesTables(uint16_t pid) const { return pids_[pid].table_uses != 0; }
 
     DemultiplexerCounters Counters() const;

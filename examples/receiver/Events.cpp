@@ -1,4 +1,4 @@
-// What an event holds beside itself is counted, so that long texts cannot fill the memory either.
+// The table counts the bytes of texts and lists too, so that long ones cannot fill the memory.
 #include "Events.h"
 
 #include <utility>
@@ -34,7 +34,7 @@ void EventTable::Keep(const EventKey &key, Event event) {
         return;
     }
     Event &kept = found->second;
-    // What the new account brings must fit beside the old one: parts of that may stay.
+    // Both accounts must fit, because parts of the old one may stay.
     if (bytes_ + BytesOf(event) > kMostBytes) {
         ++left_out_;
         return;

@@ -44,13 +44,13 @@ class EventTable {
   public:
     // Far more than a week of every service takes; keeps memory bounded on hostile streams.
     static constexpr size_t kMostEvents = 65536;
-    static constexpr size_t kMostBytes = 16 << 20;  // of what the events hold beside themselves
+    static constexpr size_t kMostBytes = 16 << 20;  // of the events' texts and lists
 
-    // Keeps the latest account of an event. Its sections come from tables of different depth, so
-    // what one leaves out stays as it was.
+    // Keeps the latest account of an event. Tables tell of it in different depth, so the earlier
+    // account stays where the new one is empty.
     void Keep(const EventKey &key, Event event);
 
-    // How often there was no room for an event, or for what is new of it.
+    // Counts how often there was no room for an event, or for a new account of one.
     uint64_t LeftOut() const { return left_out_; }
 
     bool Has(const EventKey &key) const { return events_.count(key) != 0; }

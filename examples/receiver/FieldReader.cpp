@@ -1,4 +1,4 @@
-// Each read first claims its bits from what the reader may use, then takes them from the stream.
+// Each read first claims its bits from the reader's share, then takes them from the stream.
 #include "FieldReader.h"
 
 namespace receiver {

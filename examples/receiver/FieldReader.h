@@ -26,7 +26,7 @@ class FieldReader {
     std::string Bytes(int count);
 
     // A reader for the next `count` bytes, which this one steps over. When fewer are left, it gets
-    // those, and this one is no longer Ok(): loops stop, and what was whole before stays in use.
+    // those, and this one is no longer Ok(): loops stop, and whole entries before stay in use.
     FieldReader Enter(int count);
 
     bool Ok() const { return success_ != 0; }

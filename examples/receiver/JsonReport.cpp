@@ -1,4 +1,4 @@
-// One JSON member for each thing that was read; what lies deeper is an object of its own.
+// Each function writes one part of the report: some members of the outermost object, or one array.
 #include "JsonReport.h"
 
 #include "JsonWriter.h"

@@ -1,5 +1,5 @@
 // Writes JSON text (RFC 8259) to a file: each member of the outermost object on a line, and each
-// element of an array there; what lies deeper stays on its line.
+// element of an array there; deeper levels stay on its line.
 #ifndef RECEIVER_JSONWRITER_H
 #define RECEIVER_JSONWRITER_H
 

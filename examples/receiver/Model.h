@@ -1,5 +1,5 @@
-// What the tables of a stream say: the parser fills it, the report shows it. Only what
-// applies now and to this stream is kept, except for events, where other streams' fill in. Times
+// The content of a stream's tables: the parser fills it, the report shows it. It holds only the
+// tables that apply now and to this stream, and other streams' events apart from its own. Times
 // are as the stream carries them.
 #ifndef RECEIVER_MODEL_H
 #define RECEIVER_MODEL_H
@@ -28,7 +28,7 @@ struct Component {  // a PMT entry
     uint16_t pid;
     uint16_t data_component_id;  // where the descriptor is the one of a data component
     uint8_t stream_type;
-    uint8_t descriptor;  // tag of the one that tells what the data is, 0 for none
+    uint8_t descriptor;  // tag of the one that tells the kind of data, 0 for none
     Code languages[2];   // of audio
 };
 
@@ -88,7 +88,7 @@ class Sections {
 };
 
 struct Model {
-    // Of all PMTs together, far more than any stream has.
+    // The limit for all PMTs together is far above any stream's need.
     static constexpr size_t kMostComponents = 65536;
 
     std::optional<uint16_t> transport_stream_id;

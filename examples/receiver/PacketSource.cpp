@@ -138,7 +138,7 @@ bool PacketSource::StartsPackets(size_t at, size_t distance) const {
     return expected || found >= kSyncsToResume;
 }
 
-// Whether the header, as far as it is at hand, has no transport error and a valid
+// Tells whether the header, as far as it is at hand, has no transport error and a valid
 // adaptation_field_control.
 bool PacketSource::MayBeHeader(size_t at) const {
     return at + 3 >= pending_.size() ||

@@ -28,7 +28,7 @@ class PacketSource {
     explicit PacketSource(Handler handler) : handler_(std::move(handler)) {}
 
     void Feed(const unsigned char *bytes, size_t count);
-    // No more bytes will come: judges what was held back.
+    // Judges the bytes that were held back, because no more will come.
     void Finish();
 
     const PacketCounters &Counters() const { return counters_; }

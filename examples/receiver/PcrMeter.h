@@ -7,8 +7,8 @@
 
 namespace receiver {
 
-// What went by between the clock references of one PID. Stretches over which the clock was set anew
-// do not count.
+// The time and the packets between the clock references of one PID. Stretches over which the clock
+// was set anew do not count.
 struct PcrSpan {
     uint64_t ticks = 0;    // of 27 MHz
     uint64_t packets = 0;  // of the whole stream

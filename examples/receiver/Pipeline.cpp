@@ -1,4 +1,4 @@
-// Three threads in a chain, and one that collects what they found:
+// Three threads form a chain, and a fourth one collects their results:
 //
 //   reader ==packets==> demultiplexer --sections--> parser
 //      \ counters           \ counters                 \ model, end
@@ -6,8 +6,8 @@
 //
 // Packets go through a ring, and a message says how many bytes came into it; everything else goes
 // with its message. First the threads, then their messages, last the life of all in RunPipeline. An
-// end message goes down the chain behind the data, so whoever sees it has seen everything, and each
-// thread's result is with control before the end gets there.
+// end message goes down the chain behind the data, so a thread that sees it has seen everything,
+// and each thread's result is with control before the end gets there.
 #include "Pipeline.h"
 
 #include <algorithm>
@@ -32,7 +32,7 @@ namespace receiver {
 namespace {
 
 constexpr size_t kBlockSize = 65536;
-// What goes from thread to thread in one message: enough that waking the other side costs little.
+// The size of one message's data: large enough that waking the other thread costs little.
 constexpr size_t kBatchSize = 1024 * kPacketSize;
 constexpr uint32_t kBatchesWaiting = 8;
 constexpr uint32_t kTickTime = 250;  // milliseconds
@@ -40,16 +40,16 @@ constexpr uint32_t kTickTime = 250;  // milliseconds
 // In the order of their creation: whom a thread sends to is there before it.
 enum ThreadIndex { kControl, kParser, kDemultiplexer, kReader, kThreadCount };
 
-// What the threads share. Handles are -1 until there is something; a thread uses only those that
+// The threads share this. A handle is -1 until its object exists; a thread uses only those that
 // were there before it.
 struct Pipeline {
     StreamFile &file;  // the reader's as long as that runs
     uint64_t size;     // of the file in bytes, 0 when it is not known
     const PipelineOptions &options;
 
-    // As much as the batches that may wait. It neither waits nor takes half, so semaphores see to
-    // it that there is room. Made before the mutex: when the registry has no place left for the
-    // ring's own, there is none for ours either, and the pipeline does not start.
+    // It holds as much as the batches that may wait. It neither waits nor takes half, so semaphores
+    // see to it that there is room. Made before the mutex: when the registry has no place left for
+    // the ring's own, there is none for ours either, and the pipeline does not start.
     VarnekCRingBuffer ring{static_cast<int>(kBatchSize * kBatchesWaiting)};
 
     int32_t packet_room = -1;   // semaphore: batches that may still be sent to the demultiplexer
@@ -65,10 +65,10 @@ struct Pipeline {
 
 // Messages ---------------------------------------------------------------------------------------
 
-// A message hands its object over: who takes it out of the queue deletes it. None but messages
-// without an object may be left in a queue when its thread goes.
+// A message hands its object over: the thread that takes it out of the queue deletes it. None but
+// messages without an object may be left in a queue when its thread goes.
 enum class Kind : uint32_t {
-    kPackets,  // no object; its length is what came into the ring
+    kPackets,  // no object; its length is the number of bytes that came into the ring
     kSections,
     kPacketCounters,
     kSectionCounters,
@@ -251,7 +251,8 @@ void RunControl(Pipeline &pipeline) {
 }
 
 // The thread's last act, when nothing of its body is left. It signals with the mutex held, so that
-// who has seen every signal and then gets the mutex knows that nobody is within the semaphore.
+// a thread that has seen every signal and then gets the mutex knows that nobody is within the
+// semaphore.
 template <void (*Body)(Pipeline &)>
 void *RunThread(void *argument) {
     Pipeline &pipeline = *static_cast<Pipeline *>(argument);

@@ -21,8 +21,8 @@ struct PipelineOptions {
 
 // Reads an open file to its end, in bounded memory. The threads and everything made for them are
 // gone when it returns, also on failure. Their names are fixed: one call at a time in a process.
-//   report    what was read; the settings are left as they are
-//   returns   empty; else what could not be created, and nothing was read
+//   report    out: the result; its settings are left as they are
+//   returns   empty; else the name of an object that could not be created, and nothing was read
 std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report &report);
 
 }  // namespace receiver

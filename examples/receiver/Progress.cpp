@@ -1,4 +1,4 @@
-// A shorter text gets blanks over what stood there, so that any terminal can show it.
+// A shorter text gets blanks over the rest of the longer one, so that any terminal can show it.
 #include "Progress.h"
 
 #include <algorithm>

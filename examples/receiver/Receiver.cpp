@@ -1,4 +1,4 @@
-// The command line, then the pipeline over the file, then the report on what it found.
+// Takes the command line, runs the pipeline over the file, and shows its report.
 #include "Receiver.h"
 
 #include <fcntl.h>
@@ -33,7 +33,8 @@ std::string SystemText(int error) {
     return std::generic_category().message(error);
 }
 
-// Why what could be opened is not shown; empty when it is.
+// Tells why a stream that could be opened cannot be shown.
+//   returns  empty when it can
 std::string FindFault(const Report &report, int read_error) {
     const PacketCounters &packets = report.packets;
     const std::string bytes = std::to_string(packets.bytes) + " bytes";

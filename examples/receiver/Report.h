@@ -30,10 +30,10 @@ struct Report {
     Model model;
 };
 
-// Whether there is so little of a stream in what was read that it is something else.
+// Tells whether the bytes hold so little of a stream that they are something else.
 bool IsHardlyStream(const Report &report);
 
-// Duration in milliseconds and bit rate in bits per second, by the clock references.
+// The clock references give the duration in milliseconds and the bit rate in bits per second.
 std::optional<int64_t> DurationOf(const Report &report);
 std::optional<int64_t> BitRateOf(const Report &report);
 
@@ -44,14 +44,14 @@ struct Service {
     bool one_seg = false;
 };
 
-// Services that the PAT or the SDT names, by service_id. They point into the model. A PMT counts
-// only when it came where the PAT says.
+// Joins the services that the PAT or the SDT names, by service_id. They point into the model. A PMT
+// counts only when it came where the PAT says.
 std::map<uint16_t, Service> JoinServices(const Model &model);
 
-// What the NIT says of this stream; null without.
+// Finds the NIT's entry on this stream; null without one.
 const NetworkStream *FindOwnStream(const Model &model);
 
-// Whether a warning to the population is on, by the NIT or the PMT of a service.
+// Tells whether the NIT or the PMT of a service signals a warning to the population.
 bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services);
 
 struct ListedEvent {
@@ -60,11 +60,11 @@ struct ListedEvent {
     bool other_stream;
 };
 
-// All events by start, those whose start is not known last. Another stream's account of an event
-// that this stream tells of is left out.
+// Lists all events by start, those whose start is not known last. Another stream's account of an
+// event that this stream tells of is left out.
 std::vector<ListedEvent> ListEvents(const Model &model);
 
-// What the stream's times mean. In Brazil they are the official time of Brasilia, and local offsets
+// Converts the stream's times. In Brazil they are the official time of Brasilia, and local offsets
 // are relative to that; elsewhere they are UTC.
 class StreamClock {
   public:
@@ -78,12 +78,12 @@ class StreamClock {
     // else, where the user names no region, the first. Null for none.
     const LocalOffset *Offset() const { return offset_; }
 
-    // Of a time as the stream carries it; nothing when it cannot be told. The local time takes the
-    // offset that applies then.
+    // These convert a time as the stream carries it; nothing comes out when it is not known. The
+    // local time takes the offset that applies then.
     std::optional<DateTime> Utc(const std::optional<DateTime> &time) const;
     std::optional<DateTime> Local(const std::optional<DateTime> &time) const;
 
-    // "-03:00" from UTC, of minutes as the stream carries them.
+    // Shows the offset from UTC as "-03:00"; `minutes` are as the stream carries them.
     std::string OffsetText(int minutes) const;
 
   private:

@@ -30,7 +30,8 @@ class SectionAssembler {
                               const Handler &handler, int &given_up);
     const unsigned char *Fill(const unsigned char *from, const unsigned char *end, size_t size);
 
-    std::vector<unsigned char> section_;  // what has come of the section in progress; empty: none
+    std::vector<unsigned char>
+        section_;  // the section in progress, as far as it has come; empty: none
 };
 
 }  // namespace receiver

@@ -31,7 +31,7 @@ class StreamFile {
     //   returns  the size in bytes; 0 when it is not known
     uint64_t Size() const;
 
-    // Whether this path names the same file.
+    // Tells whether this path names the same file.
     bool IsSameAs(const std::string &path) const;
 
   private:

@@ -34,7 +34,7 @@ std::string NameOf(const Services &services, uint16_t service_id) {
     return info != nullptr ? info->name.Text() : "";
 }
 
-// Text with a comma in front, where there is text.
+// Puts a comma in front of a text that is not empty.
 std::string Further(const std::string &text) {
     return text.empty() ? "" : ", " + text;
 }
@@ -131,7 +131,7 @@ void AddServices(const Services &services, Paragraphs &out) {
     }
 }
 
-// Whether an event is over at this time; false when that cannot be told.
+// Tells whether an event is over at this time; false when that is not known.
 bool IsOver(const Event &event, const std::optional<DateTime> &now) {
     if (!now || !event.start || !event.duration) {
         return false;
@@ -140,7 +140,7 @@ bool IsOver(const Event &event, const std::optional<DateTime> &now) {
     return end && !(*now < *end);
 }
 
-// Genre and the nation's own rating, in brackets.
+// Puts genre and the nation's own rating in brackets.
 std::string DescribeContent(const Event &event, const Code &nation) {
     std::vector<std::string> items;
     for (const uint8_t genre : event.genres) {
@@ -157,7 +157,7 @@ std::string DescribeContent(const Event &event, const Code &nation) {
     return items.empty() ? "" : " (" + Joined(items) + ")";
 }
 
-// This stream's events: what is on, what comes, and last what is over.
+// Lists this stream's events: present ones and coming ones first, past ones last.
 void AddEvents(const Report &report, const Services &services, const StreamClock &clock,
                Paragraphs &out) {
     const Model &model = report.model;
@@ -236,7 +236,7 @@ void AddTables(const DemultiplexerCounters &sections, Paragraphs &out) {
     }
 }
 
-// What the services say of their PIDs.
+// Names the PIDs that the services use.
 std::map<uint16_t, std::string> NamePids(const Services &services) {
     std::map<uint16_t, std::string> names;
     for (const auto &[id, service] : services) {

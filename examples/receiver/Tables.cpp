@@ -30,11 +30,11 @@ constexpr uint8_t kDescriptorPartialReception = 0xFB;
 constexpr uint8_t kDescriptorEmergency = 0xFC;
 constexpr uint8_t kDescriptorDataComponent = 0xFD;
 
-// Tell what a component is beside its stream_type: teletext, subtitles, sound codings, application
-// signalling, data component.
+// These tell the kind of a component beside its stream_type: teletext, subtitles, sound codings,
+// application signalling, data component.
 constexpr uint8_t kDescriptorsOfContent[] = {0x56, 0x59, 0x6A, 0x6F,
                                              0x7A, 0x7B, 0x7C, kDescriptorDataComponent};
-// Delivery by satellite, by cable and on the ground, as only DVB has it.
+// Only DVB has these: delivery by satellite, by cable and on the ground.
 constexpr uint8_t kDescriptorsOfDvb[] = {0x43, 0x44, 0x5A};
 
 template <size_t Count>
@@ -103,7 +103,7 @@ void ReadLocalOffsets(FieldReader &body, std::vector<LocalOffset> &offsets) {
     }
 }
 
-// Whether a warning is on in any of the areas that the descriptor lists.
+// Tells whether a warning is on in any of the areas that the descriptor lists.
 bool ReadsAsEmergency(FieldReader &body) {
     while (body.BytesLeft() >= 4) {
         body.Skip(16);

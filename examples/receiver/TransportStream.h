@@ -1,4 +1,4 @@
-// What packets look like, and the PIDs and table_ids that the receiver tells apart.
+// The basics of packets, and the PIDs and table_ids that the receiver tells apart.
 #ifndef RECEIVER_TRANSPORTSTREAM_H
 #define RECEIVER_TRANSPORTSTREAM_H
 
@@ -31,7 +31,7 @@ constexpr uint16_t kPidSdttOneSeg = 0x0028;  // software downloads within one se
 constexpr uint16_t kPidCdt = 0x0029;         // common data, such as logos
 constexpr uint16_t kPidNull = 0x1FFF;
 
-// Sections are assembled on these wherever they come; what nobody understands is only counted.
+// Sections are assembled on these wherever they come; unknown tables are only counted.
 constexpr uint16_t kTablePids[] = {
     kPidPat, kPidCat,  kPidNit,       kPidSdt,       kPidEit,        kPidTime, kPidSdtt,
     kPidBit, kPidNbit, kPidEitMobile, kPidEitOneSeg, kPidSdttOneSeg, kPidCdt,

@@ -11,13 +11,13 @@ namespace {
 std::atomic<bool> gStop{false};
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler sets it");
 
-// The first Ctrl-C ends the reading; what was read so far is shown. The second one ends the
+// The first Ctrl-C ends the reading, and the result so far is shown. The second one ends the
 // program.
 void OnInterrupt(int /*signal*/) {
     gStop = true;
 }
 
-// Without SA_RESTART, so that a wait for the other end of a pipe ends too.
+// Leaves SA_RESTART out, so that a wait for the other end of a pipe ends too.
 void CatchInterrupt() {
     struct sigaction action = {};
     action.sa_handler = OnInterrupt;
@@ -25,8 +25,8 @@ void CatchInterrupt() {
     sigaction(SIGINT, &action, nullptr);
 }
 
-// A standard descriptor that is closed would be given to the next file that is opened. It is taken
-// by one instead that can do nothing of what is asked of it, so that reads and writes fail.
+// The system would give the number of a closed standard descriptor to the next file that is opened.
+// A descriptor that can only do the opposite takes it instead, so that reads and writes fail.
 void TakeStandardDescriptors() {
     for (int descriptor = STDIN_FILENO; descriptor <= STDERR_FILENO; ++descriptor) {
         if (fcntl(descriptor, F_GETFD) < 0) {

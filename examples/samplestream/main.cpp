@@ -1,5 +1,6 @@
 // Makes a sample transport stream: an ISDB-Tb multiplex of 20 seconds with a full-segment and a
-// one-seg service, thinned out to what a receiver of tables needs. The same bytes on every run.
+// one-seg service, thinned out to the needs of a receiver of tables. Every run makes the same
+// bytes.
 //   samplestream FILE
 // Texts are in ISO/IEC 8859-15. One service description section is damaged on purpose.
 #include <cstdint>
@@ -124,7 +125,7 @@ Bytes OwnSdt(unsigned number, uint16_t service, const std::string &name) {
                    {number, 1, 0xC5});
 }
 
-// Who made a programme, in two descriptors of which the second one goes on where the first one
+// Names the makers of a programme in two descriptors; the second one goes on where the first one
 // ends.
 Bytes Credits() {
     const Bytes first = Counted("Dire\xE7\xE3o") + Counted("B\xE1rbara Le\xE3o");
@@ -206,7 +207,7 @@ class Multiplex {
   public:
     // Queues sections that follow one another without a gap, in as few packets as they take.
     void Queue(uint16_t pid, const std::vector<Bytes> &sections);
-    // Sends queued packets among filler until `packets` more are written. What is queued takes
+    // Sends queued packets among filler until `packets` more are written. Queued ones take
     // every third packet at most.
     void Run(int packets);
     const Bytes &Stream() const { return writer_.Stream(); }

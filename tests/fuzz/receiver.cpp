@@ -1,7 +1,7 @@
 // The example receiver from bytes to JSON: one stream, fed whole and in pieces, gives one report,
-// its counters add up, and its text is what JSON may hold. An input whose first byte is even is a
-// stream as it stands; any other is a list of sections {PID, length, bytes}, which get their lengths
-// and CRCs and are put into packets, so that a run gets behind those.
+// its counters add up, its text is fit for JSON, and no line of the summary is too wide. An input whose first byte is
+// even is a stream as it stands; any other is a list of sections {PID, length, bytes}, which get their lengths and CRCs
+// and are put into packets, so that a run gets behind those.
 #include <numeric>
 
 #include "Fuzz.h"

@@ -43,7 +43,7 @@ inline Report ReadStream(const Bytes &stream, size_t block = 4096) {
     return report;
 }
 
-// What a function writes to the file that it is handed.
+// Collects the text that a function writes to the file that it is handed.
 template <typename Writer>
 std::string Written(Writer writer) {
     char *text = nullptr;
