@@ -7,8 +7,10 @@ if(NOT CMAKE_CXX_COMPILER)
     set(CMAKE_C_COMPILER arm-linux-gnueabihf-gcc)
     set(CMAKE_CXX_COMPILER arm-linux-gnueabihf-g++)
 endif()
-# No word on every container of the C++ library whose passing an old g++ got wrong.
-set(CMAKE_CXX_FLAGS_INIT -Wno-psabi)
+# Times have 32 bits, as on the device: Debian 13 would give them 64. And no word on every container of the C++
+# library whose passing an old g++ got wrong.
+set(CMAKE_C_FLAGS_INIT "-U_TIME_BITS -U_FILE_OFFSET_BITS")
+set(CMAKE_CXX_FLAGS_INIT "-Wno-psabi -U_TIME_BITS -U_FILE_OFFSET_BITS")
 set(CMAKE_CROSSCOMPILING_EMULATOR qemu-arm -L /usr/arm-linux-gnueabihf)
 
 set(CMAKE_FIND_ROOT_PATH /usr/arm-linux-gnueabihf)

@@ -20,7 +20,7 @@ configure_file(cmake/varnekutils_ltn.pc.in varnekutils_ltn.pc @ONLY)
 install(FILES ${CMAKE_CURRENT_BINARY_DIR}/varnekutils_ltn.pc
         DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT dev)
 
-install(FILES defaults/debug_ltn.ini defaults/Varnek_Config.cfg DESTINATION ${VARNEK_SHARE} COMPONENT dev)
+install(FILES defaults/debug_ltn.ini defaults/Varnek_Config.cfg CommonUtility/gdb.py DESTINATION ${VARNEK_SHARE} COMPONENT dev)
 install(FILES LICENSE DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT license)
 # In the order of the source tree, so that the documents' links to each other hold.
 install(FILES README.md CHANGELOG.md SECURITY.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)

@@ -389,7 +389,6 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
     const int32_t sink = VarnekPGL_CreateThread("sink", 1, 0, Nothing, nullptr);
     const int32_t semaphore = VarnekPGL_CreateSemaphore("semaphore", 0);
     const VarnekConfigInfo initial = *VarnekCfg_GetConfigInfo();
-    const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg";
     char bytes[8] = {};
     unsigned char raw[8] = {};
     const auto content = [&] { WriteAll(file, "12345678"); };

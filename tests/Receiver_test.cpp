@@ -573,6 +573,8 @@ std::vector<int32_t> CreateAll(const std::function<int32_t(const char *)> &creat
     return handles;
 }
 
+void *ReturnAtOnce(void *) { return nullptr; }
+
 // With the registry of one family full but for 0, 1, 2 ... places: no more places are needed than
 // there are objects, and each run leaves as many as it found.
 TEST_F(ReceiverFiles, LeavesNothingBehind) {
@@ -582,11 +584,7 @@ TEST_F(ReceiverFiles, LeavesNothingBehind) {
         BOOL (*remove)(int32_t);
         size_t needed;
     } families[] = {
-        {"thread",
-         [](const char *name) {
-             return VarnekPGL_CreateThread(
-                 name, 1, 65536, [](void *) -> void * { return nullptr; }, nullptr);
-         },
+        {"thread", [](const char *name) { return VarnekPGL_CreateThread(name, 1, 65536, ReturnAtOnce, nullptr); },
          VarnekPGL_DeleteThread, 4},
         {"semaphore", [](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); }, VarnekPGL_DeleteSemaphore,
          3},

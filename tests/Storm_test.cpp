@@ -137,9 +137,11 @@ TEST_F(StormAlone, SavesThatAreKilled) {
     const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(1500);
     while (std::chrono::steady_clock::now() < end && !HasFatalFailure()) {
         const pid_t child = fork();  // of this process's only thread
-        while (child == 0) {
-            save('a');
-            save('b');
+        if (child == 0) {
+            while (true) {
+                save('a');
+                save('b');
+            }
         }
         for (auto i = random() % 20; i > 0; i--) {
             check();

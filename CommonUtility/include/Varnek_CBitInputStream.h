@@ -4,6 +4,11 @@
 
 #include "Varnek_Common.h"
 
+// Results of GetByteArray, beside 0.
+#define VARNEK_BITS_NOT_ALIGNED (-1)  // inside a byte
+#define VARNEK_BITS_TOO_FEW (-10)     // fewer bytes remain
+#define VARNEK_BITS_END (-22)         // at the end of the stream
+
 #ifdef __cplusplus
 
 // A read position in a byte array that is either borrowed from the caller, who keeps it alive and
@@ -43,9 +48,9 @@ class VARNEK_API VarnekCBitInputStream {
     unsigned short ReadShort(int count, unsigned char &success);
     unsigned int ReadInt(int count, unsigned char &success);
 
-    // Copies `count` bytes from a byte boundary. Returns 0; -22 at the end of the stream, -1 when
-    // not on a boundary, -10 when fewer bytes remain, for a negative count and for a null
-    // destination: nothing moves then.
+    // Copies `count` bytes from a byte boundary. Returns 0; VARNEK_BITS_END at the end of the
+    // stream, VARNEK_BITS_NOT_ALIGNED inside a byte, VARNEK_BITS_TOO_FEW when fewer bytes remain,
+    // for a negative count and for a null destination: nothing moves then.
     int GetByteArray(unsigned char *dest, int count);
     // Discards `count` bits, and stops at the end of the stream; each byte's worth beyond it is one
     // trace.

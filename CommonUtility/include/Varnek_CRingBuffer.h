@@ -4,6 +4,13 @@
 
 #include "Varnek_Common.h"
 
+// Results of a ring's operations, beside 0.
+#define VARNEK_RING_INVALID (-8)     // a length, size, origin or pointer that can never work
+#define VARNEK_RING_NO_SPACE (-10)   // too little room, or a seek too far
+#define VARNEK_RING_NO_DATA (-11)    // too few bytes to read
+#define VARNEK_RING_OVERFLOW (-32)   // in disorder: the writer is too far ahead
+#define VARNEK_RING_UNDERFLOW (-34)  // in disorder: the writer is behind the reader
+
 #ifdef __cplusplus
 
 // Writes and reads take all of their bytes or none, and never wait. Besides its position, each side
@@ -34,8 +41,8 @@ class VARNEK_API VarnekCRingBuffer {
     // Frees the storage and deletes the mutex. No other thread may be inside the ring.
     ~VarnekCRingBuffer();
 
-    // Empties the ring, and gives it a new storage when the size is another one. Returns 0; -8 for
-    // a size below 1, which changes nothing, and when there is no memory.
+    // Empties the ring, and gives it a new storage when the size is another one. Returns 0;
+    // VARNEK_RING_INVALID for a size below 1, which changes nothing, and when there is no memory.
     int Reset(int size);
     // Empties the ring. Returns 0.
     int Flush();
@@ -43,21 +50,24 @@ class VARNEK_API VarnekCRingBuffer {
     // Moves the reader to an index (origin 0), on by `aOffset` bytes (1), or to the last `aOffset`
     // bytes written (2), whatever the storage holds there; with origin 2, an offset of the whole
     // size leaves nothing to read. An index equal to the size is the storage's end: read, or move
-    // on by 0, before the next write. Returns 0; -10 for a negative offset and for one beyond the
-    // size or, with origin 1, beyond the readable bytes; -8 for another origin.
+    // on by 0, before the next write. Returns 0; VARNEK_RING_NO_SPACE for a negative
+    // offset and for one beyond the size or, with origin 1, beyond the readable bytes;
+    // VARNEK_RING_INVALID for another origin.
     int Seek(int aOffset, int origin);
 
-    // The bytes that can be read and written now; -32 in an overflow and -34 in an underflow state.
+    // The bytes that can be read and written now; in disorder VARNEK_RING_OVERFLOW
+    // or VARNEK_RING_UNDERFLOW.
     int GetSpaceReading() const;
     int GetSpaceWriting() const;
     // The readable bytes in per cent of the size; in an abnormal state maybe not 0 to 100.
     int GetDistance() const;
 
-    // Copies `writelen` bytes in or `readLen` bytes out. Returns 0. A length below 0 or above the
-    // size, or a null pointer (after a panic report), is -8. Too little space is -10 and too few
-    // bytes -11; so is reading 0 bytes from an empty ring. A ring that is found in an abnormal
-    // state is emptied: -10 for an overflow, -11 for an underflow; only a write that finds W < R in
-    // one lap leaves it as it is.
+    // Copies `writelen` bytes in or `readLen` bytes out. Returns 0. VARNEK_RING_INVALID
+    // means a length below 0 or above the size, or a null pointer (after a panic report);
+    // VARNEK_RING_NO_SPACE too little room; VARNEK_RING_NO_DATA too few bytes, and reading 0 bytes
+    // from an empty ring. A ring that is found in an abnormal state is emptied, with
+    // VARNEK_RING_NO_SPACE for an overflow and VARNEK_RING_NO_DATA for an underflow; only a write
+    // that finds W < R in one lap leaves it as it is.
     int Write(const unsigned char *data, int writelen);
     int Read(unsigned char *dest, int readLen);
 

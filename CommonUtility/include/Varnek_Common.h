@@ -30,7 +30,8 @@ typedef int32_t BOOL;
 #define VARNEK_LEVEL_MID 0x20000000u
 #define VARNEK_LEVEL_LOW 0x10000000u
 
-// Module that traces; each has its tag in the log. Common is this library.
+// Module that traces; each has its tag in the log. Common is this library. There are no other ones:
+// a trace under any other bit is not written.
 #define VARNEK_MODULE_COMMON 0x001u
 #define VARNEK_MODULE_JNI 0x002u
 #define VARNEK_MODULE_MAIN_CONTROL 0x004u

@@ -26,7 +26,9 @@ static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
 }
 
 // Stores the caller's place and traces. `mask` is one VARNEK_LEVEL_ bit with one VARNEK_MODULE_
-// bit; a printf format and its arguments follow. The trace adds no line end.
+// bit; a printf format and its arguments follow. The trace adds no line end. There are twelve
+// modules, and a bit beyond theirs is never switched on: what is traced under it alone is not
+// written, and nothing says so. A new module takes the bit of the area that it belongs to.
 #define VARNEK_TRACE(mask, ...) \
     (VarnekDbg_StorePlace(__FILE__, __LINE__), VarnekPGL_TraceOut((mask), __VA_ARGS__))
 

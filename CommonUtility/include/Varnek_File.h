@@ -10,6 +10,13 @@
 
 #include "Varnek_Common.h"
 
+// Failures that have a result of their own; every other failure is -1 or what its operation says.
+#define VARNEK_FILE_DEVICE_FAILURE (-5)
+#define VARNEK_FILE_INVALID_BASE (-8)  // of a seek
+#define VARNEK_FILE_NOT_OPENED (-18)
+#define VARNEK_FILE_TOO_LARGE (-27)  // for its size limit
+#define VARNEK_FILE_MEDIUM_FULL (-28)
+
 #ifdef __cplusplus
 extern "C" {
 #endif
@@ -33,7 +40,8 @@ VARNEK_API int32_t VarnekPGL_CloseFile(PglFileHandle hFile);
 //   hFile    handle of an open stream
 //   offset   bytes from the base
 //   base     0 from the start, 1 from here, 2 from the end
-//   returns  0, also for no stream; -8 for another base; -1 when the seek fails
+//   returns  0, also for no stream; VARNEK_FILE_INVALID_BASE for another base; -1 when the seek
+//   fails
 VARNEK_API int32_t VarnekPGL_SeekFile(PglFileHandle hFile, int32_t offset, uint32_t base);
 
 // Tells the position.
@@ -58,15 +66,15 @@ VARNEK_API uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void 
 VARNEK_API int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile);
 
 // Reads the first bytes of a file.
-//   returns  the bytes read, 0 to `length`; -18 when the file cannot be opened
+//   returns  the bytes read, 0 to `length`; VARNEK_FILE_NOT_OPENED
 VARNEK_API int32_t VarnekPGL_ReadFile(const char *path, void *buffer, uint32_t length);
 
 // Replaces a file's content, creating it if need be.
-//   returns  the bytes written, 0 when closing failed; -18 when the file cannot be opened
+//   returns  the bytes written, 0 when closing failed; VARNEK_FILE_NOT_OPENED
 VARNEK_API int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uint32_t length);
 
 // Adds bytes at a file's end, creating it if need be.
-//   returns  0 when all bytes are stored; -1 when not; -18 when the file cannot be opened
+//   returns  0 when all bytes are stored; -1 when not; VARNEK_FILE_NOT_OPENED
 VARNEK_API int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t length);
 
 // Measures a file.
@@ -102,8 +110,8 @@ VARNEK_API int32_t VarnekPGL_CloseFile64Bits(int32_t hFile);
 VARNEK_API int32_t VarnekPGL_ReadFileByHandle64Bits(int32_t hFile, void *buffer, uint32_t length);
 
 // Writes with one call and does not retry.
-//   returns  `length`; -28 for a full medium, -27 for a file over its size limit, -5 for a device
-//            failure; otherwise the short count or -1. 0 for a negative descriptor
+//   returns  `length`; VARNEK_FILE_MEDIUM_FULL, VARNEK_FILE_TOO_LARGE, VARNEK_FILE_DEVICE_FAILURE;
+//            otherwise the short count or -1. 0 for a negative descriptor
 VARNEK_API int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer,
                                                      uint32_t length);
 
@@ -111,7 +119,8 @@ VARNEK_API int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *
 //   hFile    the descriptor
 //   offset   bytes from the base
 //   base     0 from the start, 1 from here, 2 from the end
-//   returns  0 whatever the seek reported; -8 for another base; -1 for a negative descriptor
+//   returns  0 whatever the seek reported; VARNEK_FILE_INVALID_BASE for another base; -1 for a
+//            negative descriptor
 VARNEK_API int32_t VarnekPGL_SeekFile64Bits(int32_t hFile, int64_t offset, uint32_t base);
 
 // Tells the position.

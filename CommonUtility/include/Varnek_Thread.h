@@ -44,8 +44,7 @@ VARNEK_API int32_t VarnekPGL_GetThreadByName(const char *szThreadName);
 
 // Tells which thread of the registry the calling thread is.
 //   returns  the calling thread's handle; -1, after an Error line, when the registry has not
-//   started
-//            it (as for main and timer callbacks) or its record has been removed
+//            started it (as for main and timer callbacks) or its record has been removed
 VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 
 // Messages ---------------------------------------------------------------------------------------
@@ -56,7 +55,7 @@ VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 // What is in it is up to the modules that communicate; the library copies it as bytes, from and to
 // any address.
 typedef struct THREAD_MSG {
-    unsigned char data[40];
+    unsigned char data[40];  // the modules' own
 } __attribute__((aligned(8))) THREAD_MSG;
 
 // Appends a message to a thread's queue.
@@ -65,7 +64,7 @@ typedef struct THREAD_MSG {
 VARNEK_API BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message);
 
 // Puts a message in front of everything that is queued now, earlier urgent messages included.
-// Results are those of VarnekPGL_SendMessage.
+//   returns  TRUE and FALSE as VarnekPGL_SendMessage does
 VARNEK_API BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message);
 
 // Takes the first message of the calling thread's queue, waiting up to `timeout` for one.

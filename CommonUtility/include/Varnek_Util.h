@@ -13,7 +13,8 @@ extern "C" {
 #endif
 
 // Computes the CRC of `length` bytes. Over data that ends in its own CRC, most significant byte
-// first, the result is 0.
+// first, the result is 0. To go on over a further piece, of 4 bytes or more, combine its first four
+// bytes with the complement of the CRC so far, most significant byte first, by exclusive-or.
 //   data     the bytes, of any alignment
 //   length   4 or more; less is reported by a panic report, and less than 1 reads nothing
 //   returns  the register; 0xFFFFFFFF when `length` is below 1, and for null after a panic report
@@ -24,13 +25,13 @@ VARNEK_API uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t leng
 //   returns  TRUE when the CRC is right; FALSE when not, and for null after a panic report
 VARNEK_API BOOL VarnekUtil_CheckSectionCRC32(const unsigned char *section);
 
-// Checks a file of at least 8 bytes whose last four are the CRC of the rest, most significant byte
-// first.
+// Checks a file of at least 8 bytes and less than 2 GiB, which is read into memory as a whole, and
+// whose last four bytes are the CRC of the rest, most significant byte first.
 //   returns  TRUE when they are equal; FALSE when not, or when the file is too small or unreadable
 VARNEK_API BOOL VarnekUtil_CheckFileCRC32(const char *path);
 
-// Appends the CRC of a file's whole content, of at least 4 bytes, to the file. Doing it twice
-// appends a CRC of content and first CRC.
+// Appends the CRC of a file's whole content to the file: at least 4 bytes and less than 2 GiB,
+// which are read into memory as a whole. Doing it twice appends a CRC of content and first CRC.
 //   returns  TRUE once the append was issued, whatever became of it; FALSE when the file is too
 //            small or unreadable, and then unchanged
 VARNEK_API BOOL VarnekUtil_AppendCRC32ToFile(const char *path);

@@ -186,14 +186,14 @@ unsigned int VarnekCBitInputStream::ReadInt(int count, unsigned char &success) {
 
 int VarnekCBitInputStream::GetByteArray(unsigned char *dest, int count) {
     if (bEndOfStream == kAtEnd) {
-        return -22;
+        return VARNEK_BITS_END;
     }
     if (iBitIdxInCurByte != 0) {
-        return -1;
+        return VARNEK_BITS_NOT_ALIGNED;
     }
     const int remaining = static_cast<int>(uiBufLen) - iCurByteIdx;
     if (remaining < count || count < 0 || (dest == nullptr && count > 0)) {
-        return -10;
+        return VARNEK_BITS_TOO_FEW;
     }
     if (count > 0) {
         memcpy(dest, pBuffer + iCurByteIdx, static_cast<size_t>(count));

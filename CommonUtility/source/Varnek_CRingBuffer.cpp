@@ -72,13 +72,6 @@ namespace {
 
 using State = VarnekRingState;
 
-constexpr int kRefused = -8;
-constexpr int kNoSpace = -10;
-constexpr int kOffsetTooLong = -10;
-constexpr int kNoData = -11;
-constexpr int kOverflowState = -32;
-constexpr int kUnderflowState = -34;
-
 // Numbers the mutex names of the process: a name that came twice would destroy another ring's
 // mutex.
 std::atomic<int32_t> gRingBufCount{0};
@@ -120,7 +113,7 @@ int VarnekRingState::Check(const VarnekCRingBuffer &ring) {
                 ring.iReadLoopCnt, ring.iWriteLoopCnt);
     TRACE_ERROR("[Abnormal State] Reading Position=[%d], Writing Position=[%d]\n", ring.iReadPos,
                 ring.iWritePos);
-    return ahead > 0 ? kOverflowState : kUnderflowState;
+    return ahead > 0 ? VARNEK_RING_OVERFLOW : VARNEK_RING_UNDERFLOW;
 }
 
 void VarnekRingState::Recover(VarnekCRingBuffer *ring, HoldMutex *hold) {
@@ -186,7 +179,7 @@ VarnekCRingBuffer::~VarnekCRingBuffer() {
 
 int VarnekCRingBuffer::Reset(int size) {
     if (size < 1) {
-        return VARNEK_FAIL(kRefused, "Invalid Ring Size! size=[%d]\n", size);
+        return VARNEK_FAIL(VARNEK_RING_INVALID, "Invalid Ring Size! size=[%d]\n", size);
     }
     TRACE_MID("Ring Buffer will be reset!!!\n");
     const HoldMutex hold(hRingMutex);
@@ -197,7 +190,7 @@ int VarnekCRingBuffer::Reset(int size) {
     free(pRingBuf);
     pRingBuf = AllocateStorage(size);
     iRingSize = pRingBuf != nullptr ? size : 0;
-    return pRingBuf != nullptr ? 0 : kRefused;
+    return pRingBuf != nullptr ? 0 : VARNEK_RING_INVALID;
 }
 
 int VarnekCRingBuffer::Flush() {
@@ -214,26 +207,26 @@ int VarnekCRingBuffer::Seek(int aOffset, int origin) {
         case SEEK_SET:
             if (!possible || aOffset > iRingSize) {
                 TRACE_HIGH("[SEEK_SET] Too long offset. aOffset=[%d]\n", aOffset);
-                return kOffsetTooLong;
+                return VARNEK_RING_NO_SPACE;
             }
             State::SetReader(this, aOffset);
             return 0;
         case SEEK_CUR:
             if (State::Check(*this) != 0 || !possible || aOffset > State::Used(*this)) {
                 TRACE_HIGH("[SEEK_CUR] Too long offset. aOffset=[%d]\n", aOffset);
-                return kOffsetTooLong;
+                return VARNEK_RING_NO_SPACE;
             }
             Advance(&iReadPos, &iReadLoopCnt, aOffset, iRingSize);
             return 0;
         case SEEK_END:
             if (!possible || aOffset > iRingSize) {
                 TRACE_HIGH("[SEEK_END] Too long offset. aOffset=[%d]\n", aOffset);
-                return kOffsetTooLong;
+                return VARNEK_RING_NO_SPACE;
             }
             State::SetReader(this, iWritePos - aOffset + (aOffset > iWritePos ? iRingSize : 0));
             return 0;
         default:
-            return VARNEK_FAIL(kRefused, "Invalid origin value=[%d]\n", origin);
+            return VARNEK_FAIL(VARNEK_RING_INVALID, "Invalid origin value=[%d]\n", origin);
     }
 }
 
@@ -264,12 +257,12 @@ int VarnekCRingBuffer::GetDistance() const {
 int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
     HoldMutex hold(hRingMutex);
     if (writelen < 0 || writelen > iRingSize || pRingBuf == nullptr) {
-        return VARNEK_FAIL(kRefused, "Too long writelen=[%d]! Ring buffer size=[%d]\n", writelen,
-                           iRingSize);
+        return VARNEK_FAIL(VARNEK_RING_INVALID, "Too long writelen=[%d]! Ring buffer size=[%d]\n",
+                           writelen, iRingSize);
     }
     if (data == nullptr && writelen > 0) {
         VARNEK_PANIC();
-        return kRefused;
+        return VARNEK_RING_INVALID;
     }
     switch (State::OrderOf(*this)) {
         case State::kInOrder:
@@ -278,22 +271,23 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
             TRACE_ERROR(
                 "[Abnormal Sate] Ring Buffer is already overflowed! This data will be discarded\n");
             State::Recover(this, &hold);
-            return kNoSpace;
+            return VARNEK_RING_NO_SPACE;
         case State::kUnderflow:
             TRACE_ERROR(
                 "[Abnormal State] Invalid Ring Buffer State! Underflow! This data will be "
                 "discarded!\n");
             State::Recover(this, &hold);
-            return kNoData;
+            return VARNEK_RING_NO_DATA;
         case State::kOvertaken:
             // On purpose not emptied here; the next read does that.
             return VARNEK_FAIL(
-                kNoData, "Invalid Ring Buffer State! Underflow! This data will be discarded!\n");
+                VARNEK_RING_NO_DATA,
+                "Invalid Ring Buffer State! Underflow! This data will be discarded!\n");
     }
     const int space = iRingSize - State::Used(*this);
     if (space < writelen) {
         return VARNEK_FAIL(
-            kNoSpace,
+            VARNEK_RING_NO_SPACE,
             "Remaing Writing Space=[%d], Wrting Len=[%d]!! This data will be discarded!\n", space,
             writelen);
     }
@@ -308,12 +302,12 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
 int VarnekCRingBuffer::Read(unsigned char *dest, int readLen) {
     HoldMutex hold(hRingMutex);
     if (readLen < 0 || readLen > iRingSize) {
-        return VARNEK_FAIL(kRefused, "Too long readLen=[%d]! Ring buffer size=[%d]\n", readLen,
-                           iRingSize);
+        return VARNEK_FAIL(VARNEK_RING_INVALID, "Too long readLen=[%d]! Ring buffer size=[%d]\n",
+                           readLen, iRingSize);
     }
     if (dest == nullptr && readLen > 0) {
         VARNEK_PANIC();
-        return kRefused;
+        return VARNEK_RING_INVALID;
     }
     switch (State::OrderOf(*this)) {
         case State::kInOrder:
@@ -321,22 +315,22 @@ int VarnekCRingBuffer::Read(unsigned char *dest, int readLen) {
         case State::kOverflow:
             TRACE_ERROR("Abnormal Sate!! Buffer Already Overflow!\n");
             State::Recover(this, &hold);
-            return kNoSpace;
+            return VARNEK_RING_NO_SPACE;
         case State::kUnderflow:
             TRACE_ERROR("Abnormal Sate!! Buffer Already Overflow!\n");
             State::Recover(this, &hold);
-            return kNoData;
+            return VARNEK_RING_NO_DATA;
         case State::kOvertaken:
             TRACE_ERROR("Abnormal Sate!! Buffer Already Underflow!\n");
             State::Recover(this, &hold);
-            return kNoData;
+            return VARNEK_RING_NO_DATA;
     }
     if (iReadPos == iWritePos && iReadLoopCnt == iWriteLoopCnt) {
-        return VARNEK_FAIL(kNoData, "No reading data!\n");
+        return VARNEK_FAIL(VARNEK_RING_NO_DATA, "No reading data!\n");
     }
     const int available = State::Used(*this);
     if (available < readLen) {
-        return VARNEK_FAIL(kNoData,
+        return VARNEK_FAIL(VARNEK_RING_NO_DATA,
                            "Not enough reading buffer space. readLen=[%d], readiing buf=[%d]!\n",
                            readLen, available);
     }

@@ -16,7 +16,6 @@
 namespace {
 
 constexpr size_t kFileLogSize = 1024;
-constexpr int32_t kNotOpened = -18;
 
 // A length whose count fits the signed result of the whole-file operations.
 uint32_t Countable(uint32_t length) {
@@ -92,7 +91,7 @@ int32_t VarnekPGL_SeekFile(PglFileHandle hFile, int32_t offset, uint32_t base) {
     }
     if (base >= kSeekBases) {
         __VarnekPGL_FileLog("%s : Invalid Seek base! base=%d", __func__, static_cast<int>(base));
-        return kInvalidBase;
+        return VARNEK_FILE_INVALID_BASE;
     }
     if (fseek(stream, offset, static_cast<int>(base)) < 0) {
         __VarnekPGL_FileLog("%s : fail handle = 0x%x", __func__, ShownHandle(hFile));
@@ -181,7 +180,7 @@ static PglFileHandle OpenWhole(const char *operation, const char *path, int32_t 
 int32_t VarnekPGL_ReadFile(const char *path, void *buffer, uint32_t length) {
     const PglFileHandle file = OpenWhole(__func__, path, PGL_FILE_MODE_READ);
     if (file == -1) {
-        return kNotOpened;
+        return VARNEK_FILE_NOT_OPENED;
     }
     const uint32_t count = VarnekPGL_ReadFileByHandle(file, buffer, Countable(length));
     VarnekPGL_CloseFile(file);
@@ -196,7 +195,7 @@ int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uint32_t lengt
     }
     const PglFileHandle file = OpenWhole(__func__, path, PGL_FILE_MODE_WRITE);
     if (file == -1) {
-        return kNotOpened;
+        return VARNEK_FILE_NOT_OPENED;
     }
     const uint32_t count = VarnekPGL_WriteFileByHandle(file, buffer, Countable(length));
     // Small data reaches a full disk only here.
@@ -214,7 +213,7 @@ int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t leng
     }
     const PglFileHandle file = OpenWhole(__func__, path, PGL_FILE_MODE_APPEND);
     if (file == -1) {
-        return kNotOpened;
+        return VARNEK_FILE_NOT_OPENED;
     }
     uint32_t written = VarnekPGL_WriteFileByHandle(file, buffer, length);
     // Small data reaches a full disk only here.

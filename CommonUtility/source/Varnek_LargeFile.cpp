@@ -84,12 +84,12 @@ int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer, uin
         hFile, length, static_cast<unsigned>(written), ErrorText(error));
     switch (error) {
         case EFBIG:
-            return -27;
+            return VARNEK_FILE_TOO_LARGE;
         case EIO:
         case ETIMEDOUT:
-            return -5;
+            return VARNEK_FILE_DEVICE_FAILURE;
         case ENOSPC:
-            return -28;
+            return VARNEK_FILE_MEDIUM_FULL;
         default:
             return static_cast<int32_t>(written);
     }
@@ -99,7 +99,7 @@ int32_t VarnekPGL_SeekFile64Bits(int32_t hFile, int64_t offset, uint32_t base) {
     if (base >= kSeekBases) {
         LARGE_FILE_LOG(" VarnekPGL_SeekFile64Bits Invalid Seek base! base=[%d]",
                        static_cast<int>(base));
-        return kInvalidBase;
+        return VARNEK_FILE_INVALID_BASE;
     }
     if (hFile < 0) {
         LARGE_FILE_LOG("VarnekPGL_FSeek64Bits: Seek Failure Invalid Hndl : %d", hFile);

@@ -15,7 +15,6 @@
 // errno alone.
 void __VarnekPGL_FileLog(const char *format, ...) __attribute__((format(printf, 1, 2)));
 
-constexpr int32_t kInvalidBase = -8;
 constexpr uint32_t kSeekBases = 3;  // SEEK_SET 0, SEEK_CUR 1, SEEK_END 2
 
 inline bool IsTooLong(const char *path) {
@@ -40,7 +39,7 @@ enum class FileKind {
     kOdd,       // no regular file
     kTooLarge,  // more than kMaxConfigSize bytes
 };
-constexpr int64_t kMaxConfigSize = 1024 * 1024;
+constexpr int64_t kMaxConfigSize = 1048576;
 FileKind KindOfConfigFile(const char *path);
 
 // What a read of a whole file brought: `count` bytes in a block from malloc, a NUL behind them.

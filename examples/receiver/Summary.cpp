@@ -123,6 +123,7 @@ void AddServices(const Services &services, Paragraphs &out) {
             continue;
         }
         std::vector<std::string> components;
+        components.reserve(service.map->components.size());
         for (const Component &component : service.map->components) {
             components.push_back(Format("0x%04X ", component.pid) + NameOfComponent(component));
         }

@@ -1,56 +1,94 @@
-// trailer FILE: makes a file with a CRC-32 behind its content, as data carousels are stored, checks
-// it, changes one byte and checks again.
+// trailer FILE: appends the CRC-32 of a file to it, as data carousels are stored.
+// trailer --check FILE: tells whether a file ends in its CRC-32; exits with 1 when it does not.
+// The file may have any size: it is read in pieces.
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
+#include <vector>
 
 #include "Varnek_File.h"
 #include "Varnek_Util.h"
 
 namespace {
 
-constexpr char kContent[] = "What a carousel brought, to be checked when it is read again.";
+constexpr int32_t kPiece = 64 * 1024;
+constexpr int32_t kSmallest = 4;  // of a piece and of a file
 
-bool Make(const char *path) {
-    constexpr uint32_t kLength = sizeof kContent - 1;
-    // The append reports nothing; the check that follows does.
-    return VarnekPGL_WriteFile(path, kContent, kLength) == static_cast<int32_t>(kLength) &&
-           VarnekUtil_AppendCRC32ToFile(path) != FALSE;
+// The CRC of everything up to the end of a further piece, whose first bytes it changes.
+uint32_t GoOn(uint32_t crc, unsigned char *piece, int32_t length) {
+    for (int i = 0; i < 4; ++i) {
+        piece[i] ^= static_cast<unsigned char>(~crc >> (24 - 8 * i));
+    }
+    return VarnekUtil_MakeCRC32(piece, length);
 }
 
-// Changes the byte at `offset`, where a stream would have to write the whole file again.
-bool Damage(const char *path, int64_t offset) {
-    const int32_t hFile = VarnekPGL_OpenFile64Bits(path, PGL_FILE_MODE_READ | PGL_FILE_MODE_WRITE);
-    if (hFile < 0) {
+bool ReadAll(int32_t hFile, unsigned char *to, int32_t length) {
+    for (int32_t count = 0; length > 0; to += count, length -= count) {
+        count = VarnekPGL_ReadFileByHandle64Bits(hFile, to, static_cast<uint32_t>(length));
+        if (count <= 0) {
+            return false;
+        }
+    }
+    return true;
+}
+
+// The CRC of a file's whole content.
+bool Measure(int32_t hFile, uint32_t &crc) {
+    int64_t left = VarnekPGL_GetFileSizeByHandle64Bits(hFile);
+    if (left < kSmallest) {
+        std::fputs("trailer: the file is too small\n", stderr);
         return false;
     }
-    unsigned char byte = 0;
-    VarnekPGL_SeekFile64Bits(hFile, offset, SEEK_SET);
-    bool done = VarnekPGL_ReadFileByHandle64Bits(hFile, &byte, 1) == 1;
-    byte ^= 0x01;
-    VarnekPGL_SeekFile64Bits(hFile, offset, SEEK_SET);
-    done = done && VarnekPGL_WriteFileByHandle64Bits(hFile, &byte, 1) == 1;
-    VarnekPGL_CloseFile64Bits(hFile);
-    return done;
+    std::vector<unsigned char> piece(kPiece);
+    crc = 0xFFFFFFFF;  // the register before the first byte
+    while (left > 0) {
+        // What remains is nothing, or at least the smallest piece.
+        const bool tail = left > kPiece && left < kPiece + kSmallest;
+        const auto length =
+            static_cast<int32_t>(std::min<int64_t>(left, tail ? kPiece - kSmallest : kPiece));
+        if (!ReadAll(hFile, piece.data(), length)) {
+            std::fputs("trailer: the file cannot be read\n", stderr);
+            return false;
+        }
+        crc = GoOn(crc, piece.data(), length);
+        left -= length;
+    }
+    return true;
 }
 
-bool Check(const char *path) {
-    const bool right = VarnekUtil_CheckFileCRC32(path) != FALSE;
-    std::printf("%d bytes, CRC %s\n", static_cast<int>(VarnekPGL_GetFileSize(path)),
-                right ? "right" : "wrong");
-    return right;
+bool Append(int32_t hFile, uint32_t crc) {
+    const unsigned char trailer[] = {
+        static_cast<unsigned char>(crc >> 24), static_cast<unsigned char>(crc >> 16),
+        static_cast<unsigned char>(crc >> 8), static_cast<unsigned char>(crc)};
+    VarnekPGL_SeekFile64Bits(hFile, 0, SEEK_END);
+    return VarnekPGL_WriteFileByHandle64Bits(hFile, trailer, sizeof trailer) == sizeof trailer;
 }
 
 }  // namespace
 
 int main(int argc, char **argv) {
-    if (argc != 2) {
-        std::fputs("usage: trailer FILE\n", stderr);
+    const bool check = argc == 3 && std::strcmp(argv[1], "--check") == 0;
+    if (argc != 2 && !check) {
+        std::fputs("usage: trailer [--check] FILE\n", stderr);
         return 2;
     }
-    const char *path = argv[1];
-    if (!Make(path) || !Check(path) || !Damage(path, 5) || Check(path)) {
-        std::fprintf(stderr, "trailer: %s: the log says more\n", path);
+    const char *const path = argv[argc - 1];
+    const int32_t hFile = VarnekPGL_OpenFile64Bits(
+        path, check ? PGL_FILE_MODE_READ : PGL_FILE_MODE_READ | PGL_FILE_MODE_WRITE);
+    if (hFile < 0) {
+        std::fprintf(stderr, "trailer: %s cannot be opened\n", path);
         return 1;
     }
-    return 0;
+    uint32_t crc = 0;
+    bool done = Measure(hFile, crc);
+    if (done && check) {
+        // Over data that ends in its own CRC the result is 0.
+        std::printf("%s: CRC %s\n", path, crc == 0 ? "right" : "wrong");
+        done = crc == 0;
+    } else if (done) {
+        std::printf("%s: CRC 0x%08X\n", path, static_cast<unsigned>(crc));
+        done = Append(hFile, crc);
+    }
+    VarnekPGL_CloseFile64Bits(hFile);
+    return done ? 0 : 1;
 }

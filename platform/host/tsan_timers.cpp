@@ -49,6 +49,8 @@ Timer *Of(timer_t id) {
 
 extern "C" {
 
+// The C library's headers have names of their own for the parameters.
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name)
 int timer_create(clockid_t, sigevent *event, timer_t *id) {
     Timer *timer = new (std::nothrow) Timer;
     if (timer == nullptr) {
@@ -88,4 +90,5 @@ int timer_delete(timer_t id) {
     Of(id)->changed.notify_one();
     return 0;
 }
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
 }

@@ -10,13 +10,15 @@
 
 // The same operations, bit by bit.
 struct BitStreamModel {
+    explicit BitStreamModel(const std::vector<unsigned char> &source) : bytes(source) {}
+
     std::vector<unsigned char> bytes;
     int size = static_cast<int>(bytes.size());
     int index = 0;
     int consumed = 0;  // as counted; a rewind from inside a byte makes it differ from what is taken
     int taken = 0;
     bool end = false;
-    std::vector<std::string> log = {};
+    std::vector<std::string> log;
 
     int64_t Fail(const std::string &line, unsigned char &flag) {
         flag = 0;

@@ -26,7 +26,8 @@ void DropTraces() { gTraces.clear(); }
 
 void CheckTraces(const std::vector<std::string> &expected) {
     if (gTraces == expected) {
-        return DropTraces();
+        DropTraces();
+        return;
     }
     for (const std::string &line : gTraces) {
         fprintf(stderr, "traced:   %s", line.c_str());

@@ -47,7 +47,7 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         return 0;
     }
     CollectTraces();
-    BitStreamModel model{source};
+    BitStreamModel model(source);
     VarnekCBitInputStream stream(source.data(), static_cast<unsigned int>(source.size()), mode % 2);
     while (!input.Empty()) {
         Operation operation{input.Below(10), input.Int()};

@@ -7,7 +7,8 @@
 
 #define CHECK(condition)                                                           \
     do {                                                                           \
-        if (!(condition)) {                                                        \
+        const bool holds = (condition);                                            \
+        if (!holds) {                                                              \
             fprintf(stderr, "%s:%d: CHECK(%s)\n", __FILE__, __LINE__, #condition); \
             abort();                                                               \
         }                                                                          \

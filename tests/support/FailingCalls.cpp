@@ -27,7 +27,12 @@ struct Call {
     int error = 0;
 
     explicit Call(const char *callName);
-    bool Fails() { return left > 0 && --left == 0; }
+    bool Fails() {
+        if (left <= 0) {
+            return false;
+        }
+        return --left == 0;
+    }
 };
 
 Call *gCalls = nullptr;

@@ -1,0 +1,80 @@
+"""Lists the library's live objects in gdb: mutexes with their holders, semaphores, threads, timers.
+
+    (gdb) source share/varnekutils_ltn/gdb.py
+    (gdb) varnek
+
+The library must have its debug information. Works on a process that stands still, and on a core dump."""
+
+import gdb
+
+
+def table(name):
+    """The used slots of a slot table: handle, name and what the slot holds."""
+    found = gdb.lookup_static_symbol(f'(anonymous namespace)::{name}').value()
+    base = found['slots_']
+    for i in range(base.type.range()[1] + 1):
+        handle = int(base[i]['handle']['_M_i'])
+        if handle > 0:
+            yield handle, text(found['names_'][i]), base[i]['info']
+
+
+def text(words):
+    """The characters up to a NUL, of an array of anything."""
+    size = words.type.sizeof
+    content = gdb.selected_inferior().read_memory(int(words.address), size).tobytes()
+    return content.split(b'\0')[0].decode(errors='replace')
+
+
+def thread_names():
+    return {thread.ptid[1]: thread.name for thread in gdb.selected_inferior().threads()}
+
+
+def mutexes():
+    names = thread_names()
+    for handle, name, info in table('gMutexArr'):
+        data = info['linuxMutex']['__data']
+        owner = int(data['__owner'])
+        held = f'held by {names.get(owner, "?")} (LWP {owner})' if int(data['__lock']) else 'free'
+        yield f'{handle:6}  {name:31}  {held}'
+
+
+def units(semaphore):
+    """The units that are left: glibc keeps them in the first word, on 32-bit systems beside a flag."""
+    word = gdb.lookup_type('unsigned int').pointer()
+    value = int(semaphore.address.cast(word).dereference())
+    return value if word.sizeof == 8 else value >> 1
+
+
+def semaphores():
+    for handle, name, info in table('gSemArr'):
+        yield f'{handle:6}  {name:31}  units {units(info["linuxSem"])}'
+
+
+def threads():
+    for handle, name, info in table('gThreadInfoArr'):
+        yield f'{handle:6}  {name:31}  messages {int(info["MsgQ"]["count"])}'
+
+
+def timers():
+    timer_table = gdb.lookup_static_symbol('(anonymous namespace)::gTimerArr').value()
+    for handle in range(timer_table.type.range()[1] + 1):
+        info = timer_table[handle]
+        if info['bUsed']:
+            yield f'{handle:6}  {text(info["szTmName"]):31}  ' + ('started' if info['bAwaited'] else 'idle')
+
+
+class Varnek(gdb.Command):
+    """Lists the live mutexes, semaphores, threads and timers of varnekutils_ltn."""
+
+    def __init__(self):
+        super().__init__('varnek', gdb.COMMAND_DATA)
+
+    def invoke(self, argument, from_tty):
+        for title, lines in (('Mutexes', mutexes), ('Semaphores', semaphores), ('Threads', threads),
+                             ('Timers', timers)):
+            print(title)
+            for line in lines():
+                print(line)
+
+
+Varnek()
