@@ -63,8 +63,8 @@ typedef struct THREAD_MSG {
 //            message, too little memory, or a failing OS call (the message stays queued then)
 VARNEK_API BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message);
 
-// Puts a message in front of everything that is queued now, earlier urgent messages included. Results
-// are those of VarnekPGL_SendMessage.
+// Puts a message in front of everything that is queued now, earlier urgent messages included.
+// Results are those of VarnekPGL_SendMessage.
 VARNEK_API BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message);
 
 // Takes the first message of the calling thread's queue, waiting up to `timeout` for one.
