@@ -230,17 +230,17 @@ TEST_F(Thread, ALogFunctionGetsNoThreadWhileItsOwnCallMakesTheGuard) {
 
 // A table that has given out all handles but two.
 struct LateTable : SlotTable<int, 3> {
-    LateTable() { given_ = INT32_MAX - 2; }
+    LateTable() { SkipHandles(INT32_MAX - 2); }
 };
 
 TEST_F(Thread, HandlesEnd) {
     static LateTable table;
     EXPECT_EQ(table.Publish(table.FirstFree(), "a"), INT32_MAX - 1);
     EXPECT_EQ(table.Publish(table.FirstFree(), "b"), INT32_MAX);
-    EXPECT_EQ(table.FindByHandle(INT32_MAX), 1);
-    EXPECT_EQ(table.FirstFree(), -1);
-    EXPECT_EQ(table.Withdraw(0), 1);
-    EXPECT_EQ(table.FirstFree(), -1) << "no handle is left for a free slot";
+    EXPECT_EQ(table.NumberOf(table.Find(INT32_MAX)), 1);
+    EXPECT_EQ(table.FirstFree(), nullptr);
+    EXPECT_EQ(table.Withdraw(table.Find(INT32_MAX - 1)), 1);
+    EXPECT_EQ(table.FirstFree(), nullptr) << "no handle is left for a free slot";
 }
 
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
