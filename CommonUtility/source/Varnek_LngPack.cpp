@@ -5,6 +5,7 @@
 #include "Varnek_LngPack.h"
 
 #include <limits.h>
+#include <stddef.h>
 #include <stdlib.h>
 #include <string.h>
 
@@ -44,12 +45,17 @@ constexpr Latin15Table MakeLatin15Table() {
 // The row of a byte is at its distance from 0xA0.
 constexpr Latin15Table gWmLatin15CodeTable = MakeLatin15Table();
 
+// Plain characters are the same in Latin-15 and UTF-8.
+constexpr bool IsPlain(unsigned char byte) {
+    return byte >= 0x20 && byte <= 0x7E;
+}
+
 // The unit of a byte; 0 for a control character, which has none.
 constexpr unsigned int UnitOf(unsigned char byte) {
     if (byte >= kFirstUpper) {
         return gWmLatin15CodeTable.row[byte - kFirstUpper].unicode;
     }
-    return byte >= 0x20 && byte <= 0x7E ? byte : 0;
+    return IsPlain(byte) ? byte : 0;
 }
 
 // Appends the UTF-8 of a unit, one to three bytes. Returns where they end.
@@ -67,13 +73,12 @@ constexpr char *PutUtf8(char *out, unsigned int unit) {
     return out;
 }
 
-// Of four bytes, the first in the lowest place, marks those that are not plain characters: 0x20 to
-// 0x7E are the same in Latin-15 and UTF-8, and no top bit of theirs is set, before or after 0x20 is
-// taken off or 1 is added. What one byte carries over to the next cannot reach below the first
-// mark.
-uint32_t MarkOthers(uint32_t four) {
-    constexpr uint32_t kOnes = 0x01010101u;
-    return (four | (four - 0x20 * kOnes) | (four + kOnes)) & 0x80 * kOnes;
+// Whether all bytes of a word are plain: no top bit is set, before or after 0x20 is taken off or 1
+// is added in each byte.
+using Word = uintptr_t;
+constexpr bool ArePlain(Word bytes) {
+    constexpr Word kOnes = ~Word{0} / 0xFF;
+    return ((bytes | (bytes - 0x20 * kOnes) | (bytes + kOnes)) & 0x80 * kOnes) == 0;
 }
 
 // The UTF-8 of a Latin-15 byte: its bytes, the first in the lowest place, and in the highest how
@@ -107,24 +112,21 @@ char *PutLatin15(char *out, unsigned char byte) {
 }
 
 // Converts `length` bytes straight to UTF-8, for which there is room: three bytes for each, and one
-// more. Plain characters go four at a time. Returns where the output ends.
+// more. Plain characters go a word at a time. Returns where the output ends.
 char *PutLatin15(char *out, const unsigned char *in, size_t length) {
     const unsigned char *const end = in + length;
-    while (end - in >= 4) {
-        uint32_t others = 0;
-        do {
-            const uint32_t loaded = Load(in);
-            memcpy(out, &loaded, sizeof loaded);
-            others = MarkOthers(LittleEndian(loaded));
-            in += sizeof loaded;
-            out += sizeof loaded;
-        } while (others == 0 && end - in >= 4);
-        if (others != 0) {
-            const int beyond = 4 - __builtin_ctz(others) / 8;
-            const unsigned char *const other = in - beyond;
-            in = other + 1;
-            out = PutLatin15(out - beyond, *other);
+    while (static_cast<size_t>(end - in) >= sizeof(Word)) {
+        const Word word = Load<Word>(in);
+        memcpy(out, &word, sizeof word);
+        if (ArePlain(word)) {
+            in += sizeof word;
+            out += sizeof word;
+            continue;
         }
+        for (; IsPlain(*in); ++in) {
+            ++out;
+        }
+        out = PutLatin15(out, *in++);
     }
     while (in != end) {
         out = PutLatin15(out, *in++);
@@ -146,6 +148,11 @@ int CharLength(const unsigned char *text, int length) {
     return 0;
 }
 
+void ReportTooLong() {
+    VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL,
+                 "WmConvertLatin15Code2PCode() fail. outBufSize < strLen\n");
+}
+
 }  // namespace
 
 BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize, const char *szInText) {
@@ -157,8 +164,7 @@ BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize, con
     }
     const size_t strLen = strlen(szInText);
     if (outBufSize < 0 || strLen > static_cast<size_t>(outBufSize)) {
-        VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL,
-                     "WmConvertLatin15Code2PCode() fail. outBufSize < strLen\n");
+        ReportTooLong();
         return FALSE;
     }
     for (size_t i = 0; i < strLen; ++i) {
@@ -345,40 +351,6 @@ unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned char second
     return static_cast<unsigned short>(first << 12 | (second & 0x3F) << 6 | (third & 0x3F));
 }
 
-// The conversion within a work buffer for `length` characters.
-static BOOL ConvertWithin(char *utf8, char **outputData, const char *szInput, size_t length,
-                          unsigned int szInputSize, int capacity) {
-    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: szInputSize is %d\t!\n",
-                    static_cast<int>(szInputSize));
-    if (length > static_cast<size_t>(capacity)) {
-        unsigned short nothing = 0;
-        WmConvertLatin15Code2PCode(&nothing, capacity, szInput);  // says so
-        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: WmConvertLatin15Code2PCode. ERROR  !\n");
-        return FALSE;
-    }
-    // Both steps at once, without the units in between.
-    char *end = PutLatin15(utf8, reinterpret_cast<const unsigned char *>(szInput), length);
-    *end = '\0';
-    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: Convert String => %s !\n", utf8);
-    const size_t textlen = static_cast<size_t>(end - utf8);
-    if (textlen == 0) {
-        return TRUE;
-    }
-    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8:textlen = %d !\n",
-                    static_cast<int>(textlen + 1));
-    char *text = static_cast<char *>(malloc(textlen + 1));
-    if (text == nullptr) {
-        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: memalloc failed  !\n");
-        return FALSE;
-    }
-    memcpy(text, utf8, textlen + 1);
-    free(*outputData);
-    *outputData = text;
-    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8 : VarnekPGL_Strlen(*outputData) = %d !\n",
-                    static_cast<int>(textlen));
-    return TRUE;
-}
-
 BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
                                     unsigned int szInputSize) {
     if (outputData == nullptr || szInput == nullptr) {
@@ -389,13 +361,42 @@ BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
     // below overflows. The buffer follows the input itself, not what the caller says of it.
     const uint64_t stated = 3 * static_cast<uint64_t>(szInputSize) + 1;
     const int capacity = stated < INT_MAX / 4 ? static_cast<int>(stated) : INT_MAX / 4;
-    const size_t length = strnlen(szInput, static_cast<size_t>(capacity) + 1);
+    const size_t length = LengthWithin(szInput, static_cast<size_t>(capacity) + 1);
     char *utf8 = static_cast<char *>(malloc(length * 3 + 1));
     if (utf8 == nullptr) {
         TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: memalloc failed  !\n");
         return FALSE;
     }
-    const BOOL done = ConvertWithin(utf8, outputData, szInput, length, szInputSize, capacity);
+    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: szInputSize is %d\t!\n",
+                    static_cast<int>(szInputSize));
+    if (length > static_cast<size_t>(capacity)) {
+        free(utf8);
+        ReportTooLong();
+        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: WmConvertLatin15Code2PCode. ERROR  !\n");
+        return FALSE;
+    }
+    // Both steps at once, without the units in between.
+    char *end = PutLatin15(utf8, reinterpret_cast<const unsigned char *>(szInput), length);
+    *end = '\0';
+    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: Convert String => %s !\n", utf8);
+    const size_t textlen = static_cast<size_t>(end - utf8);
+    if (textlen == 0) {
+        free(utf8);
+        return TRUE;
+    }
+    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8:textlen = %d !\n",
+                    static_cast<int>(textlen + 1));
+    char *text = static_cast<char *>(malloc(textlen + 1));
+    if (text == nullptr) {
+        free(utf8);
+        TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: memalloc failed  !\n");
+        return FALSE;
+    }
+    memcpy(text, utf8, textlen + 1);
     free(utf8);
-    return done;
+    free(*outputData);
+    *outputData = text;
+    TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8 : VarnekPGL_Strlen(*outputData) = %d !\n",
+                    static_cast<int>(textlen));
+    return TRUE;
 }

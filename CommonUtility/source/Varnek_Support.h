@@ -19,6 +19,12 @@ inline bool IsLineEnd(char c) {
     return c == '\r' || c == '\n';
 }
 
+// What strnlen tells, by a call that C libraries write in their processor's own instructions.
+inline size_t LengthWithin(const char *text, size_t most) {
+    const void *end = memchr(text, '\0', most);
+    return end != nullptr ? static_cast<size_t>(static_cast<const char *>(end) - text) : most;
+}
+
 // The system's text for an error number, the calling thread's until it asks again.
 inline const char *ErrorText(int error) {
     return strerror(error);  // NOLINT(concurrency-mt-unsafe): a buffer per thread on every target
@@ -51,14 +57,20 @@ inline uint32_t BigEndian(const unsigned char *p) {
            static_cast<uint32_t>(p[2]) << 8 | p[3];
 }
 
-// Four bytes, the least significant first, from the machine's order or into it.
-inline uint32_t LittleEndian(uint32_t word) {
-    return __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? word : __builtin_bswap32(word);
+// A word whose least significant byte comes first, from the machine's order or into it.
+template <typename Word>
+constexpr Word LittleEndian(Word word) {
+    if constexpr (__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__) {
+        return word;
+    }
+    return static_cast<Word>(sizeof word == 8 ? __builtin_bswap64(word)
+                                              : __builtin_bswap32(static_cast<uint32_t>(word)));
 }
 
-// Four bytes as the machine loads them, wherever they lie.
-inline uint32_t Load(const unsigned char *p) {
-    uint32_t word = 0;
+// A word as the machine loads it, wherever it lies.
+template <typename Word>
+Word Load(const unsigned char *p) {
+    Word word = 0;
     memcpy(&word, p, sizeof word);
     return word;
 }

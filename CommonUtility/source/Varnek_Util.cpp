@@ -44,6 +44,10 @@ template <int zeros>
 constexpr CrcTable kCrc = MakeCrcTable(zeros);
 static_assert(kCrc<0>.word[1] == 0xB71DC104u && kCrc<0>.word[255] == 0xB440F7B1u);
 
+uint32_t Word(const unsigned char *data) {
+    return LittleEndian(Load<uint32_t>(data));
+}
+
 // The register, reversed, after the four bytes of `word` and `zeros` bytes of 0.
 template <int zeros>
 uint32_t After(uint32_t word) {
@@ -63,25 +67,24 @@ unsigned char *ReadWhole(const char *path, int32_t size) {
 }  // namespace
 
 uint32_t VarnekUtil_MakeCRC32(const unsigned char *data, int32_t length) {
-    if (length < 4 || data == nullptr) {
+    if (__builtin_expect(length < 4 || data == nullptr, 0)) {
         VARNEK_PANIC();
-    }
-    if (length < 1 || data == nullptr) {
-        return kInitial;
-    }
-    uint32_t crc = kInitial;
-    const unsigned char *const end = data + length;
-    if constexpr (kWide) {
-        for (const unsigned char *const stop = end - length % 16; data != stop; data += 16) {
-            crc = After<12>(crc ^ LittleEndian(Load(data))) ^
-                  After<8>(LittleEndian(Load(data + 4))) ^ After<4>(LittleEndian(Load(data + 8))) ^
-                  After<0>(LittleEndian(Load(data + 12)));
+        if (length < 1 || data == nullptr) {
+            return kInitial;
         }
     }
-    for (const unsigned char *const stop = end - length % 4; data != stop; data += 4) {
-        crc = After<0>(crc ^ LittleEndian(Load(data)));
+    uint32_t crc = kInitial;
+    size_t left = static_cast<size_t>(length);
+    if constexpr (kWide) {
+        for (; left >= 16; left -= 16, data += 16) {
+            crc = After<12>(crc ^ Word(data)) ^ After<8>(Word(data + 4)) ^
+                  After<4>(Word(data + 8)) ^ After<0>(Word(data + 12));
+        }
     }
-    for (; data != end; ++data) {
+    for (const unsigned char *const stop = data + (left & ~size_t{3}); data != stop; data += 4) {
+        crc = After<0>(crc ^ Word(data));
+    }
+    for (const unsigned char *const stop = data + left % 4; data != stop; ++data) {
         crc = kCrc<0>.word[(*data ^ crc) & 0xFF] ^ crc >> 8;
     }
     return __builtin_bswap32(crc);
