@@ -24,7 +24,7 @@
 
 const char *gszVarnekDbgFilePath = "";
 int32_t gVarnekDbgLineNum = 0;
-std::atomic<uint32_t> gDebugState{0};
+std::atomic<uint32_t> gDebugState{~0u};
 
 namespace {
 
@@ -45,6 +45,10 @@ constexpr char kDefaultConfigPath[] = VARNEK_SYSTEM_DIR "debug_ltn.ini";
 constexpr char kSettingsPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
 static_assert(sizeof kSettingsPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
 static_assert(sizeof kDefaultConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_SYSTEM_DIR is too long");
+
+bool IsLoaded() {
+    return (gDebugState.load(std::memory_order_relaxed) & kNotLoaded) == 0;
+}
 
 struct TraceLevel {
     uint32_t bit;
@@ -249,10 +253,12 @@ uint32_t ReadConfig() {
 // One load, in the thread that holds gDebugLoadLock. While it runs nothing is traced, also when it
 // replaces an earlier load.
 void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
-    gDebugState.fetch_and(kInitialised, std::memory_order_relaxed);
+    if (IsLoaded()) {
+        gDebugState.store(0, std::memory_order_relaxed);
+    }
     const uint32_t enabled = ReadConfig();
     LogSummary(enabled);
-    gDebugState.store(enabled | kInitialised, std::memory_order_release);
+    gDebugState.store((enabled & kOutputOn) != 0 ? enabled : 0, std::memory_order_relaxed);
 }
 
 // Loads under the lock; with `again` unset only when no load has finished meanwhile.
@@ -262,7 +268,7 @@ void LoadConfigOnce(bool again) {
         return;
     }
     const Hold hold(gDebugLoadLock);
-    if (again || (gDebugState.load(std::memory_order_relaxed) & kInitialised) == 0) {
+    if (again || !IsLoaded()) {
         gDebugLoader.store(pthread_self(), std::memory_order_relaxed);
         LoadConfig();
         gDebugLoader.store(pthread_t{}, std::memory_order_relaxed);
@@ -302,10 +308,18 @@ size_t PutPrefix(char (&line)[kTraceLineSize], char label, const char *file, int
     return length;
 }
 
-// Composes and writes one line that the configuration lets through. Kept out of line, so that the
-// buffer costs nothing in a trace that is off.
+// Composes and writes a line whose level may be on: loads the configuration first, unless that has
+// happened. Kept out of line, so that its buffer costs nothing in a trace that is off.
 __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, const char *format,
                                                                 va_list args) {
+    if (!IsLoaded()) {
+        LoadConfigOnce(false);
+    }
+    const uint32_t state = gDebugState.load(std::memory_order_relaxed);
+    const uint32_t enabled = state & mask;
+    if ((state & kNotLoaded) != 0 || (enabled & kLevelBits) == 0 || (enabled & kModuleBits) == 0) {
+        return;
+    }
     const ErrnoKeeper keeper;
     if (format == nullptr) {
         format = "(null)";
@@ -324,13 +338,9 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
 }  // namespace
 
 void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...) {
-    uint32_t state = gDebugState.load(std::memory_order_acquire);
-    if ((state & kInitialised) == 0) {
-        LoadConfigOnce(false);
-        state = gDebugState.load(std::memory_order_acquire);
-    }
-    const uint32_t enabled = state & mask;
-    if ((state & kOutputOn) == 0 || (enabled & kLevelBits) == 0 || (enabled & kModuleBits) == 0) {
+    // A mask without a level ends here too, once the configuration is loaded.
+    const uint32_t state = gDebugState.load(std::memory_order_relaxed);
+    if ((state & (mask | kNotLoaded)) < kNotLoaded) {
         return;
     }
     va_list args;
@@ -344,7 +354,7 @@ void VarnekPGL_InitializeDebug() {
 }
 
 void VarnekPGL_CheckAndInitDebug() {
-    if ((gDebugState.load(std::memory_order_acquire) & kInitialised) == 0) {
+    if (!IsLoaded()) {
         LoadConfigOnce(false);
     }
 }

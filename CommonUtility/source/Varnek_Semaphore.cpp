@@ -196,7 +196,7 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
 // The unlimited wait. An interruption ends it like any failure.
 BOOL WaitForever(int32_t hSem, int slot) {
     const int retSem = sem_wait(&gSemArr[slot].linuxSem);
-    TRACE_LOW("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]\n", hSem, slot);
+    TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]\n", hSem, slot);
     if (retSem != 0) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: retSem != 0, errCode = [%d]",
                            VarnekPGL_SysGetLastErro());

@@ -6,17 +6,17 @@
 
 #include "Varnek_Debug.h"
 
-// The enabled levels and modules where a trace mask holds its own, and two flags in bits that
-// neither uses. A load of the debug configuration writes it.
-constexpr uint32_t kInitialised = 0x01000000u;
+// What a trace may write: the enabled levels and modules where a trace mask holds its own, none of
+// them when the output is off, and two flags in bits that neither uses. A load of the debug
+// configuration writes it; before the first one every bit is set, since nothing is known to be off.
+// The word itself says all that a trace asks of it, so every access is relaxed.
 constexpr uint32_t kOutputOn = 0x02000000u;
+constexpr uint32_t kNotLoaded = 0x08000000u;
 extern __attribute__((visibility("hidden"))) std::atomic<uint32_t> gDebugState;
 
-// Whether a mask of one level and one module is off. Before the configuration is loaded that is not
-// known, and the trace loads it.
+// Whether a mask of one level and one module is known to be off.
 inline bool TraceIsOff(uint32_t mask) {
-    const uint32_t state = gDebugState.load(std::memory_order_relaxed);
-    return (state & kInitialised) != 0 && (~state & (mask | kOutputOn)) != 0;
+    return (~gDebugState.load(std::memory_order_relaxed) & mask) != 0;
 }
 
 #define TRACE_ERROR(...) VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON, __VA_ARGS__)
