@@ -173,12 +173,6 @@ void *UseOwnQueue(void *done) {
          TRUE,
          {receiveLine + "Semaphore Get Value FAIL. errCode = [-1]"}},
     });
-    // The second allocation of a send is the node's.
-    for (const auto &sending : {std::function<BOOL()>(send), std::function<BOOL()>(urgent)}) {
-        FailCall("malloc", 2, ENOMEM);
-        EXPECT_FALSE(sending());
-    }
-    TakeLog();
     EXPECT_FALSE(receive(0)) << "a failed send leaves neither a message nor a signal";
     EXPECT_EQ(TakeErrors()[0], receiveLine + "Semaphore wait FAIL. errCode = [110]");
     ExpectFaults({

@@ -250,6 +250,15 @@ uint32_t ReadConfig() {
     return enabled;
 }
 
+// What a trace asks for, of what a configuration enables.
+uint32_t StateOf(uint32_t enabled) {
+    constexpr uint32_t kOwnLow = VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON;
+    if ((enabled & kOutputOn) == 0) {
+        return 0;
+    }
+    return (enabled & kOwnLow) == kOwnLow ? enabled | kOwnLowOn : enabled;
+}
+
 // One load, in the thread that holds gDebugLoadLock. While it runs nothing is traced, also when it
 // replaces an earlier load.
 void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
@@ -258,7 +267,7 @@ void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     }
     const uint32_t enabled = ReadConfig();
     LogSummary(enabled);
-    gDebugState.store((enabled & kOutputOn) != 0 ? enabled : 0, std::memory_order_relaxed);
+    gDebugState.store(StateOf(enabled), std::memory_order_relaxed);
 }
 
 // Loads under the lock; with `again` unset only when no load has finished meanwhile.

@@ -4,29 +4,21 @@
 
 #include <stdlib.h>
 
+#include "Varnek_ListLink.h"
+
 namespace {
 
 // Links a new node for `data` before `next`, at the tail when that is null.
 void InsertBefore(list_t *list, list_node_t *next, void *data) {
     list_node_t *node = static_cast<list_node_t *>(malloc(sizeof(list_node_t)));
-    if (node == nullptr) {
-        return;
+    if (node != nullptr) {
+        LinkBefore(list, next, node, data);
     }
-    list_node_t *prev = next != nullptr ? next->prev : list->tail;
-    *node = {data, prev, next};
-    list_node_t **forward = prev != nullptr ? &prev->next : &list->head;
-    list_node_t **backward = next != nullptr ? &next->prev : &list->tail;
-    *forward = *backward = node;
-    list->count++;
 }
 
 // Unlinks a node of the list, frees it and hands back its data.
-void *Unlink(list_t *list, list_node_t *node) {
-    list_node_t **forward = node->prev != nullptr ? &node->prev->next : &list->head;
-    list_node_t **backward = node->next != nullptr ? &node->next->prev : &list->tail;
-    *forward = node->next;
-    *backward = node->prev;
-    list->count--;
+void *Remove(list_t *list, list_node_t *node) {
+    Unlink(list, node);
     void *data = node->data;
     free(node);
     return data;
@@ -79,11 +71,11 @@ void *list_element(list_t *list, int32_t position) {
 }
 
 void *list_removeHead(list_t *list) {
-    return list != nullptr && list->head != nullptr ? Unlink(list, list->head) : nullptr;
+    return list != nullptr && list->head != nullptr ? Remove(list, list->head) : nullptr;
 }
 
 void *list_removeTail(list_t *list) {
-    return list != nullptr && list->tail != nullptr ? Unlink(list, list->tail) : nullptr;
+    return list != nullptr && list->tail != nullptr ? Remove(list, list->tail) : nullptr;
 }
 
 void *list_remove(list_t *list, int32_t position) {
@@ -92,7 +84,7 @@ void *list_remove(list_t *list, int32_t position) {
     }
     // The tail is known; everything else is a walk from the head.
     list_node_t *node = position == list->count - 1 ? list->tail : NodeAt(list, position);
-    return node != nullptr ? Unlink(list, node) : nullptr;
+    return node != nullptr ? Remove(list, node) : nullptr;
 }
 
 void list_removeAll(list_t *list) {
@@ -111,7 +103,7 @@ void list_removeAll(list_t *list) {
 
 void list_remove_node(list_t *list, list_node_t *node) {
     if (list != nullptr && node != nullptr) {
-        free(Unlink(list, node));
+        free(Remove(list, node));
     }
 }
 

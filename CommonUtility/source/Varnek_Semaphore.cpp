@@ -28,7 +28,8 @@ struct SEM_MGR_INFO {
 Lock gMutexArrLock;
 SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE> gMutexArr;
 Lock gSemArrLock;
-SlotTable<SEM_MGR_INFO, MAX_SEM_MGR_INFO_ARR_SIZE> gSemArr;
+using Semaphores = SlotTable<SEM_MGR_INFO, MAX_SEM_MGR_INFO_ARR_SIZE>;
+Semaphores gSemArr;
 
 // Mutexes ----------------------------------------------------------------------------------------
 
@@ -54,11 +55,11 @@ int32_t __Varnek_create_mutex(const char *szMutexName) {
     }
 
     Hold hold(gMutexArrLock);
-    const int slot = gMutexArr.FirstFree();
-    if (slot == -1) {
+    auto *const slot = gMutexArr.FirstFree();
+    if (slot == nullptr) {
         return VARNEK_FAIL(-1, "***** __Varnek_create_mutex : Can't find empty index!!!!");
     }
-    pthread_mutex_t &linuxMutex = gMutexArr[slot].linuxMutex;
+    pthread_mutex_t &linuxMutex = slot->info.linuxMutex;
     if (!Succeeded(pthread_mutex_init(&linuxMutex, nullptr))) {
         return VARNEK_FAIL(-1, "***** __Varnek_create_mutex : Mutex creation FAIL!! errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
@@ -96,13 +97,13 @@ int32_t VarnekPGL_CreateMutex(const char *szMutexName) {
 BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
     TRACE_LOW("***** START : VarnekPGL_DeleteMutex. hMutex=[%d]", hMutex);
     Hold hold(gMutexArrLock);
-    const int slot = gMutexArr.FindByHandle(hMutex);
-    if (slot == -1) {
+    auto *const slot = gMutexArr.Find(hMutex);
+    if (slot == nullptr) {
         return VARNEK_FAIL(
             FALSE, "***** VarnekPGL_DeleteMutex : Can't find mutex info. mutex handle = [%d]",
             hMutex);
     }
-    if (!DestroyMutex(&gMutexArr[slot].linuxMutex)) {
+    if (!DestroyMutex(&slot->info.linuxMutex)) {
         return VARNEK_FAIL(FALSE,
                            "***** VarnekPGL_DeleteMutex : Mutex Destroy FAIL! errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
@@ -114,13 +115,13 @@ BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
 }
 
 BOOL VarnekPGL_AcquireMutex(int32_t hMutex) {
-    const int slot = gMutexArr.FindByHandle(hMutex);
-    if (slot == -1) {
+    auto *const slot = gMutexArr.Find(hMutex);
+    if (slot == nullptr) {
         return VARNEK_FAIL(
             FALSE, "***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [%d]",
             hMutex);
     }
-    if (!Succeeded(pthread_mutex_lock(&gMutexArr[slot].linuxMutex))) {
+    if (!Succeeded(pthread_mutex_lock(&slot->info.linuxMutex))) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_AcquireMutex : Mutex Lock FAIL! errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
     }
@@ -128,13 +129,13 @@ BOOL VarnekPGL_AcquireMutex(int32_t hMutex) {
 }
 
 BOOL VarnekPGL_ReleaseMutex(int32_t hMutex) {
-    const int slot = gMutexArr.FindByHandle(hMutex);
-    if (slot == -1) {
+    auto *const slot = gMutexArr.Find(hMutex);
+    if (slot == nullptr) {
         return VARNEK_FAIL(
             FALSE, "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [%d]",
             hMutex);
     }
-    if (!Succeeded(pthread_mutex_unlock(&gMutexArr[slot].linuxMutex))) {
+    if (!Succeeded(pthread_mutex_unlock(&slot->info.linuxMutex))) {
         return VARNEK_FAIL(FALSE,
                            "***** VarnekPGL_ReleaseMutex : Mutex Unlock FAIL! errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
@@ -173,11 +174,11 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
     }
 
     Hold hold(gSemArrLock);
-    const int slot = gSemArr.FirstFree();
-    if (slot == -1) {
+    auto *const slot = gSemArr.FirstFree();
+    if (slot == nullptr) {
         return VARNEK_FAIL(-1, "***** __Varnek_create_semaphore : Can't find empty index!!!!");
     }
-    sem_t &linuxSem = gSemArr[slot].linuxSem;
+    sem_t &linuxSem = slot->info.linuxSem;
     if (sem_init(&linuxSem, 0, count) != 0) {
         const int error = VarnekPGL_SysGetLastErro();
         hold.Release();
@@ -194,9 +195,10 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
 }
 
 // The unlimited wait. An interruption ends it like any failure.
-BOOL WaitForever(int32_t hSem, int slot) {
-    const int retSem = sem_wait(&gSemArr[slot].linuxSem);
-    TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]\n", hSem, slot);
+BOOL WaitForever(int32_t hSem, Semaphores::Slot *slot) {
+    const int retSem = sem_wait(&slot->info.linuxSem);
+    TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]\n", hSem,
+                    gSemArr.NumberOf(slot));
     if (retSem != 0) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: retSem != 0, errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
@@ -211,11 +213,11 @@ BOOL WaitUntilDeadline(int32_t hSem, uint32_t timeout) {
     int retSem = clock_gettime(CLOCK_REALTIME, &curTime);
     if (retSem == 0) {
         semTimeOut = DeadlineAfter(curTime, timeout);
-        const int slot = gSemArr.FindByHandle(hSem);
-        if (slot == -1) {
+        auto *const slot = gSemArr.Find(hSem);
+        if (slot == nullptr) {
             return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: arrIdx == -1, %d", hSem);
         }
-        retSem = sem_timedwait(&gSemArr[slot].linuxSem, &semTimeOut);
+        retSem = sem_timedwait(&slot->info.linuxSem, &semTimeOut);
     }
     if (retSem == 0) {
         return TRUE;
@@ -245,13 +247,13 @@ int32_t VarnekPGL_CreateSemaphore(const char *szSemName, uint32_t count) {
 
 BOOL VarnekPGL_DeleteSemaphore(int32_t hSem) {
     Hold hold(gSemArrLock);
-    const int slot = gSemArr.FindByHandle(hSem);
-    if (slot == -1) {
+    auto *const slot = gSemArr.Find(hSem);
+    if (slot == nullptr) {
         hold.Release();
         return VARNEK_FAIL(FALSE, "Varnek_delete_semaphore: arrIdx == -1, %d", hSem);
     }
     const int32_t size = gSemArr.Withdraw(slot);
-    if (sem_destroy(&gSemArr[slot].linuxSem) != 0) {
+    if (sem_destroy(&slot->info.linuxSem) != 0) {
         TRACE_ERROR("Varnek_delete_semaphore: retSem != 0, errCode = [%d]",
                     VarnekPGL_SysGetLastErro());
     }
@@ -261,22 +263,24 @@ BOOL VarnekPGL_DeleteSemaphore(int32_t hSem) {
 }
 
 BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout) {
-    const int slot = gSemArr.FindByHandle(hSem);
-    TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]", hSem, slot);
-    if (slot == -1) {
+    auto *const slot = gSemArr.Find(hSem);
+    TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]", hSem, gSemArr.NumberOf(slot));
+    if (slot == nullptr) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_WaitSemaphore: arrIdx == -1, %d", hSem);
     }
     return timeout == WAIT_FOREVER ? WaitForever(hSem, slot) : WaitUntilDeadline(hSem, timeout);
 }
 
 BOOL VarnekPGL_SignalSemaphore(int32_t hSem) {
-    const int slot = gSemArr.FindByHandle(hSem);
-    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, slot);
-    if (slot == -1) {
+    auto *const slot = gSemArr.Find(hSem);
+    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem,
+                    gSemArr.NumberOf(slot));
+    if (slot == nullptr) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_SignalSemaphore: arrIdx == -1, %d", hSem);
     }
-    const int retSem = sem_post(&gSemArr[slot].linuxSem);
-    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem, slot);
+    const int retSem = sem_post(&slot->info.linuxSem);
+    TRACE_LOW_QUICK("VarnekPGL_SignalSemaphore: hSem[%d], arrIdx[%d]\n", hSem,
+                    gSemArr.NumberOf(slot));
     if (retSem != 0) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_SignalSemaphore: retSem != 0, errCode = [%d]",
                            VarnekPGL_SysGetLastErro());

@@ -4,17 +4,21 @@
 // slot: what belongs to it is complete before it is stored and untouched until it is withdrawn.
 // Lookups take no lock. They read the handle with acquire; for a name they read the handle again
 // after the name's words, and since no handle ever comes back, the same handle twice means that the
-// words in between were its own: a sequence lock whose number cannot repeat.
+// words in between were its own: a sequence lock whose number cannot repeat. A digest of each name
+// tells where that is worth its barriers.
 //
 // A thread that changes the table holds the family's guard. The table is zero when the library is
 // loaded.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 
+#include <stddef.h>
 #include <stdint.h>
 #include <string.h>
 
 #include <atomic>
+
+#include "Varnek_Support.h"
 
 constexpr int32_t kInvalidHandle = -1;
 constexpr size_t kNameSize = 32;  // with the terminator
@@ -22,53 +26,64 @@ constexpr size_t kNameSize = 32;  // with the terminator
 template <typename Info, int capacity>
 class SlotTable {
   public:
-    Info &operator[](int slot) { return slots_[slot].info; }
+    // A line of the cache each, so that threads at neighbouring slots do not slow each other.
+    struct alignas(64) Slot {
+        std::atomic<int32_t> handle;
+        Info info;
 
-    // The slot of a live handle, -1 for none. One look when the hint is right, a scan when it is
-    // not: for an unknown handle, and when another handle has the same place among the hints.
-    int FindByHandle(int32_t handle) const {
-        if (handle <= kFree) {
-            return -1;
+        // Whether the slot still belongs to this handle.
+        bool Has(int32_t wanted, std::memory_order order) const {
+            return handle.load(order) == wanted;
         }
-        const int hint = HintOf(handle).load(std::memory_order_relaxed);
-        return __builtin_expect(IsLive(hint, handle), 1) ? hint : ScanForHandle(handle, hint);
+    };
+
+    // The slot of a live handle, null for none. One look when the hint is right, a scan when it is
+    // not: for an unknown handle, and when another handle has the same place among the hints.
+    // Read with `order`; with relaxed, what belongs to the slot may not be looked at yet.
+    Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
+        if (handle <= kFree) {
+            return nullptr;
+        }
+        Slot *hint = &slots_[HintOf(handle).load(std::memory_order_relaxed)];
+        return __builtin_expect(hint->Has(handle, order), 1) ? hint : Scan(handle, hint);
     }
 
     // The handle of the lowest live slot of this name, kInvalidHandle for none and for null.
     int32_t FindByName(const char *name) const {
-        if (name == nullptr || strnlen(name, kNameSize) >= kNameSize) {
+        const size_t length = name != nullptr ? LengthWithin(name, kNameSize) : kNameSize;
+        if (length == kNameSize) {
             return kInvalidHandle;
         }
-        const PackedName wanted(name);
-        for (int slot = 0; slot < capacity; slot++) {
-            const int32_t handle = slots_[slot].handle.load(std::memory_order_acquire);
-            if (handle != kFree && HasName(slot, wanted) && IsLive(slot, handle)) {
-                return handle;
+        const PackedName wanted(name, length);
+        const uint32_t digest = wanted.Digest();
+        for (const std::atomic<uint32_t> &candidate : digests_) {
+            if (candidate.load(std::memory_order_relaxed) == digest) {
+                const int32_t handle = HandleOfName(&candidate - digests_, wanted);
+                if (handle != kFree) {
+                    return handle;
+                }
             }
         }
         return kInvalidHandle;
     }
 
-    // Whether the slot still belongs to this handle.
-    bool IsLive(int slot, int32_t handle) const {
-        return slots_[slot].handle.load(std::memory_order_acquire) == handle;
+    // The number of a slot in the log: from 0 on, -1 for null.
+    int NumberOf(const Slot *slot) const {
+        return slot != nullptr ? static_cast<int>(slot - slots_) : -1;
     }
-
-    // The handle that the slot belongs to, 0 for none.
-    int32_t HandleOf(int slot) const { return slots_[slot].handle.load(std::memory_order_acquire); }
 
     // The slots in use. Exact for the holder of the guard, a moment old for any other thread.
     int32_t Count() const { return count_.load(std::memory_order_relaxed); }
 
-    // The lowest slot from `first` on that a new object may take. -1 for none, and for good once
-    // every handle has been given out.
-    int FirstFree(int first = 0) const {
-        for (int slot = first; slot < capacity && HasHandles(); slot++) {
-            if (HandleOf(slot) == kFree) {
-                return slot;
+    // The lowest slot that a new object may take, after `last` where that is given. Null for none,
+    // and for good once every handle has been given out.
+    Slot *FirstFree(const Slot *last = nullptr) {
+        for (int slot = NumberOf(last) + 1; slot < capacity && HasHandles(); slot++) {
+            if (slots_[slot].Has(kFree, std::memory_order_relaxed)) {
+                return &slots_[slot];
             }
         }
-        return -1;
+        return nullptr;
     }
 
     // Whether there is a handle left to give out.
@@ -79,19 +94,19 @@ class SlotTable {
 
     // Makes a free slot visible under a name of at most 31 characters. The slot's Info is complete
     // by now. Returns its handle.
-    int32_t Publish(int slot, const char *name) {
+    int32_t Publish(Slot *slot, const char *name) {
         const int32_t handle = ++given_;
-        StoreName(slot, PackedName(name));
-        HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
-        slots_[slot].handle.store(handle, std::memory_order_release);
+        StoreName(NumberOf(slot), PackedName(name, LengthWithin(name, kNameSize - 1)));
+        HintOf(handle).store(static_cast<uint32_t>(NumberOf(slot)), std::memory_order_relaxed);
+        slot->handle.store(handle, std::memory_order_release);
         count_.fetch_add(1, std::memory_order_relaxed);
         return handle;
     }
 
     // Makes the slot invisible; its Info may be taken apart now. Returns how many are left in use.
-    int32_t Withdraw(int slot) {
-        slots_[slot].handle.store(kFree, std::memory_order_relaxed);
-        StoreName(slot, PackedName(""));
+    int32_t Withdraw(Slot *slot) {
+        slot->handle.store(kFree, std::memory_order_relaxed);
+        digests_[NumberOf(slot)].store(0, std::memory_order_relaxed);
         return count_.fetch_sub(1, std::memory_order_relaxed) - 1;
     }
 
@@ -99,65 +114,76 @@ class SlotTable {
     static constexpr int32_t kFree = 0;
     static constexpr size_t kNameWords = kNameSize / sizeof(uint32_t);
     static constexpr size_t kHints = 256;
-    static_assert(capacity > 0 && capacity <= 256, "a hint is one byte");
     static constexpr size_t kSlots = static_cast<size_t>(capacity);
 
+    // A name as words, up to the one that holds its terminator: what lies behind does not count.
     struct PackedName {
-        explicit PackedName(const char *name) { memcpy(words, name, strnlen(name, kNameSize - 1)); }
-        uint32_t words[kNameWords] = {};
-    };
-
-    // A line of the cache each, so that threads at neighbouring slots do not slow each other.
-    struct alignas(64) Slot {
-        std::atomic<int32_t> handle;
-        Info info;
+        PackedName(const char *name, size_t length) : used(length / sizeof(uint32_t) + 1) {
+            words[used - 1] = 0;
+            memcpy(words, name, length);
+        }
+        // Never 0, which is no name's.
+        uint32_t Digest() const {
+            uint32_t digest = 0;
+            for (size_t i = 0; i < used; i++) {
+                digest = digest * 31 + words[i];
+            }
+            return digest | 1;
+        }
+        const size_t used;
+        uint32_t words[kNameWords];
     };
 
     // Kept out of line, so that it does not weigh on the lookups that find their handle at once.
-    __attribute__((noinline, cold)) int ScanForHandle(int32_t handle, int hint) const {
-        for (int slot = 0; slot < capacity; slot++) {
-            if (!IsLive(slot, handle)) {
+    __attribute__((noinline, cold)) Slot *Scan(int32_t handle, const Slot *hint) {
+        for (Slot &slot : slots_) {
+            if (!slot.Has(handle, std::memory_order_acquire)) {
                 continue;
             }
             // Two live handles may share a hint, which then belongs to one of them. A hint that
             // points to no live handle of the two has been left behind, and is corrected.
-            const int32_t hinted = HandleOf(hint);
+            const int32_t hinted = hint->handle.load(std::memory_order_relaxed);
             if (hinted == kFree || &HintOf(hinted) != &HintOf(handle)) {
-                HintOf(handle).store(static_cast<uint8_t>(slot), std::memory_order_relaxed);
+                HintOf(handle).store(static_cast<uint32_t>(NumberOf(&slot)),
+                                     std::memory_order_relaxed);
             }
-            return slot;
+            return &slot;
         }
-        return -1;
+        return nullptr;
     }
 
-    // Acquire and release on the words order them before the second look at the handle: a lookup
-    // that reads a word of a later owner then finds that the earlier handle is gone.
-    bool HasName(int slot, const PackedName &wanted) const {
-        for (size_t i = 0; i < kNameWords; i++) {
-            if (names_[slot][i].load(std::memory_order_acquire) != wanted.words[i]) {
-                return false;
+    // The handle of a slot whose name is this one, kFree for another. The acquire of the first look
+    // keeps the words from being older than the handle. A word that is younger was stored after the
+    // fence of StoreName, which the fence here meets: then the second look finds the handle gone.
+    int32_t HandleOfName(ptrdiff_t slot, const PackedName &wanted) const {
+        const int32_t handle = slots_[slot].handle.load(std::memory_order_acquire);
+        for (size_t i = 0; i < wanted.used; i++) {
+            if (names_[slot][i].load(std::memory_order_relaxed) != wanted.words[i]) {
+                return kFree;
             }
         }
-        return true;
+        std::atomic_thread_fence(std::memory_order_acquire);
+        return slots_[slot].Has(handle, std::memory_order_relaxed) ? handle : kFree;
     }
 
     void StoreName(int slot, const PackedName &name) {
-        for (size_t i = 0; i < kNameWords; i++) {
-            names_[slot][i].store(name.words[i], std::memory_order_release);
+        std::atomic_thread_fence(std::memory_order_release);
+        for (size_t i = 0; i < name.used; i++) {
+            names_[slot][i].store(name.words[i], std::memory_order_relaxed);
         }
+        digests_[slot].store(name.Digest(), std::memory_order_relaxed);
     }
 
-    std::atomic<uint8_t> &HintOf(int32_t handle) const {
+    std::atomic<uint32_t> &HintOf(int32_t handle) {
         return hints_[static_cast<uint32_t>(handle) % kHints];
     }
 
     Slot slots_[kSlots];
-    std::atomic<uint32_t> names_[kSlots][kNameWords];
     // hints_[handle % kHints] is the slot at which to look first; the handle found there decides.
-    mutable std::atomic<uint8_t> hints_[kHints];
+    std::atomic<uint32_t> hints_[kHints];
+    std::atomic<uint32_t> digests_[kSlots];  // of the names, 0 where there is none
+    std::atomic<uint32_t> names_[kSlots][kNameWords];
     std::atomic<int32_t> count_;
-
-  protected:
     int32_t given_;  // handles given out so far, 1 to this one; used under the guard only
 };
 

@@ -17,7 +17,7 @@
 #include <semaphore.h>
 #include <stdlib.h>
 
-#include "Varnek_List.h"
+#include "Varnek_ListLink.h"
 #include "Varnek_Lock.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_SlotTable.h"
@@ -58,7 +58,8 @@ struct Start {
 constexpr uint32_t kRemoved = 0x80000000u;
 constexpr int kLeaveTries = 1000;  // of a millisecond
 
-SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE> gThreadInfoArr;
+using Threads = SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE>;
+Threads gThreadInfoArr;
 
 // The handle of the guard "VarnekThreadMutex"; kNoGuard until the first creation makes it.
 constexpr int32_t kNoGuard = HoldMutex::kNoMutex;
@@ -122,8 +123,7 @@ bool EnsureGuard() {
 
 // Takes a removed record apart. Runs in the record's last user, which is why the queue needs no
 // lock here.
-void Dispose(int slot) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
-    THREAD_MGR_INFO &info = gThreadInfoArr[slot];
+void Dispose(THREAD_MGR_INFO &info) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
     if (sem_destroy(&info.msgQSem) != 0) {
         TRACE_ERROR("***** %s : semaphore destroy FAIL!! errCode = [%d]", info.removedBy,
                     VarnekPGL_SysGetLastErro());
@@ -131,22 +131,25 @@ void Dispose(int slot) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
     if (info.MsgQ.count > 0) {
         VARNEK_TRACE(info.unreadMask, "***** %s : MsgQ is not empty!!size = [%d]", info.removedBy,
                      info.MsgQ.count);
-        while (void *message = list_removeHead(&info.MsgQ)) {
-            free(message);
+        while (list_node_t *node = info.MsgQ.head) {
+            Unlink(&info.MsgQ, node);
+            free(node);
         }
     }
     info.users.fetch_and(~kRemoved, std::memory_order_release);
 }
 
-void Leave(int slot) {
-    if (gThreadInfoArr[slot].users.fetch_sub(1, std::memory_order_acq_rel) == kRemoved + 1) {
-        Dispose(slot);
+// Only the last user looks at what the others did, so only that one acquires it.
+void Leave(THREAD_MGR_INFO &info) {
+    if (info.users.fetch_sub(1, std::memory_order_release) == kRemoved + 1) {
+        (void)info.users.load(std::memory_order_acquire);
+        Dispose(info);
     }
 }
 
 // Keeps the record of this handle in one piece until Leave. False when it is gone.
-bool Enter(int slot, int32_t hThread) {
-    std::atomic<uint32_t> &users = gThreadInfoArr[slot].users;
+bool Enter(Threads::Slot *slot, int32_t hThread) {
+    std::atomic<uint32_t> &users = slot->info.users;
     uint32_t count = users.load(std::memory_order_relaxed);
     do {
         if ((count & kRemoved) != 0) {
@@ -155,8 +158,8 @@ bool Enter(int slot, int32_t hThread) {
     } while (!users.compare_exchange_weak(count, count + 1, std::memory_order_acquire,
                                           std::memory_order_relaxed));
     // The slot may have changed hands since it was looked up.
-    if (!gThreadInfoArr.IsLive(slot, hThread)) {
-        Leave(slot);
+    if (!slot->Has(hThread, std::memory_order_acquire)) {
+        Leave(slot->info);
         return false;
     }
     return true;
@@ -166,27 +169,30 @@ bool Enter(int slot, int32_t hThread) {
 class RecordUse {
   public:
     explicit RecordUse(int32_t hThread)
-        : hThread_(hThread), slot_(gThreadInfoArr.FindByHandle(hThread)) {
-        if (slot_ != -1 && !Enter(slot_, hThread)) {
-            slot_ = -1;
+        : RecordUse(hThread, gThreadInfoArr.Find(hThread, std::memory_order_relaxed)) {}
+    RecordUse(int32_t hThread, Threads::Slot *slot) : hThread_(hThread), slot_(slot) {
+        if (slot_ != nullptr && !Enter(slot_, hThread)) {
+            slot_ = nullptr;
         }
     }
     ~RecordUse() {
-        if (slot_ != -1) {
-            Leave(slot_);
+        if (slot_ != nullptr) {
+            Leave(slot_->info);
         }
     }
     RecordUse(const RecordUse &) = delete;
     RecordUse &operator=(const RecordUse &) = delete;
 
-    int Slot() const { return slot_; }  // -1 for none
-    THREAD_MGR_INFO &Info() const { return gThreadInfoArr[slot_]; }
-    // Whether the record has not been removed meanwhile.
-    bool IsLive() const { return gThreadInfoArr.IsLive(slot_, hThread_); }
+    bool Entered() const { return slot_ != nullptr; }
+    int Number() const { return gThreadInfoArr.NumberOf(slot_); }  // -1 for none
+    THREAD_MGR_INFO &Info() const { return slot_->info; }
+    // Whether the record has not been removed meanwhile. What was done before a removal is there
+    // for whoever was woken by it, so the handle needs no acquire.
+    bool IsLive() const { return slot_->Has(hThread_, std::memory_order_relaxed); }
 
   private:
     const int32_t hThread_;
-    int slot_;
+    Threads::Slot *slot_;
 };
 
 // Threads ----------------------------------------------------------------------------------------
@@ -199,15 +205,15 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
         VarnekPGL_AcquireMutex(guard);  // reports that there is no guard, as the release below does
     }
     HoldMutex hold(guard);
-    const int slot = hold.IsHeld() ? gThreadInfoArr.FindByHandle(hThread) : -1;
-    if (slot == -1) {
+    Threads::Slot *const slot = hold.IsHeld() ? gThreadInfoArr.Find(hThread) : nullptr;
+    if (slot == nullptr) {
         TRACE_ERROR("***** %s : Can't find thread info. thread handle = [%d]", operation, hThread);
         if (guard == kNoGuard) {
             VarnekPGL_ReleaseMutex(guard);
         }
         return FALSE;
     }
-    THREAD_MGR_INFO &info = gThreadInfoArr[slot];
+    THREAD_MGR_INFO &info = slot->info;
     const int32_t count = gThreadInfoArr.Withdraw(slot);
     info.removedBy = operation;
     info.unreadMask = unreadMask;
@@ -215,7 +221,7 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
     // a waiter the post goes with the semaphore.
     sem_post(&info.msgQSem);
     if (info.users.fetch_or(kRemoved, std::memory_order_acq_rel) == 0) {
-        Dispose(slot);
+        Dispose(info);
     }
     hold.Release();
     TRACE_LOW("***** END : %s, %d", operation, count);
@@ -232,7 +238,7 @@ void __Varnek_delete_thread_info(int32_t hThread) {
 void *ThreadEntry(void *begin) {
     const Start start = *static_cast<Start *>(begin);
     free(begin);
-    if (gThreadInfoArr.FindByHandle(start.hHandle) == -1) {
+    if (gThreadInfoArr.Find(start.hHandle) == nullptr) {
         const HoldMutex created(Guard());
     }
     const pthread_key_t key =
@@ -265,9 +271,9 @@ int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize, St
 
 // Fills the record at `slot` and starts its thread; the guard is held. The record becomes visible
 // once the thread exists, so a handle that is given back was never seen.
-int32_t StartRecord(int slot, const char *szThreadName, int32_t priority, uint32_t stackSize,
-                    void *(*function)(void *), void *argument) {
-    THREAD_MGR_INFO &info = gThreadInfoArr[slot];
+int32_t StartRecord(Threads::Slot *slot, const char *szThreadName, int32_t priority,
+                    uint32_t stackSize, void *(*function)(void *), void *argument) {
+    THREAD_MGR_INFO &info = slot->info;
     if (sem_init(&info.msgQSem, 0, 0) != 0) {
         return VARNEK_FAIL(-1,
                            "***** __Varnek_create_thread : MsgQ Sem creation FAIL!! errCode = [%d]",
@@ -292,27 +298,26 @@ int32_t StartRecord(int slot, const char *szThreadName, int32_t priority, uint32
 }
 
 // The lowest slot whose record is neither in use nor waiting for its last user; the guard is held.
-int FirstFreeRecord() {
-    int slot = gThreadInfoArr.FirstFree();
-    while (slot != -1 &&
-           (gThreadInfoArr[slot].users.load(std::memory_order_acquire) & kRemoved) != 0) {
-        slot = gThreadInfoArr.FirstFree(slot + 1);
+Threads::Slot *FirstFreeRecord() {
+    Threads::Slot *slot = gThreadInfoArr.FirstFree();
+    while (slot != nullptr && (slot->info.users.load(std::memory_order_acquire) & kRemoved) != 0) {
+        slot = gThreadInfoArr.FirstFree(slot);
     }
     return slot;
 }
 
 // Claims a slot, under the guard, which it may release and take again: a removed record is free
-// once its last user has left, and that takes a moment. -1 for none; the guard may then be lost.
-int ClaimRecord(HoldMutex *guard) {
-    int slot = FirstFreeRecord();
-    for (int i = 0;
-         i < kLeaveTries && slot == -1 && gThreadInfoArr.Count() < MAX_THREAD_MGR_INFO_ARR_SIZE &&
-         gThreadInfoArr.HasHandles() && guard->IsHeld();
+// once its last user has left, and that takes a moment. Null for none; the guard may then be lost.
+Threads::Slot *ClaimRecord(HoldMutex *guard) {
+    Threads::Slot *slot = FirstFreeRecord();
+    for (int i = 0; i < kLeaveTries && slot == nullptr &&
+                    gThreadInfoArr.Count() < MAX_THREAD_MGR_INFO_ARR_SIZE &&
+                    gThreadInfoArr.HasHandles() && guard->IsHeld();
          i++) {
         guard->Release();
         VarnekPGL_MSleep(1);
         guard->Acquire();
-        slot = guard->IsHeld() ? FirstFreeRecord() : -1;
+        slot = guard->IsHeld() ? FirstFreeRecord() : nullptr;
     }
     return slot;
 }
@@ -351,13 +356,13 @@ int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint3
     }
 
     HoldMutex guard(Guard());
-    const int slot = guard.IsHeld() ? ClaimRecord(&guard) : -1;
-    if (slot == -1) {
+    Threads::Slot *const slot = guard.IsHeld() ? ClaimRecord(&guard) : nullptr;
+    if (slot == nullptr) {
         return VARNEK_FAIL(-1, "***** __Varnek_create_thread : Can't find empty index!!!!");
     }
     const int32_t hHandle =
         StartRecord(slot, szThreadName, priority, stackSize, function, argument);
-    const int linuxThread = static_cast<int>(gThreadInfoArr[slot].linuxThread);
+    const int linuxThread = static_cast<int>(slot->info.linuxThread);
     guard.Release();
     if (hHandle == -1) {
         return VARNEK_FAIL(-1, "***** END : __Varnek_create_thread, thread creation failed");
@@ -367,16 +372,29 @@ int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint3
     return hHandle;
 }
 
-// The calling thread's handle, kInvalidHandle when the registry has not started it or its record
-// has been removed. In a thread that the registry has not started nothing is under the key.
-int32_t HandleOfSelf() {
+// The calling thread's handle, and its slot for RecordUse.
+struct Self {
+    int32_t hThread;
+    Threads::Slot *slot;
+};
+
+// kInvalidHandle when the registry has not started the calling thread, under whose key nothing is
+// then, or when its record has been removed. Part of each receive.
+inline __attribute__((always_inline)) Self FindSelf() {
+    TRACE_LOW_QUICK("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]",
+                    static_cast<int>(pthread_self()));
     const uint32_t key = gSelfKey.load(std::memory_order_relaxed);
-    if (key == 0) {
-        return kInvalidHandle;
+    const void *const held =
+        key != 0 ? pthread_getspecific(static_cast<pthread_key_t>(key - 1)) : nullptr;
+    const int32_t hThread = static_cast<int32_t>(reinterpret_cast<intptr_t>(held));
+    Threads::Slot *const slot = gThreadInfoArr.Find(hThread, std::memory_order_relaxed);
+    if (slot == nullptr) {
+        TRACE_ERROR("***** VarnekPGL_GetCurrentThread : Can't find thread Info. pthreadID = [%d]",
+                    static_cast<int>(pthread_self()));
+        return {kInvalidHandle, nullptr};
     }
-    const void *self = pthread_getspecific(static_cast<pthread_key_t>(key - 1));
-    const int32_t hThread = static_cast<int32_t>(reinterpret_cast<intptr_t>(self));
-    return gThreadInfoArr.FindByHandle(hThread) != -1 ? hThread : kInvalidHandle;
+    TRACE_LOW_QUICK("***** END : VarnekPGL_GetCurrentThread. thread handle = [%d]", hThread);
+    return {hThread, slot};
 }
 
 }  // namespace
@@ -416,54 +434,47 @@ int32_t VarnekPGL_GetThreadByName(const char *szThreadName) {
 }
 
 int32_t VarnekPGL_GetCurrentThread() {
-    const pthread_t self = pthread_self();
-    TRACE_LOW_QUICK("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]",
-                    static_cast<int>(self));
-    const int32_t hThread = HandleOfSelf();
-    if (hThread == kInvalidHandle) {
-        return VARNEK_FAIL(
-            -1, "***** VarnekPGL_GetCurrentThread : Can't find thread Info. pthreadID = [%d]",
-            static_cast<int>(self));
-    }
-    TRACE_LOW_QUICK("***** END : VarnekPGL_GetCurrentThread. thread handle = [%d]", hThread);
-    return hThread;
+    return FindSelf().hThread;
 }
 
 // Messages ---------------------------------------------------------------------------------------
 
 namespace {
 
-// Copies a message into a block of its own and puts it into the queue. False when memory is short;
-// nothing is left behind then. Messages are copied as bytes: a caller's record may lie anywhere.
-bool Enqueue(THREAD_MGR_INFO &info, const void *message, void (*insert)(list_t *, void *)) {
-    void *block = malloc(sizeof(THREAD_MSG));
-    if (block == nullptr) {
+// A queued message, in one block with its node.
+struct Queued {
+    list_node_t node;
+    THREAD_MSG message;
+};
+
+// Copies a message into a block of its own and puts it into the queue, before the head when it is
+// urgent. False when memory is short. Messages are copied as bytes: a caller's record may lie
+// anywhere. Inlined, since a stack does it all day.
+inline __attribute__((always_inline)) bool Enqueue(THREAD_MGR_INFO &info, const void *message,
+                                                   bool urgent) {
+    Queued *queued = static_cast<Queued *>(malloc(sizeof(Queued)));
+    if (queued == nullptr) {
         return false;
     }
-    memcpy(block, message, sizeof(THREAD_MSG));
-    Hold hold(info.queueLock);
-    const int32_t before = info.MsgQ.count;
-    insert(&info.MsgQ, block);
-    const bool inserted = info.MsgQ.count != before;
-    hold.Release();
-    if (!inserted) {
-        free(block);
-    }
-    return inserted;
+    memcpy(&queued->message, message, sizeof queued->message);
+    const Hold hold(info.queueLock);
+    LinkBefore(&info.MsgQ, urgent ? info.MsgQ.head : nullptr, &queued->node, &queued->message);
+    return true;
 }
 
 // Moves the first message out of the queue. False when there is none.
-bool Dequeue(THREAD_MGR_INFO &info, void *message, int32_t *count) {
+inline __attribute__((always_inline)) bool Dequeue(THREAD_MGR_INFO &info, void *message,
+                                                   int32_t *count) {
     Hold hold(info.queueLock);
-    void *block = list_removeHead(&info.MsgQ);
-    const int32_t left = info.MsgQ.count;
-    hold.Release();
-    if (block == nullptr) {
+    list_node_t *const node = info.MsgQ.head;
+    if (node == nullptr) {
         return false;
     }
-    memcpy(message, block, sizeof(THREAD_MSG));
-    free(block);
-    *count = left;
+    Unlink(&info.MsgQ, node);
+    *count = info.MsgQ.count;
+    hold.Release();
+    memcpy(message, node->data, sizeof(THREAD_MSG));
+    free(node);  // the whole block
     return true;
 }
 
@@ -488,12 +499,12 @@ BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendMessage: message is NULL");
     }
     const RecordUse use(hThread);
-    if (use.Slot() == -1) {
+    if (!use.Entered()) {
         return VARNEK_FAIL(
             FALSE, "***** VarnekPGL_SendMessage. Can't find thread info. thread = [%d]", hThread);
     }
-    TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: ThreadMgr arrIdx = %d", use.Slot());
-    if (!Enqueue(use.Info(), message, list_insert)) {
+    TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: ThreadMgr arrIdx = %d", use.Number());
+    if (!Enqueue(use.Info(), message, false)) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendMessage: memalloc failed");
     }
     sem_t *msgQSem = &use.Info().msgQSem;
@@ -517,12 +528,12 @@ BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendUrgentMessage: message is NULL");
     }
     const RecordUse use(hThread);
-    if (use.Slot() == -1) {
+    if (!use.Entered()) {
         return VARNEK_FAIL(
             FALSE, "***** VarnekPGL_SendUrgentMessage. Can't find thread info. thread = [%d]",
             hThread);
     }
-    if (!Enqueue(use.Info(), message, list_insertHead)) {
+    if (!Enqueue(use.Info(), message, true)) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendUrgentMessage: memalloc failed");
     }
     if (sem_post(&use.Info().msgQSem) != 0) {
@@ -534,7 +545,7 @@ BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message) {
 }
 
 BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *count) {
-    const int32_t curThread = VarnekPGL_GetCurrentThread();
+    const auto [curThread, slot] = FindSelf();
     TRACE_LOW_QUICK("***** START : VarnekPGL_ReceiveMessage. current thread = %d", curThread);
     if (message == nullptr || count == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_ReceiveMessage: message or count is NULL");
@@ -543,9 +554,9 @@ BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *co
         return VARNEK_FAIL(FALSE,
                            "***** VarnekPGL_ReceiveMessage. Can't find current thread handle");
     }
-    const RecordUse use(curThread);
-    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: arrIdx = %d", use.Slot());
-    if (use.Slot() == -1) {
+    const RecordUse use(curThread, slot);
+    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: arrIdx = %d", use.Number());
+    if (!use.Entered()) {
         return VARNEK_FAIL(
             FALSE, "VarnekPGL_ReceiveMessage: Can't find current thread Info. curThread = [%d]",
             curThread);
@@ -577,7 +588,7 @@ BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *co
 }
 
 BOOL VarnekPGL_PeekMessage(THREAD_MSG *message, int32_t *count) {
-    const int32_t curThread = VarnekPGL_GetCurrentThread();
+    const auto [curThread, slot] = FindSelf();
     TRACE_LOW("***** START : VarnekPGL_PeekMessage. current thread = %d", curThread);
     if (message == nullptr || count == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_PeekMessage: message or count is NULL");
@@ -585,9 +596,9 @@ BOOL VarnekPGL_PeekMessage(THREAD_MSG *message, int32_t *count) {
     if (curThread == kInvalidHandle) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_PeekMessage. Can't find current thread handle");
     }
-    const RecordUse use(curThread);
-    TRACE_LOW("VarnekPGL_PeekMessage: arrIdx = %d", use.Slot());
-    if (use.Slot() == -1) {
+    const RecordUse use(curThread, slot);
+    TRACE_LOW("VarnekPGL_PeekMessage: arrIdx = %d", use.Number());
+    if (!use.Entered()) {
         return VARNEK_FAIL(
             FALSE, "VarnekPGL_PeekMessage: Can't find current thread Info. curThread = [%d]",
             curThread);
