@@ -237,10 +237,10 @@ TEST_F(Thread, HandlesEnd) {
     static LateTable table;
     EXPECT_EQ(table.Publish(table.FirstFree(), "a"), INT32_MAX - 1);
     EXPECT_EQ(table.Publish(table.FirstFree(), "b"), INT32_MAX);
-    EXPECT_EQ(table.FindByHandle(INT32_MAX), 1);
-    EXPECT_EQ(table.FirstFree(), -1);
-    EXPECT_EQ(table.Withdraw(0), 1);
-    EXPECT_EQ(table.FirstFree(), -1) << "no handle is left for a free slot";
+    EXPECT_EQ(table.NumberOf(table.Find(INT32_MAX)), 1);
+    EXPECT_EQ(table.FirstFree(), nullptr);
+    EXPECT_EQ(table.Withdraw(table.Find(INT32_MAX - 1)), 1);
+    EXPECT_EQ(table.FirstFree(), nullptr) << "no handle is left for a free slot";
 }
 
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {

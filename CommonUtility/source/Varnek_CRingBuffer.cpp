@@ -88,8 +88,8 @@ void Advance(int *pos, int *laps, int length, int size) {
 }
 
 // A null pointer comes with nothing to copy.
-void Copy(unsigned char *to, const unsigned char *from, int count) {
-    if (count > 0 && to != nullptr && from != nullptr) {
+inline void Copy(unsigned char *to, const unsigned char *from, int count) {
+    if (count > 0) {
         memcpy(to, from, static_cast<size_t>(count));
     }
 }
@@ -116,7 +116,9 @@ int VarnekRingState::Check(const VarnekCRingBuffer &ring) {
     return ahead > 0 ? VARNEK_RING_OVERFLOW : VARNEK_RING_UNDERFLOW;
 }
 
-void VarnekRingState::Recover(VarnekCRingBuffer *ring, HoldMutex *hold) {
+// Inlined, so that the holder of the mutex stays in registers.
+inline __attribute__((always_inline)) void VarnekRingState::Recover(VarnekCRingBuffer *ring,
+                                                                    HoldMutex *hold) {
     hold->Release();
     TRACE_MID("Ring Buffer will be reset!!!\n");
     hold->Acquire();
@@ -292,10 +294,15 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
             writelen);
     }
     const int tail = iRingSize - iWritePos;
-    const int first = writelen < tail ? writelen : tail;
-    Copy(pRingBuf + iWritePos, data, first);
-    Copy(pRingBuf, data + first, writelen - first);
-    Advance(&iWritePos, &iWriteLoopCnt, writelen, iRingSize);
+    if (writelen < tail) {
+        Copy(pRingBuf + iWritePos, data, writelen);
+        iWritePos += writelen;
+        return 0;
+    }
+    Copy(pRingBuf + iWritePos, data, tail);
+    Copy(pRingBuf, data + tail, writelen - tail);
+    iWritePos = writelen - tail;
+    iWriteLoopCnt = State::AddLaps(iWriteLoopCnt, 1);
     return 0;
 }
 
@@ -335,9 +342,14 @@ int VarnekCRingBuffer::Read(unsigned char *dest, int readLen) {
                            readLen, available);
     }
     const int tail = iRingSize - iReadPos;
-    const int first = readLen < tail ? readLen : tail;
-    Copy(dest, pRingBuf + iReadPos, first);
-    Copy(dest + first, pRingBuf, readLen - first);
-    Advance(&iReadPos, &iReadLoopCnt, readLen, iRingSize);
+    if (readLen < tail) {
+        Copy(dest, pRingBuf + iReadPos, readLen);
+        iReadPos += readLen;
+        return 0;
+    }
+    Copy(dest, pRingBuf + iReadPos, tail);
+    Copy(dest + tail, pRingBuf, readLen - tail);
+    iReadPos = readLen - tail;
+    iReadLoopCnt = State::AddLaps(iReadLoopCnt, 1);
     return 0;
 }

@@ -51,6 +51,12 @@ class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
     bool held_ = false;
 };
 
+// What VarnekPGL_AcquireMutex does; hands the mutex out, null when it was not taken. It cannot be
+// deleted while it is held, so UnlockMutex, which is the rest of VarnekPGL_ReleaseMutex, looks for
+// nothing.
+pthread_mutex_t *LockMutex(int32_t hMutex);
+BOOL UnlockMutex(pthread_mutex_t *mutex);
+
 // Holds a named mutex to the end of the scope, or up to its release; nothing for an object without
 // a mutex (kNoMutex). IsHeld says whether the mutex could be taken; one that could not is released
 // all the same, so that the log has the lines of both calls.
@@ -63,22 +69,25 @@ class HoldMutex {
     HoldMutex(const HoldMutex &) = delete;
     HoldMutex &operator=(const HoldMutex &) = delete;
 
-    bool IsHeld() const { return held_; }
+    bool IsHeld() const { return held_ != nullptr; }
     void Acquire() {
         tried_ = hMutex_ != kNoMutex;
-        held_ = tried_ && VarnekPGL_AcquireMutex(hMutex_) != FALSE;
+        held_ = tried_ ? LockMutex(hMutex_) : nullptr;
     }
     void Release() {
-        if (tried_) {
+        if (held_ != nullptr) {
+            UnlockMutex(held_);
+        } else if (tried_) {
             VarnekPGL_ReleaseMutex(hMutex_);
         }
-        tried_ = held_ = false;
+        tried_ = false;
+        held_ = nullptr;
     }
 
   private:
     const int32_t hMutex_;
     bool tried_ = false;
-    bool held_ = false;
+    pthread_mutex_t *held_ = nullptr;
 };
 
 #endif

@@ -114,18 +114,41 @@ BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
     return TRUE;
 }
 
-BOOL VarnekPGL_AcquireMutex(int32_t hMutex) {
+// Both inlined, since they are all that their exported operations are.
+static inline __attribute__((always_inline)) pthread_mutex_t *FindAndLock(int32_t hMutex) {
     auto *const slot = gMutexArr.Find(hMutex);
     if (slot == nullptr) {
-        return VARNEK_FAIL(
-            FALSE, "***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [%d]",
-            hMutex);
+        TRACE_ERROR("***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [%d]",
+                    hMutex);
+        return nullptr;
     }
     if (!Succeeded(pthread_mutex_lock(&slot->info.linuxMutex))) {
-        return VARNEK_FAIL(FALSE, "***** VarnekPGL_AcquireMutex : Mutex Lock FAIL! errCode = [%d]",
+        TRACE_ERROR("***** VarnekPGL_AcquireMutex : Mutex Lock FAIL! errCode = [%d]",
+                    VarnekPGL_SysGetLastErro());
+        return nullptr;
+    }
+    return &slot->info.linuxMutex;
+}
+
+static inline __attribute__((always_inline)) BOOL Unlock(pthread_mutex_t *mutex) {
+    if (!Succeeded(pthread_mutex_unlock(mutex))) {
+        return VARNEK_FAIL(FALSE,
+                           "***** VarnekPGL_ReleaseMutex : Mutex Unlock FAIL! errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
     }
     return TRUE;
+}
+
+pthread_mutex_t *LockMutex(int32_t hMutex) {
+    return FindAndLock(hMutex);
+}
+
+BOOL UnlockMutex(pthread_mutex_t *mutex) {
+    return Unlock(mutex);
+}
+
+BOOL VarnekPGL_AcquireMutex(int32_t hMutex) {
+    return FindAndLock(hMutex) != nullptr ? TRUE : FALSE;
 }
 
 BOOL VarnekPGL_ReleaseMutex(int32_t hMutex) {
@@ -135,12 +158,7 @@ BOOL VarnekPGL_ReleaseMutex(int32_t hMutex) {
             FALSE, "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [%d]",
             hMutex);
     }
-    if (!Succeeded(pthread_mutex_unlock(&slot->info.linuxMutex))) {
-        return VARNEK_FAIL(FALSE,
-                           "***** VarnekPGL_ReleaseMutex : Mutex Unlock FAIL! errCode = [%d]",
-                           VarnekPGL_SysGetLastErro());
-    }
-    return TRUE;
+    return Unlock(&slot->info.linuxMutex);
 }
 
 int32_t VarnekPGL_GetMutexByName(const char *szMutexName) {

@@ -184,6 +184,8 @@ class SlotTable {
     std::atomic<uint32_t> digests_[kSlots];  // of the names, 0 where there is none
     std::atomic<uint32_t> names_[kSlots][kNameWords];
     std::atomic<int32_t> count_;
+
+  protected:
     int32_t given_;  // handles given out so far, 1 to this one; used under the guard only
 };
 
