@@ -44,6 +44,24 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
     EXPECT_TRUE(VarnekPGL_AcquireMutex(299) && VarnekPGL_ReleaseMutex(299));
 }
 
+TEST_F(Mutex, NamesThatResembleEachOther) {
+    // The first two have one digest; a slot keeps the rest of a longer name that it had before.
+    const char *const names[] = {"aaaazaaa", "baaa[aaa", "aaaazaaabbbb", "aaaa", "aaa"};
+    EXPECT_TRUE(VarnekPGL_DeleteMutex(VarnekPGL_CreateMutex("baaa[aaabbbbcccc")));
+    for (const char *name : names) {
+        const int32_t handle = VarnekPGL_CreateMutex(name);
+        EXPECT_NE(handle, -1) << name;
+        EXPECT_TRUE(VarnekPGL_DeleteMutex(handle));
+        EXPECT_EQ(VarnekPGL_GetMutexByName(name), -1);
+    }
+    for (int32_t i = 0; i < 5; i++) {
+        EXPECT_EQ(VarnekPGL_CreateMutex(names[i]), 7 + i);
+    }
+    for (int32_t i = 0; i < 5; i++) {
+        EXPECT_EQ(VarnekPGL_GetMutexByName(names[i]), 7 + i) << names[i];
+    }
+}
+
 TEST_F(Semaphore, ALogFunctionMayUseTheFamilyOnceTheLockIsFree) {
     static int32_t inner = 0;
     gLogHook = [](const LogLine &line) {

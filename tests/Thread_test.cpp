@@ -230,7 +230,7 @@ TEST_F(Thread, ALogFunctionGetsNoThreadWhileItsOwnCallMakesTheGuard) {
 
 // A table that has given out all handles but two.
 struct LateTable : SlotTable<int, 3> {
-    LateTable() { given_ = INT32_MAX - 2; }
+    LateTable() { SkipHandles(INT32_MAX - 2); }
 };
 
 TEST_F(Thread, HandlesEnd) {

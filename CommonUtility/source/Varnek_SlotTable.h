@@ -110,6 +110,10 @@ class SlotTable {
         return count_.fetch_sub(1, std::memory_order_relaxed) - 1;
     }
 
+  protected:
+    // As if so many handles had been given out.
+    void SkipHandles(int32_t given) { given_ = given; }
+
   private:
     static constexpr int32_t kFree = 0;
     static constexpr size_t kNameWords = kNameSize / sizeof(uint32_t);
@@ -184,8 +188,6 @@ class SlotTable {
     std::atomic<uint32_t> digests_[kSlots];  // of the names, 0 where there is none
     std::atomic<uint32_t> names_[kSlots][kNameWords];
     std::atomic<int32_t> count_;
-
-  protected:
     int32_t given_;  // handles given out so far, 1 to this one; used under the guard only
 };
 

@@ -131,10 +131,12 @@ void Dispose(THREAD_MGR_INFO &info) VARNEK_THREAD_SAFETY(no_thread_safety_analys
     if (info.MsgQ.count > 0) {
         VARNEK_TRACE(info.unreadMask, "***** %s : MsgQ is not empty!!size = [%d]", info.removedBy,
                      info.MsgQ.count);
-        while (list_node_t *node = info.MsgQ.head) {
-            Unlink(&info.MsgQ, node);
+        for (list_node_t *node = info.MsgQ.head; node != nullptr;) {
+            list_node_t *const next = node->next;
             free(node);
+            node = next;
         }
+        list_initialize(&info.MsgQ);
     }
     info.users.fetch_and(~kRemoved, std::memory_order_release);
 }
