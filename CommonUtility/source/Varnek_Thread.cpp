@@ -461,6 +461,7 @@ inline __attribute__((always_inline)) bool Enqueue(THREAD_MGR_INFO &info, const 
     memcpy(&queued->message, message, sizeof queued->message);
     const Hold hold(info.queueLock);
     LinkBefore(&info.MsgQ, urgent ? info.MsgQ.head : nullptr, &queued->node, &queued->message);
+    // cppcheck-suppress memleak  // the list owns the block, by the node in it
     return true;
 }
 
