@@ -168,7 +168,7 @@ void UseTimer(Worker &me) {
     for (uint32_t timeout : {1u, 20u, 1u + static_cast<uint32_t>(me.Below(3))}) {
         Start &start = gStarts[me.index][me.starts++ % 1024];
         start.worker = &me;
-        start.due = Microseconds() + timeout * 1000;
+        start.due = Microseconds() + int64_t{timeout} * 1000;
         CHECK(VarnekPGL_StartTimer(handle, timeout, OnTimer, &start) == TRUE || !mine);
         std::this_thread::sleep_for(std::chrono::microseconds(900 + me.Below(200)));
         VarnekPGL_CancelTimer(handle);
