@@ -60,52 +60,36 @@ TEST_F(File, PathsOf256CharactersAreRefused) {
 
 TEST_F(File, FailuresHaveTheirLineAndResult) {
     const std::string none = Path("none");
-    const std::string open = "VarnekPGL_OpenFile : NULL file pointer. szFilePath=[" + none + "]";
     const PglFileHandle writer = VarnekPGL_OpenFile(Path("w").c_str(), PGL_FILE_MODE_WRITE);
     const PglFileHandle full = VarnekPGL_OpenFile("/dev/full", PGL_FILE_MODE_WRITE);
     char buffer[8] = {};
-    const auto hex = [](PglFileHandle handle) {
-        char text[16];
-        snprintf(text, sizeof text, "0x%x", static_cast<unsigned>(handle));
-        return std::string(text);
-    };
+    char shown[16];
+    snprintf(shown, sizeof shown, "0x%x", static_cast<unsigned>(writer));
+    Show(shown, "WRITER");
     VarnekPGL_WriteFileByHandle(full, "data", 4);
-    ExpectRows({
-        {VarnekPGL_OpenFile(nullptr, 2), -1, {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[(null)]"}},
-        {VarnekPGL_CloseFile(0), -1, {"VarnekPGL_CloseFile : NULL file pointer"}},
-        {VarnekPGL_CloseFile(-1), -1, {"VarnekPGL_CloseFile : NULL file pointer"}},
-        {VarnekPGL_SeekFile(0, 0, 3), 0, {"VarnekPGL_SeekFile : NULL file pointer"}},
-        {VarnekPGL_SeekFile(writer, 0, 3), -8, {"VarnekPGL_SeekFile : Invalid Seek base! base=3"}},
-        {VarnekPGL_SeekFile(writer, -1, 0), -1, {"VarnekPGL_SeekFile : fail handle = " + hex(writer)}},
-        {VarnekPGL_TellFile(0), -1, {"VarnekPGL_TellFile : NULL file pointer"}},
-        {VarnekPGL_FlushFile(0), -1, {"VarnekPGL_FlushFile : NULL file pointer"}},
-        {VarnekPGL_FlushFile(full), -1, {"VarnekPGL_FlushFile : fail"}},
-        {VarnekPGL_ReadFileByHandle(0, buffer, 1), 0, {"VarnekPGL_ReadFileByHandle : NULL file pointer"}},
-        {VarnekPGL_WriteFileByHandle(0, buffer, 1), 0, {"VarnekPGL_WriteFileByHandle : NULL file pointer"}},
-        {VarnekPGL_WriteFileByHandle(writer, nullptr, 1), 0, {"VarnekPGL_WriteFileByHandle : NULL buffer"}},
-        {VarnekPGL_ReadFileByHandle(writer, nullptr, 1), 0, {"VarnekPGL_ReadFileByHandle : NULL buffer"}},
-        {VarnekPGL_ReadFileByHandle(writer, buffer, 8), 0, {}},
-        {VarnekPGL_GetFileSizeByHandle(0),
-         -1,
-         {"VarnekPGL_TellFile : NULL file pointer", "VarnekPGL_SeekFile : NULL file pointer",
-          "VarnekPGL_TellFile : NULL file pointer"}},
-        {VarnekPGL_ReadFile(none.c_str(), buffer, 8),
-         -18,
-         {open, "VarnekPGL_ReadFile : File doesn't exist! file path=[" + none + "]"}},
-        {VarnekPGL_GetFileSize(none.c_str()), 0, {open, "VarnekPGL_GetFileSize fail =[" + none + "]"}},
-        {VarnekPGL_CheckFile(none.c_str()), FALSE, {open, "VarnekPGL_CheckFile : fail " + none}},
-        {VarnekPGL_DeleteFile(none.c_str()), -1, {"VarnekPGL_DeleteFile : remove File[] Fail"}},
-        {VarnekPGL_WriteFile("/no/dir", "x", 1),
-         -18,
-         {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[/no/dir]",
-          "VarnekPGL_WriteFile : File doesn't exist! file path=[/no/dir]"}},
-        {VarnekPGL_AppendFile("/no/dir", "x", 1),
-         -18,
-         {"VarnekPGL_OpenFile : NULL file pointer. szFilePath=[/no/dir]",
-          "VarnekPGL_AppendFile : File doesn't exist! file path=[/no/dir]"}},
-        {VarnekPGL_WriteFile(Path("w").c_str(), nullptr, 1), 0, {"VarnekPGL_WriteFile : NULL buffer"}},
-        {VarnekPGL_AppendFile(Path("w").c_str(), nullptr, 1), -1, {"VarnekPGL_AppendFile : NULL buffer"}},
-    });
+    NOTE(VarnekPGL_OpenFile(nullptr, 2));
+    NOTE(VarnekPGL_CloseFile(0));
+    NOTE(VarnekPGL_CloseFile(-1));
+    NOTE(VarnekPGL_SeekFile(0, 0, 3));
+    NOTE(VarnekPGL_SeekFile(writer, 0, 3));
+    NOTE(VarnekPGL_SeekFile(writer, -1, 0));
+    NOTE(VarnekPGL_TellFile(0));
+    NOTE(VarnekPGL_FlushFile(0));
+    NOTE(VarnekPGL_FlushFile(full));
+    NOTE(VarnekPGL_ReadFileByHandle(0, buffer, 1));
+    NOTE(VarnekPGL_WriteFileByHandle(0, buffer, 1));
+    NOTE(VarnekPGL_WriteFileByHandle(writer, nullptr, 1));
+    NOTE(VarnekPGL_ReadFileByHandle(writer, nullptr, 1));
+    NOTE(VarnekPGL_ReadFileByHandle(writer, buffer, 8));
+    NOTE(VarnekPGL_GetFileSizeByHandle(0));
+    NOTE(VarnekPGL_ReadFile(none.c_str(), buffer, 8));
+    NOTE(VarnekPGL_GetFileSize(none.c_str()));
+    NOTE(VarnekPGL_CheckFile(none.c_str()));
+    NOTE(VarnekPGL_DeleteFile(none.c_str()));
+    NOTE(VarnekPGL_WriteFile("/no/dir", "x", 1));
+    NOTE(VarnekPGL_AppendFile("/no/dir", "x", 1));
+    NOTE(VarnekPGL_WriteFile(Path("w").c_str(), nullptr, 1));
+    NOTE(VarnekPGL_AppendFile(Path("w").c_str(), nullptr, 1));
     VarnekPGL_CloseFile(full);
     VarnekPGL_CloseFile(writer);
 }
@@ -243,7 +227,6 @@ TEST_F(LargeFile, BeyondFourGiB) {
 }
 
 TEST_F(LargeFile, FailuresHaveTheirLineAndResult) {
-    const std::string mark = "[FULLSEG_64BIT_FILE]";
     const std::string path = Path("limited");
     const int32_t full = VarnekPGL_OpenFile64Bits("/dev/full", PGL_FILE_MODE_WRITE);
     const int32_t limited = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_CREATE_RW);
@@ -254,29 +237,23 @@ TEST_F(LargeFile, FailuresHaveTheirLineAndResult) {
     const rlimit small = {100, old.rlim_max};
     setrlimit(RLIMIT_FSIZE, &small);
     const std::string data(150, 'x');
-    const auto failure = [&mark](int32_t fd, const char *sizes, int error) {
-        return mark + "VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : " + std::to_string(fd) + ", Size : [ " +
-               sizes + " ] " + strerror(error) + " ";
-    };
-    ExpectRows({
-        {VarnekPGL_WriteFileByHandle64Bits(full, "x", 1), -28, {failure(full, "1 4294967295", ENOSPC)}},
-        {VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150), 100, {failure(limited, "150 100", 0)}},
-        {VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150),
-         -27,
-         {failure(limited, "150 4294967295", EFBIG)}},
-        {VarnekPGL_WriteFileByHandle64Bits(reader, "x", 1), -1, {failure(reader, "1 4294967295", EBADF)}},
-        {VarnekPGL_WriteFileByHandle64Bits(-2, "x", 1),
-         0,
-         {mark + "VarnekPGL_WriteFileByHandle64Bits: Write Failure Invalid Hndl : -2"}},
-        {VarnekPGL_ReadFileByHandle64Bits(-1, nullptr, 1),
-         0,
-         {mark + "VarnekPGL_ReadFileByHandle64Bits: Read Failure Invalid Hndl : -1"}},
-        {VarnekPGL_SeekFile64Bits(-1, 0, 5), -8, {mark + " VarnekPGL_SeekFile64Bits Invalid Seek base! base=[5]"}},
-        {VarnekPGL_SeekFile64Bits(-1, 0, 2), -1, {mark + "VarnekPGL_FSeek64Bits: Seek Failure Invalid Hndl : -1"}},
-        {VarnekPGL_TellFile64Bits(-1), 0, {mark + "VarnekPGL_TellFile64Bits: Tell Failure Invalid Hndl : -1"}},
-        {VarnekPGL_FlushFile64Bits(-1), -1, {mark + "VarnekPGL_FlushFile64Bits: Flush Failure Invalid Hndl : -1"}},
-        {VarnekPGL_CloseFile64Bits(-1), -1, {mark + "VarnekPGL_CloseFile64Bits: Close Failure Invalid Hndl : -1"}},
-    });
+    for (int error : {0, ENOSPC, EFBIG, EBADF}) {
+        Show(strerror(error), "error " + std::to_string(error));
+    }
+    Show("Hndl : " + std::to_string(full), "Hndl : FULL");
+    Show("Hndl : " + std::to_string(limited), "Hndl : LIMITED");
+    Show("Hndl : " + std::to_string(reader), "Hndl : READER");
+    NOTE(VarnekPGL_WriteFileByHandle64Bits(full, "x", 1));
+    NOTE(VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150));
+    NOTE(VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150));
+    NOTE(VarnekPGL_WriteFileByHandle64Bits(reader, "x", 1));
+    NOTE(VarnekPGL_WriteFileByHandle64Bits(-2, "x", 1));
+    NOTE(VarnekPGL_ReadFileByHandle64Bits(-1, nullptr, 1));
+    NOTE(VarnekPGL_SeekFile64Bits(-1, 0, 5));
+    NOTE(VarnekPGL_SeekFile64Bits(-1, 0, 2));
+    NOTE(VarnekPGL_TellFile64Bits(-1));
+    NOTE(VarnekPGL_FlushFile64Bits(-1));
+    NOTE(VarnekPGL_CloseFile64Bits(-1));
     setrlimit(RLIMIT_FSIZE, &old);
     EXPECT_EQ(VarnekPGL_ReadFileByHandle64Bits(full + 500, nullptr, 1), -1);
     EXPECT_EQ(VarnekPGL_GetFileSizeByHandle64Bits(-1), -1);
@@ -295,34 +272,19 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     ASSERT_EQ(VarnekPGL_MakeDir(present.c_str()), 0);
     PglFmFileAttributes attributes;
     PglDirEntryInfo info = {7, ""};
-    const std::string openFail = "VarnekPGL_OpenDir : pDir(" + none + ") = NULL";
-    const std::string gone = "VarnekPGL_DeleteDirEx : No Eixst Dir! [" + none + "]";
-    ExpectRows({
-        {VarnekPGL_MakeDir(tooLong.c_str()), -1, {"VarnekPGL_MakeDir : exceed max file path length : " + tooLong}},
-        {VarnekPGL_DeleteDirEx((none + "/").c_str()), -1, {openFail, gone}},
-        {VarnekPGL_DeleteDirEx(""),
-         -1,
-         {"VarnekPGL_OpenDir : pDir() = NULL", "VarnekPGL_DeleteDirEx : No Eixst Dir! []"}},
-        {VarnekPGL_DeleteDirEx(nullptr), -1, {"VarnekPGL_DeleteDirEx : No Eixst Dir! [(null)]"}},
-        {VarnekPGL_ClearDir(tooLong.c_str()),
-         -1,
-         {"VarnekPGL_MakeDir : exceed max file path length : " + tooLong,
-          "VarnekPGL_ClearDir : Directory Creation Fail. Dir Path=[" + tooLong + "]"}},
-        {VarnekPGL_ClearDir(none.c_str()),
-         -1,
-         {openFail, gone, "VarnekPGL_ClearDir : Directory Deletion Fail. Dir Path=[" + none + "]"}},
-        {VarnekPGL_CheckDir(none.c_str()), FALSE, {openFail}},
-        {__VarnekPGL_ReadDir(nullptr, nullptr), FALSE, {"__VarnekPGL_ReadDir : pEntry == NULL"}},
-        {VarnekPGL_ReadDir(nullptr, nullptr), FALSE, {"VarnekPGL_ReadDir : pEntry == NULL"}},
-        {VarnekPGL_ReadDir(PGL_INVALID_DIR_HANDLE, &info),
-         FALSE,
-         {"__VarnekPGL_ReadDir : return FALSE pDir = 0xffffffff"}},
-        {VarnekPGL_FmGetFileAttributes(none.c_str(), nullptr), FALSE, {}},
-        {VarnekPGL_FmGetFileAttributes(none.c_str(), &attributes),
-         FALSE,
-         {"VarnekPGL_FmGetFileAttributes : failed..." + none}},
-        {VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE), TRUE, {}},
-    });
+    NOTE(VarnekPGL_MakeDir(tooLong.c_str()));
+    NOTE(VarnekPGL_DeleteDirEx((none + "/").c_str()));
+    NOTE(VarnekPGL_DeleteDirEx(""));
+    NOTE(VarnekPGL_DeleteDirEx(nullptr));
+    NOTE(VarnekPGL_ClearDir(tooLong.c_str()));
+    NOTE(VarnekPGL_ClearDir(none.c_str()));
+    NOTE(VarnekPGL_CheckDir(none.c_str()));
+    NOTE(__VarnekPGL_ReadDir(nullptr, nullptr));
+    NOTE(VarnekPGL_ReadDir(nullptr, nullptr));
+    NOTE(VarnekPGL_ReadDir(PGL_INVALID_DIR_HANDLE, &info));
+    NOTE(VarnekPGL_FmGetFileAttributes(none.c_str(), nullptr));
+    NOTE(VarnekPGL_FmGetFileAttributes(none.c_str(), &attributes));
+    NOTE(VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE));
     EXPECT_EQ(info.type, 0u);
     EXPECT_FALSE(std::filesystem::exists(none));
 

@@ -12,15 +12,6 @@ using Units = std::vector<unsigned short>;
 
 class LngPack : public VarnekTest {};
 
-// A result and the lines that were traced on the way to it.
-std::string Said(int result) {
-    std::string all = std::to_string(result);
-    for (const std::string &line : TakeBodies()) {
-        all += "|" + line;
-    }
-    return all;
-}
-
 TEST_F(LngPack, Latin15BecomesUtf8) {
     std::string every;
     for (int byte = 1; byte < 256; ++byte) {
@@ -33,20 +24,11 @@ TEST_F(LngPack, Latin15BecomesUtf8) {
                  "`abcdefghijklmnopqrstuvwxyz{|}~"
                  " ¡¢£€¥Š§š©ª«¬\u00AD®¯°±²³Žµ¶·ž¹º»ŒœŸ¿"
                  "ÀÁÂÃÄÅÆÇÈÉÊËÌÍÎÏÐÑÒÓÔÕÖ×ØÙÚÛÜÝÞßàáâãäåæçèéêëìíîïðñòóôõö÷øùúûüýþÿ");
-    TakeLog();
-    EXPECT_EQ(Said(VarnekPGL_ConvertLatin15toUTF8(&text, "caf\xE9", 4)),
-              "1|VarnekPGL_ConvertLatin15toUTF8: szInputSize is 4\t!\n"
-              "|VarnekPGL_ConvertLatin15toUTF8: Convert String => café !\n"
-              "|VarnekPGL_ConvertLatin15toUTF8:textlen = 6 !\n"
-              "|VarnekPGL_ConvertLatin15toUTF8 : VarnekPGL_Strlen(*outputData) = 5 !\n");
+    NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, "caf\xE9", 4));
     // Nothing to convert, or far more than stated, leaves the text alone.
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "", 0), TRUE);
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\x09\x0A\x1B\x7F\x85", 5), TRUE);
-    TakeLog();
-    EXPECT_EQ(Said(VarnekPGL_ConvertLatin15toUTF8(&text, "12345", 1)),
-              "0|VarnekPGL_ConvertLatin15toUTF8: szInputSize is 1\t!\n"
-              "|WmConvertLatin15Code2PCode() fail. outBufSize < strLen\n"
-              "|VarnekPGL_ConvertLatin15toUTF8: WmConvertLatin15Code2PCode. ERROR  !\n");
+    NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, "12345", 1));
     EXPECT_STREQ(text, "café");
     // A little more than stated does not outgrow the work buffers, nor does the largest statement.
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4\xA4\xA4\xA4", 1), TRUE);
@@ -71,7 +53,7 @@ TEST_F(LngPack, EveryUnitSurvivesUtf8) {
     ASSERT_EQ(WmConvert2LCode(text.data(), all.data()), TRUE);
     const int length = static_cast<int>(strlen(text.data()));
     EXPECT_EQ(__WmLngStrlenByByte(text.data(), length), 0x20000);
-    EXPECT_EQ(Said(WmConvertUTF2PCode(back.data(), 0x20000, text.data(), length)), "1");
+    NOTE(WmConvertUTF2PCode(back.data(), 0x20000, text.data(), length));
     all[0xA0 - 1] = ' ';
     EXPECT_TRUE(back == all);
 }
@@ -114,34 +96,26 @@ TEST_F(LngPack, FailuresAreNamed) {
     unsigned short units[8];
     char bytes[8] = "before";
     char *text = nullptr;
-    EXPECT_EQ(Said(WmConvertLatin15Code2PCode(nullptr, 4, "a")),
-              "0|WmConvertLatin15Code2PCode() fail. pmszOutText == NULL ||  szInText  == NULL\n");
-    EXPECT_EQ(Said(WmConvertLatin15Code2PCode(units, 4, "12345")),
-              "0|WmConvertLatin15Code2PCode() fail. outBufSize < strLen\n");
-    EXPECT_EQ(Said(WmConvertLatin15Code2PCode(units, 5, "12345")), "1");
-    EXPECT_EQ(Said(__WmLngUnicode2UTF(nullptr, abc, 3)), "-1| __WmLngUnicode2UTF : des - null  !!");
-    EXPECT_EQ(Said(__WmLngUnicode2UTF(bytes, nullptr, 3)), "-1|__WmLngUnicode2UTF : src - null  !!");
-    EXPECT_EQ(Said(__WmLngUnicode2UTF(bytes, abc, 0)), "-1| __WmLngUnicode2UTF : nChar - 0  !!");
-    EXPECT_EQ(Said(WmConvertPCode2UTF(bytes, abc, 0) + bytes[0]), "1");
-    EXPECT_EQ(Said(WmConvert2LCode(bytes, nullptr)),
-              "0| WmConvertPCode2UTF : mszInText - 0  !!"
-              "|WmConvert2LCode: Converting Unicode(0) to utf8 code failed\n");
-    EXPECT_EQ(Said(WmConvert2LCode(nullptr, abc + 3)).substr(0, 45), "0|WmConvertPCode2UTF : pszOutText - null  !!|");
-    EXPECT_EQ(Said(__WmLngUTF2Unicode(nullptr, "a", 1)), "-1|__WmLngUTF2Unicode : des - null  !!");
-    EXPECT_EQ(Said(__WmLngUTF2Unicode(units, nullptr, 1)), "-1|__WmLngUTF2Unicode : src - null  !!");
-    EXPECT_EQ(Said(WmConvertUTF2PCode(nullptr, 8, "a", 1)), "0|WmConvertUTF2PCode : pmszOutText - null  !!");
-    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 8, nullptr, 1)), "0|WmConvertUTF2PCode : szInText - null  !!");
-    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 4, "abc", 3)),
-              "0|__WmConvertCodeBufferSizeCheck: Out buffer size seems to be small (pmszOutText)\n"
-              "|WmConvertUTF2PCode: Out buffer size seems to be small!\n");
-    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 6, "abc", 3)),
-              "0|__WmConvertCodeBufferSizeCheck: Buffer size is too small pmszOutText: "
-              "OutBuffer(6), RequiredBufSize(8)\n"
-              "|WmConvertUTF2PCode: Out buffer size seems to be small!\n");
-    EXPECT_EQ(Said(WmConvertUTF2PCode(units, 0, "abc", 0) + units[0]), "1");
-    EXPECT_EQ(Said(__WmLngStrlenByByte("abc", 0)), "2");
-    EXPECT_EQ(Said(VarnekPGL_ConvertLatin15toUTF8(&text, nullptr, 1)),
-              "0|VarnekPGL_ConvertLatin15toUTF8: outputData or szInput is NULL  !\n");
+    NOTE(WmConvertLatin15Code2PCode(nullptr, 4, "a"));
+    NOTE(WmConvertLatin15Code2PCode(units, 4, "12345"));
+    NOTE(WmConvertLatin15Code2PCode(units, 5, "12345"));
+    NOTE(__WmLngUnicode2UTF(nullptr, abc, 3));
+    NOTE(__WmLngUnicode2UTF(bytes, nullptr, 3));
+    NOTE(__WmLngUnicode2UTF(bytes, abc, 0));
+    NOTE(WmConvertPCode2UTF(bytes, abc, 0) + bytes[0]);
+    NOTE(WmConvert2LCode(bytes, nullptr));
+    TakeLog();
+    EXPECT_EQ(WmConvert2LCode(nullptr, abc + 3), FALSE);
+    EXPECT_EQ(TakeBodies()[0], "WmConvertPCode2UTF : pszOutText - null  !!");
+    NOTE(__WmLngUTF2Unicode(nullptr, "a", 1));
+    NOTE(__WmLngUTF2Unicode(units, nullptr, 1));
+    NOTE(WmConvertUTF2PCode(nullptr, 8, "a", 1));
+    NOTE(WmConvertUTF2PCode(units, 8, nullptr, 1));
+    NOTE(WmConvertUTF2PCode(units, 4, "abc", 3));
+    NOTE(WmConvertUTF2PCode(units, 6, "abc", 3));
+    NOTE(WmConvertUTF2PCode(units, 0, "abc", 0) + units[0]);
+    NOTE(__WmLngStrlenByByte("abc", 0));
+    NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, nullptr, 1));
 }
 
 }  // namespace

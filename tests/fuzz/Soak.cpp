@@ -25,7 +25,7 @@ constexpr int kThreads = 8;
 constexpr int kUnits = 3;  // of the semaphore that all share
 constexpr int kPacket = 188;
 
-std::atomic<bool> gStop{false};
+std::atomic<bool> gStop{false}, gStorm{false};
 std::atomic<int> gReady{0}, gSenders{kThreads}, gRunning{kThreads}, gUnitsTaken{0};
 std::atomic<int64_t> gTraces{0}, gLines{0};
 int32_t gMutex, gSemaphore;
@@ -35,7 +35,7 @@ int64_t gGuarded = 0;
 struct Message {
     int64_t number;
     int32_t from;
-    BOOL urgent;
+    int32_t urgent;  // or the record that it is meant for
     char filled[24];
 };
 static_assert(sizeof(Message) == sizeof(THREAD_MSG));
@@ -47,13 +47,33 @@ struct Worker {
     std::mt19937 random;
     int64_t sent[kThreads], received[kThreads], urgentSent, urgentReceived;
     int64_t peeked, objects, locks, units, starts, short_lived, written, read, operations;
-    std::atomic<int64_t> fired, ran;
+    int64_t lookups, passed;
+    int32_t latest[kThreads];  // the record of each other one that it sent to last
+    std::atomic<int64_t> fired, ended, taken;
     VarnekCRingBuffer *ring;  // between an even worker, who writes, and the next one
 
     int Below(int limit) { return static_cast<int>(random() % static_cast<unsigned int>(limit)); }
-    std::string Name(const char *what) const { return what + std::to_string(index); }
+    // Every character but the first tells whose it is, so that half a name is none.
+    std::string Name(char kind) const { return kind + std::string(30, static_cast<char>('a' + index)); }
 };
 Worker gWorkers[kThreads];
+
+// Which of the workers made a handle, by the handle's last bits: the handle and, in three bits, the worker.
+std::atomic<int64_t> gMakers[3][4096];
+
+void SetMaker(int family, int32_t handle, const Worker &maker) {
+    CHECK(handle > 0 && gMakers[family][handle % 4096].exchange(int64_t{handle} * 8 + maker.index) / 8 != handle);
+}
+
+// The handle that another thread's name has just now, if any. It never is that of another name.
+int32_t LookUp(int family, int32_t (*find)(const char *), const Worker &maker, char kind) {
+    const int32_t handle = find(maker.Name(kind).c_str());
+    if (handle != -1) {
+        const int64_t known = gMakers[family][handle % 4096];
+        CHECK(known / 8 != handle || known % 8 == maker.index);
+    }
+    return handle;
+}
 
 void Send(Worker &me) {
     const int to = me.Below(kThreads);
@@ -102,11 +122,13 @@ void UseSharedObjects(Worker &me) {
 }
 
 void UseOwnObjects(Worker &me) {
-    const std::string name = me.Name("own");
+    const std::string name = me.Name('o');
     const int32_t mutex = VarnekPGL_CreateMutex(name.c_str());
     const int32_t semaphore = VarnekPGL_CreateSemaphore(name.c_str(), 1);
     CHECK(mutex > 0 && VarnekPGL_GetMutexByName(name.c_str()) == mutex);
     CHECK(semaphore > 0 && VarnekPGL_SemaphoreByName(name.c_str()) == semaphore);
+    SetMaker(0, mutex, me);
+    SetMaker(1, semaphore, me);
     CHECK(VarnekPGL_AcquireMutex(mutex) == TRUE && VarnekPGL_ReleaseMutex(mutex) == TRUE);
     CHECK(VarnekPGL_WaitSemaphore(semaphore, WAIT_FOREVER) == TRUE && VarnekPGL_WaitSemaphore(semaphore, 0) == FALSE);
     CHECK(VarnekPGL_DeleteMutex(mutex) == TRUE && VarnekPGL_DeleteSemaphore(semaphore) == TRUE);
@@ -114,20 +136,46 @@ void UseOwnObjects(Worker &me) {
     ++me.objects;
 }
 
+// One start of a timer. It outlives a late callback.
+struct Start {
+    std::atomic<int64_t> due;
+    Worker *worker;
+};
+Start gStarts[kThreads][1024];
+
+int64_t Microseconds() {
+    return std::chrono::duration_cast<std::chrono::microseconds>(std::chrono::system_clock::now().time_since_epoch())
+        .count();
+}
+
+// Never comes before its start is due. Half of the callbacks do to their own timer what they may do.
+void OnTimer(uint32_t timer, void *userData) {
+    const Start &start = *static_cast<Start *>(userData);
+    CHECK(Microseconds() >= start.due);
+    const int64_t nth = ++start.worker->fired;
+    if (start.worker->index % 2 == 0) {
+        nth % 2 == 0 ? VarnekPGL_CancelTimer(timer) : VarnekPGL_StartTimer(timer, 20, OnTimer, userData);
+    }
+}
+
 void UseTimer(Worker &me) {
-    const int32_t timer = VarnekPGL_CreateTimer(me.Name("timer").c_str());
-    CHECK(timer >= 0 && VarnekPGL_GetTimerByName(me.Name("timer").c_str()) == timer);
+    const std::string name = me.Name('t');
+    const int32_t timer = VarnekPGL_CreateTimer(name.c_str());
+    CHECK(timer >= 0 && VarnekPGL_GetTimerByName(name.c_str()) == timer);
     const uint32_t handle = static_cast<uint32_t>(timer);
-    const auto fire = [](uint32_t, void *worker) { ++static_cast<Worker *>(worker)->fired; };
-    CHECK(VarnekPGL_StartTimer(handle, 1 + static_cast<uint32_t>(me.Below(3)), fire, &me) == TRUE);
-    ++me.starts;
-    if (me.Below(2) == 0) {
-        VarnekPGL_MSleep(me.Below(4));
+    const bool mine = me.index % 2 != 0;
+    // Short starts may be expiring while they are cancelled.
+    for (uint32_t timeout : {1u, 20u, 1u + static_cast<uint32_t>(me.Below(3))}) {
+        Start &start = gStarts[me.index][me.starts++ % 1024];
+        start.worker = &me;
+        start.due = Microseconds() + int64_t{timeout} * 1000;
+        CHECK(VarnekPGL_StartTimer(handle, timeout, OnTimer, &start) == TRUE || !mine);
+        std::this_thread::sleep_for(std::chrono::microseconds(900 + me.Below(200)));
         VarnekPGL_CancelTimer(handle);
-        CHECK(VarnekPGL_IsTimerActive(handle) == FALSE);
+        CHECK(VarnekPGL_IsTimerActive(handle) == FALSE || !mine);
     }
     CHECK(VarnekPGL_DeleteTimer(handle) == TRUE);
-    CHECK(me.fired <= me.starts);
+    CHECK(me.fired <= me.starts || !mine);
 }
 
 void UseRing(Worker &me) {
@@ -145,28 +193,65 @@ void UseRing(Worker &me) {
         CHECK(writer.ring->Read(packet, kPacket) == 0 && memcmp(packet, expected, sizeof packet) == 0);
         ++me.read;
     }
+    const int distance = writer.ring->GetDistance();
+    CHECK(distance >= 0 && distance <= 100);
     VarnekCRingBuffer own(1 + me.Below(300));
     CHECK(own.GetDistance() == 0 && own.Reset(kPacket) == 0 && own.Write(packet, kPacket) == 0);
     CHECK(own.GetDistance() == 100);
 }
 
-void UseThread(Worker &me) {
-    const int64_t before = me.ran;
-    const auto run = [](void *argument) -> void * {
-        Worker &parent = *static_cast<Worker *>(argument);
-        CHECK(VarnekPGL_GetCurrentThread() == VarnekPGL_GetThreadByName(parent.Name("short").c_str()));
-        ++parent.ran;
-        return nullptr;
-    };
-    const int32_t thread = VarnekPGL_CreateThread(me.Name("short").c_str(), 1, 0, run, &me);
-    CHECK(thread > 0);
-    while (me.ran == before) {
-        std::this_thread::yield();
+// Receives until its record is gone. What it gets was sent to it, and is in order.
+void *ReceiveAll(void *argument) {
+    Worker &parent = *static_cast<Worker *>(argument);
+    const int32_t self = VarnekPGL_GetCurrentThread();
+    int64_t next[kThreads] = {};
+    THREAD_MSG in;
+    int32_t count = 0;
+    // A removal before the first look is no error: a removed thread has no handle.
+    while (self != -1 && VarnekPGL_ReceiveMessage(WAIT_FOREVER, &in, &count) == TRUE) {
+        Message message;
+        memcpy(&message, &in, sizeof message);
+        CHECK(message.urgent == self && message.number == next[message.from]++);
+        ++parent.taken;
     }
-    CHECK(VarnekPGL_DeleteThread(thread) == TRUE);
-    ++me.short_lived;
+    ++parent.ended;
+    return nullptr;
 }
 
+void UseThread(Worker &me) {
+    const int32_t thread = VarnekPGL_CreateThread(me.Name('s').c_str(), 1, 65536, ReceiveAll, &me);
+    CHECK(VarnekPGL_GetThreadByName(me.Name('s').c_str()) == thread);
+    SetMaker(2, thread, me);
+    if (me.Below(2) != 0) {
+        std::this_thread::sleep_for(std::chrono::microseconds(me.Below(1000)));
+    }
+    CHECK(VarnekPGL_DeleteThread(thread) == TRUE);
+    // The waiter is woken.
+    for (++me.short_lived; me.ended < me.short_lived;) {
+        std::this_thread::yield();
+    }
+}
+
+// Looks for what another thread makes and deletes meanwhile, and sends to its thread until that is gone.
+void UseOthers(Worker &me) {
+    const Worker &other = gWorkers[me.Below(kThreads)];
+    me.lookups += LookUp(0, VarnekPGL_GetMutexByName, other, 'o') != -1 ? 1 : 0;
+    me.lookups += LookUp(1, VarnekPGL_SemaphoreByName, other, 'o') != -1 ? 1 : 0;
+    const int32_t thread = LookUp(2, VarnekPGL_GetThreadByName, other, 's');
+    if (thread == -1 || thread == me.latest[other.index]) {
+        return;
+    }
+    me.latest[other.index] = thread;
+    Message message{0, me.index, thread, {}};
+    THREAD_MSG out;
+    do {
+        memcpy(&out, &message, sizeof out);
+    } while (VarnekPGL_SendMessage(thread, &out) == TRUE && ++message.number < 2000);
+    me.passed += message.number;
+}
+
+// Half of the time all do what modules do; half of the time it storms: half of the threads do nothing but create
+// and delete, and the others nothing but look for it.
 void *Work(void *argument) {
     Worker &me = *static_cast<Worker *>(argument);
     while (gReady == 0) {
@@ -175,15 +260,19 @@ void *Work(void *argument) {
     CHECK(VarnekPGL_GetCurrentThread() == me.handle);
     for (; !gStop; ++me.operations) {
         const int kind = me.Below(100);
-        if (kind < 30) {
+        if (gStorm) {
+            (me.index % 2 != 0 ? UseOthers : kind < 50 ? UseOwnObjects : UseThread)(me);
+        } else if (kind < 27) {
             Send(me);
+        } else if (kind < 60) {
+            Receive(me, kind == 59);
         } else if (kind < 66) {
-            Receive(me, kind == 65);
+            UseOthers(me);
         } else if (kind < 76) {
             UseSharedObjects(me);
         } else if (kind < 82) {
             UseOwnObjects(me);
-        } else if (kind < 84) {
+        } else if (kind < 83) {
             UseTimer(me);
         } else if (kind < 93) {
             UseRing(me);
@@ -191,7 +280,7 @@ void *Work(void *argument) {
             UseThread(me);
         } else {
             ++gTraces;
-            VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_GINGA, "soak %d end", me.index);
+            VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_GINGA, "soak %d%*c", me.index, 900, '.');
         }
     }
     --gSenders;
@@ -246,7 +335,7 @@ long long Sum(Field field) {
 void OnLog(int, const char *tag, const char *text) {
     if (strcmp(tag, "SBTVD_GINGA") == 0) {
         const char *body = BodyOf(tag, text);
-        CHECK(text[1] == 'H' && strncmp(body, "soak ", 5) == 0 && strcmp(body + 6, " end") == 0);
+        CHECK(text[1] == 'H' && strncmp(body, "soak ", 5) == 0 && strlen(body) == 906 && body[905] == '.');
         ++gLines;
     }
 }
@@ -261,14 +350,17 @@ int main(int argc, char **argv) {
         gWorkers[i].index = i;
         gWorkers[i].random.seed(static_cast<unsigned int>(i + 1));
         gWorkers[i].ring = i % 2 == 0 ? new VarnekCRingBuffer(kPacket * 7 + 5) : nullptr;
-        gWorkers[i].handle = VarnekPGL_CreateThread(gWorkers[i].Name("soak").c_str(), 1, 0, Work, &gWorkers[i]);
+        gWorkers[i].handle = VarnekPGL_CreateThread(gWorkers[i].Name('w').c_str(), 1, 0, Work, &gWorkers[i]);
         CHECK(gWorkers[i].handle > 0);
     }
     gMutex = VarnekPGL_CreateMutex("all");
     gSemaphore = VarnekPGL_CreateSemaphore("all", kUnits);
     const std::string room = RoomInTables();
     gReady = 1;
-    std::this_thread::sleep_for(std::chrono::seconds(seconds));
+    for (int quarter = 0; quarter < 4 * seconds; ++quarter) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(250));
+        gStorm = quarter % 2 == 0;
+    }
     gStop = true;
     while (gRunning > 0) {
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
@@ -290,6 +382,8 @@ int main(int argc, char **argv) {
         CHECK(gWorkers[i].ring->GetSpaceReading() == (gWorkers[i].written - gWorkers[i + 1].read) * kPacket);
         delete gWorkers[i].ring;
     }
+    const long long passed = Sum([](const Worker &w) { return w.passed; });
+    CHECK(passed >= Sum([](const Worker &w) { return w.taken.load(); }));
     rusage usage{};
     getrusage(RUSAGE_SELF, &usage);
     printf("seconds              %d\n", seconds);
@@ -301,7 +395,10 @@ int main(int argc, char **argv) {
     printf("timer starts         %lld, of which %lld called back\n", Sum([](const Worker &w) { return w.starts; }),
            Sum([](const Worker &w) { return w.fired.load(); }));
     printf("ring packets         %lld\n", Sum([](const Worker &w) { return w.read; }));
-    printf("threads              %lld\n", Sum([](const Worker &w) { return w.short_lived; }));
+    printf("threads              %lld, sent %lld messages, of which %lld were received\n",
+           Sum([](const Worker &w) { return w.short_lived; }), passed,
+           Sum([](const Worker &w) { return w.taken.load(); }));
+    printf("found elsewhere      %lld mutexes and semaphores\n", Sum([](const Worker &w) { return w.lookups; }));
     printf("traces               %lld\n", static_cast<long long>(gTraces));
     printf("room afterwards      %s, as before\n", room.c_str());
     printf("largest memory       %ld KiB\n", usage.ru_maxrss);

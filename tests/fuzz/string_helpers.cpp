@@ -1,11 +1,10 @@
-// The helpers on NUL-terminated strings and the string class, against the C library and the C++
-// library, on blocks of exactly the texts' sizes.
+// The helpers on NUL-terminated strings, against the C library and the C++ library, on blocks of exactly the texts'
+// sizes.
 #include <algorithm>
 #include <cstring>
 #include <string>
 
 #include "Fuzz.h"
-#include "Varnek_CString.h"
 #include "Varnek_StrUtil.h"
 
 namespace {
@@ -44,20 +43,6 @@ void CheckPart(const std::string &source, const char *exact, int32_t start, int3
     CHECK(result == part.data() && expected == std::string(part.begin(), part.end()));
 }
 
-void CheckClass(const std::string &a, const char *exactA, const std::string &b, const char *exactB) {
-    const VarnekCString left(exactA), right(exactB);
-    CHECK((left == right) == (a == b ? 1 : 0) && (left < right) == (a < b ? 1 : 0));
-    CHECK((left > right) == (a > b ? 1 : 0) && (left <= right) == (a <= b ? 1 : 0));
-    char *const sum = (left + exactB).String();
-    CHECK(a + b == sum);
-    VarnekCString taken(nullptr);
-    taken.SetMemAllocedString(sum);
-    VarnekCString twice(taken);
-    twice += taken;
-    twice += twice;
-    CHECK(twice == VarnekCString((a + b + a + b + a + b + a + b).c_str()));
-}
-
 }  // namespace
 
 int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
@@ -73,7 +58,6 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
 
     CheckNumber(value, radix % 40);
     CheckPart(a, exactA.data(), start, count);
-    CheckClass(a, exactA.data(), b, exactB.data());
 
     CHECK(VarnekPGL_Stristr(exactA.data(), exactB.data()) == strcasestr(exactA.data(), exactB.data()));
     CHECK(Sign(VarnekPGL_Stricmp(exactA.data(), exactB.data())) == Sign(strcasecmp(a.c_str(), b.c_str())));

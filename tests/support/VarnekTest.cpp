@@ -8,6 +8,7 @@
 #include <fstream>
 #include <iterator>
 #include <mutex>
+#include <regex>
 
 void (*gLogHook)(const LogLine &line) = nullptr;
 
@@ -57,15 +58,6 @@ std::vector<std::string> TakeErrors() {
     return bodies;
 }
 
-void ExpectRows(const std::vector<Row> &rows) {
-    std::vector<std::string> expected;
-    for (const Row &row : rows) {
-        EXPECT_EQ(row.result, row.expected) << ::testing::PrintToString(row.lines);
-        expected.insert(expected.end(), row.lines.begin(), row.lines.end());
-    }
-    EXPECT_EQ(TakeErrors(), expected);
-}
-
 std::string ReadAll(const std::string &path) {
     std::ifstream file(path, std::ios::binary);
     return {std::istreambuf_iterator<char>(file), {}};
@@ -78,13 +70,39 @@ void VarnekTest::SetUp() {
     char folder[] = "test.XXXXXX";
     ASSERT_NE(mkdtemp(folder), nullptr);
     folder_ = folder;
+    Show(folder_, "DIR");
     VarnekPGL_CheckAndInitDebug();
     TakeLog();
     VARNEK_PANIC();
     ASSERT_EQ(TakeLog().size(), 1u) << "the log is not captured";
 }
 
+void VarnekTest::Note(const std::string &call, int64_t result) {
+    transcript_ += call + " = " + std::to_string(result) + "\n";
+    for (const LogLine &line : TakeLog()) {
+        if (line.thread == syscall(SYS_gettid)) {
+            transcript_ += std::string("  ") + "??LMH?EP"[line.priority & 7] + " " + line.tag + " ";
+            transcript_ += std::regex_replace(line.Body(), std::regex("\n"), "\\n") + "\n";
+        }
+    }
+}
+
 void VarnekTest::TearDown() {
+    for (const auto &[text, name] : names_) {
+        for (size_t at = 0; (at = transcript_.find(text, at)) != std::string::npos; at += name.size()) {
+            transcript_.replace(at, text.size(), name);
+        }
+    }
+    if (!transcript_.empty()) {
+        const std::regex handle("(linux ?[A-Z][a-z]+=|[pP]threadI[dD] = )\\[[^\\]]*");
+        transcript_ = std::regex_replace(transcript_, handle, "$1[*");
+        const auto &test = *::testing::UnitTest::GetInstance()->current_test_info();
+        const std::string path = std::string(VARNEK_EXPECTED) + test.test_suite_name() + "." + test.name() + ".txt";
+        if (getenv("VARNEK_WRITE_EXPECTED") != nullptr) {
+            WriteAll(path, transcript_);
+        }
+        EXPECT_EQ(transcript_, ReadAll(path));
+    }
     std::error_code ignored;
     std::filesystem::remove_all(folder_, ignored);
 }

@@ -10,6 +10,7 @@
 #include <chrono>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "Varnek_Debug.h"
@@ -33,17 +34,6 @@ std::vector<std::string> TakeBodies(const std::string &tag = "");
 
 // The bodies of the Error traces and storage failures since the last call.
 std::vector<std::string> TakeErrors();
-
-// A row of a failure table: what a call returned, what it has to return, and the Error lines that it has
-// to leave.
-struct Row {
-    int64_t result;
-    int64_t expected;
-    std::vector<std::string> lines;
-};
-
-// Holds rows, whose calls were made in their order, against the log.
-void ExpectRows(const std::vector<Row> &rows);
 
 // Called for each line before it is captured, without a lock; null for none.
 extern void (*gLogHook)(const LogLine &line);
@@ -73,8 +63,18 @@ class VarnekTest : public ::testing::Test {
     // A path in this test's own folder.
     std::string Path(const std::string &name) const { return folder_ + "/" + name; }
 
+    // Appends a call's result, and this thread's lines since the last TakeLog(), to the test's transcript. It has to be
+    // that of tests/expected/SUITE.TEST.txt; a run with VARNEK_WRITE_EXPECTED in its environment writes that file.
+    void Note(const std::string &call, int64_t result);
+    // Has the transcript show `name` for what differs from run to run. (The system's handles are hidden always.)
+    void Show(const std::string &text, const std::string &name) { names_.emplace_back(text, name); }
+
   private:
-    std::string folder_;
+    std::string folder_, transcript_;
+    std::vector<std::pair<std::string, std::string>> names_{{VARNEK_DATA_DIR, "DATA/"}, {VARNEK_SYSTEM_DIR, "SYSTEM/"}};
 };
+
+// Notes a call under its own text.
+#define NOTE(...) (TakeLog(), Note(#__VA_ARGS__, (__VA_ARGS__)))
 
 #endif
