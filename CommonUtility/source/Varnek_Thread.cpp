@@ -75,11 +75,16 @@ int32_t Guard() {
     return guard != kGuardInTheMaking ? guard : kNoGuard;
 }
 
-// Runs when a thread ends. The system has cleared the value by then; the destructors of other keys
-// may still ask who they run in, or read messages.
+// Runs when a thread ends. The system has cleared the value by then, but the destructors of other
+// keys may still ask who they run in, or read messages. So the handle is kept, negative, for one
+// more round of destructors.
 void KeepSelf(void *self) {
-    pthread_setspecific(static_cast<pthread_key_t>(gSelfKey.load(std::memory_order_relaxed) - 1),
-                        self);
+    const intptr_t hThread = reinterpret_cast<intptr_t>(self);
+    if (hThread > 0) {
+        pthread_setspecific(
+            static_cast<pthread_key_t>(gSelfKey.load(std::memory_order_relaxed) - 1),
+            reinterpret_cast<void *>(-hThread));
+    }
 }
 
 // Makes the key, unless an earlier call has made it.
@@ -388,7 +393,8 @@ inline __attribute__((always_inline)) Self FindSelf() {
     const uint32_t key = gSelfKey.load(std::memory_order_relaxed);
     const void *const held =
         key != 0 ? pthread_getspecific(static_cast<pthread_key_t>(key - 1)) : nullptr;
-    const int32_t hThread = static_cast<int32_t>(reinterpret_cast<intptr_t>(held));
+    const int32_t kept = static_cast<int32_t>(reinterpret_cast<intptr_t>(held));
+    const int32_t hThread = kept < 0 ? -kept : kept;  // negative while the thread ends
     Threads::Slot *const slot = gThreadInfoArr.Find(hThread, std::memory_order_relaxed);
     if (slot == nullptr) {
         TRACE_ERROR("***** VarnekPGL_GetCurrentThread : Can't find thread Info. pthreadID = [%d]",
