@@ -234,7 +234,7 @@ TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
 
 // The bytes of its stack that a thread uses for `work`, the log function of this program included.
 size_t StackOf(void (*work)()) {
-    constexpr size_t kSize = 256 * 1024;
+    constexpr size_t kSize = 262144;
     static char stack[kSize] __attribute__((aligned(4096)));
     memset(stack, 0xA5, kSize);
     pthread_attr_t attributes;
