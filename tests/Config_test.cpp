@@ -190,9 +190,11 @@ TEST_F(ConfigAlone, SavesThatAreKilledLeaveEitherText) {
     save('a');
     for (int round = 0; round < 100 && !HasFailure(); ++round) {
         const pid_t child = fork();  // of this process's only thread
-        while (child == 0) {
-            save('a');
-            save('b');
+        if (child == 0) {
+            for (;;) {
+                save('a');
+                save('b');
+            }
         }
         for (int left = round % 20; left >= 0; --left) {
             if (left == 0) {
