@@ -60,6 +60,7 @@ template <typename Record, typename Convert>
 void RunBack(benchmark::State &state, Record (*make)(uint32_t), Convert convert) {
     constexpr size_t kCount = 512;
     std::vector<Record> records;
+    records.reserve(kCount);
     for (uint32_t i = 0; i < kCount; i++) {
         records.push_back(make(i * kStep));
     }
