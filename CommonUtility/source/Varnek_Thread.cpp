@@ -1,10 +1,11 @@
 // The thread registry and the message queues.
 //
-// The registry's guard is held while a record is made or removed. A queue's list has a lock of its
-// own. A sender or a receiver that works with a record counts as one of its users, which keeps the
-// record's queue and semaphore alive: a removal makes the record invisible at once, and the last
-// user to leave takes it apart. So no lock is ever held across a wait, and none while another is
-// taken.
+// The registry's guard is held while a record is created or made invisible. Each queue has a lock
+// of its own. Its holder sees whether the record is still there, and while it is, the record's
+// semaphore is alive as long as the lock is held. A thread that needs the semaphore without the
+// lock, to wait or to wake the owner, counts as one of the record's users: a removal leaves it to
+// the last user to take the record apart. So no lock is ever held across a wait, and none while
+// another is taken.
 //
 // A thread starts in ThreadEntry, which waits for its creator to release the guard. So the record
 // of a thread is visible before any of the caller's code runs in it. The entry leaves the handle
@@ -34,15 +35,17 @@ constexpr int MAX_THREAD_MGR_INFO_ARR_SIZE = 20;
 constexpr size_t kSystemNameSize = 16;  // of a thread's name in the system, with the terminator
 
 struct THREAD_MGR_INFO {
-    std::atomic<uint32_t> users;  // threads inside the record, and kRemoved
-    sem_t msgQSem;                // counts the queue's messages
     Lock queueLock;
-    list_t MsgQ VARNEK_GUARDED_BY(queueLock);
+    list_t MsgQ VARNEK_GUARDED_BY(queueLock);     // empty while the record is free
+    sem_t msgQSem;                                // counts the queue's messages
+    uint32_t users VARNEK_GUARDED_BY(queueLock);  // of the semaphore, without the lock
+    // For the last user of a removed record: the operation that removed it, null before, and the
+    // level and module at which that operation reports unread messages.
+    const char *removedBy VARNEK_GUARDED_BY(queueLock);
+    uint32_t unreadMask VARNEK_GUARDED_BY(queueLock);
+    // From the removal, which sets it under the guard, until the record has been taken apart.
+    std::atomic<bool> isLeftover;
     pthread_t linuxThread;  // for a debugger
-    // For the last user of a removed record: the operation that removed it, and the level and
-    // module at which that operation reports unread messages.
-    const char *removedBy;
-    uint32_t unreadMask;
 };
 
 // What a new thread begins with. Made by its creator and freed by its entry, so that the record may
@@ -54,8 +57,6 @@ struct Start {
     char systemName[kSystemNameSize];
 };
 
-// In `users` from a record's removal until it has been taken apart.
-constexpr uint32_t kRemoved = 0x80000000u;
 constexpr int kLeaveTries = 1000;  // of a millisecond
 
 using Threads = SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE>;
@@ -126,8 +127,8 @@ bool EnsureGuard() {
 
 // Users of a record ------------------------------------------------------------------------------
 
-// Takes a removed record apart. Runs in the record's last user, which is why the queue needs no
-// lock here.
+// Takes a removed record apart. Only the thread for which IsLast has been true calls it, and nobody
+// else looks at more than the handle of a removed record. So the queue needs no lock here.
 void Dispose(THREAD_MGR_INFO &info) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
     if (sem_destroy(&info.msgQSem) != 0) {
         TRACE_ERROR("***** %s : semaphore destroy FAIL!! errCode = [%d]", info.removedBy,
@@ -143,64 +144,26 @@ void Dispose(THREAD_MGR_INFO &info) VARNEK_THREAD_SAFETY(no_thread_safety_analys
         }
         list_initialize(&info.MsgQ);
     }
-    info.users.fetch_and(~kRemoved, std::memory_order_release);
+    info.removedBy = nullptr;
+    info.isLeftover.store(false, std::memory_order_release);
 }
 
-// Only the last user looks at what the others did, so only that one acquires it.
+// Whether the record has been removed and has no user left. True once for each removal: in the
+// removal itself, or when the last user leaves.
+bool IsLast(const THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
+    return info.removedBy != nullptr && info.users == 0;
+}
+
+// Ends the use of a record, which began with an increment of `users`.
 void Leave(THREAD_MGR_INFO &info) {
-    if (info.users.fetch_sub(1, std::memory_order_release) == kRemoved + 1) {
-        (void)info.users.load(std::memory_order_acquire);
+    Hold hold(info.queueLock);
+    info.users--;
+    const bool last = IsLast(info);
+    hold.Release();
+    if (last) {
         Dispose(info);
     }
 }
-
-// Keeps the record of this handle in one piece until Leave. False when it is gone.
-bool Enter(Threads::Slot *slot, int32_t hThread) {
-    std::atomic<uint32_t> &users = slot->info.users;
-    uint32_t count = users.load(std::memory_order_relaxed);
-    do {
-        if ((count & kRemoved) != 0) {
-            return false;
-        }
-    } while (!users.compare_exchange_weak(count, count + 1, std::memory_order_acquire,
-                                          std::memory_order_relaxed));
-    // The slot may have changed hands since it was looked up.
-    if (!slot->Has(hThread, std::memory_order_acquire)) {
-        Leave(slot->info);
-        return false;
-    }
-    return true;
-}
-
-// One stay inside a record.
-class RecordUse {
-  public:
-    explicit RecordUse(int32_t hThread)
-        : RecordUse(hThread, gThreadInfoArr.Find(hThread, std::memory_order_relaxed)) {}
-    RecordUse(int32_t hThread, Threads::Slot *slot) : hThread_(hThread), slot_(slot) {
-        if (slot_ != nullptr && !Enter(slot_, hThread)) {
-            slot_ = nullptr;
-        }
-    }
-    ~RecordUse() {
-        if (slot_ != nullptr) {
-            Leave(slot_->info);
-        }
-    }
-    RecordUse(const RecordUse &) = delete;
-    RecordUse &operator=(const RecordUse &) = delete;
-
-    bool Entered() const { return slot_ != nullptr; }
-    int Number() const { return gThreadInfoArr.NumberOf(slot_); }  // -1 for none
-    THREAD_MGR_INFO &Info() const { return slot_->info; }
-    // Whether the record has not been removed meanwhile. What was done before a removal is there
-    // for whoever was woken by it, so the handle needs no acquire.
-    bool IsLive() const { return slot_->Has(hThread_, std::memory_order_relaxed); }
-
-  private:
-    const int32_t hThread_;
-    Threads::Slot *slot_;
-};
 
 // Threads ----------------------------------------------------------------------------------------
 
@@ -221,16 +184,22 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
         return FALSE;
     }
     THREAD_MGR_INFO &info = slot->info;
+    info.isLeftover.store(true, std::memory_order_relaxed);
     const int32_t count = gThreadInfoArr.Withdraw(slot);
+    hold.Release();
+
+    // The record is this thread's and its users' now.
+    Hold queue(info.queueLock);
     info.removedBy = operation;
     info.unreadMask = unreadMask;
     // The owner may be waiting for a message: this wakes it, and it finds its record gone. Without
     // a waiter the post goes with the semaphore.
     sem_post(&info.msgQSem);
-    if (info.users.fetch_or(kRemoved, std::memory_order_acq_rel) == 0) {
+    const bool last = IsLast(info);
+    queue.Release();
+    if (last) {
         Dispose(info);
     }
-    hold.Release();
     TRACE_LOW("***** END : %s, %d", operation, count);
     return TRUE;
 }
@@ -286,7 +255,6 @@ int32_t StartRecord(Threads::Slot *slot, const char *szThreadName, int32_t prior
                            "***** __Varnek_create_thread : MsgQ Sem creation FAIL!! errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
     }
-    list_initialize(&info.MsgQ);
     Start *start = static_cast<Start *>(malloc(sizeof(Start)));
     int result = ENOMEM;
     if (start != nullptr) {
@@ -304,10 +272,10 @@ int32_t StartRecord(Threads::Slot *slot, const char *szThreadName, int32_t prior
     return gThreadInfoArr.Publish(slot, szThreadName);
 }
 
-// The lowest slot whose record is neither in use nor waiting for its last user; the guard is held.
+// The lowest slot whose record is neither in use nor left over; the guard is held.
 Threads::Slot *FirstFreeRecord() {
     Threads::Slot *slot = gThreadInfoArr.FirstFree();
-    while (slot != nullptr && (slot->info.users.load(std::memory_order_acquire) & kRemoved) != 0) {
+    while (slot != nullptr && slot->info.isLeftover.load(std::memory_order_acquire)) {
         slot = gThreadInfoArr.FirstFree(slot);
     }
     return slot;
@@ -379,7 +347,7 @@ int32_t __Varnek_create_thread(const char *szThreadName, int32_t priority, uint3
     return hHandle;
 }
 
-// The calling thread's handle, and its slot for RecordUse.
+// The calling thread's handle and slot.
 struct Self {
     int32_t hThread;
     Threads::Slot *slot;
@@ -455,36 +423,100 @@ struct Queued {
     THREAD_MSG message;
 };
 
-// Copies a message into a block of its own and puts it into the queue, before the head when it is
-// urgent. False when memory is short. Messages are copied as bytes: a caller's record may lie
-// anywhere. Inlined, since a stack does it all day.
-inline __attribute__((always_inline)) bool Enqueue(THREAD_MGR_INFO &info, const void *message,
-                                                   bool urgent) {
-    Queued *queued = static_cast<Queued *>(malloc(sizeof(Queued)));
-    if (queued == nullptr) {
-        return false;
+// A copy of a message in a block, null when memory is short. Messages are copied as bytes: a
+// caller's record may lie anywhere.
+inline Queued *CopyOf(const THREAD_MSG *message) {
+    Queued *const queued = static_cast<Queued *>(malloc(sizeof(Queued)));
+    if (queued != nullptr) {
+        memcpy(&queued->message, static_cast<const void *>(message), sizeof queued->message);
     }
-    memcpy(&queued->message, message, sizeof queued->message);
-    const Hold hold(info.queueLock);
-    LinkBefore(&info.MsgQ, urgent ? info.MsgQ.head : nullptr, &queued->node, &queued->message);
-    // cppcheck-suppress memleak  // the list owns the block, by the node in it
-    return true;
+    return queued;
 }
 
-// Moves the first message out of the queue. False when there is none.
-inline __attribute__((always_inline)) bool Dequeue(THREAD_MGR_INFO &info, void *message,
-                                                   int32_t *count) {
+// How a message was sent. The numbers are those of the error, 0 for success.
+struct Sent {
+    bool found;
+    int postError;
+    int valueError;
+    int semCount;  // after the post, -1 when unread
+};
+
+// Puts a block into the queue, before the head when it is urgent, and raises the semaphore. Takes
+// the block over unless the record is gone. Nobody waits where there is no user, so the post
+// happens under the lock; an owner that waits is woken without it, as it takes the lock next.
+// Inlined, since a stack sends all day.
+inline __attribute__((always_inline)) Sent Enqueue(Threads::Slot *slot, int32_t hThread,
+                                                   Queued *queued, bool urgent) {
+    THREAD_MGR_INFO &info = slot->info;
     Hold hold(info.queueLock);
+    if (!slot->Has(hThread, std::memory_order_relaxed)) {
+        return {};
+    }
+    LinkBefore(&info.MsgQ, urgent ? info.MsgQ.head : nullptr, &queued->node, &queued->message);
+    const bool used = info.users > 0;
+    if (used) {
+        info.users++;
+        hold.Release();
+    }
+    Sent sent = {true, 0, 0, -1};
+    if (sem_post(&info.msgQSem) != 0) {
+        sent.postError = VarnekPGL_SysGetLastErro();
+    } else if (!urgent && sem_getvalue(&info.msgQSem, &sent.semCount) != 0) {
+        sent.valueError = VarnekPGL_SysGetLastErro();
+        sent.semCount = -1;
+    }
+    if (used) {
+        Leave(info);
+    }
+    // cppcheck-suppress memleak  // the list owns the block, by the node in it
+    return sent;
+}
+
+// Takes the first message out of the queue, null when there is none; the caller frees its block.
+inline Queued *TakeFirst(THREAD_MGR_INFO &info, int32_t *left) VARNEK_REQUIRES(info.queueLock) {
     list_node_t *const node = info.MsgQ.head;
     if (node == nullptr) {
-        return false;
+        return nullptr;
     }
     Unlink(&info.MsgQ, node);
-    *count = info.MsgQ.count;
-    hold.Release();
-    memcpy(message, node->data, sizeof(THREAD_MSG));
-    free(node);  // the whole block
-    return true;
+    *left = info.MsgQ.count;
+    return reinterpret_cast<Queued *>(node);  // its first member
+}
+
+// Hands a message out and frees its block.
+inline void HandOut(Queued *queued, THREAD_MSG *message) {
+    memcpy(static_cast<void *>(message), &queued->message, sizeof queued->message);
+    free(queued);
+}
+
+// What the owner finds at its queue.
+struct Receipt {
+    bool found;      // the record
+    bool counted;    // a unit of the semaphore, which was taken
+    Queued *queued;  // the message, null for none
+    int32_t left;    // messages behind it
+    int valueError;  // the result of the call that reads the semaphore
+    int semCount;    // before a unit was taken
+};
+
+// Takes a unit that is counted, with its message. Where none is counted, the calling thread becomes
+// a user of its record, for WaitAndTake.
+inline __attribute__((always_inline)) Receipt TakeCounted(Threads::Slot *self, int32_t hThread) {
+    THREAD_MGR_INFO &info = self->info;
+    Receipt receipt = {};
+    const Hold hold(info.queueLock);
+    receipt.found = self->Has(hThread, std::memory_order_relaxed);
+    if (!receipt.found) {
+        return receipt;
+    }
+    receipt.valueError = sem_getvalue(&info.msgQSem, &receipt.semCount);
+    receipt.counted = sem_trywait(&info.msgQSem) == 0;
+    if (receipt.counted) {
+        receipt.queued = TakeFirst(info, &receipt.left);
+    } else {
+        info.users++;
+    }
+    return receipt;
 }
 
 // Waits for one unit, with errno telling why not. 0 or -1.
@@ -500,6 +532,26 @@ int WaitForMessage(sem_t *msgQSem, uint32_t timeout) {
     return sem_timedwait(msgQSem, &deadline);
 }
 
+// Waits for a unit and takes its message. The calling thread is a user of its record until this
+// returns. `error` is the number of the error that ended the wait, 0 for none.
+Receipt WaitAndTake(Threads::Slot *self, int32_t hThread, uint32_t timeout, int *error) {
+    THREAD_MGR_INFO &info = self->info;
+    Receipt receipt = {};
+    *error = WaitForMessage(&info.msgQSem, timeout) == 0 ? 0 : VarnekPGL_SysGetLastErro();
+    Hold hold(info.queueLock);
+    info.users--;
+    receipt.found = self->Has(hThread, std::memory_order_relaxed);
+    if (*error == 0 && receipt.found) {
+        receipt.queued = TakeFirst(info, &receipt.left);
+    }
+    const bool last = IsLast(info);
+    hold.Release();
+    if (last) {
+        Dispose(info);
+    }
+    return receipt;
+}
+
 }  // namespace
 
 BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message) {
@@ -507,28 +559,33 @@ BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message) {
     if (message == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendMessage: message is NULL");
     }
-    const RecordUse use(hThread);
-    if (!use.Entered()) {
+    Threads::Slot *const slot = gThreadInfoArr.Find(hThread);
+    if (slot == nullptr) {
         return VARNEK_FAIL(
             FALSE, "***** VarnekPGL_SendMessage. Can't find thread info. thread = [%d]", hThread);
     }
-    TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: ThreadMgr arrIdx = %d", use.Number());
-    if (!Enqueue(use.Info(), message, false)) {
+    TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: ThreadMgr arrIdx = %d",
+                    gThreadInfoArr.NumberOf(slot));
+    Queued *const queued = CopyOf(message);
+    if (queued == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendMessage: memalloc failed");
     }
-    sem_t *msgQSem = &use.Info().msgQSem;
-    if (sem_post(msgQSem) != 0) {
+    const Sent sent = Enqueue(slot, hThread, queued, false);
+    if (!sent.found) {
+        free(queued);
+        return VARNEK_FAIL(
+            FALSE, "***** VarnekPGL_SendMessage. Can't find thread info. thread = [%d]", hThread);
+    }
+    if (sent.postError != 0) {
         return VARNEK_FAIL(FALSE,
                            "***** VarnekPGL_SendMessage: Semaphore Post FAIL. errCode = [%d]",
-                           VarnekPGL_SysGetLastErro());
+                           sent.postError);
     }
-    int semCount = -1;
-    if (sem_getvalue(msgQSem, &semCount) != 0) {
+    if (sent.valueError != 0) {
         TRACE_ERROR("***** VarnekPGL_SendMessage: Semaphore Get Value FAIL. errCode = [%d]",
-                    VarnekPGL_SysGetLastErro());
-        semCount = -1;
+                    sent.valueError);
     }
-    TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: semCount = %d", semCount);
+    TRACE_LOW_QUICK("***** VarnekPGL_SendMessage: semCount = %d", sent.semCount);
     return TRUE;
 }
 
@@ -536,19 +593,27 @@ BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message) {
     if (message == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendUrgentMessage: message is NULL");
     }
-    const RecordUse use(hThread);
-    if (!use.Entered()) {
+    Threads::Slot *const slot = gThreadInfoArr.Find(hThread);
+    if (slot == nullptr) {
         return VARNEK_FAIL(
             FALSE, "***** VarnekPGL_SendUrgentMessage. Can't find thread info. thread = [%d]",
             hThread);
     }
-    if (!Enqueue(use.Info(), message, true)) {
+    Queued *const queued = CopyOf(message);
+    if (queued == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_SendUrgentMessage: memalloc failed");
     }
-    if (sem_post(&use.Info().msgQSem) != 0) {
+    const Sent sent = Enqueue(slot, hThread, queued, true);
+    if (!sent.found) {
+        free(queued);
+        return VARNEK_FAIL(
+            FALSE, "***** VarnekPGL_SendUrgentMessage. Can't find thread info. thread = [%d]",
+            hThread);
+    }
+    if (sent.postError != 0) {
         return VARNEK_FAIL(FALSE,
                            "***** VarnekPGL_SendUrgentMessage: Semaphore Post FAIL. errCode = [%d]",
-                           VarnekPGL_SysGetLastErro());
+                           sent.postError);
     }
     return TRUE;
 }
@@ -563,36 +628,40 @@ BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *co
         return VARNEK_FAIL(FALSE,
                            "***** VarnekPGL_ReceiveMessage. Can't find current thread handle");
     }
-    const RecordUse use(curThread, slot);
-    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: arrIdx = %d", use.Number());
-    if (!use.Entered()) {
+    Receipt receipt = TakeCounted(slot, curThread);
+    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: arrIdx = %d",
+                    receipt.found ? gThreadInfoArr.NumberOf(slot) : -1);
+    if (!receipt.found) {
         return VARNEK_FAIL(
             FALSE, "VarnekPGL_ReceiveMessage: Can't find current thread Info. curThread = [%d]",
             curThread);
     }
-    sem_t *msgQSem = &use.Info().msgQSem;
-    int semCount = -1;
-    const int read = sem_getvalue(msgQSem, &semCount);
-    if (read != 0) {
+    if (receipt.valueError != 0) {
         TRACE_ERROR("***** VarnekPGL_ReceiveMessage: Semaphore Get Value FAIL. errCode = [%d]",
-                    read);
-        semCount = -1;
+                    receipt.valueError);
     }
-    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: semCount = %d", semCount);
-    if (WaitForMessage(msgQSem, timeout) != 0) {
-        return VARNEK_FAIL(FALSE,
-                           "***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [%d]",
-                           VarnekPGL_SysGetLastErro());
+    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: semCount = %d",
+                    receipt.valueError == 0 ? receipt.semCount : -1);
+    if (!receipt.counted) {
+        int error = 0;
+        receipt = WaitAndTake(slot, curThread, timeout, &error);
+        if (error != 0) {
+            return VARNEK_FAIL(
+                FALSE, "***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [%d]",
+                error);
+        }
+        if (!receipt.found) {
+            // The record was removed while its thread waited.
+            return VARNEK_FAIL(
+                FALSE, "VarnekPGL_ReceiveMessage: Can't find current thread Info. curThread = [%d]",
+                curThread);
+        }
     }
-    if (!use.IsLive()) {
-        // The record was removed while its thread waited here.
-        return VARNEK_FAIL(
-            FALSE, "VarnekPGL_ReceiveMessage: Can't find current thread Info. curThread = [%d]",
-            curThread);
-    }
-    if (!Dequeue(use.Info(), message, count)) {
+    if (receipt.queued == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_ReceiveMessage: Msg is NULL");
     }
+    HandOut(receipt.queued, message);
+    *count = receipt.left;
     return TRUE;
 }
 
@@ -605,16 +674,22 @@ BOOL VarnekPGL_PeekMessage(THREAD_MSG *message, int32_t *count) {
     if (curThread == kInvalidHandle) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_PeekMessage. Can't find current thread handle");
     }
-    const RecordUse use(curThread, slot);
-    TRACE_LOW("VarnekPGL_PeekMessage: arrIdx = %d", use.Number());
-    if (!use.Entered()) {
+    Hold hold(slot->info.queueLock);
+    int32_t left = 0;
+    const bool found = slot->Has(curThread, std::memory_order_relaxed);
+    Queued *const queued = found ? TakeFirst(slot->info, &left) : nullptr;
+    hold.Release();
+    TRACE_LOW("VarnekPGL_PeekMessage: arrIdx = %d", found ? gThreadInfoArr.NumberOf(slot) : -1);
+    if (!found) {
         return VARNEK_FAIL(
             FALSE, "VarnekPGL_PeekMessage: Can't find current thread Info. curThread = [%d]",
             curThread);
     }
-    if (!Dequeue(use.Info(), message, count)) {
+    if (queued == nullptr) {
         return VARNEK_FAIL(FALSE, "***** VarnekPGL_PeekMessage: Msg is NULL");
     }
+    HandOut(queued, message);
+    *count = left;
     TRACE_LOW("***** END : VarnekPGL_PeekMessage.");
     return TRUE;
 }
