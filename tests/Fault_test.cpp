@@ -91,13 +91,35 @@ void Fault::UseOwnQueue() {
     FAULT("sem_getvalue", EINVAL, send());
     FAULT("sem_getvalue", EINVAL, receive(0));
     NOTE(receive(0));  // a failed send leaves neither a message nor a signal
-    FAULT("sem_post", EOVERFLOW, send());
-    FAULT("sem_post", EOVERFLOW, urgent());
     FAULT("sem_wait", EINTR, receive(WAIT_FOREVER));
     FAULT("clock_gettime", EFAULT, receive(7));
-    EXPECT_TRUE(VarnekPGL_PeekMessage(&received, &count)) << "what a failed post queued stays queued";
-    EXPECT_EQ(count, 1);
     done_.set_value();
+}
+
+TEST_F(Fault, APostThatFailsLeavesTheMessageAndTheNextWakesTheOwner) {
+    static std::promise<void> waiting;
+    gLogHook = [](const LogLine &line) {
+        if (line.text.find("VarnekPGL_ReceiveMessage: semCount = 0") != std::string::npos) {
+            waiting.set_value();
+        }
+    };
+    const auto run = [](void *left) -> void * {
+        THREAD_MSG message;
+        int32_t count = -1;
+        VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count);
+        static_cast<std::promise<int> *>(left)->set_value(message.data[0] * 10 + count);
+        return nullptr;
+    };
+    std::promise<int> left;
+    ASSERT_EQ(VarnekPGL_CreateThread("owner", 1, 0, run, &left), 1);
+    waiting.get_future().wait();
+    gLogHook = nullptr;
+    const THREAD_MSG message = {}, urgent = {{1}};
+    FAULT("sem_post", EOVERFLOW, VarnekPGL_SendMessage(1, &message));
+    FAULT("sem_post", EOVERFLOW, VarnekPGL_SendUrgentMessage(1, &urgent));
+    EXPECT_TRUE(VarnekPGL_SendMessage(1, &message));
+    EXPECT_EQ(left.get_future().get(), 12) << "the urgent message, and two behind it";
+    EXPECT_TRUE(VarnekPGL_DeleteThread(1));
 }
 
 TEST_F(Fault, Messages) {

@@ -36,9 +36,14 @@ constexpr size_t kSystemNameSize = 16;  // of a thread's name in the system, wit
 
 struct THREAD_MGR_INFO {
     Lock queueLock;
-    list_t MsgQ VARNEK_GUARDED_BY(queueLock);     // empty while the record is free
-    sem_t msgQSem;                                // counts the queue's messages
-    uint32_t users VARNEK_GUARDED_BY(queueLock);  // of the semaphore, without the lock
+    list_t MsgQ VARNEK_GUARDED_BY(queueLock);  // empty while the record is free
+    // The semaphore and `units` together count the messages: a unit for each that was sent. It is
+    // posted if the owner waits for one. If not, it is only counted, which needs no more than the
+    // lock.
+    sem_t msgQSem;
+    int32_t units VARNEK_GUARDED_BY(queueLock);
+    uint32_t unanswered VARNEK_GUARDED_BY(queueLock);  // waits for which no unit was posted yet
+    uint32_t users VARNEK_GUARDED_BY(queueLock);       // of the semaphore, without the lock
     // For the last user of a removed record: the operation that removed it, null before, and the
     // level and module at which that operation reports unread messages.
     const char *removedBy VARNEK_GUARDED_BY(queueLock);
@@ -144,6 +149,8 @@ void Dispose(THREAD_MGR_INFO &info) VARNEK_THREAD_SAFETY(no_thread_safety_analys
         }
         list_initialize(&info.MsgQ);
     }
+    info.units = 0;
+    info.unanswered = 0;
     info.removedBy = nullptr;
     info.isLeftover.store(false, std::memory_order_release);
 }
@@ -152,17 +159,6 @@ void Dispose(THREAD_MGR_INFO &info) VARNEK_THREAD_SAFETY(no_thread_safety_analys
 // removal itself, or when the last user leaves.
 bool IsLast(const THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
     return info.removedBy != nullptr && info.users == 0;
-}
-
-// Ends the use of a record, which began with an increment of `users`.
-void Leave(THREAD_MGR_INFO &info) {
-    Hold hold(info.queueLock);
-    info.users--;
-    const bool last = IsLast(info);
-    hold.Release();
-    if (last) {
-        Dispose(info);
-    }
 }
 
 // Threads ----------------------------------------------------------------------------------------
@@ -433,40 +429,67 @@ inline Queued *CopyOf(const THREAD_MSG *message) {
     return queued;
 }
 
-// How a message was sent. The numbers are those of the error, 0 for success.
+// Reads how many units are counted; -1 and errno as sem_getvalue.
+inline int ReadUnits(THREAD_MGR_INFO &info, int *units) VARNEK_REQUIRES(info.queueLock) {
+    int posted = 0;
+    const int result = sem_getvalue(&info.msgQSem, &posted);
+    *units = result == 0 ? posted + info.units : -1;
+    return result;
+}
+
+// Takes a unit. False when none is counted.
+inline bool TakeUnit(THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
+    if (info.units > 0) {
+        info.units--;
+        return true;
+    }
+    return sem_trywait(&info.msgQSem) == 0;
+}
+
+// How a message was sent. The errors are error numbers, 0 for none.
 struct Sent {
-    bool found;
+    bool found;  // the record
     int postError;
     int valueError;
-    int semCount;  // after the post, -1 when unread
+    int semCount;  // the units after the post, -1 when unread; not read for an urgent message
 };
 
-// Puts a block into the queue, before the head when it is urgent, and raises the semaphore. Takes
-// the block over unless the record is gone. Nobody waits where there is no user, so the post
-// happens under the lock; an owner that waits is woken without it, as it takes the lock next.
-// Inlined, since a stack sends all day.
+// Puts a block into the queue, before the head when it is urgent, and counts a unit for it. Takes
+// the block over unless the record is gone. Inlined, since a stack sends all day.
 inline __attribute__((always_inline)) Sent Enqueue(Threads::Slot *slot, int32_t hThread,
                                                    Queued *queued, bool urgent) {
     THREAD_MGR_INFO &info = slot->info;
+    Sent sent = {};
+    bool last = false;
     Hold hold(info.queueLock);
-    if (!slot->Has(hThread, std::memory_order_relaxed)) {
-        return {};
+    sent.found = slot->Has(hThread, std::memory_order_relaxed);
+    if (!sent.found) {
+        return sent;
     }
     LinkBefore(&info.MsgQ, urgent ? info.MsgQ.head : nullptr, &queued->node, &queued->message);
-    const bool used = info.users > 0;
-    if (used) {
+    if (info.unanswered == 0) {
+        info.units++;
+    } else {
+        // The post comes without the lock, which the owner takes as soon as it wakes.
+        info.unanswered--;
         info.users++;
         hold.Release();
+        if (sem_post(&info.msgQSem) != 0) {
+            sent.postError = VarnekPGL_SysGetLastErro();
+        }
+        hold.Acquire();
+        info.users--;
+        if (sent.postError != 0) {
+            info.unanswered++;  // the next message wakes the owner
+        }
+        last = IsLast(info);
     }
-    Sent sent = {true, 0, 0, -1};
-    if (sem_post(&info.msgQSem) != 0) {
-        sent.postError = VarnekPGL_SysGetLastErro();
-    } else if (!urgent && sem_getvalue(&info.msgQSem, &sent.semCount) != 0) {
+    if (!urgent && sent.postError == 0 && ReadUnits(info, &sent.semCount) != 0) {
         sent.valueError = VarnekPGL_SysGetLastErro();
-        sent.semCount = -1;
     }
-    if (used) {
-        Leave(info);
+    hold.Release();
+    if (last) {
+        Dispose(info);
     }
     // cppcheck-suppress memleak  // the list owns the block, by the node in it
     return sent;
@@ -492,11 +515,11 @@ inline void HandOut(Queued *queued, THREAD_MSG *message) {
 // What the owner finds at its queue.
 struct Receipt {
     bool found;      // the record
-    bool counted;    // a unit of the semaphore, which was taken
+    bool counted;    // a unit, which was taken
     Queued *queued;  // the message, null for none
     int32_t left;    // messages behind it
     int valueError;  // the result of the call that reads the semaphore
-    int semCount;    // before a unit was taken
+    int semCount;    // the units before that, -1 when unread
 };
 
 // Takes a unit that is counted, with its message. Where none is counted, the calling thread becomes
@@ -509,11 +532,12 @@ inline __attribute__((always_inline)) Receipt TakeCounted(Threads::Slot *self, i
     if (!receipt.found) {
         return receipt;
     }
-    receipt.valueError = sem_getvalue(&info.msgQSem, &receipt.semCount);
-    receipt.counted = sem_trywait(&info.msgQSem) == 0;
+    receipt.valueError = ReadUnits(info, &receipt.semCount);
+    receipt.counted = TakeUnit(info);
     if (receipt.counted) {
         receipt.queued = TakeFirst(info, &receipt.left);
     } else {
+        info.unanswered++;
         info.users++;
     }
     return receipt;
@@ -541,6 +565,9 @@ Receipt WaitAndTake(Threads::Slot *self, int32_t hThread, uint32_t timeout, int 
     Hold hold(info.queueLock);
     info.users--;
     receipt.found = self->Has(hThread, std::memory_order_relaxed);
+    if (*error != 0 && info.unanswered > 0) {
+        info.unanswered--;
+    }
     if (*error == 0 && receipt.found) {
         receipt.queued = TakeFirst(info, &receipt.left);
     }
@@ -640,8 +667,7 @@ BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *co
         TRACE_ERROR("***** VarnekPGL_ReceiveMessage: Semaphore Get Value FAIL. errCode = [%d]",
                     receipt.valueError);
     }
-    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: semCount = %d",
-                    receipt.valueError == 0 ? receipt.semCount : -1);
+    TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: semCount = %d", receipt.semCount);
     if (!receipt.counted) {
         int error = 0;
         receipt = WaitAndTake(slot, curThread, timeout, &error);
