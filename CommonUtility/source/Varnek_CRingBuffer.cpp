@@ -262,7 +262,7 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
         return VARNEK_FAIL(VARNEK_RING_INVALID, "Too long writelen=[%d]! Ring buffer size=[%d]\n",
                            writelen, iRingSize);
     }
-    if (data == nullptr && writelen > 0) {
+    if (__builtin_expect(data == nullptr, 0) && writelen > 0) {
         VARNEK_PANIC();
         return VARNEK_RING_INVALID;
     }
@@ -312,7 +312,7 @@ int VarnekCRingBuffer::Read(unsigned char *dest, int readLen) {
         return VARNEK_FAIL(VARNEK_RING_INVALID, "Too long readLen=[%d]! Ring buffer size=[%d]\n",
                            readLen, iRingSize);
     }
-    if (dest == nullptr && readLen > 0) {
+    if (__builtin_expect(dest == nullptr, 0) && readLen > 0) {
         VARNEK_PANIC();
         return VARNEK_RING_INVALID;
     }

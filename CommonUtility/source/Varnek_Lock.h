@@ -7,6 +7,7 @@
 #include <pthread.h>
 
 #include "Varnek_Semaphore.h"
+#include "Varnek_SlotTable.h"
 
 #if defined(__clang__)
 #define VARNEK_THREAD_SAFETY(attribute) __attribute__((attribute))
@@ -51,11 +52,31 @@ class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
     bool held_ = false;
 };
 
+// The table of the named mutexes, for the two operations below. Varnek_Semaphore.cpp owns it, and
+// writes the lines of their failures.
+constexpr int MAX_MUTEX_MGR_INFO_ARR_SIZE = 40;
+struct MUTEX_MGR_INFO {
+    pthread_mutex_t linuxMutex;
+};
+extern __attribute__((visibility("hidden"))) SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE>
+    gMutexArr;
+pthread_mutex_t *LockFailed(const void *slot, int32_t hMutex, int error);  // null
+BOOL UnlockFailed(int error);                                              // FALSE
+
 // What VarnekPGL_AcquireMutex does; hands the mutex out, null when it was not taken. It cannot be
 // deleted while it is held, so UnlockMutex, which is the rest of VarnekPGL_ReleaseMutex, looks for
 // nothing.
-pthread_mutex_t *LockMutex(int32_t hMutex);
-BOOL UnlockMutex(pthread_mutex_t *mutex);
+inline pthread_mutex_t *LockMutex(int32_t hMutex) {
+    auto *const slot = gMutexArr.Find(hMutex);
+    const int error = slot != nullptr ? pthread_mutex_lock(&slot->info.linuxMutex) : 0;
+    return __builtin_expect(slot != nullptr && error == 0, 1) ? &slot->info.linuxMutex
+                                                              : LockFailed(slot, hMutex, error);
+}
+
+inline BOOL UnlockMutex(pthread_mutex_t *mutex) {
+    const int error = pthread_mutex_unlock(mutex);
+    return __builtin_expect(error == 0, 1) ? TRUE : UnlockFailed(error);
+}
 
 // Holds a named mutex to the end of the scope, or up to its release; nothing for an object without
 // a mutex (kNoMutex). IsHeld says whether the mutex could be taken; one that could not is released

@@ -11,14 +11,11 @@
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
+SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE> gMutexArr;
+
 namespace {
 
-constexpr int MAX_MUTEX_MGR_INFO_ARR_SIZE = 40;
 constexpr int MAX_SEM_MGR_INFO_ARR_SIZE = 40;
-
-struct MUTEX_MGR_INFO {
-    pthread_mutex_t linuxMutex;
-};
 
 struct SEM_MGR_INFO {
     sem_t linuxSem;
@@ -26,7 +23,6 @@ struct SEM_MGR_INFO {
 
 // A lock for each table. It guards every change of its table; lookups read the table without it.
 Lock gMutexArrLock;
-SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE> gMutexArr;
 Lock gSemArrLock;
 using Semaphores = SlotTable<SEM_MGR_INFO, MAX_SEM_MGR_INFO_ARR_SIZE>;
 Semaphores gSemArr;
@@ -114,41 +110,25 @@ BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
     return TRUE;
 }
 
-// Both inlined, since they are all that their exported operations are.
-static inline __attribute__((always_inline)) pthread_mutex_t *FindAndLock(int32_t hMutex) {
-    auto *const slot = gMutexArr.Find(hMutex);
+pthread_mutex_t *LockFailed(const void *slot, int32_t hMutex, int error) {
     if (slot == nullptr) {
-        TRACE_ERROR("***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [%d]",
-                    hMutex);
-        return nullptr;
+        return VARNEK_FAIL(
+            nullptr, "***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [%d]",
+            hMutex);
     }
-    if (!Succeeded(pthread_mutex_lock(&slot->info.linuxMutex))) {
-        TRACE_ERROR("***** VarnekPGL_AcquireMutex : Mutex Lock FAIL! errCode = [%d]",
-                    VarnekPGL_SysGetLastErro());
-        return nullptr;
-    }
-    return &slot->info.linuxMutex;
+    errno = error;
+    return VARNEK_FAIL(nullptr, "***** VarnekPGL_AcquireMutex : Mutex Lock FAIL! errCode = [%d]",
+                       VarnekPGL_SysGetLastErro());
 }
 
-static inline __attribute__((always_inline)) BOOL Unlock(pthread_mutex_t *mutex) {
-    if (!Succeeded(pthread_mutex_unlock(mutex))) {
-        return VARNEK_FAIL(FALSE,
-                           "***** VarnekPGL_ReleaseMutex : Mutex Unlock FAIL! errCode = [%d]",
-                           VarnekPGL_SysGetLastErro());
-    }
-    return TRUE;
-}
-
-pthread_mutex_t *LockMutex(int32_t hMutex) {
-    return FindAndLock(hMutex);
-}
-
-BOOL UnlockMutex(pthread_mutex_t *mutex) {
-    return Unlock(mutex);
+BOOL UnlockFailed(int error) {
+    errno = error;
+    return VARNEK_FAIL(FALSE, "***** VarnekPGL_ReleaseMutex : Mutex Unlock FAIL! errCode = [%d]",
+                       VarnekPGL_SysGetLastErro());
 }
 
 BOOL VarnekPGL_AcquireMutex(int32_t hMutex) {
-    return FindAndLock(hMutex) != nullptr ? TRUE : FALSE;
+    return LockMutex(hMutex) != nullptr ? TRUE : FALSE;
 }
 
 BOOL VarnekPGL_ReleaseMutex(int32_t hMutex) {
@@ -158,7 +138,7 @@ BOOL VarnekPGL_ReleaseMutex(int32_t hMutex) {
             FALSE, "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [%d]",
             hMutex);
     }
-    return Unlock(&slot->info.linuxMutex);
+    return UnlockMutex(&slot->info.linuxMutex);
 }
 
 int32_t VarnekPGL_GetMutexByName(const char *szMutexName) {
