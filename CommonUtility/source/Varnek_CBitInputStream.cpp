@@ -1,6 +1,6 @@
-// The bit input stream. A field within the current byte is taken from ucCurByte, and one that
-// leaves it from the buffer, as long as five bytes are left. The others go piece by piece through
-// GetBits, which is the only place where the end is found.
+// The bit input stream. A field within the current byte is taken from ucCurByte. A field that goes
+// beyond it is taken from the buffer, if five bytes are left there. All other fields are read piece
+// by piece by GetBits, which alone finds the end of the stream.
 #include "Varnek_CBitInputStream.h"
 
 #include <limits.h>
@@ -11,8 +11,9 @@
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
-// Values of bEndOfStream. Inside a byte that a rewind loaded afresh, ucCurByte is not what the
-// buffer and the bit index give, so fields go piece by piece until the byte is left.
+// Values of bEndOfStream. A rewind from within a byte loads the whole target byte but keeps the bit
+// index, so ucCurByte is not what buffer and index would give. Up to the end of that byte, fields
+// are read piece by piece.
 static constexpr unsigned char kReading = 0;
 static constexpr unsigned char kAtEnd = 1;
 static constexpr unsigned char kRewound = 2;
@@ -32,7 +33,7 @@ VarnekCBitInputStream::VarnekCBitInputStream(unsigned char *source, unsigned int
         TRACE_ERROR("Source Array is NULL!\n");
         return;
     }
-    // The index is signed: what lies beyond 2 GiB cannot be reached.
+    // The index is signed, so it cannot reach bytes beyond 2 GiB.
     const unsigned int reachable = length > INT_MAX ? INT_MAX : length;
     pBuffer = copyMode == 1 ? CopyOf(source, reachable) : source;
     if (pBuffer == nullptr) {
@@ -117,8 +118,8 @@ unsigned int VarnekCBitInputStream::GetBits(int aNum, unsigned char &success) {
     return value;
 }
 
-// A field of `width` bits where the current byte has `left`. Kept out of line and called last, so
-// that the other fields need no registers saved.
+// Reads a field of `width` bits where the current byte has `left`. It is out of line and called
+// last, so that the usual fields save no registers for it.
 template <typename Value>
 __attribute__((noinline, cold)) static Value ReadByPieces(VarnekCBitInputStream &stream, int left,
                                                           int width, unsigned char &success) {
@@ -132,7 +133,7 @@ __attribute__((noinline, cold)) static Value ReadByPieces(VarnekCBitInputStream 
     return static_cast<Value>(value);
 }
 
-// Inlined into each of the reads, since a table is thousands of short fields.
+// Inlined into each of the reads, since a table has thousands of short fields.
 template <typename Value, unsigned int most>
 __attribute__((always_inline)) inline Value VarnekCBitInputStream::Read(int count,
                                                                         unsigned char &success) {

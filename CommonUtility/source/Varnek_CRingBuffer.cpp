@@ -1,5 +1,5 @@
-// The byte ring. A position stays below the size, but for a reader that was set to the end of the
-// storage: its next byte is the first.
+// The byte ring. A position is below the size, with one exception: a reader may be set to the end of
+// the storage, and reads the first byte next.
 #include "Varnek_CRingBuffer.h"
 
 #include <stdio.h>
@@ -12,7 +12,7 @@
 #include "Varnek_Semaphore.h"
 #include "Varnek_Trace.h"
 
-// What the operations ask of a ring and do to it. The caller holds the ring's mutex, if it has one.
+// The steps that several operations share. The caller holds the ring's mutex, if it has one.
 struct VarnekRingState {
     enum Order {
         kInOrder,
@@ -21,7 +21,8 @@ struct VarnekRingState {
         kOvertaken,  // the reader is ahead of the writer in one lap
     };
 
-    // The laps by which the writer is ahead. Loop counts wrap around, their difference does not.
+    // The laps by which the writer is ahead. A loop count may wrap around; the difference is right
+    // all the same.
     static int Ahead(const VarnekCRingBuffer &ring) {
         return static_cast<int>(static_cast<unsigned int>(ring.iWriteLoopCnt) -
                                 static_cast<unsigned int>(ring.iReadLoopCnt));
@@ -38,14 +39,14 @@ struct VarnekRingState {
         return ring.iReadPos < ring.iWritePos ? kOverflow : kInOrder;
     }
 
-    // The bytes that can be read from a ring in order. A writer that is several laps ahead counts
-    // as one that is one lap ahead.
+    // The bytes that can be read from a ring whose positions are in order. A writer that is several
+    // laps ahead counts as one lap ahead.
     static int Used(const VarnekCRingBuffer &ring) {
         return ring.iWritePos - ring.iReadPos + (Ahead(ring) > 0 ? ring.iRingSize : 0);
     }
 
-    // For a query: 0, or the result after its two lines for a state in which no operation should
-    // have left the ring.
+    // The check of the queries: 0 for a ring in order. For an inconsistent state it writes its two
+    // lines and returns the query's result.
     static int Check(const VarnekCRingBuffer &ring);
 
     static void Empty(VarnekCRingBuffer *ring) {
@@ -56,8 +57,8 @@ struct VarnekRingState {
     // the mutex is released and taken again, and the ring keeps whatever size it has then.
     static void Recover(VarnekCRingBuffer *ring, HoldMutex *hold);
 
-    // Sets the reader to a position in the writer's lap, or in the one before when the writer has
-    // not come that far.
+    // Sets the reader to a position in the writer's lap, or in the lap before if the writer is not
+    // that far.
     static void SetReader(VarnekCRingBuffer *ring, int pos) {
         ring->iReadPos = pos;
         ring->iReadLoopCnt = AddLaps(ring->iWriteLoopCnt, ring->iWritePos < pos ? -1 : 0);
@@ -72,8 +73,8 @@ namespace {
 
 using State = VarnekRingState;
 
-// Numbers the mutex names of the process: a name that came twice would destroy another ring's
-// mutex.
+// Numbers the names of the rings' mutexes. With a name twice, the second ring would destroy the
+// first one's mutex.
 std::atomic<int32_t> gRingBufCount{0};
 
 // Moves a position on by `length` bytes, at most `size`.
@@ -116,7 +117,7 @@ int VarnekRingState::Check(const VarnekCRingBuffer &ring) {
     return ahead > 0 ? VARNEK_RING_OVERFLOW : VARNEK_RING_UNDERFLOW;
 }
 
-// Inlined, so that the holder of the mutex stays in registers.
+// Inlined, so that `hold` needs no address and can stay in registers.
 inline __attribute__((always_inline)) void VarnekRingState::Recover(VarnekCRingBuffer *ring,
                                                                     HoldMutex *hold) {
     hold->Release();
@@ -249,7 +250,8 @@ int VarnekCRingBuffer::GetDistance() const {
     if (iRingSize == 0) {
         return 0;
     }
-    // In 64 bits: a hundred times the fill level of a large ring. Every lap counts here.
+    // In 64 bits, since a hundred times the fill level of a large ring overflows 32. Unlike Used,
+    // this counts every lap.
     const int64_t distance =
         static_cast<int64_t>(State::Ahead(*this)) * iRingSize + iWritePos - iReadPos;
     const int64_t percent = distance * 100 / iRingSize;
@@ -281,7 +283,7 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
             State::Recover(this, &hold);
             return VARNEK_RING_NO_DATA;
         case State::kOvertaken:
-            // On purpose not emptied here; the next read does that.
+            // The ring stays as it is; the next read empties it.
             return VARNEK_FAIL(
                 VARNEK_RING_NO_DATA,
                 "Invalid Ring Buffer State! Underflow! This data will be discarded!\n");

@@ -1,11 +1,17 @@
 // The table of named objects: slots, handles and names, and nothing else. Private.
 //
-// A handle is published once in the life of the process, so it is the one word that publishes a
-// slot: what belongs to it is complete before it is stored and untouched until it is withdrawn.
-// Lookups take no lock. They read the handle with acquire; for a name they read the handle again
-// after the name's words, and since no handle ever comes back, the same handle twice means that the
-// words in between were its own: a sequence lock whose number cannot repeat. A digest of each name
-// tells where that is worth its barriers.
+// A handle is published once in the life of the process, and it publishes its slot: everything that
+// belongs to the slot is complete before the handle is stored, and does not change until the handle
+// is withdrawn. Lookups take no lock. A lookup by handle reads the handle with acquire. A lookup by
+// name reads the handle, the words of the name, and the handle again. Handles never come back, so
+// if both are the same, the words in between were that handle's own: this is a sequence lock whose
+// number cannot repeat. Each name has a digest, which shows where these reads are worth their
+// barriers.
+//
+// A handle says nothing about its slot's place. So that a lookup by handle does not have to scan,
+// the table remembers for each of 256 classes of handles where one of that class was last seen.
+// Such a hint may be stale or belong to another handle of the class; the handle in the slot
+// decides, and a lookup that a stale hint has misled scans once and corrects the hint.
 //
 // A thread that changes the table holds the family's guard. The table is zero when the library is
 // loaded.
@@ -26,7 +32,8 @@ constexpr size_t kNameSize = 32;  // with the terminator
 template <typename Info, int capacity>
 class SlotTable {
   public:
-    // A line of the cache each, so that threads at neighbouring slots do not slow each other.
+    // Each slot has its own lines of the cache, so that threads that use neighbouring slots do not
+    // slow each other.
     struct alignas(64) Slot {
         std::atomic<int32_t> handle;
         Info info;
@@ -37,9 +44,9 @@ class SlotTable {
         }
     };
 
-    // The slot of a live handle, null for none. One look when the hint is right, a scan when it is
-    // not: for an unknown handle, and when another handle has the same place among the hints.
-    // Read with `order`; with relaxed, what belongs to the slot may not be looked at yet.
+    // The slot of a live handle, null for none. This is one look if the hint is right, and a scan
+    // for an unknown handle or if the hint is another's. The handle is read with `order`; after a
+    // relaxed read, only the handle of the slot may be used.
     Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
         if (handle <= kFree) {
             return nullptr;
@@ -67,16 +74,17 @@ class SlotTable {
         return kInvalidHandle;
     }
 
-    // The number of a slot in the log: from 0 on, -1 for null.
+    // The number that a slot has in the log: 0 for the first, -1 for null.
     int NumberOf(const Slot *slot) const {
         return slot != nullptr ? static_cast<int>(slot - slots_) : -1;
     }
 
-    // The slots in use. Exact for the holder of the guard, a moment old for any other thread.
+    // The number of slots in use. For the holder of the guard it is exact; for any other thread it
+    // may have changed.
     int32_t Count() const { return count_.load(std::memory_order_relaxed); }
 
-    // The lowest slot that a new object may take, after `last` where that is given. Null for none,
-    // and for good once every handle has been given out.
+    // The lowest slot that a new object may take, of those after `last` if that is given. Null for
+    // none, and always null once every handle has been given out.
     Slot *FirstFree(const Slot *last = nullptr) {
         for (int slot = NumberOf(last) + 1; slot < capacity && HasHandles(); slot++) {
             if (slots_[slot].Has(kFree, std::memory_order_relaxed)) {
@@ -103,7 +111,8 @@ class SlotTable {
         return handle;
     }
 
-    // Makes the slot invisible; its Info may be taken apart now. Returns how many are left in use.
+    // Makes the slot invisible; its Info may be taken apart now. Returns how many slots remain in
+    // use.
     int32_t Withdraw(Slot *slot) {
         slot->handle.store(kFree, std::memory_order_relaxed);
         digests_[NumberOf(slot)].store(0, std::memory_order_relaxed);
@@ -111,7 +120,7 @@ class SlotTable {
     }
 
   protected:
-    // As if so many handles had been given out.
+    // Continues as if so many handles had been given out.
     void SkipHandles(int32_t given) { given_ = given; }
 
   private:
@@ -120,13 +129,13 @@ class SlotTable {
     static constexpr size_t kHints = 256;
     static constexpr size_t kSlots = static_cast<size_t>(capacity);
 
-    // A name as words, up to the one that holds its terminator: what lies behind does not count.
+    // A name as words, up to the one with its terminator. The words after that are not compared.
     struct PackedName {
         PackedName(const char *name, size_t length) : used(length / sizeof(uint32_t) + 1) {
             words[used - 1] = 0;
             memcpy(words, name, length);
         }
-        // Never 0, which is no name's.
+        // Never 0, which stands for no name.
         uint32_t Digest() const {
             uint32_t digest = 0;
             for (size_t i = 0; i < used; i++) {
@@ -138,14 +147,14 @@ class SlotTable {
         uint32_t words[kNameWords];
     };
 
-    // Kept out of line, so that it does not weigh on the lookups that find their handle at once.
+    // Out of line, so that the lookups that find their handle at once save no registers for it.
     __attribute__((noinline, cold)) Slot *Scan(int32_t handle, const Slot *hint) {
         for (Slot &slot : slots_) {
             if (!slot.Has(handle, std::memory_order_acquire)) {
                 continue;
             }
-            // Two live handles may share a hint, which then belongs to one of them. A hint that
-            // points to no live handle of the two has been left behind, and is corrected.
+            // Two live handles may share a hint. It stays with the one that has it; a hint that
+            // points to neither is stale and is corrected.
             const int32_t hinted = hint->handle.load(std::memory_order_relaxed);
             if (hinted == kFree || &HintOf(hinted) != &HintOf(handle)) {
                 HintOf(handle).store(static_cast<uint32_t>(NumberOf(&slot)),
@@ -156,9 +165,9 @@ class SlotTable {
         return nullptr;
     }
 
-    // The handle of a slot whose name is this one, kFree for another. The acquire of the first look
-    // keeps the words from being older than the handle. A word that is younger was stored after the
-    // fence of StoreName, which the fence here meets: then the second look finds the handle gone.
+    // The handle of a slot if this is its name, kFree otherwise. The words are not older than the
+    // handle, since its first read acquires. A word that is younger was stored after the fence of
+    // StoreName, which pairs with the fence here: then the second read finds the handle gone.
     int32_t HandleOfName(ptrdiff_t slot, const PackedName &wanted) const {
         const int32_t handle = slots_[slot].handle.load(std::memory_order_acquire);
         for (size_t i = 0; i < wanted.used; i++) {
@@ -183,7 +192,7 @@ class SlotTable {
     }
 
     Slot slots_[kSlots];
-    // hints_[handle % kHints] is the slot at which to look first; the handle found there decides.
+    // hints_[handle % kHints] is the slot at which to look first; the handle there decides.
     std::atomic<uint32_t> hints_[kHints];
     std::atomic<uint32_t> digests_[kSlots];  // of the names, 0 where there is none
     std::atomic<uint32_t> names_[kSlots][kNameWords];

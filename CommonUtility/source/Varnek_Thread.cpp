@@ -53,8 +53,8 @@ struct THREAD_MGR_INFO {
     pthread_t linuxThread;  // for a debugger
 };
 
-// What a new thread begins with. Made by its creator and freed by its entry, so that the record may
-// be removed meanwhile.
+// What a new thread begins with. Its creator allocates it and its entry frees it, so the record may
+// be removed before the thread runs.
 struct Start {
     int32_t hHandle;
     void *(*function)(void *);
@@ -67,13 +67,14 @@ constexpr int kLeaveTries = 1000;  // of a millisecond
 using Threads = SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE>;
 Threads gThreadInfoArr;
 
-// The handle of the guard "VarnekThreadMutex"; kNoGuard until the first creation makes it.
+// The handle of the guard "VarnekThreadMutex"; kNoGuard until the first creation of a thread
+// creates it.
 constexpr int32_t kNoGuard = HoldMutex::kNoMutex;
 constexpr int32_t kGuardInTheMaking = -2;
 std::atomic<int32_t> gThreadMutex{kNoGuard};
-std::atomic<pthread_t> gGuardMaker{};  // the thread that makes it, while it does
+std::atomic<pthread_t> gGuardMaker{};  // the thread that is creating it
 
-// The key under which a registered thread finds its handle, plus one; 0 until the guard is made.
+// The key under which a registered thread finds its handle, plus one; 0 until the guard exists.
 std::atomic<uint32_t> gSelfKey{0};
 
 int32_t Guard() {
@@ -82,8 +83,8 @@ int32_t Guard() {
 }
 
 // Runs when a thread ends. The system has cleared the value by then, but the destructors of other
-// keys may still ask who they run in, or read messages. So the handle is kept, negative, for one
-// more round of destructors.
+// keys may still ask for the calling thread, or receive messages. So the handle is kept, negative,
+// for one more round of destructors.
 void KeepSelf(void *self) {
     const intptr_t hThread = reinterpret_cast<intptr_t>(self);
     if (hThread > 0) {
@@ -93,7 +94,7 @@ void KeepSelf(void *self) {
     }
 }
 
-// Makes the key, unless an earlier call has made it.
+// Creates the key, unless an earlier call has created it.
 bool MakeSelfKey() {
     if (gSelfKey.load(std::memory_order_relaxed) != 0) {
         return true;
@@ -106,10 +107,10 @@ bool MakeSelfKey() {
     return true;
 }
 
-// Makes the guard and the key on first use. One thread makes them and others wait that moment,
-// since a second mutex of the guard's name would destroy the first. False when they cannot be made,
-// and for a log function that creates a thread while this thread's own call writes the line of the
-// guard's creation: that call would wait for itself.
+// Creates the guard and the key on first use. One thread creates them while others wait, since a
+// second mutex of the guard's name would destroy the first. Returns false if they cannot be
+// created. It also returns false to a log function that creates a thread while its own thread, in
+// here, writes the lines of the guard's creation: it would wait for itself.
 bool EnsureGuard() {
     for (;;) {
         int32_t guard = gThreadMutex.load(std::memory_order_acquire);
@@ -164,11 +165,11 @@ bool IsLast(const THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
 // Threads ----------------------------------------------------------------------------------------
 
 // Removes the record of a handle for `operation`, which reports unread messages with `unreadMask`.
-// FALSE, after its line, when there is none.
+// Without such a record it writes the operation's line and returns FALSE.
 BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
     const int32_t guard = Guard();
     if (guard == kNoGuard) {
-        VarnekPGL_AcquireMutex(guard);  // reports that there is no guard, as the release below does
+        VarnekPGL_AcquireMutex(guard);  // reports the missing guard, as the release below does
     }
     HoldMutex hold(guard);
     Threads::Slot *const slot = hold.IsHeld() ? gThreadInfoArr.Find(hThread) : nullptr;
@@ -205,7 +206,7 @@ void __Varnek_delete_thread_info(int32_t hThread) {
     RemoveRecord(hThread, __func__, VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON);
 }
 
-// Where every thread of the registry starts. The creator holds the guard until the record is
+// Every thread of the registry starts here. The creator holds the guard until the record is
 // visible, so a thread that does not see its record yet waits for the guard.
 void *ThreadEntry(void *begin) {
     const Start start = *static_cast<Start *>(begin);
@@ -220,16 +221,16 @@ void *ThreadEntry(void *begin) {
     return start.function(start.argument);
 }
 
-// Starts a detached OS thread. Returns pthread_create's result; `start` is the thread's when it is
-// 0.
+// Starts a detached OS thread. Returns pthread_create's result; if that is 0, the thread owns
+// `start`.
 int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize, Start *start) {
     pthread_attr_t attributes;
     const int result = pthread_attr_init(&attributes);
     if (result != 0) {
         return result;
     }
-    // What the system refuses of these (a stack below its minimum, a priority that the policy does
-    // not know) stays at its default.
+    // An attribute that the system refuses (a stack below its minimum, a priority that the policy
+    // does not know) keeps its default.
     sched_param parameter = {};
     parameter.sched_priority = priority;
     pthread_attr_setstacksize(&attributes, stackSize);
@@ -242,7 +243,8 @@ int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize, St
 }
 
 // Fills the record at `slot` and starts its thread; the guard is held. The record becomes visible
-// once the thread exists, so a handle that is given back was never seen.
+// only when its thread exists. So the handle of a failed creation, which the next creation gets,
+// was never seen.
 int32_t StartRecord(Threads::Slot *slot, const char *szThreadName, int32_t priority,
                     uint32_t stackSize, void *(*function)(void *), void *argument) {
     THREAD_MGR_INFO &info = slot->info;
@@ -277,8 +279,8 @@ Threads::Slot *FirstFreeRecord() {
     return slot;
 }
 
-// Claims a slot, under the guard, which it may release and take again: a removed record is free
-// once its last user has left, and that takes a moment. Null for none; the guard may then be lost.
+// Claims a slot, under the guard. If all slots are taken and some of them are left over, it waits a
+// while for their last users, with the guard released. Null for none; the guard may then be lost.
 Threads::Slot *ClaimRecord(HoldMutex *guard) {
     Threads::Slot *slot = FirstFreeRecord();
     for (int i = 0; i < kLeaveTries && slot == nullptr &&
@@ -349,8 +351,9 @@ struct Self {
     Threads::Slot *slot;
 };
 
-// kInvalidHandle when the registry has not started the calling thread, under whose key nothing is
-// then, or when its record has been removed. Part of each receive.
+// The handle is kInvalidHandle in a thread that the registry has not started, which has nothing
+// under the key, and in one whose record has been removed. Inlined, since each receive begins with
+// it.
 inline __attribute__((always_inline)) Self FindSelf() {
     TRACE_LOW_QUICK("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]",
                     static_cast<int>(pthread_self()));
@@ -543,7 +546,7 @@ inline __attribute__((always_inline)) Receipt TakeCounted(Threads::Slot *self, i
     return receipt;
 }
 
-// Waits for one unit, with errno telling why not. 0 or -1.
+// Waits for one unit of the semaphore. 0, or -1 and errno.
 int WaitForMessage(sem_t *msgQSem, uint32_t timeout) {
     if (timeout == WAIT_FOREVER) {
         return sem_wait(msgQSem);
