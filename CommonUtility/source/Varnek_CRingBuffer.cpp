@@ -1,5 +1,5 @@
-// The byte ring. A position is below the size, with one exception: a reader may be set to the end of
-// the storage, and reads the first byte next.
+// The byte ring. A position is below the size, with one exception: a reader may be set to the end
+// of the storage, and reads the first byte next.
 #include "Varnek_CRingBuffer.h"
 
 #include <stdio.h>
