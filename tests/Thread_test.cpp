@@ -228,7 +228,7 @@ TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
 #if defined(__has_feature)
 #define IS_INSTRUMENTED __has_feature(thread_sanitizer) || __has_feature(address_sanitizer)
 #else
-#define IS_INSTRUMENTED 0
+#define IS_INSTRUMENTED defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 #endif
 #if defined(__OPTIMIZE__) && !IS_INSTRUMENTED
 
