@@ -226,11 +226,13 @@ TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
 }
 
 #if defined(__has_feature)
-#define IS_INSTRUMENTED __has_feature(thread_sanitizer) || __has_feature(address_sanitizer)
-#else
-#define IS_INSTRUMENTED defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#if __has_feature(thread_sanitizer) || __has_feature(address_sanitizer)
+#define IS_INSTRUMENTED
 #endif
-#if defined(__OPTIMIZE__) && !IS_INSTRUMENTED
+#elif defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#define IS_INSTRUMENTED
+#endif
+#if defined(__OPTIMIZE__) && !defined(IS_INSTRUMENTED)
 
 // The bytes of its stack that a thread uses for `work`, the log function of this program included.
 size_t StackOf(void (*work)()) {
