@@ -1,4 +1,4 @@
-// Each option is a row of one table, which both the parsing and the help go by.
+// Each option is a row of one table, which both the parser and the help use.
 #include "CommandLine.h"
 
 #include <algorithm>
@@ -12,7 +12,7 @@ namespace {
 
 constexpr unsigned kLargestRegion = 63;
 
-//   returns  empty; else what is wrong with the value
+//   returns  empty, or an error message about the value
 using Setter = std::string (*)(Options &options, const std::string &value);
 
 std::string SetRegion(Options &options, const std::string &value) {
@@ -56,8 +56,8 @@ constexpr struct {
     {"--help", nullptr, Set<&Options::help>, "show this"},
 };
 
-// Takes the option at `i`, and its value, where it has one.
-//   returns  empty; else what is wrong with it
+// Parses the option at `i`, and its value if it has one.
+//   returns  empty, or an error message
 std::string TakeOption(const std::vector<std::string> &arguments, size_t &i, Options &options) {
     const std::string name = arguments[i] == "-h" ? "--help" : arguments[i];
     const auto *option = std::find_if(std::begin(kOptions), std::end(kOptions),
