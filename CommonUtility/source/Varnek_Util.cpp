@@ -1,7 +1,7 @@
 // CRC-32 over memory, sections and stored files. A step processes as many bytes as it uses tables:
 // 16 on 64-bit systems, then 4, then single bytes. The register is stored with its bytes reversed,
-// so that a little-endian machine can combine it with a word of data without swapping. The bytes are
-// combined by value, so neither byte order nor alignment affects the result.
+// so that a little-endian machine can combine it with a word of data without swapping. The bytes
+// are combined by value, so neither byte order nor alignment affects the result.
 #include "Varnek_Util.h"
 
 #include <stdlib.h>
