@@ -208,8 +208,7 @@ int32_t VarnekPGL_MakeDir(const char *path) {
     if (path != nullptr && mkdir(path, 0755) == 0) {
         return 0;
     }
-    const int error =
-        path != nullptr ? errno : EFAULT;  // what the system would report for a null path
+    const int error = path != nullptr ? errno : EFAULT;  // as mkdir reports a null path
     char process[200];
     ReadProcessName(process);
     __VarnekPGL_FileLog("%s : [%s] dir create failed! errno(%d),process(%s) pid(%d) uid(%d)",

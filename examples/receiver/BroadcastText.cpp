@@ -13,8 +13,7 @@ namespace {
 
 using Units = std::vector<unsigned short>;
 
-constexpr unsigned char kFirstPrintable =
-    0x20;  // a text that begins with a lower byte has a selector
+constexpr unsigned char kFirstPrintable = 0x20;  // a lower first byte is a selector
 constexpr unsigned char kSelectNumbered = 0x10;  // the table's number follows in two bytes
 constexpr unsigned char kSelectUnicode = 0x11;
 constexpr unsigned char kSelectUtf8 = 0x15;

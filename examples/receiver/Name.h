@@ -12,8 +12,7 @@ namespace receiver {
 class Name {
   public:
     Name() = default;
-    Name(const std::string &text)
-        : text_(text.c_str()) {}  // not explicit, because a name is just a text
+    Name(const std::string &text) : text_(text.c_str()) {}  // implicit on purpose
 
     // Also empty when there was no memory for the name.
     std::string Text() const {

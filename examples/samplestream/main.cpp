@@ -36,8 +36,8 @@ constexpr uint16_t kPidOneSegVideo = 0x0181, kPidOneSegAudio = 0x0182;
 constexpr size_t kPacketSize = 188;
 constexpr int kRounds = 16;
 constexpr int kRoundPackets = 100;
-constexpr uint64_t kPcrTicks =
-    27000000ull * 20 / (uint64_t{kRounds} * kRoundPackets);  // for each packet
+// Ticks per packet.
+constexpr uint64_t kPcrTicks = 27000000ull * 20 / (uint64_t{kRounds} * kRoundPackets);
 
 // All times are in the official time of Brasilia, UTC-3, as in broadcasts in Brazil.
 constexpr uint16_t kDay = 60476;     // 2024-06-15
