@@ -43,17 +43,16 @@ constexpr struct {
     Setter set;
     const char *help;
 } kOptions[] = {
-    {"--json", nullptr, Set<&Options::json>, "show all as one JSON object"},
+    {"--json", nullptr, Set<&Options::json>, "show everything as one JSON object"},
     {"--region", "N", SetRegion,
-     "show local times of this region, where the nation has several; without it, the first one's"},
+     "show local times of this region if the nation has several; the default is the first one"},
     {"--capture", "FILE", SetCapture,
-     "write the packets of the tables to a file; where the configuration has its capture switch "
-     "on, "
-     "the default is the stream's name with \".capture\""},
-    {"--quiet", nullptr, Set<&Options::quiet>, "no progress line"},
-    {"--log", nullptr, Set<&Options::log>, "the library's log goes to stderr, not to its file"},
+     "write the packets that carry tables to a file; if the capture switch of the configuration is "
+     "on, the default is the stream's name with \".capture\""},
+    {"--quiet", nullptr, Set<&Options::quiet>, "show no progress line"},
+    {"--log", nullptr, Set<&Options::log>, "write the library's log to stderr, not to its file"},
     {"--version", nullptr, Set<&Options::version>, "show the version"},
-    {"--help", nullptr, Set<&Options::help>, "show this"},
+    {"--help", nullptr, Set<&Options::help>, "show this help"},
 };
 
 // Parses the option at `i`, and its value if it has one.
@@ -107,9 +106,10 @@ std::string ParseArguments(const std::vector<std::string> &arguments, Options &o
 void WriteHelp(std::FILE *out, size_t width) {
     Paragraphs text(out, width);
     text.Add("usage: ", "receiver [OPTION...] FILE");
-    text.Add("  ",
-             "Reads a transport stream, from standard input where FILE is \"-\", and shows its "
-             "services, events and counters.");
+    text.Add(
+        "  ",
+        "Reads a transport stream and shows its services, events and counters. If FILE is \"-\", "
+        "it reads standard input.");
     for (const auto &option : kOptions) {
         std::string lead = std::string("  ") + option.name;
         lead += option.value != nullptr ? std::string(" ") + option.value : "";

@@ -110,7 +110,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     Options options;
     const std::string wrong = ParseArguments(arguments, options);
     if (!wrong.empty()) {
-        std::fprintf(err, "receiver: %s\nusage: receiver [OPTION...] FILE (--help tells more)\n",
+        std::fprintf(err, "receiver: %s\nusage: receiver [OPTION...] FILE (--help shows more)\n",
                      wrong.c_str());
         return 2;
     }
