@@ -50,12 +50,12 @@ class VARNEK_API VarnekCRingBuffer {
     int Flush();
 
     // Moves the reader: to the index `aOffset` (origin 0), forward by `aOffset` bytes (origin 1),
-    // or to the start of the last `aOffset` bytes written (origin 2). Origins 0 and 2 do not check
-    // that the bytes there are unread. With origin 2, an offset of the whole size leaves nothing to
-    // read. With origin 0, an index equal to the size is the end of the storage; after it, read or
-    // seek forward by 0 before the next write. Returns 0; VARNEK_RING_NO_SPACE for an offset that
-    // is negative, larger than the size or, with origin 1, larger than the number of readable
-    // bytes; VARNEK_RING_INVALID for another origin.
+    // or to the start of the last `aOffset` bytes written (origin 2). With origins 0 and 2 it does
+    // not check whether those bytes are unread, or were ever written. With origin 2, an offset of
+    // the whole size leaves nothing to read. With origin 0, an index equal to the size is accepted,
+    // but then the caller must read, or seek forward by 0, before the next write. Returns 0;
+    // VARNEK_RING_NO_SPACE for an offset that is negative, larger than the size or, with origin 1,
+    // larger than the number of readable bytes; VARNEK_RING_INVALID for another origin.
     int Seek(int aOffset, int origin);
 
     // Return the number of bytes that can be read and written now; in an inconsistent state,
@@ -71,8 +71,8 @@ class VARNEK_API VarnekCRingBuffer {
     // VARNEK_RING_NO_SPACE when there is too little room; VARNEK_RING_NO_DATA when there are too
     // few bytes, and when 0 bytes are read from an empty ring. An operation that finds the ring in
     // an inconsistent state empties it and returns VARNEK_RING_NO_SPACE for an overflow and
-    // VARNEK_RING_NO_DATA for an underflow. A write that finds W < R in the same lap leaves the
-    // ring unchanged instead.
+    // VARNEK_RING_NO_DATA for an underflow. There is one exception: a write that finds WL = RL and
+    // W < R returns VARNEK_RING_NO_DATA but leaves the ring unchanged.
     int Write(const unsigned char *data, int writelen);
     int Read(unsigned char *dest, int readLen);
 

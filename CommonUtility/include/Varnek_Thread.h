@@ -45,16 +45,17 @@ VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 VARNEK_API int32_t VarnekPGL_GetThreadByName(const char *szThreadName);
 
 // Returns the handle of the calling thread.
-//   returns  the calling thread's handle; -1, after an Error line, when the registry has not
-//            started it (as for main and timer callbacks) or its record has been removed
+//   returns  the calling thread's handle; -1, after an Error line, in a thread that the registry
+//            has not started (such as main or a timer callback) or whose record has been removed
 VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 
 // Messages ---------------------------------------------------------------------------------------
 // A message is copied in and copied out. Only memory limits the length of a queue. Messages that
 // one thread sends with VarnekPGL_SendMessage are received in the order of sending.
 
-// One message of 40 bytes, aligned to 8, so that a module may overlay it with a record. The modules
-// that communicate define its content; the library copies it as bytes, from and to any address.
+// One message of 40 bytes. It is aligned to 8, so that modules may overlay it with their own
+// struct. The modules that communicate define its content; the library copies it as bytes, from and
+// to any address.
 typedef struct THREAD_MSG {
     unsigned char data[40];  // defined by the modules
 } __attribute__((aligned(8))) THREAD_MSG;

@@ -27,9 +27,9 @@ VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 // Arms the timer once. A start that succeeds and is neither cancelled nor deleted in time calls
 // back exactly once, with its own `callback` and `userData`. The callback may come late but never
 // early, and it is not lost when the timer expires and is started again before the system delivers
-// the expiry. In two cases the callback comes with the timer's next expiry, without a log line:
-// when the system cannot create a thread for the expiry, and when a later start discards the expiry
-// and then fails.
+// the expiry. In two cases the callback is delayed until the timer's next expiry, without a log
+// line: when the system cannot create a thread for the expiry, and when a later start fails and
+// thereby discards the expiry.
 //   timer     handle from VarnekPGL_CreateTimer
 //   timeout   milliseconds from now, 1 or more; setting the wall clock does not change it
 //   callback  called once at the expiry

@@ -33,8 +33,8 @@ VARNEK_API BOOL VarnekUtil_CheckSectionCRC32(const unsigned char *section);
 VARNEK_API BOOL VarnekUtil_CheckFileCRC32(const char *path);
 
 // Appends the CRC of a file's whole content to the file. The file has at least 4 bytes and less
-// than 2 GiB, and is read into memory as a whole. A second call appends the CRC of the content and
-// the first CRC.
+// than 2 GiB, and is read into memory as a whole. A second call appends a second CRC, which covers
+// the content and the first CRC.
 //   returns  TRUE, even when the append fails; FALSE when the file is too small or unreadable, and
 //            therefore unchanged
 VARNEK_API BOOL VarnekUtil_AppendCRC32ToFile(const char *path);

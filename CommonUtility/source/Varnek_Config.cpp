@@ -41,7 +41,7 @@ constexpr size_t kFileSize = 900;  // of the text that is written, with its term
 constexpr char kConfigPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
 constexpr char kNewPath[] = VARNEK_DATA_DIR "Varnek_Config.new";  // before it is renamed
 static_assert(sizeof kConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
-constexpr int kLockTries = 1000;  // of a millisecond
+constexpr int kLockTries = 1000;  // one per millisecond
 constexpr int32_t kSaveFlags = PGL_FILE_MODE_CREATE_RW | PGL_FILE_MODE_WRITE;
 
 enum ConfigField {
@@ -54,7 +54,7 @@ enum ConfigField {
     CONFIG_FIELD_COUNT
 };
 
-// A line sets the field of the first key in this table that the line contains.
+// If a line contains several keys, the first one in this table counts.
 constexpr const char *kKeys[CONFIG_FIELD_COUNT] = {
     "CONFIG_CURRENTAREANAME=", "CONFIG_STANDARDTYPE=",     "CONFIG_TSCAPTURE=",
     "CONFIG_TSFILESIMUL=",     "CONFIG_CPRMPLAYER_DELAY=", "CONFIG_SUPPORT_NATION=",
@@ -200,9 +200,9 @@ bool TakeOver(int fd) {
                                 fchmod(fd, old.st_mode & 07777) == 0);
 }
 
-// Writes the text to a second file, flushes it to the disk, and renames it over the first one. So a
-// reader finds either the old text or the new one, whatever happens to this process. Returns false
-// when that fails, with the file unchanged.
+// Writes the text to a second file, flushes that to the disk, and renames it over the settings
+// file. So a reader finds either the old text or the new one, whatever happens to this process.
+// Returns false when that fails, with the settings file unchanged.
 bool ReplaceFile(const char *text) {
     remove(kNewPath);
     const PglFileHandle file = VarnekPGL_OpenFile(kNewPath, kSaveFlags);

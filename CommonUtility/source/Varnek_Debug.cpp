@@ -31,8 +31,9 @@ namespace {
 constexpr uint32_t kLevelBits = 0xF0000000u;
 constexpr uint32_t kModuleBits = 0x00000FFFu;
 
-// Serialises loads. gDebugLoader is the thread that holds the lock. The load reports through the
-// log function; if that traces, it finds everything off instead of waiting for its own thread.
+// Serialises loads. gDebugLoader is the thread that holds the lock. A load calls the log function,
+// which may trace. With gDebugLoader such a trace recognises that its own thread is loading, and
+// returns instead of waiting for itself.
 Lock gDebugLoadLock;
 std::atomic<pthread_t> gDebugLoader{};
 
@@ -122,9 +123,9 @@ void LogFailure(const char *text) {
     __android_log_write(VARNEK_LOG_ERROR, "SBTVD", text);
 }
 
-// Returns the bit that a line enables, or 0. A line counts for the first key that it contains, in
-// the order of the tables, and it enables that key if it contains a '1'. Both may be anywhere in
-// the line.
+// Returns the bit that a line enables, or 0. The key may be anywhere in the line. If the line
+// contains several keys, the first one in the order of the tables counts. A '1' anywhere in the
+// line enables it.
 uint32_t BitOfLine(const char *line) {
     if (line[0] == '#') {
         return 0;
@@ -350,8 +351,8 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
 }  // namespace
 
 void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...) {
-    // The levels are above kNotLoaded and the modules below it. So this is true when the
-    // configuration is loaded and the level is off, or the mask has no level.
+    // The bits of the levels are above kNotLoaded, and all others are below it. So this returns
+    // when the configuration is loaded and the level is off, or the mask has no level.
     const uint32_t state = gDebugState.load(std::memory_order_relaxed);
     if ((state & (mask | kNotLoaded)) < kNotLoaded) {
         return;

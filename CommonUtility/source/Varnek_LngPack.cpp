@@ -72,10 +72,11 @@ constexpr char *PutUtf8(char *out, unsigned int unit) {
     return out;
 }
 
-// Whether all bytes of a word are plain. A byte is plain if its top bit is clear before and after
-// 0x20 is subtracted (otherwise it is below 0x20) and after 1 is added (otherwise it is 0x7F). A
-// subtraction may borrow from the next byte, and an addition may carry into it. That does no harm,
-// because only a byte that is not plain does so, and it has already set its own top bit.
+// Whether all bytes of a word are plain. A byte is plain if the top bit is clear in the byte
+// itself, in the byte minus 0x20 (where a byte below 0x20 sets it), and in the byte plus 1 (where
+// 0x7F sets it). The arithmetic is done on all bytes at once, so a byte may borrow from the next
+// one or carry into it. That does no harm: only a byte that is not plain does so, and its own top
+// bit is set.
 using Word = uintptr_t;
 constexpr bool ArePlain(Word bytes) {
     constexpr Word kOnes = ~Word{0} / 0xFF;
