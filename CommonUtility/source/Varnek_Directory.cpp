@@ -400,7 +400,7 @@ class ShellCommand {
     bool fits_ = true;
 };
 
-// Whether two paths may name the same file, found out without stat: if they do, a lock through one
+// Whether two paths may name the same file. It does not need stat: if they do, a lock through one
 // path prevents a lock through the other. Also true when a lock cannot be taken for another reason.
 bool ShareALock(const char *a, const char *b) {
     const int first = open(a, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
