@@ -37,10 +37,10 @@ VARNEK_API void VarnekCfg_LoadConfigFile(void);
 
 // Saves the record; the data directory must exist. A failure is traced. The new text is written to
 // "Varnek_Config.new", flushed to the medium and renamed over the file, with the mode of the old
-// file. So a reader finds either the old text or the new one, whenever the process is killed. The
-// file is emptied and written in place instead when there is no room or permission for a second
-// file, when the save of another process takes longer than a second, or when the existing file is a
-// link, belongs to another user or is not a regular file.
+// file. So a reader finds either the old text or the new one, even if the process is killed during
+// the save. The file is emptied and written in place instead when there is no room or permission
+// for a second file, when the save of another process takes longer than a second, or when the
+// existing file is a link, has a second name, belongs to another user or is not a regular file.
 VARNEK_API void VarnekCfg_SaveConfigFile(void);
 
 // Sets the standard type, and saves the record when the type changes.
@@ -51,8 +51,9 @@ VARNEK_API int32_t VarnekCfg_GetStandard(void);
 VARNEK_API uint8_t VarnekCfg_GetTSCaptueEnable(void);
 VARNEK_API uint8_t VarnekCfg_GetTSFileSimulEnable(void);
 
-// Asks the feature store while the record has no nation.
-//   returns  the record's nation, never empty: "BRA" unless file or platform say otherwise
+// Returns the record's nation. When the record has none, it first sets the nation from the feature
+// store.
+//   returns  the nation, never empty; "BRA" when neither the file nor the feature store defines one
 VARNEK_API const char *VarnekCfg_GetSupportNation(void);
 
 // Says whether the receiver shows BML data broadcasts.

@@ -52,7 +52,7 @@ VARNEK_API void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...)
 //   threads  Thread-safe; concurrent loads run one after the other.
 VARNEK_API void VarnekPGL_InitializeDebug(void);
 
-// Loads the debug configuration if no load was tried before, successful or not.
+// Loads the debug configuration unless a load was tried before, even one that failed.
 VARNEK_API void VarnekPGL_CheckAndInitDebug(void);
 
 // Writes the assertion report at fatal priority under the tag "Varnek", whatever the configuration
