@@ -30,7 +30,7 @@ It provides threads with message queues, mutexes, semaphores, timers and
 files, a trace that is filtered by level and module, and tools for
 broadcast code: bit stream, ring buffer, CRC-32, text conversion and
 configuration.")
-package(standins libvarnekutils-ltn-standins libs "a device's log and feature store, on a PC
+package(standins libvarnekutils-ltn-standins libs "PC stand-ins for a device's log and feature store
 libvarnekutils-ltn loads these libraries. The log writes to standard error
 as logcat does. The feature store answers from a text file.")
 package(dev libvarnekutils-ltn-dev libdevel "development files of libvarnekutils-ltn
