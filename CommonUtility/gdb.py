@@ -3,13 +3,13 @@
     (gdb) source share/varnekutils_ltn/gdb.py
     (gdb) varnek
 
-The library must have its debug information. Works on a process that stands still, and on a core dump."""
+The library must have debug information. The script works on a stopped process and on a core dump."""
 
 import gdb
 
 
 def table(name):
-    """The used slots of a slot table: handle, name and what the slot holds."""
+    """Yields the handle, name and Info of each used slot of a slot table."""
     found = gdb.lookup_static_symbol(f'(anonymous namespace)::{name}').value()
     base = found['slots_']
     for i in range(base.type.range()[1] + 1):
@@ -19,7 +19,7 @@ def table(name):
 
 
 def text(words):
-    """The characters up to a NUL, of an array of anything."""
+    """Returns the text in an array of any type, up to a NUL."""
     size = words.type.sizeof
     content = gdb.selected_inferior().read_memory(int(words.address), size).tobytes()
     return content.split(b'\0')[0].decode(errors='replace')
@@ -39,7 +39,7 @@ def mutexes():
 
 
 def units(semaphore):
-    """The units that are left: glibc keeps them in the first word, on 32-bit systems beside a flag."""
+    """Returns the units left. glibc stores them in the first word; on 32-bit systems the lowest bit is a flag."""
     word = gdb.lookup_type('unsigned int').pointer()
     value = int(semaphore.address.cast(word).dereference())
     return value if word.sizeof == 8 else value >> 1

@@ -55,7 +55,7 @@ void AddMissing(const std::string &name) {
 }
 
 std::vector<unsigned char> Noise(size_t size) {
-    std::mt19937 random(188);  // NOLINT(cert-msc51-cpp): the same bytes on every run, on purpose
+    std::mt19937 random(188);  // NOLINT(cert-msc51-cpp): intentionally the same bytes in every run
     std::vector<unsigned char> bytes(size);
     for (unsigned char &byte : bytes) {
         byte = static_cast<unsigned char>(random());

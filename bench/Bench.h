@@ -1,5 +1,5 @@
-// What the benchmarks share. A program holds one area; a benchmark is called ROW:CONTENDER, and
-// script/bench.py sets the contenders of a row side by side. Time is that of the clock on the wall.
+// Functions that the benchmarks share. Each program measures one area. A benchmark has the name
+// ROW:CONTENDER, and script/bench.py compares the contenders of a row. Times are wall-clock times.
 #ifndef VARNEK_BENCH_H
 #define VARNEK_BENCH_H
 
@@ -14,28 +14,28 @@
 
 namespace bench {
 
-// Runs an area's benchmarks in a thread of the library, so that they can receive messages, while
-// the first thread sleeps: a process that never had a second one skips atomics. `config` is what
-// the debug configuration holds meanwhile; an empty one traces nothing.
+// Runs an area's benchmarks in a thread of the library, so that they can receive messages. The
+// first thread sleeps. With a second thread, the process does not skip atomics. `config` is the
+// content of the debug configuration during the run; with an empty one nothing is traced.
 int Main(int argc, char **argv, void (*registerAll)(), const char *config = "");
 
-// A row that has a function in its place, each measured alike.
+// Registers a contender that is a function. All contenders are measured in the same way.
 template <typename Function>
 benchmark::internal::Benchmark *Add(const std::string &name, Function function) {
     // NOLINTNEXTLINE(readability-redundant-string-cstr): Debian 12's version takes no std::string
     return benchmark::RegisterBenchmark(name.c_str(), std::move(function))->UseRealTime();
 }
 
-// Keeps a contender in its row that was not there when this was built.
+// Registers a contender that was not installed at build time, so that its row says so.
 void AddMissing(const std::string &name);
 
-// Bytes that differ from run to run in nothing.
+// Returns random bytes that are the same in each run.
 std::vector<unsigned char> Noise(size_t size);
 
-// Binds the calling thread to one of the cores, counted from 0; where there is but one, to that.
+// Binds the calling thread to a core, counted from 0. If there is only one core, it uses that one.
 void PinTo(int core);
 
-// A benchmark that cannot go on says so in its row.
+// Reports in the row that a benchmark cannot continue.
 inline bool Require(benchmark::State &state, bool holds, const char *what) {
     if (!holds) {
         state.SkipWithError(what);

@@ -1,10 +1,11 @@
-// Bit fields as a parser of PSI sections reads them, over 960 bytes.
+// Reads bit fields as a parser of PSI sections does, from 960 bytes.
 #include "Bench.h"
 #include "Varnek_CBitInputStream.h"
 #include "limit.h"
 
 #ifdef HAVE_GSTREAMER
-// Calls its library, as callers in other languages and of unusual widths do.
+// Calls the library's functions, as callers in other languages and with unusual widths do, instead
+// of the inlined ones.
 #define GST_BIT_READER_DISABLE_INLINES
 #include <gst/base/gstbitreader.h>
 #endif
@@ -17,8 +18,8 @@ using Psi = Fields<8, 1, 1, 2, 12, 16, 2, 5, 1, 8, 8, 3, 13, 4, 12>;
 constexpr size_t kRound = 12;           // bytes of these fields
 constexpr size_t kBytes = 80 * kRound;  // 1200 fields
 
-// One read after the other with a width that the compiler knows, as a parser has them. 0 when one
-// of them fails.
+// Reads fields one after the other, with widths that the compiler knows, as a parser does. Returns
+// 0 when a read fails.
 template <typename Reader, int... counts>
 uint32_t ReadAll(Reader *reader, size_t size, Fields<counts...>) {
     uint32_t sum = 0;
@@ -31,7 +32,7 @@ uint32_t ReadAll(Reader *reader, size_t size, Fields<counts...>) {
 class OurReader {
   public:
     OurReader(const unsigned char *data, size_t size)
-        // Borrowed, and only read.
+        // The stream borrows the bytes and only reads them.
         : stream_(const_cast<unsigned char *>(data), static_cast<unsigned int>(size), 0) {}
     template <int count>
     uint32_t Read() {

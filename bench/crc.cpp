@@ -1,4 +1,4 @@
-// CRC-32 over sections: a short one, a packet's payload, and up to the longest.
+// CRC-32 over sections, from a short one through a packet's payload to the longest.
 #include <string.h>
 
 #include "Bench.h"
@@ -10,7 +10,7 @@ extern "C" {
 }
 #endif
 #ifdef HAVE_DVBPSI
-// Its headers expect these.
+// The peer's header expects these headers before it.
 #include <stdbool.h>
 #include <stdint.h>
 extern "C" {
@@ -24,7 +24,7 @@ extern "C" {
 
 namespace {
 
-// The limit: 16 bytes a step through 16 tables, inlined here.
+// The limit: 16 bytes for each step with 16 tables, inlined here.
 struct Tables {
     uint32_t word[16][256];
 };
@@ -49,7 +49,7 @@ constexpr Tables MakeTables() {
 
 constexpr Tables kTables = MakeTables();
 
-// The register after four bytes of `word` and `n` more of 0.
+// Returns the register after the four bytes of `word` and `n` zero bytes.
 template <int n>
 uint32_t Through(uint32_t word) {
     return kTables.word[n + 3][word >> 24] ^ kTables.word[n + 2][word >> 16 & 0xFF] ^
@@ -98,7 +98,7 @@ void RegisterPeers(const std::string &row, [[maybe_unused]] size_t length) {
 #ifdef HAVE_AVUTIL
     const AVCRC *table = av_crc_get_table(AV_CRC_32_IEEE);
     Register(row + "av_crc", length, [table](const unsigned char *data, size_t size) {
-        // Its register lies the other way round.
+        // The bytes of this peer's result are in the opposite order.
         return __builtin_bswap32(av_crc(table, 0xFFFFFFFFu, data, size));
     });
 #else
@@ -106,8 +106,7 @@ void RegisterPeers(const std::string &row, [[maybe_unused]] size_t length) {
 #endif
 #ifdef HAVE_DVBPSI
     Register(row + "dvbpsi", length, [](const unsigned char *data, size_t size) {
-        // It computes over a section, and writes the result behind it; the bytes are taken twice,
-        // so that it has room there.
+        // This peer writes the result after the section, so it works on a copy with room for it.
         static std::vector<unsigned char> copy;
         if (copy.size() != size + 4) {
             copy.assign(data, data + size);

@@ -1,4 +1,4 @@
-// Reading a file that lies in memory: packets through a stream, blocks through a descriptor.
+// Reads a file in memory: packets through a stream, blocks through a descriptor.
 #include <fcntl.h>
 #include <stdio.h>
 #include <unistd.h>
@@ -10,7 +10,7 @@ namespace {
 
 constexpr uint32_t kPacket = 188;
 constexpr uint32_t kBlock = 64 * 1024;
-constexpr size_t kFileSize = size_t{kPacket} * kBlock / 4;  // whole packets and whole blocks
+constexpr size_t kFileSize = size_t{kPacket} * kBlock / 4;  // a multiple of both sizes
 
 // A file for one benchmark.
 class File {
@@ -26,7 +26,7 @@ class File {
     const char *const path = VARNEK_DATA_DIR "bench.ts";
 };
 
-// Reads again from the start when `read` finds no whole piece.
+// Starts again at the beginning of the file when `read` finds no complete piece.
 template <typename Read, typename Rewind>
 void Run(benchmark::State &state, Read read, Rewind rewind) {
     for (auto _ : state) {

@@ -1,5 +1,5 @@
-// How late a timer of 5 ms calls back, on an idle machine and with every core busy. Contenders take
-// turns. Each part of a second gives the median and the 99th percentile of its deliveries.
+// Measures how late a timer of 5 ms calls back, on an idle machine and with every core busy. The
+// contenders alternate. Each round gives the median and the 99th percentile of its deliveries.
 #include <semaphore.h>
 #include <signal.h>
 #include <sys/timerfd.h>
@@ -29,7 +29,7 @@ itimerspec After(uint32_t milliseconds) {
     return time;
 }
 
-// Where a callback leaves the moment of its call.
+// Here a callback stores the time of its call.
 struct Arrival {
     Arrival() { sem_init(&arrived, 0, 0); }
     ~Arrival() { sem_destroy(&arrived); }
@@ -116,7 +116,7 @@ class Descriptor {
     const int descriptor_ = timerfd_create(CLOCK_REALTIME, TFD_CLOEXEC);
 };
 
-// Keeps every core busy while it lives.
+// Keeps every core busy during its lifetime.
 class Load {
   public:
     explicit Load(bool on) {
@@ -155,7 +155,8 @@ Samples Measure(bool busy, int count) {
     Descriptor timerfd;
     constexpr int64_t kAsked = int64_t{kMilliseconds} * 1000000;
     for (int i = 0; i < count; i++) {
-        // The first of the two finds the timer service's thread asleep for longer.
+        // The contenders change their order, because the first one finds the thread of the timer
+        // service asleep for longer.
         if (i % 2 == 0) {
             samples.ours.push_back(ours.Measure() - kAsked);
         }
@@ -183,7 +184,7 @@ void Print(const std::string &row, const char *contender, std::vector<int64_t> *
 
 }  // namespace
 
-// lateness ROUNDS COUNT: prints what Google Benchmark would.
+// lateness ROUNDS COUNT: prints the results in Google Benchmark's format.
 int main(int argc, char **argv) {
     const int rounds = argc > 1 ? std::atoi(argv[1]) : 1;
     const int count = argc > 2 ? std::atoi(argv[2]) : 100;

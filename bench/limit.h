@@ -1,4 +1,5 @@
-// What the rows' limits call: the least that does the same work across a shared library.
+// The functions that the "limit" contenders call: the minimal code that does the same work, in a
+// shared library.
 #ifndef VARNEK_BENCH_LIMIT_H
 #define VARNEK_BENCH_LIMIT_H
 
@@ -10,7 +11,7 @@
 
 extern "C" {
 
-// A reader that checks its bounds. 1, or 0 past the end.
+// A bit reader that checks its bounds. Returns 1, or 0 beyond the end.
 struct LimitReader {
     const unsigned char *data;
     size_t bits;
@@ -21,7 +22,7 @@ LIMIT_API int LimitReadBits(LimitReader *reader, int count, uint32_t *value);
 LIMIT_API int LimitLock(pthread_mutex_t *mutex);
 LIMIT_API int LimitUnlock(pthread_mutex_t *mutex);
 
-// Drops the line unless `mask` has a bit of the enabled ones, of which there are none.
+// Drops the line unless `mask` contains an enabled bit. No bit is enabled.
 LIMIT_API void LimitTrace(uint32_t mask, const char *format, ...)
     __attribute__((format(printf, 2, 3)));
 

@@ -1,5 +1,5 @@
-// Mutexes and semaphores by handle: the first and the last slot of a full table, in one thread and
-// in two at once on objects that have nothing to do with one another.
+// Uses mutexes and semaphores by handle, in the first and the last slot of a full table. One thread
+// does so, or two threads at the same time with unrelated objects.
 #include <pthread.h>
 #include <semaphore.h>
 
@@ -11,9 +11,9 @@
 
 namespace {
 
-constexpr int kSlots = 39;  // the thread registry has one of the 40 mutexes
+constexpr int kSlots = 39;  // the thread registry uses one of the 40 mutexes
 
-// `count` objects of a family, in the slots from 0 on.
+// Has `count` objects of a family, in the slots from 0 on.
 class Table {
   public:
     Table(bool semaphores, int count) : semaphores_(semaphores) {
@@ -69,7 +69,7 @@ void RegisterSlot(const std::string &name, bool semaphores, int fill, int slot) 
     });
 }
 
-// Two threads, each on a core and a mutex of its own.
+// Two threads, each with its own core and mutex.
 void RegisterTwo(const std::string &name, int slotA, int slotB) {
     static std::unique_ptr<Table> table;
     bench::Add(name,
@@ -120,7 +120,7 @@ void RegisterByName(const std::string &name, int fill, int slot) {
 }
 
 void RegisterAll() {
-    // The thread registry's comes first.
+    // The thread registry's mutex is in the first slot.
     RegisterByName("byname:ours", kSlots, 29);
     for (const auto &[slot, place] : {std::pair{0, "first"}, std::pair{kSlots - 1, "last"}}) {
         const std::string mutex = std::string("mutex/") + place + ":";

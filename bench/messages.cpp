@@ -1,4 +1,5 @@
-// Messages of 40 bytes, copied in and out: within a thread, one way between two, and to and fro.
+// Messages of 40 bytes, copied in and out: within a thread, one way between two threads, and back
+// and forth.
 #include <fcntl.h>
 #include <mqueue.h>
 #include <pthread.h>
@@ -18,10 +19,10 @@
 
 namespace {
 
-constexpr int kBatch = 1000;  // messages between two meetings of the threads
+constexpr int kBatch = 1000;  // messages between two synchronisations of the threads
 
-// A contender is a queue: Send may be called by any thread, Receive by the one that `Owner` made
-// the queue's, and waits.
+// A contender is a queue. Any thread may call Send. Only the thread that `Owner` made the owner of
+// the queue calls Receive, which waits.
 
 class Ours {
   public:
@@ -121,7 +122,7 @@ class GLib {
 class PosixQueue {
   public:
     PosixQueue() {
-        // The length that the system allows without asking.
+        // The length that the system allows by default.
         mq_attr attributes = {};
         attributes.mq_maxmsg = 10;
         attributes.mq_msgsize = sizeof(THREAD_MSG);
@@ -165,8 +166,8 @@ void SameThread(benchmark::State &state) {
     }
 }
 
-// A thread of the library that answers: with `echo` every message, else the last one of a batch.
-// The first byte of a message says whether it is the last of all.
+// A thread of the library that answers messages: with `echo` every one, otherwise the last one of a
+// batch. The first byte of a message says whether it is the last message of the benchmark.
 template <typename Queue>
 class Partner {
   public:
@@ -235,7 +236,7 @@ void OneWay(benchmark::State &state) {
     state.SetItemsProcessed(state.iterations() * kBatch);
 }
 
-// There and back again, on the cores 0 and `core`.
+// Sends a message there and back, between the cores 0 and `core`.
 template <typename Queue, int core>
 void PingPong(benchmark::State &state) {
     bench::PinTo(0);

@@ -1,4 +1,4 @@
-// Packets of 188 bytes through a byte ring, in one thread and from one to another.
+// Moves packets of 188 bytes through a byte ring, in one thread and from one thread to another.
 #include <pthread.h>
 #include <sched.h>
 #include <string.h>
@@ -22,7 +22,7 @@ namespace {
 
 constexpr int kPacket = 188;
 constexpr int kSize = 64 * kPacket;
-constexpr int kBatch = 2000;  // packets between two meetings of the threads
+constexpr int kBatch = 2000;  // packets between two synchronisations of the threads
 
 using Packet = std::array<unsigned char, kPacket>;
 
@@ -135,7 +135,7 @@ class Jack {
 };
 #endif
 
-// Tries until it succeeds, and lets the other side run meanwhile.
+// Calls `once` until it succeeds, and lets the other side run in between.
 template <typename Try>
 void Insist(Try once) {
     while (!once()) {
@@ -159,8 +159,7 @@ void OneThread(benchmark::State &state) {
     }
 }
 
-// The reader is a thread of its own for as long as the benchmark runs; a turn is a batch of
-// packets.
+// The reader is a thread that lives as long as the benchmark. An iteration is a batch of packets.
 template <typename Ring>
 void TwoThreads(benchmark::State &state) {
     Ring ring;

@@ -1,4 +1,4 @@
-// Appending to a string, copying and comparing it.
+// Appends to a string, copies it and compares it.
 #include "Bench.h"
 #include "Varnek_CString.h"
 

@@ -1,4 +1,5 @@
-// Latin-15 to UTF-8: a service's name, and a long text with an accent in every tenth character.
+// Converts Latin-15 to UTF-8: a service's name, and a long text with an accent in every tenth
+// character.
 #include <iconv.h>
 #include <stdlib.h>
 #include <string.h>

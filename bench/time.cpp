@@ -1,4 +1,4 @@
-// Seconds to a calendar record and back, over days that the branch predictor does not know.
+// Converts seconds to a calendar record and back, for days that the branch predictor cannot learn.
 #include <time.h>
 
 #include <chrono>
@@ -55,7 +55,7 @@ uint32_t FromRecordByChrono(const VarnekCDateTime &record) {
     return static_cast<uint32_t>(time.time_since_epoch().count());
 }
 
-// Records made in advance, so that only the way back is measured.
+// Creates the records in advance, so that only the conversion back is measured.
 template <typename Record, typename Convert>
 void RunBack(benchmark::State &state, Record (*make)(uint32_t), Convert convert) {
     constexpr size_t kCount = 512;

@@ -1,4 +1,4 @@
-// Starting a timer and calling it off.
+// Starts a timer and cancels it.
 #include <signal.h>
 #include <time.h>
 
@@ -23,7 +23,7 @@ void Ours(benchmark::State &state) {
     VarnekPGL_DeleteTimer(timer);
 }
 
-// A timer of the system that is armed and disarmed, and with `asks` asked before each whether it is
+// Arms and disarms a timer of the system. With `asks` it first asks each time whether the timer is
 // armed, as the library has to.
 template <bool asks>
 void Raw(benchmark::State &state) {

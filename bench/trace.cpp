@@ -1,4 +1,4 @@
-// A trace whose level is off, and one that goes into a log function which discards it.
+// Writes a trace whose level is off, and one to a log function that discards it.
 #include <dlfcn.h>
 #include <stdarg.h>
 #include <string.h>
@@ -14,7 +14,7 @@
 #include <spdlog/spdlog.h>
 #endif
 
-// In the place of the platform's.
+// Replaces the log function of the platform.
 extern "C" __attribute__((visibility("default"))) int __android_log_write(int, const char *,
                                                                           const char *text) {
     benchmark::DoNotOptimize(text);
@@ -66,7 +66,8 @@ void LimitOn(benchmark::State &state) {
 #ifdef HAVE_ANDROID_LOG
 using AndroidPrint = int (*)(int, const char *, const char *, ...);
 
-// Loaded beside the symbols that this program and the stand-in have under the same names.
+// Loads the library at run time, because this program and the stand-in define symbols of the same
+// names.
 AndroidPrint LoadAndroidPrint() {
     void *library = dlopen(HAVE_ANDROID_LOG, RTLD_NOW | RTLD_LOCAL | RTLD_DEEPBIND);
     if (library == nullptr) {
@@ -115,7 +116,7 @@ void SpdlogOff(benchmark::State &state) {
     }
 }
 
-// The null sink drops the message before a line is composed, so the text alone is formatted.
+// The null sink drops the message before a line is composed, so only the text is formatted.
 void SpdlogOn(benchmark::State &state) {
     spdlog::logger &logger = Spdlog();
     int i = 0;
@@ -124,7 +125,7 @@ void SpdlogOn(benchmark::State &state) {
     }
 }
 
-// Drops the line when it is composed, as the log function that the library writes to does.
+// Composes the line and then drops it, as the log function that the library calls does.
 class DiscardingSink final : public spdlog::sinks::base_sink<spdlog::details::null_mutex> {
   protected:
     void sink_it_(const spdlog::details::log_msg &message) override {

@@ -1,6 +1,6 @@
-# What is installed beside the library and its headers, and the packages made of it.
+# Installs the files other than the library and its headers, and defines the packages.
 
-# What CMake and pkg-config read. Both find the tree from where they lie, so it may be moved as a whole.
+# The files for CMake and pkg-config. They refer to the tree relative to themselves, so it may be moved as a whole.
 include(CMakePackageConfigHelpers)
 set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/varnekutils_ltn)
 configure_package_config_file(cmake/varnekutils_ltn-config.cmake.in varnekutils_ltn-config.cmake
@@ -22,13 +22,13 @@ install(FILES ${CMAKE_CURRENT_BINARY_DIR}/varnekutils_ltn.pc
 
 install(FILES defaults/debug_ltn.ini defaults/Varnek_Config.cfg CommonUtility/gdb.py DESTINATION ${VARNEK_SHARE} COMPONENT dev)
 install(FILES LICENSE DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT license)
-# In the order of the source tree, so that the documents' links to each other hold.
+# The directories are those of the source tree, so that the links between the documents work.
 install(FILES README.md CHANGELOG.md SECURITY.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
 install(DIRECTORY docs examples DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev
         FILES_MATCHING PATTERN *.md PATTERN *.svg PATTERN *.cpp PATTERN *.h)
 install(FILES platform/README.md DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform COMPONENT dev)
 
-# Debian packages: script/package makes them with the preset package.
+# Debian packages; script/package builds them with the preset package.
 if(VARNEK_DEBIAN)
     include(cmake/debian/packages.cmake)
 endif()

@@ -1,6 +1,7 @@
-# Shows Doxygen the documents as one tree of pages: each gets a name, and what a list of contents links to
-# becomes a page below it. What is no page here (sources, licence) becomes plain text.
-# The lists of contents are the last section of README.md and docs/guide/README.md.
+# Filters the documents for Doxygen, so that they become one tree of pages. Each document gets a page name. A document
+# that a table of contents links to becomes a subpage of the page with that table. A link to a file that is not
+# a page (a source, the licence) becomes plain text.
+# The tables of contents are the last section of README.md and docs/guide/README.md.
 
 # The name of a page: docs/guide/trace.md is docs_guide_trace.
 function label(path) {
@@ -9,7 +10,7 @@ function label(path) {
     return path
 }
 
-# A link's target from the top of the tree.
+# The path of a link's target, relative to the top of the tree.
 function resolve(directory, target) {
     target = directory target
     while (match(target, /[^\/]+\/\.\.\//)) { target = substr(target, 1, RSTART - 1) substr(target, RSTART + RLENGTH) }
@@ -25,7 +26,7 @@ FNR == 1 {
     if ($0 ~ /^# /) { $0 = $0 " {#" (file == "README.md" ? "mainpage" : label(file)) "}" }
 }
 
-file == "README.md" && $0 == "## Read on" { contents = 1 }
+file == "README.md" && $0 == "## Documentation" { contents = 1 }
 
 /^ *```/ { fenced = !fenced; if (fenced) { sub(/```[a-z]+.*/, "```") } }
 

@@ -1,19 +1,20 @@
-# Shows Doxygen the headers' plain comments as its own:
-#   the comment that opens a file          describes the file
-#   "// Title ----" with what follows      opens a group
-#   a comment right above declarations     describes each of them, up to the next empty line
-#   "//   name  text" above a function     a parameter, or what it "returns", "traces", or its "threads"
-#   other indented lines                   a table, as it stands
-#   a comment behind a field or a macro    describes it
-# A comment that an empty line follows describes nothing.
+# Converts the plain comments of the headers to Doxygen's format:
+#   a comment at the start of a file           describes the file
+#   "// Title ----" and the following lines    open a group
+#   a comment directly above declarations      describes each of them, up to the next empty line
+#   "//   name  text" above a function         describes a parameter; the names "returns", "traces" and
+#                                              "threads" describe the result, the traces and thread safety
+#   other indented lines                       are a table, which is printed unchanged
+#   a comment after a field or a macro         describes it
+# A comment that is followed by an empty line describes nothing.
 { line[++lines] = $0 }
 
 function is_comment(text) { return text ~ /^ *\/\/( |$)/ }
 
-# Appends to the comment that is being made, in `doc`.
+# Appends a line to `doc`, the comment under construction.
 function say(text) { doc = doc indent text "\n" }
 
-# Adds comment lines first to last; `columns` tells parameters from tables.
+# Appends the comment lines `first` to `last`. With `columns`, indented lines are parameters, otherwise a table.
 function render(first, last, columns, i, text, table) {
     for (i = first; i <= last; i++) {
         text = line[i]

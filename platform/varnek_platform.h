@@ -1,6 +1,7 @@
-// What the library takes from its platform beside the C library; README.md is the contract. The
-// library includes this header where it calls these functions, and every stand-in where it defines
-// one, so that the compiler checks definitions and calls against one declaration. Private; plain C.
+// The functions that the library uses of its platform in addition to the C library; README.md is
+// the contract. The library includes this header where it calls the functions, and the stand-ins
+// include it where they define them. So the compiler checks calls and definitions against one
+// declaration. Private; plain C.
 #ifndef VARNEK_PLATFORM_H
 #define VARNEK_PLATFORM_H
 
@@ -20,8 +21,8 @@ enum VarnekLogPriority {
 // Writes one entry to the device's log (liblog).
 int __android_log_write(int priority, const char *tag, const char *text);
 
-// The text value of a platform feature; null or `defaultValue` when there is no such feature
-// (libvellnativefeature).
+// Returns the text value of a platform feature; null or `defaultValue` when there is no such
+// feature (libvellnativefeature).
 const char *VellNativeFeature_getStringWithDefault(const char *key, const char *defaultValue);
 
 #ifdef __cplusplus

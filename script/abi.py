@@ -1,5 +1,5 @@
-"""Turns abidw's account of the library (stdin) into the readable record of its binary interface:
-functions and globals with their types, then every type that these lead to, with sizes and offsets in
+"""Converts abidw's description of the library (stdin) to a readable record of its binary interface:
+functions and globals with their types, then every type that these refer to, with sizes and offsets in
 bytes."""
 
 import subprocess
@@ -15,7 +15,7 @@ for node in root.iter():
     if "id" in node.attrib:
         by_id.setdefault(node.get("id"), node)
 
-reached = {}  # the described types: their text by name
+reached = {}  # the descriptions of types, by name
 
 
 def parameters(function):
@@ -29,7 +29,7 @@ def returned(function):
 
 
 def name(type_id):
-    """The type as a declaration writes it. Notes what it leads to."""
+    """Returns the type as it is written in a declaration, and records the types that it refers to."""
     node = by_id[type_id]
     if node.tag == "pointer-type-def":
         target = by_id[node.get("type-id")]
@@ -50,7 +50,7 @@ def name(type_id):
     if node.tag == "typedef-decl" and by_id[node.get("type-id")].get("name") == own:
         return name(node.get("type-id"))  # the typedef that C needs
     if own not in reached and node.tag in ("typedef-decl", "class-decl", "union-decl", "enum-decl"):
-        reached[own] = ""  # a type may lead to itself
+        reached[own] = ""  # a type may refer to itself
         reached[own] = describe(node)
     return own
 
@@ -81,14 +81,14 @@ readable = dict(zip(symbols, subprocess.run(["c++filt"], input="\n".join(symbols
                                             stdout=subprocess.PIPE).stdout.split("\n")))
 exports = set()
 for node in root.iter():
-    # A C function that another source calls may be there as a mere declaration.
+    # A C function that another source calls may appear as a declaration only.
     symbol = node.get("elf-symbol-id") or node.get("name")
     if symbol not in readable:
         continue
     if node.tag == "var-decl":
         exports.add(f"{name(node.get('type-id'))} {readable[symbol]}")
     elif node.tag == "function-decl":
-        if readable[symbol] == symbol:  # no mangled name tells the parameters of a C function
+        if readable[symbol] == symbol:  # the name of a C function does not encode its parameters
             exports.add(f"{returned(node)} {symbol}({parameters(node)})")
         else:
             parameters(node)
@@ -96,7 +96,7 @@ for node in root.iter():
             exports.add(("" if structor else returned(node) + " ") + readable[symbol])
 unknown = [s for s in readable.values() if not any(f" {s}" in f" {e}" for e in exports)]
 if unknown:
-    sys.exit("no debug information on " + ", ".join(unknown))
+    sys.exit("no debug information for " + ", ".join(unknown))
 
 print("# The library's binary interface on 32-bit ARM: script/abi writes this file, script/check compares.")
 print("\n".join(sorted(exports, key=lambda e: e.split("(")[0].split()[-1] + e)))

@@ -1,12 +1,12 @@
 #!/usr/bin/env python3
-"""Which rows script/bench measures, against whom and with what goal; its table and its charts.
+"""Defines the rows of script/bench with their peers and goals, and creates its table and charts.
 
-  bench.py list                      the rows' names
-  bench.py areas [ROW...]            the programs that measure these rows, each with a filter
-  bench.py receiver TOP MIB RUNS OUT  measures the receiver of the build tree TOP beside ffprobe
-  bench.py table DIR [ROW...]        prints what the JSON in DIR says; fails when one of ours is not in it
-  bench.py growth DIR                prints how cost grows
-  bench.py record DIR DOCS           writes it into DOCS/performance.md and draws the charts beside it
+  bench.py list                       lists the names of the rows
+  bench.py areas [ROW...]             prints the programs that measure these rows, each with a filter
+  bench.py receiver TOP MIB RUNS OUT  measures the receiver of the build tree TOP, and ffprobe
+  bench.py table DIR [ROW...]         prints the results in DIR; fails when a row has no figure of ours
+  bench.py growth DIR                 prints how the cost grows
+  bench.py record DIR DOCS            writes the results to DOCS/performance.md and draws the charts next to it
 """
 import datetime
 import json
@@ -21,7 +21,7 @@ from pathlib import Path
 
 
 class Row:
-    """A row; goals are (contender, label, highest ratio or None). `wall` counts waiting as well."""
+    """A row. Goals are (contender, label, highest ratio or None). `wall` measures wall-clock time."""
 
     def __init__(self, name, area, title, *goals, wall=False):
         self.name, self.area, self.title, self.goals, self.wall = name, area, title, goals, wall
@@ -75,7 +75,7 @@ ROWS = [
         ('programs', 'ffprobe, first programs', 1.0), ('read', 'plain reading', None), wall=True),
 ]
 
-# What grows, along what axis; each curve is (name, contender, label). `per` divides by the axis.
+# The charts of growth. Each curve is (name, contender, label). `per` divides the time by the value on the x axis.
 GROWTH = [
     ('fill', 'locks', 'Objects in the table', 'ns an operation', False,
      (('grow_mutex', 'ours', 'mutex acquire + release'), ('grow_semaphore', 'ours', 'semaphore signal + wait'),
@@ -86,7 +86,7 @@ GROWTH = [
      (('grow_text', 'ours', 'Latin-15 to UTF-8'), ('grow_text', 'iconv', 'the same, by iconv'),
       ('grow_crc', 'ours', 'CRC-32'), ('grow_bits', 'ours', 'bit fields'))),
 ]
-# An operation in one thread, and in each of two at once.
+# An operation in one thread, and in each of two threads at the same time.
 THREADS = [
     ('mutexes in slots side by side', ('mutex2/neighbours', 'onethread'), ('mutex2/neighbours', 'ours')),
     ('mutexes in slots far apart', ('mutex2/apart', 'onethread'), ('mutex2/apart', 'ours')),
@@ -122,7 +122,7 @@ class Figures:
             return
         scale = {'ns': 1, 'us': 1e3, 'ms': 1e6, 's': 1e9}[run['time_unit']]
         wall = run['real_time'] * scale
-        # Of a batch the share of an item; of threads at once what each of them waited.
+        # For a batch, the time of one item. For concurrent threads, the time that each of them took.
         if 'items_per_second' in run:
             wall = 1e9 / run['items_per_second']
         self.wall.setdefault(key, []).append(wall * run.get('threads', 1))
@@ -145,7 +145,7 @@ def spread(samples):
 
 
 def lines(figures):
-    """(row, ours, spread, peer, time, ratio, goal, verdict) of each pair that was measured."""
+    """Yields (row, ours, spread, peer, time, ratio, goal, verdict) for each pair that was measured."""
     for row in ROWS:
         ours = figures.of(row.name, 'ours', row.wall)
         if not ours:
@@ -166,7 +166,7 @@ HEAD = ('row', 'ours', 'ours, least to most', 'beside', 'theirs', 'ratio', 'goal
 
 
 def named_once(table):
-    """The lines of a table, with title and time of ours only in the first of each row."""
+    """Yields the lines of a table, with the title and our time only in the first line of each row."""
     last = None
     for line in table:
         yield ['', '', '', *line[3:]] if line[0] == last else list(line)
@@ -186,7 +186,7 @@ def print_table(figures, prefixes):
     print(score(table))
     absent = [row.name for row in chosen(prefixes) if not figures.of(row.name, 'ours', row.wall)]
     if absent:
-        sys.exit(f'no figure of ours: {", ".join(absent)}')
+        sys.exit(f'rows without a figure of ours: {", ".join(absent)}')
 
 
 def curves(figures, chart):
@@ -255,10 +255,10 @@ def growth_chart(figures, chart, path):
     drawn = list(curves(figures, chart))
     if not drawn:
         return
-    import matplotlib  # nothing but a recording needs it
+    import matplotlib  # only a recording needs it
     matplotlib.use('svg')
     from matplotlib import pyplot, ticker
-    # The same figures give the same file.
+    # Makes the file the same for the same figures.
     pyplot.rcParams.update({'svg.fonttype': 'none', 'svg.hashsalt': name, 'font.family': 'sans-serif'})
     figure, axes = pyplot.subplots(figsize=(7.2, 3.6), layout='constrained')
     for label, points in drawn:
@@ -266,7 +266,7 @@ def growth_chart(figures, chart, path):
     axes.set_xscale('log')
     axes.set_xticks([x for x, _ in drawn[0][1]])
     axes.xaxis.set_major_formatter('{x:.0f}')
-    if per:  # lengths meet very different prices
+    if per:  # the prices for a byte differ a lot
         axes.set_yscale('log')
         axes.yaxis.set_major_locator(ticker.LogLocator(subs=(1, 2, 5)))
         axes.yaxis.set_major_formatter('{x:g}')
@@ -336,7 +336,7 @@ def print_areas(prefixes):
     for area in AREAS:
         names = [row.name for row in chosen(prefixes) if row.area == area]
         if names:
-            # Google Benchmark takes an extended regular expression.
+            # Google Benchmark expects an extended regular expression.
             print(area, '.' if not prefixes else '^(' + '|'.join(names) + '):')
 
 

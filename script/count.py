@@ -1,12 +1,12 @@
 #!/usr/bin/env python3
 """Counts what the ARM build executes for an operation, under the emulator.
 
-  count.py table [ROW...]    counts ours and the peers that were built in, and prints them side by side
-  count.py page              the same, into docs/performance.md
-  count.py record            counts ours, and writes them into bench/device/counts.txt
-  count.py check             counts ours, and fails where one is above that
+  count.py table [ROW...]    counts ours and the available peers, and prints a table
+  count.py page              counts the same, and writes the table to docs/performance.md
+  count.py record            counts ours, and writes the record bench/device/counts.txt
+  count.py check             counts ours, and fails if a count exceeds the record
 
-Counts instructions, barriers and exclusive loads of the programs in build/arm; for script/count and script/check.
+Counts instructions, barriers and exclusive loads of the programs in build/arm. Used by script/count and script/check.
 """
 import datetime
 import os
@@ -18,12 +18,12 @@ ARM, CLANG, TOP = Path('build/arm'), Path('build/arm-clang'), Path('build/device
 SYSROOT = '/usr/arm-linux-gnueabihf'
 PEERS = Path('build/device/root').absolute()
 RECORD = Path('bench/device/counts.txt')
-RENEW = 'script/count --record renews the record'
+RENEW = 'script/count --record updates the record'
 KINDS = ('instructions', 'barriers', 'exclusive loads')
 
 
 class Row:
-    """A row. The goal is the most instructions and barriers; peers are (contender, label)."""
+    """A row. The goal is the maximum of instructions and barriers; peers are (contender, label)."""
 
     def __init__(self, name, program, title, goal, *peers, turns=4096):
         self.name, self.program, self.title, self.goal = name, program, title, goal
@@ -66,7 +66,7 @@ def build_plugin():
 
 
 def count(row, contender, library=ARM):
-    """An operation's share of what a run executes between its marks; None when the run fails."""
+    """Returns the average counts of an operation between the marks of a run; None when the run fails."""
     out = TOP / 'count.txt'
     out.unlink(missing_ok=True)
     paths = [library.absolute() / 'lib', *(PEERS / top / 'lib/arm-linux-gnueabihf' for top in ('usr', '.'))]
@@ -77,19 +77,19 @@ def count(row, contender, library=ARM):
         stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True, check=False)
     if run.returncode == 0 and out.exists():
         return tuple(round(int(executed) / row.turns) for executed in out.read_text().split())
-    print(f'{row.name}:{contender} fails: {run.stderr}', file=sys.stderr)
+    print(f'{row.name}:{contender} failed: {run.stderr}', file=sys.stderr)
     return None
 
 
 def count_all(wanted):
-    """The counts of (row, contender, library), one after the other: the programs share a directory."""
+    """Counts each (row, contender, library), one after the other because the programs share a directory."""
     return {key: count(*key) for key in wanted}
 
 
 def of_ours():
     counts = count_all([(row, 'ours', ARM) for row in ROWS])
     if None in counts.values():
-        sys.exit('some rows cannot be counted')
+        sys.exit('some rows could not be counted')
     return {row.name: numbers for (row, _, _), numbers in counts.items()}
 
 
@@ -105,19 +105,19 @@ def check():
     counted = of_ours()
     if recorded.keys() != counted.keys():
         sys.exit(f'{RECORD} has other rows: {" ".join(recorded.keys() ^ counted.keys())}; {RENEW}')
-    worse = [f'{name}: {kind} {now}, on record {then}'
+    worse = [f'{name}: {kind} {now}, recorded {then}'
              for name in counted
              for kind, now, then, leave in zip(KINDS, counted[name], recorded[name], (1.02, 1, 1))
              if now > then * leave]
     if worse:
-        sys.exit('\n'.join([*worse, f'The device would do more than before. Where that is meant, {RENEW}.']))
+        sys.exit('\n'.join([*worse, f'The device would execute more than before. If that is intended, {RENEW}.']))
     print(f'{len(counted)} rows, none above {RECORD}')
 
 
 def record(counted):
     RECORD.write_text('\n'.join([
-        '# What the ARM build executes for an operation: instructions, barriers, exclusive loads.',
-        '# Written by script/count --record, held by script/check device.',
+        '# Counts of what the ARM build executes for an operation: instructions, barriers, exclusive loads.',
+        '# script/count --record writes this file, script/check device compares.',
         *(f'{name:<16}{numbers[0]:>7}{numbers[1]:>4}{numbers[2]:>4}' for name, numbers in counted.items()), '']))
 
 
@@ -129,7 +129,7 @@ def shown(numbers):
 
 
 def size_of(library):
-    """Text and data, stripped."""
+    """Returns the size of text and data, stripped."""
     stripped = TOP / f'{library.name}.so'
     subprocess.run(['arm-linux-gnueabihf-strip', '-o', stripped, library / 'lib/libvarnekutils_ltn.so'], check=True)
     sizes = subprocess.run(['arm-linux-gnueabihf-size', stripped], check=True, capture_output=True, text=True)

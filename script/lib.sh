@@ -1,5 +1,5 @@
-# What the scripts share. They run from the top of the tree, in one locale, and keep the chatter of
-# the tools that they call in build/log/, to be seen when something fails.
+# Functions that the scripts share. All scripts run from the top of the tree, in one locale. They write the output of
+# the tools that they call to build/log/, and show it only when a tool fails.
 # shellcheck shell=bash
 cd -P -- "$(dirname -- "${BASH_SOURCE[0]}")/.." || exit
 export LC_ALL=C.UTF-8
@@ -12,7 +12,7 @@ die() {
 }
 
 # quietly NAME COMMAND...: runs a command with its output in build/log/NAME.log, and shows the end of
-# that when the command fails.
+# the log when the command fails.
 quietly() {
     local log=build/log/$1.log status=0
     shift
@@ -20,11 +20,11 @@ quietly() {
     "$@" >"$log" 2>&1 </dev/null || status=$?
     [ "$status" = 0 ] && return
     tail -n 30 "$log" >&2
-    die "'$1' failed with status $status; all it said is in $log"
+    die "'$1' failed with status $status; its output is in $log"
 }
 
-# build PRESET [TARGET...]: configures and builds. A tree that was copied here with its build directory
-# starts afresh, since CMake refuses a cache from another place.
+# build PRESET [TARGET...]: configures and builds. If the build directory was copied from another place, it is removed
+# first, because CMake refuses such a cache.
 build() {
     local preset=$1
     shift
@@ -36,7 +36,7 @@ build() {
     quietly "build-$preset" cmake --build --preset "$preset" -j "$(nproc)" --target "$@"
 }
 
-# find_code PATTERN...: our files of these names, each ended by a NUL.
+# find_code PATTERN...: lists our files that match, each followed by a NUL.
 find_code() {
     local names=(-name "$1")
     shift
@@ -44,10 +44,10 @@ find_code() {
     find . \( -path './build*' -o -path ./.git \) -prune -o -type f \( "${names[@]}" \) -print0
 }
 
-# without_comments FILE: the file's lines but for those that are empty or begin with '#'.
+# without_comments FILE: prints the file without empty lines and lines that begin with '#'.
 without_comments() { grep -vE '^(#|$)' "$1"; }
 
-# readme TEXT: the block of README.md that holds TEXT, without its fences.
+# readme TEXT: prints the first block of README.md that contains TEXT, without its fences.
 readme() {
     local block
     block=$(awk -v text="$1" '/^```/ { if (found) exit; inside = !inside; block = ""; next }
@@ -57,5 +57,5 @@ readme() {
     printf '%s\n' "$block"
 }
 
-# log_of FILE: a log as logcat shows it, without dates, times, processes and threads.
+# log_of FILE: prints a log in logcat's format without dates, times, processes and threads.
 log_of() { sed -E 's/^[0-9-]+ [0-9:.]+ +[0-9]+ +[0-9]+ //' "$1"; }

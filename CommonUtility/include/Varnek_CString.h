@@ -6,38 +6,39 @@
 
 #ifdef __cplusplus
 
-// Holds a NUL-terminated text in an array of its own, or none: a null string differs from one with
-// an empty text. Misuse is traced and changes nothing. Without memory, construction, assignment
-// and a sum give a null string, and appending changes nothing. One thread uses a string at a time.
+// Owns a copy of a NUL-terminated text. A string without a text is a null string, which differs
+// from an empty one. Misuse is traced and changes nothing. When memory runs out, construction,
+// assignment and a sum give a null string, and appending changes nothing. Not thread-safe: one
+// thread at a time may use a string.
 class VARNEK_API VarnekCString {
   public:
-    // A copy of `text`; null gives a null string.
+    // Copies `text`; null gives a null string.
     VarnekCString(char const *text);
     VarnekCString(const VarnekCString &other);
 
     // Frees the text.
     ~VarnekCString();
 
-    // A new copy of the text, which the caller releases with delete[]; null for a null string
-    // and without memory.
+    // Returns a new copy of the text, which the caller frees with delete[]; null for a null string
+    // and when memory runs out.
     char *String() const;
-    // Takes over an array from new[] that holds a text; the caller must not use it any more. Null
-    // is refused.
+    // Takes ownership of a text in an array from new[]; the caller must not use it afterwards. Null
+    // is an error.
     void SetMemAllocedString(char *text);
 
-    // A copy of the other text; null makes a null string.
+    // Copy the other text; null makes this a null string.
     VarnekCString &operator=(const VarnekCString &other);
     VarnekCString &operator=(char const *text);
 
-    // Appends. A string with no bytes and a null text are refused; an empty text makes a null
-    // string an empty one.
+    // Append. A string object without bytes and a null text are errors; an empty text turns a null
+    // string into an empty one.
     VarnekCString &operator+=(const VarnekCString &other);
     VarnekCString &operator+=(char const *text);
     VarnekCString operator+(const VarnekCString &other) const;
     VarnekCString operator+(char const *text) const;
 
-    // Compare as strcmp does: 1 or 0. Two null strings are equal; otherwise a relation with a null
-    // string does not hold. Null strings are traced.
+    // Compare as strcmp does, and return 1 or 0. Two null strings are equal; every other comparison
+    // with a null string returns 0. Null strings are traced.
     int operator==(const VarnekCString &other) const;
     int operator>(const VarnekCString &other) const;
     int operator>=(const VarnekCString &other) const;

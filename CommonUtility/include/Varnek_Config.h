@@ -1,10 +1,10 @@
-// The receiver's persistent settings: one record of the process and its file, "Varnek_Config.cfg"
+// The receiver's persistent settings. The process has one record; its file is "Varnek_Config.cfg"
 // in the data directory, with one KEY=value line per field.
 //
-// The record starts with the initial values below. A load replaces all of it: what the file does
-// not give becomes 0 or empty, and the nation then comes from the platform's feature store. The
-// three getters that say so load the file first while `standardType` is 0. There is no lock:
-// callers that load, set or save while other threads use the record take turns.
+// The record starts with the initial values below. A load replaces all of it: a field that the file
+// does not set becomes 0 or empty, and a missing nation comes from the platform's feature store.
+// Three getters load the file first while `standardType` is 0. Not thread-safe: a thread that
+// loads, sets or saves must exclude all other users of the record.
 #ifndef VARNEK_CONFIG_H
 #define VARNEK_CONFIG_H
 
@@ -14,35 +14,36 @@
 extern "C" {
 #endif
 
-// Texts are NUL-terminated and hold no line ends. Callers may change fields; nothing is saved then.
+// Texts are NUL-terminated and contain no line breaks. Callers may change fields; that does not
+// save them.
 typedef struct VarnekConfigInfo {
-    char currentAreaName[100];  // the callers' text
-    int32_t standardType;       // the callers' code; 0 is "not loaded"; initially 2
+    char currentAreaName[100];  // defined by the callers
+    int32_t standardType;       // defined by the callers; 0 is "not loaded"; initially 2
     uint8_t tsCaptureEnable;    // 0 is off
     uint8_t tsFileSimulEnable;  // 0 is off
     int32_t cprmPlayerDelay;    // initially 68
     char supportNation[100];    // three-letter code
 } VarnekConfigInfo;
 
-// Gives access to the record, without a load.
+// Gives access to the record without loading the file.
 //   returns  the record of the process, never null
 VARNEK_API VarnekConfigInfo *VarnekCfg_GetConfigInfo(void);
 
-// Loads the file. Keys match without case and anywhere in a line; lines beyond 254 characters and
-// values beyond 99 are cut, numbers beyond 32 bits are the nearest that fits, and the switches take
-// a number's low 8 bits. A file that cannot be opened or read leaves the record as it is, and so
-// does one that is no regular file or larger than 1 MiB.
+// Loads the file. A key is found in any case and anywhere in a line. Lines are truncated to 254
+// characters and values to 99. A number beyond 32 bits becomes the nearest one that fits, and a
+// switch takes the low 8 bits of its number. When the file cannot be read, is not a regular file or
+// is larger than 1 MiB, the record stays unchanged.
 VARNEK_API void VarnekCfg_LoadConfigFile(void);
 
-// Saves the record; the data directory must exist. A failure is traced. The new text is written
-// beside the file ("Varnek_Config.new"), flushed to the medium and renamed into place with the mode
-// of the old file: a reader finds the old text or the new one, whenever the process is killed.
-// Where that cannot be (no room or no permission for a second file; a second process that saves for
-// longer than a second; a link, another user's file or no regular file in its place), the file
-// itself is emptied and written.
+// Saves the record; the data directory must exist. A failure is traced. The new text is written to
+// "Varnek_Config.new", flushed to the medium and renamed over the file, with the mode of the old
+// file. So a reader finds either the old text or the new one, even if the process is killed during
+// the save. The file is emptied and written in place instead when there is no room or permission
+// for a second file, when the save of another process takes longer than a second, or when the
+// existing file is a link, has a second name, belongs to another user or is not a regular file.
 VARNEK_API void VarnekCfg_SaveConfigFile(void);
 
-// Sets the standard type, and saves when it is another one.
+// Sets the standard type, and saves the record when the type changes.
 VARNEK_API void VarnekCfg_SetStandard(int32_t std);
 
 // Read a field. These three load the file first while `standardType` is 0.
@@ -50,11 +51,12 @@ VARNEK_API int32_t VarnekCfg_GetStandard(void);
 VARNEK_API uint8_t VarnekCfg_GetTSCaptueEnable(void);
 VARNEK_API uint8_t VarnekCfg_GetTSFileSimulEnable(void);
 
-// Asks the feature store while the record has no nation.
-//   returns  the record's nation, never empty: "BRA" unless file or platform say otherwise
+// Returns the record's nation. When the record has none, it first sets the nation from the feature
+// store.
+//   returns  the nation, never empty; "BRA" when neither the file nor the feature store defines one
 VARNEK_API const char *VarnekCfg_GetSupportNation(void);
 
-// Whether the receiver shows BML data broadcasts.
+// Says whether the receiver shows BML data broadcasts.
 //   returns  TRUE when the nation is "PHL"
 VARNEK_API BOOL VarnekCfg_IsSupportBML(void);
 

@@ -2,8 +2,8 @@
 // UTF-8 as in RFC 3629 ("LCode").
 //
 // Every text ends in a 0 byte or 0 unit. One unit is one character from U+0001 to U+FFFF;
-// surrogates are not paired. Output buffers are the caller's. All operations may run in any thread
-// and keep no state; a failure is traced by every step it passes through.
+// surrogates are not paired. The caller provides the output buffers. Thread-safe; the operations
+// keep no state. Every step that a failure passes through traces it.
 #ifndef VARNEK_LNGPACK_H
 #define VARNEK_LNGPACK_H
 
@@ -13,19 +13,20 @@
 extern "C" {
 #endif
 
-// Latin-15 to units. Control characters are dropped; the no-break space becomes a space.
+// Converts Latin-15 to units. Control characters are dropped; the no-break space becomes a space.
 //   pmszOutText  out: the units and a terminator
-//   outBufSize   units of room, the terminator not counted: as many bytes of input fit
+//   outBufSize   room in units without the terminator; the input may have as many bytes
 //   szInText     the Latin-15 text
 //   returns      TRUE; FALSE for a null pointer or an input that is too long
 VARNEK_API BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize,
                                            const char *szInText);
 
 // Counts units.
-//   returns  the units before the terminator; -1 for null
+//   returns  the number of units before the terminator; -1 for null
 VARNEK_API int WmStrlen(const unsigned short *mszText);
 
-// At most `nChar` units to UTF-8; the output takes up to three bytes a unit and one more.
+// Converts at most `nChar` units to UTF-8. The output takes up to three bytes for each unit, and
+// one for the terminator.
 //   returns  TRUE, with an empty output for an `nChar` of 0; FALSE for a null pointer
 VARNEK_API BOOL WmConvertPCode2UTF(char *pszOutText, const unsigned short *mszInText, int nChar);
 
@@ -33,28 +34,29 @@ VARNEK_API BOOL WmConvertPCode2UTF(char *pszOutText, const unsigned short *mszIn
 //   returns  the bytes written, without the terminator; -1 for a null pointer or an `nChar` of 0
 VARNEK_API int __WmLngUnicode2UTF(char *des, const unsigned short *src, int nChar);
 
-// A whole text of units to UTF-8; the output takes up to three bytes a unit and one more.
+// Converts a whole text of units to UTF-8. The output takes up to three bytes for each unit, and
+// one for the terminator.
 //   returns  TRUE; FALSE for a null pointer
 VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInText);
 
-// UTF-8 to units, of at most `length` bytes of input; bytes beyond are never read. A byte that
-// starts no character gives its low seven bits. U+00A0 becomes a space. Four-byte forms are not
+// Converts UTF-8 to units. It reads at most `length` bytes of input. A byte that starts no
+// character is converted to its low seven bits. U+00A0 becomes a space. Four-byte forms are not
 // decoded.
 //   pmszOutText  out: the units and a terminator
-//   outBufSize   bytes of room, the terminator counted; the two bytes of that are always needed
+//   outBufSize   room in bytes with the terminator, which always needs two
 //   szInText     the UTF-8 text
-//   length       bytes of input at most
+//   length       maximum number of input bytes
 //   returns      TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a
 //                null pointer or too little room
 VARNEK_API BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize,
                                    const char *szInText, int length);
 
-// Measures for WmConvertUTF2PCode.
-//   returns  the bytes of room that WmConvertUTF2PCode needs for this input, terminator included;
-//            that of an empty text for null
+// Returns the output size of WmConvertUTF2PCode.
+//   returns  the bytes that WmConvertUTF2PCode needs for this input, terminator included; null
+//            counts as an empty text
 VARNEK_API int __WmLngStrlenByByte(const char *szText, int length);
 
-// Compares a size with what is needed, and traces under `szName` when it is too small.
+// Compares a size with the required one, and traces under `szName` when it is too small.
 //   returns  TRUE when `OutBuffer` is at least `RequiredBufSize`
 VARNEK_API BOOL __WmConvertCodeBufferSizeCheck(const char *szName, int OutBuffer,
                                                int RequiredBufSize);
@@ -63,17 +65,18 @@ VARNEK_API BOOL __WmConvertCodeBufferSizeCheck(const char *szName, int OutBuffer
 //   returns  the units written, without the terminator; -1 for a null pointer
 VARNEK_API int __WmLngUTF2Unicode(unsigned short *des, const char *src, int length);
 
-// One character of one, two and three bytes, taken to be well-formed.
+// Decode one character of one, two and three bytes. The bytes must be well-formed.
 VARNEK_API unsigned short __WmLngConvert1ByteChar(unsigned char first);
 VARNEK_API unsigned short __WmLngConvert2ByteChar(unsigned char first, unsigned char second);
 VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned char second,
                                                   unsigned char third);
 
-// Latin-15 to a new UTF-8 text.
+// Converts Latin-15 to a new UTF-8 text.
 //   outputData   in: null or a block from malloc, which is freed; out: a block from malloc that the
-//                caller frees. Left alone when the result is FALSE or the converted text is empty
+//                caller frees. Unchanged when the result is FALSE or the converted text is empty
 //   szInput      the Latin-15 text
-//   szInputSize  length of the input in bytes; up to three times as many and one are accepted
+//   szInputSize  length of the input in bytes; the text may have up to three times as many, plus
+//                one
 //   returns      TRUE; FALSE for a null pointer, a longer input or too little memory
 VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
                                                unsigned int szInputSize);

@@ -1,11 +1,11 @@
 // Named mutexes and named counting semaphores, each kept in one process-wide table of 40.
 //
-// Handles start at 1, rise by one with every creation and are never given out twice; mutexes and
-// semaphores count apart. Names have 1 to 31 characters and compare exactly; two live objects have
-// one name only when two threads create them at the same moment. Any thread may call any operation,
-// and no call is needed to set the tables up. A failure is traced at Error. A time-out and a name
-// that is not found are no failures, and nothing is traced for them. After 2147483647 creations a
-// family has no handle left, and its creations fail.
+// Handles start at 1, rise by one with every creation and are never reused; mutexes and semaphores
+// count separately. Names have 1 to 31 characters and compare exactly. They are unique, unless two
+// threads create objects of one name at the same time. Thread-safe; no call is needed to set up the
+// tables. A failure is traced at Error. A time-out and a name that is not found are not failures
+// and are not traced. After 2147483647 creations a family has no handle left, and its creations
+// fail.
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H
 
@@ -16,11 +16,11 @@ extern "C" {
 #endif
 
 // Mutexes ----------------------------------------------------------------------------------------
-// Not recursive. A mutex is deleted only when no thread can still acquire or release it. The names
-// "VarnekThreadMutex" and "VarnekRingBuf" with a number are the library's own.
+// Mutexes are not recursive. Delete a mutex only when no thread can still acquire or release it.
+// The names "VarnekThreadMutex" and "VarnekRingBuf" with a number are reserved for the library.
 
-// Creates a mutex. A live mutex of this name is deleted first; when a thread holds that one, the
-// creation fails and it stays.
+// Creates a mutex. A live mutex of this name is deleted first; when a thread holds it, it stays and
+// the creation fails.
 //   returns  the handle; -1 for a bad name, a full table or a failing OS call
 VARNEK_API int32_t VarnekPGL_CreateMutex(const char *szMutexName);
 
@@ -32,7 +32,7 @@ VARNEK_API BOOL VarnekPGL_DeleteMutex(int32_t hMutex);
 //   returns  TRUE once it is held; FALSE for an unknown handle or a failing OS call
 VARNEK_API BOOL VarnekPGL_AcquireMutex(int32_t hMutex);
 
-// Gives up the mutex that the calling thread holds. Traces nothing on success.
+// Releases the mutex that the calling thread holds. Traces nothing on success.
 //   returns  TRUE; FALSE for an unknown handle or a failing OS call
 VARNEK_API BOOL VarnekPGL_ReleaseMutex(int32_t hMutex);
 
@@ -41,25 +41,26 @@ VARNEK_API BOOL VarnekPGL_ReleaseMutex(int32_t hMutex);
 VARNEK_API int32_t VarnekPGL_GetMutexByName(const char *szMutexName);
 
 // Semaphores -------------------------------------------------------------------------------------
-// A semaphore is deleted only when no thread waits on it or can still signal it.
+// Delete a semaphore only when no thread waits on it or can still use it.
 
-// Creates a semaphore. A live semaphore of this name is deleted first, whatever the count is.
+// Creates a semaphore. A live semaphore of this name is deleted first, even when `count` is
+// invalid.
 //   szSemName  1 to 31 characters
-//   count      units at the start, at most what the system's semaphores hold
+//   count      initial units, at most the maximum of the system's semaphores
 //   returns    the handle; -1 for a bad name, a full table or a failing OS call
 VARNEK_API int32_t VarnekPGL_CreateSemaphore(const char *szSemName, uint32_t count);
 
 // Deletes a semaphore.
-//   returns  TRUE when the slot is free, whatever the OS says; FALSE for an unknown handle
+//   returns  TRUE, even when the OS call fails; FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteSemaphore(int32_t hSem);
 
 // Takes one unit, waiting up to `timeout`.
 //   hSem     handle of a live semaphore
 //   timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
-//   returns  TRUE when a unit was taken; FALSE on time-out and on every failure alike. A wait that
-//            a signal interrupts is not resumed
+//   returns  TRUE when a unit was taken; FALSE on a time-out and on a failure. A wait that a signal
+//            interrupts fails and is not resumed
 //   traces   Low on entry, and after an unlimited wait; Error for an unknown handle or a failing OS
-//   wait; nothing on time-out
+//            wait; nothing on a time-out
 VARNEK_API BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout);
 
 // Adds one unit, which wakes one waiter.

@@ -1,11 +1,11 @@
 // The registry of named threads, and the message queue that each of them owns.
 //
-// A thread is a detached OS thread; the registry keeps the record through which it is known and
-// reached, and never stops, joins or cancels it. A thread must not be cancelled inside a call of
-// this library. 20 records; names have 1 to 31 characters, compare exactly and are unique, unless
-// two threads create one at the same moment. Any thread may call any operation. A failure is traced
-// at Error; a name that is not found is no failure. The named mutex "VarnekThreadMutex" is the
-// registry's own.
+// A thread is a detached OS thread. The registry keeps a record of it, through which other threads
+// find it and send to it; the registry never stops, joins or cancels a thread. A thread must not be
+// cancelled inside a call of this library. The registry has room for 20 records. Names have 1 to 31
+// characters and compare exactly. They are unique, unless two threads create threads of one name at
+// the same time. Thread-safe. A failure is traced at Error; a name that is not found is not a
+// failure. The named mutex "VarnekThreadMutex" is reserved for the registry.
 #ifndef VARNEK_THREAD_H
 #define VARNEK_THREAD_H
 
@@ -18,23 +18,25 @@ extern "C" {
 // Threads ----------------------------------------------------------------------------------------
 
 // Starts a thread. Its record is visible before `function` runs, and the first 15 characters of its
-// name are the thread's name in the system. A record of this name is removed first, whatever the
-// other arguments are, and its unread messages are freed; that thread runs on without a record.
+// name are the thread's name in the system. An existing record of this name is removed first, even
+// when the other arguments are invalid, and its unread messages are freed; its thread runs on
+// without a record.
 //   szThreadName  1 to 31 characters
-//   priority      1 to 99, kept for the scheduler's policy, which is the ordinary one
-//   stackSize     bytes; what the system refuses gives its default size. A thread that calls this
-//                 library needs 12 KiB or more where a guard page is taken out of it
-//   function      runs in the new thread; its result is dropped
-//   argument      handed to `function` unchanged
-//   returns       the handle, never given out twice; -1 on failure, and for good after 2147483647
+//   priority      1 to 99; it has no effect, since threads use the ordinary scheduling policy
+//   stackSize     bytes; a size that the system refuses is replaced by the default size. A thread
+//                 that calls this library needs at least 12 KiB, of which some systems use one page
+//                 as a guard
+//   function      runs in the new thread; its result is ignored
+//   argument      passed to `function` unchanged
+//   returns       the handle, which is never reused; -1 on failure, and always after 2147483647
 //                 creations
 VARNEK_API int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t priority,
                                           uint32_t stackSize, void *(*function)(void *),
                                           void *argument);
 
-// Removes a thread's record and frees its unread messages: what they point to is not freed. Other
-// creations and deletions wait meanwhile (0.26 s for ten million messages on a PC). The thread runs
-// on; if it waits in a receive, that returns FALSE.
+// Removes a thread's record and frees its unread messages, but not the memory that they point to.
+// Other creations and deletions wait until that is done (0.26 s for ten million messages on a PC).
+// The thread runs on; if it waits in a receive, the receive returns FALSE.
 //   returns  TRUE, or FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 
@@ -42,41 +44,42 @@ VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 //   returns  the handle of the thread of this name; -1 for none and for null
 VARNEK_API int32_t VarnekPGL_GetThreadByName(const char *szThreadName);
 
-// Tells which thread of the registry the calling thread is.
-//   returns  the calling thread's handle; -1, after an Error line, when the registry has not
-//            started it (as for main and timer callbacks) or its record has been removed
+// Returns the handle of the calling thread.
+//   returns  the calling thread's handle; -1, after an Error line, in a thread that the registry
+//            has not started (such as main or a timer callback) or whose record has been removed
 VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 
 // Messages ---------------------------------------------------------------------------------------
-// A message is copied in and copied out. A queue is bounded only by memory. What one thread sends
-// with VarnekPGL_SendMessage is received in that order.
+// A message is copied in and copied out. Only memory limits the length of a queue. Messages that
+// one thread sends with VarnekPGL_SendMessage are received in the order of sending.
 
-// One message of 40 bytes, aligned to 8, so that modules may lay a record of their own over it.
-// What is in it is up to the modules that communicate; the library copies it as bytes, from and to
-// any address.
+// One message of 40 bytes. It is aligned to 8, so that modules may overlay it with their own
+// struct. The modules that communicate define its content; the library copies it as bytes, from and
+// to any address.
 typedef struct THREAD_MSG {
-    unsigned char data[40];  // the modules' own
+    unsigned char data[40];  // defined by the modules
 } __attribute__((aligned(8))) THREAD_MSG;
 
 // Appends a message to a thread's queue.
-//   returns  TRUE when it is queued and its reader signalled; FALSE for an unknown handle, a null
-//            message, too little memory, or a failing OS call (the message stays queued then)
+//   returns  TRUE when the message is queued and its reader signalled; FALSE for an unknown handle,
+//            a null message, too little memory, or a failing OS call (then the message stays
+//            queued)
 VARNEK_API BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message);
 
-// Puts a message in front of everything that is queued now, earlier urgent messages included.
-//   returns  TRUE and FALSE as VarnekPGL_SendMessage does
+// Puts a message in front of all queued messages, earlier urgent messages included.
+//   returns  TRUE or FALSE, as VarnekPGL_SendMessage does
 VARNEK_API BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message);
 
 // Takes the first message of the calling thread's queue, waiting up to `timeout` for one.
 //   timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
 //   message  out: the message
-//   count    out: the messages left
-//   returns  TRUE; FALSE, and nothing written, on a time-out, an interrupted wait, for a thread
-//            without a record or whose record is removed meanwhile, and for null pointers
+//   count    out: the number of messages left
+//   returns  TRUE; FALSE, with nothing written, on a time-out or an interrupted wait, when the
+//            thread has no record or the record is removed during the wait, and for null pointers
 VARNEK_API BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *count);
 
-// Takes the first message without waiting. It leaves the queue's count of signals as it is: for
-// each message that was peeked, one later receive returns FALSE at once.
+// Takes the first message without waiting. It does not lower the count of the queue's semaphore, so
+// for each message that was peeked, one later receive returns FALSE at once.
 //   returns  TRUE; FALSE, and nothing written, when there is none
 VARNEK_API BOOL VarnekPGL_PeekMessage(THREAD_MSG *message, int32_t *count);
 

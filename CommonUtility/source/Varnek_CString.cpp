@@ -1,5 +1,5 @@
-// The owning string. A new array is complete before the old one goes, so an operand may be the
-// string itself or lie in its array.
+// The owning string. A new array is complete before the old one is freed, so an operand may be the
+// string itself or part of its array.
 #include "Varnek_CString.h"
 
 #include <string.h>
@@ -10,8 +10,8 @@
 
 namespace {
 
-// A new array with one text behind the other; null, after a trace, when there is no memory or the
-// length does not fit its field.
+// Returns a new array with both texts, one after the other. Null, after a trace, when there is no
+// memory or the length does not fit its field.
 char *Joined(const char *first, size_t firstLength, const char *second, size_t secondLength) {
     const size_t length = firstLength + secondLength;
     char *text = length < UINT32_MAX ? new (std::nothrow) char[length + 1] : nullptr;
@@ -114,7 +114,7 @@ VarnekCString &VarnekCString::operator+=(char const *text) {
     return *this;
 }
 
-// Without memory for the left operand a sum is null, and not the right operand alone.
+// When there is no memory for the left operand, a sum is null rather than the right operand alone.
 
 VarnekCString VarnekCString::operator+(const VarnekCString &other) const {
     VarnekCString sum(*this);

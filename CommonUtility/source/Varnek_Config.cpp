@@ -1,5 +1,5 @@
-// The configuration record and its file. One table of keys, in the order of the fields, serves the
-// search, the loading and the saving.
+// The configuration record and its file. The search for a key, the load and the save use one table
+// of keys, in the order of the fields.
 #include "Varnek_Config.h"
 
 #include <errno.h>
@@ -36,12 +36,12 @@ static_assert(offsetof(VarnekConfigInfo, supportNation) == 112,
 namespace {
 
 constexpr size_t kLineSize = 255;  // of a line that is read, with its terminator
-constexpr size_t kFileSize = 900;  // of what is written, with a terminator
+constexpr size_t kFileSize = 900;  // of the text that is written, with its terminator
 
 constexpr char kConfigPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
-constexpr char kNewPath[] = VARNEK_DATA_DIR "Varnek_Config.new";  // until it is renamed
+constexpr char kNewPath[] = VARNEK_DATA_DIR "Varnek_Config.new";  // before it is renamed
 static_assert(sizeof kConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
-constexpr int kLockTries = 1000;  // of a millisecond
+constexpr int kLockTries = 1000;  // one per millisecond
 constexpr int32_t kSaveFlags = PGL_FILE_MODE_CREATE_RW | PGL_FILE_MODE_WRITE;
 
 enum ConfigField {
@@ -54,7 +54,7 @@ enum ConfigField {
     CONFIG_FIELD_COUNT
 };
 
-// The first key that is found in a line decides the line.
+// If a line contains several keys, the first one in this table counts.
 constexpr const char *kKeys[CONFIG_FIELD_COUNT] = {
     "CONFIG_CURRENTAREANAME=", "CONFIG_STANDARDTYPE=",     "CONFIG_TSCAPTURE=",
     "CONFIG_TSFILESIMUL=",     "CONFIG_CPRMPLAYER_DELAY=", "CONFIG_SUPPORT_NATION=",
@@ -68,7 +68,7 @@ constexpr char kNationWithBml[] = "PHL";
 
 VarnekConfigInfo gpVarnekConfigInfo = {"", 2, 0, 0, 68, ""};
 
-// Copies what fits.
+// Copies as much of the text as fits.
 template <size_t size>
 void CopyText(char (&to)[size], const char *from, size_t length) {
     const size_t count = length < size ? length : size - 1;
@@ -76,7 +76,7 @@ void CopyText(char (&to)[size], const char *from, size_t length) {
     to[count] = '\0';
 }
 
-// As atoi; a number that does not fit becomes the nearest that does.
+// Converts as atoi does. A number that does not fit becomes the nearest one that does.
 int32_t NumberOf(const char *text) {
     const ErrnoKeeper keeper;
     const long long number = strtoll(text, nullptr, 10);
@@ -149,7 +149,8 @@ void ReadLines(const char *text) {
     }
 }
 
-// The whole file. A caller may have filled a text field to its last byte.
+// Formats the whole file. The texts are limited to 99 bytes, because a caller may have filled a
+// field without a terminator.
 void FormatFile(char (&text)[kFileSize]) {
     const VarnekConfigInfo &info = gpVarnekConfigInfo;
     snprintf(text, sizeof text, "%s%.99s\n%s%d\n%s%d\n%s%d\n%s%d\n%s%.99s\n", kKeys[AREA_NAME],
@@ -158,7 +159,7 @@ void FormatFile(char (&text)[kFileSize]) {
              kKeys[PLAYER_DELAY], info.cprmPlayerDelay, kKeys[NATION], info.supportNation);
 }
 
-// The whole text of the open file. Null data, after its trace, when it cannot be read.
+// Reads the whole text of the open file. Null data, after a trace, when it cannot be read.
 FileText ReadFromStart(PglFileHandle file) {
     VarnekPGL_SeekFile(file, 0, SEEK_END);
     const int32_t length = VarnekPGL_TellFile(file);
@@ -178,8 +179,8 @@ FileText ReadFromStart(PglFileHandle file) {
     return text;
 }
 
-// Whether a new file may take the place of what is there: nothing, or a file of our own that no
-// other name leads to. Fills `*old`, with zeros for nothing.
+// Whether a new file may replace the existing one: there is none, or it is a regular file of ours
+// without other names. Fills `*old`, with zeros if there is none.
 bool MayReplace(struct stat64 *old) {
     *old = {};
     if (lstat64(kConfigPath, old) != 0) {
@@ -188,8 +189,8 @@ bool MayReplace(struct stat64 *old) {
     return S_ISREG(old->st_mode) && old->st_nlink == 1 && old->st_uid == geteuid();
 }
 
-// Gives the new file what readers of the old one go by, as late as it can: another process may
-// change it meanwhile.
+// Gives the new file the group and the mode of the old one. This is done as late as possible,
+// because another process may change them during the save.
 bool TakeOver(int fd) {
     struct stat64 old = {};
     if (!MayReplace(&old)) {
@@ -199,9 +200,9 @@ bool TakeOver(int fd) {
                                 fchmod(fd, old.st_mode & 07777) == 0);
 }
 
-// Writes the text beside the file, through to the disk, and renames it into place: a reader finds
-// the old text or the new one at any moment, whatever happens to this process. False when that
-// cannot be done; the file is as it was then.
+// Writes the text to a second file, flushes that to the disk, and renames it over the settings
+// file. So a reader finds either the old text or the new one, whatever happens to this process.
+// Returns false when that fails, with the settings file unchanged.
 bool ReplaceFile(const char *text) {
     remove(kNewPath);
     const PglFileHandle file = VarnekPGL_OpenFile(kNewPath, kSaveFlags);
@@ -220,8 +221,9 @@ bool ReplaceFile(const char *text) {
     return false;
 }
 
-// Takes the lock that keeps the saves of other processes from the file beside. It goes with its
-// holder, but a holder may be stopped, or leave a child that holds it on: so the wait has an end.
+// Takes the lock that keeps the saves of other processes from the second file. The system releases
+// it when its holder ends. But a holder may be stopped, or have a child that keeps the lock, so the
+// wait is limited.
 bool LockDirectory(int directory) {
     for (int i = 0; i < kLockTries; i++) {
         if (flock(directory, LOCK_EX | LOCK_NB) == 0) {
@@ -232,7 +234,7 @@ bool LockDirectory(int directory) {
     return false;
 }
 
-// ReplaceFile, where it is possible.
+// Calls ReplaceFile if the directory and the file allow it.
 bool SaveBeside(const char *text) {
     struct stat64 old = {};
     if (access(VARNEK_DATA_DIR, W_OK) != 0 || !MayReplace(&old)) {
@@ -245,7 +247,8 @@ bool SaveBeside(const char *text) {
     bool replaced = false;
     if (LockDirectory(directory)) {
         replaced = ReplaceFile(text);
-        // For a child, too, that was forked meanwhile and has the descriptor.
+        // A child that was forked during the save has the descriptor too, so the close below would
+        // not release the lock.
         flock(directory, LOCK_UN);
     }
     close(directory);
@@ -276,8 +279,8 @@ void VarnekCfg_LoadConfigFile() {
         CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Open Config File!");
         return;
     }
-    // A file that cannot be read is no reason to lose the settings, which the next save would write
-    // over it. So the record is cleared once the text is here.
+    // The record is cleared only after the text has been read. Otherwise a file that cannot be read
+    // would cost the settings, and the next save would write empty ones.
     const FileText text = ReadFromStart(file);
     VarnekPGL_CloseFile(file);
     if (text.data == nullptr) {
@@ -296,7 +299,7 @@ void VarnekCfg_SaveConfigFile() {
                      "VarnekCfg_SaveConfigFile: Root_Path(%s) is not Exist\n", VARNEK_DATA_DIR);
         return;
     }
-    // Opening in place empties the file, so everything is ready before.
+    // Opening the file in place empties it, so the text is prepared before.
     char text[kFileSize];
     FormatFile(text);
     if (SaveBeside(text)) {
@@ -309,7 +312,7 @@ void VarnekCfg_SaveConfigFile() {
     }
     const uint32_t length = static_cast<uint32_t>(strlen(text));
     const uint32_t written = VarnekPGL_WriteFileByHandle(file, text, length);
-    // A full disk may show only when the stream is closed.
+    // The error of a full disk may appear only when the stream is closed.
     if (VarnekPGL_CloseFile(file) != 0 || written != length) {
         CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_WriteFileByHandle() fail.!");
     }
@@ -356,7 +359,7 @@ const char *VarnekCfg_GetSupportNation() {
     }
     const char *tag = strstr(feature, kNationTag);
     const char *code = tag != nullptr ? tag + strlen(kNationTag) : "";
-    // A line end is in no code: the record's file could not hold it.
+    // No code contains a line end, and the settings file could not store one.
     if (strcspn(code, "\r\n") < kNationLength) {
         CopyText(nation, kDefaultNation, kNationLength);
         TRACE_ERROR("%s can't find Nation TAG in TARN feature. so set default nation(BRA)",

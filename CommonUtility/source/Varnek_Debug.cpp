@@ -1,8 +1,8 @@
 // The masked trace, the debug configuration that masks it, and the assertion report.
 //
-// What is enabled is one atomic word, so a trace that is off costs one load. A line is composed in
-// a buffer of its own call and no lock is held while it is formatted or written; the only lock here
-// lets one thread at a time load the configuration.
+// One atomic word says what is enabled, so a trace that is off costs one load. Each call composes
+// its line in a buffer on its stack, and holds no lock while it formats and writes the line. The
+// only lock here lets one thread at a time load the configuration.
 #include "Varnek_Debug.h"
 
 #include <errno.h>
@@ -35,8 +35,9 @@ namespace {
 constexpr uint32_t kLevelBits = 0xF0000000u;
 constexpr uint32_t kModuleBits = 0x00000FFFu;
 
-// Serialises loads. gDebugLoader names the thread that holds it, so that a log function which
-// traces while the load reports through it finds everything off instead of waiting for itself.
+// Serialises loads. gDebugLoader is the thread that holds the lock. A load calls the log function,
+// which may trace. With gDebugLoader such a trace recognises that its own thread is loading, and
+// returns instead of waiting for itself.
 Lock gDebugLoadLock;
 std::atomic<pthread_t> gDebugLoader{};
 
@@ -108,7 +109,7 @@ const TraceModule &ModuleOf(uint32_t mask) {
     return kUnknownModule;
 }
 
-// The last component of the path of the code that traces.
+// Returns the last component of the path of the code that traces.
 const char *CallerFileName() {
     const char *path = __atomic_load_n(&gszVarnekDbgFilePath, __ATOMIC_RELAXED);
     if (path == nullptr) {
@@ -126,8 +127,9 @@ void LogFailure(const char *text) {
     __android_log_write(VARNEK_LOG_ERROR, "SBTVD", text);
 }
 
-// What one line enables. The first key found in a line decides the line, wherever it is, and so
-// does a '1' anywhere. The keys are tried in the order of the tables.
+// Returns the bit that a line enables, or 0. The key may be anywhere in the line. If the line
+// contains several keys, the first one in the order of the tables counts. A '1' anywhere in the
+// line enables it.
 uint32_t BitOfLine(const char *line) {
     if (line[0] == '#') {
         return 0;
@@ -149,8 +151,8 @@ uint32_t BitOfLine(const char *line) {
     return 0;
 }
 
-// Everything that the text enables. A line over its buffer is cut; a text that begins with a line
-// end enables nothing.
+// Returns all bits that the text enables. A line that is too long for the buffer is truncated. A
+// text that begins with a line end enables nothing.
 uint32_t ParseConfig(const char *data, size_t size) {
     uint32_t enabled = 0;
     size_t position = 0;
@@ -175,7 +177,7 @@ uint32_t ParseConfig(const char *data, size_t size) {
     return enabled;
 }
 
-// A line of the summary, as it is put together.
+// Composes a line of the summary.
 class SummaryLine {
   public:
     void Add(const char *label, bool on) {
@@ -190,7 +192,7 @@ class SummaryLine {
     }
 
   private:
-    char text_[128] = {};  // more than any line's labels take
+    char text_[128] = {};  // enough for the labels of any line
     size_t length_ = 0;
     const char *separator_ = "Log Config: ";
 };
@@ -219,7 +221,7 @@ void LogSummary(uint32_t enabled) {
     }
 }
 
-// Puts the shipped configuration where there is none yet.
+// Copies the shipped configuration to the data directory.
 void SeedConfig() {
     const FileKind kind = KindOfConfigFile(kDefaultConfigPath);
     if (kind != FileKind::kOdd && VarnekPGL_CheckFile(kDefaultConfigPath)) {
@@ -230,7 +232,8 @@ void SeedConfig() {
                "debug_ltn.ini]\n");
 }
 
-// What the configuration file enables. Nothing, after a line in the log, when it cannot be read.
+// Returns all bits that the configuration file enables. 0, after a line in the log, when it cannot
+// be read.
 uint32_t ReadConfig() {
     FileKind kind = KindOfConfigFile(kConfigPath);
     bool exists = kind != FileKind::kOdd && VarnekPGL_CheckFile(kConfigPath);
@@ -254,7 +257,7 @@ uint32_t ReadConfig() {
     return enabled;
 }
 
-// What a trace asks for, of what a configuration enables.
+// Returns the state word for the bits that a configuration enables.
 uint32_t StateOf(uint32_t enabled) {
     constexpr uint32_t kOwnLow = VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON;
     if ((enabled & kOutputOn) == 0) {
@@ -263,8 +266,8 @@ uint32_t StateOf(uint32_t enabled) {
     return (enabled & kOwnLow) == kOwnLow ? enabled | kOwnLowOn : enabled;
 }
 
-// One load, in the thread that holds gDebugLoadLock. While it runs nothing is traced, also when it
-// replaces an earlier load.
+// Loads the configuration once. During the load nothing is traced, even if an earlier configuration
+// enabled traces.
 void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     if (IsLoaded()) {
         gDebugState.store(0, std::memory_order_relaxed);
@@ -274,7 +277,8 @@ void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     gDebugState.store(StateOf(enabled), std::memory_order_relaxed);
 }
 
-// Loads under the lock; with `again` unset only when no load has finished meanwhile.
+// Loads under the lock. Without `again`, it loads only if no other thread finished a load while
+// this one waited for the lock.
 void LoadConfigOnce(bool again) {
     const ErrnoKeeper keeper;
     if (pthread_equal(gDebugLoader.load(std::memory_order_relaxed), pthread_self())) {
@@ -288,10 +292,10 @@ void LoadConfigOnce(bool again) {
     }
 }
 
-// Writes "[L][File.cpp- 442] ", as far as it fits, without a terminator. Returns its length. By
-// hand, since the C library would take as long for it as for a caller's text.
+// Writes "[L][File.cpp- 442] ", as far as it fits, without a terminator, and returns its length. It
+// does not use snprintf, which would take as long for the prefix as for a caller's text.
 size_t PutPrefix(char (&line)[kTraceLineSize], char label, const char *file, int32_t number) {
-    constexpr size_t kColumns = 4;  // of the line number, at least
+    constexpr size_t kColumns = 4;  // minimal width of the line number
     char digits[12];
     char *first = digits + sizeof digits;
     uint32_t rest = number < 0 ? 0u - static_cast<uint32_t>(number) : static_cast<uint32_t>(number);
@@ -321,8 +325,8 @@ size_t PutPrefix(char (&line)[kTraceLineSize], char label, const char *file, int
     return length;
 }
 
-// Composes and writes a line whose level may be on: loads the configuration first, unless that has
-// happened. Kept out of line, so that its buffer costs nothing in a trace that is off.
+// Composes and writes a line that may be enabled. Loads the configuration first if that has not
+// happened. Not inlined, so that its buffer costs nothing in a trace that is off.
 __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, const char *format,
                                                                 va_list args) {
     if (!IsLoaded()) {
@@ -351,7 +355,8 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
 }  // namespace
 
 void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...) {
-    // A mask without a level ends here too, once the configuration is loaded.
+    // The bits of the levels are above kNotLoaded, and all others are below it. So this returns
+    // when the configuration is loaded and the level is off, or the mask has no level.
     const uint32_t state = gDebugState.load(std::memory_order_relaxed);
     if ((state & (mask | kNotLoaded)) < kNotLoaded) {
         return;

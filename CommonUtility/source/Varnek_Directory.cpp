@@ -1,4 +1,4 @@
-// Directories, and the commands that the shell carries out. No state is kept between calls.
+// Directories, and the operations that run a shell command. No state is kept between calls.
 #include <dirent.h>
 #include <errno.h>
 #include <fcntl.h>
@@ -30,12 +30,12 @@ constexpr size_t kChildPathSize = 257;
 constexpr size_t kCopyCommandSize = 532;
 constexpr size_t kChmodCommandSize = 512;
 
-// The directory stream behind a handle, null for none.
+// Returns the directory stream of a handle, null for none.
 DIR *DirOf(void *hDir) {
     return hDir != PGL_INVALID_DIR_HANDLE ? static_cast<DIR *>(hDir) : nullptr;
 }
 
-// The first argument of the calling process's command line, empty when it cannot be read.
+// Reads the first argument of the process's command line; it is empty when it cannot be read.
 template <size_t size>
 void ReadProcessName(char (&name)[size]) {
     char path[32];
@@ -49,7 +49,8 @@ void ReadProcessName(char (&name)[size]) {
     }
 }
 
-// Whether a path is a link, whatever its times: a 32-bit system cannot stat those beyond 2038.
+// Whether a path is a link. It does not use stat, which fails on a 32-bit system when the file has
+// times after 2038.
 bool IsLink(int dir, const char *name) {
     char target = '\0';
     return readlinkat(dir, name, &target, sizeof target) >= 0;
@@ -73,7 +74,7 @@ bool RemoveAt(int dir, const char *name) {
     return false;
 }
 
-// One directory that a tree deletion is in.
+// An open directory between the root of a tree deletion and its current position.
 struct TreeLevel {
     TreeLevel *parent;  // null for the root
     DIR *dir;
@@ -81,15 +82,15 @@ struct TreeLevel {
 };
 
 // The deletion of a directory tree, for VarnekPGL_DeleteDirEx. It works on descriptors that are
-// opened without following a link, so a directory that is swapped for a link meanwhile is not
-// entered. Levels lie in the heap, so that a deep tree costs a small stack nothing.
+// opened without following links, so it does not enter a link that replaces a directory during the
+// deletion. The levels are on the heap, so that a deep tree needs no more stack.
 class TreeDeletion {
   public:
-    // `path` is the root's, in a block that has room for the path of a child, too.
+    // `path` is the path of the root, in a block with room for the path of a child.
     explicit TreeDeletion(char *path) : path_(path) {}
 
     int32_t Run() {
-        // A final slash or "/." would have the system follow a link.
+        // With a final slash or "/." the system would follow a link, so they are cut off here.
         size_t bare = strlen(path_);
         while (bare > 1 &&
                (path_[bare - 1] == '/' || (path_[bare - 1] == '.' && path_[bare - 2] == '/'))) {
@@ -123,8 +124,8 @@ class TreeDeletion {
         return openat(dir, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
     }
 
-    // Goes down into the directory at the present path, and owns its descriptor. False, after the
-    // lines, when it cannot be read.
+    // Makes the directory at path_ the current level, and owns its descriptor. Returns false, after
+    // log lines, when the directory cannot be read.
     bool Enter(int fd) {
         DIR *dir = fd >= 0 ? fdopendir(fd) : nullptr;
         TreeLevel *level =
@@ -146,8 +147,8 @@ class TreeDeletion {
         return false;
     }
 
-    // Deletes the present entry, or goes down into it. A path that does not fit must not be cut
-    // into the name of some other file, so that entry stays.
+    // Deletes the current entry, or enters it if it is a directory. An entry whose path does not
+    // fit is left, because the truncated path could name another file.
     void DeleteChild() {
         const char *name = entry_.name;
         const size_t length = level_->pathLength;
@@ -171,7 +172,7 @@ class TreeDeletion {
         path_[length] = '\0';
     }
 
-    // Leaves the present directory, which is empty now, and removes it. 0, or -1 after the line.
+    // Leaves the current directory and removes it. Returns 0; -1, after a log line, on failure.
     int32_t RemoveLevel() {
         TreeLevel *level = level_;
         level_ = level->parent;
@@ -207,7 +208,7 @@ int32_t VarnekPGL_MakeDir(const char *path) {
     if (path != nullptr && mkdir(path, 0755) == 0) {
         return 0;
     }
-    const int error = path != nullptr ? errno : EFAULT;  // what the system says of a null path
+    const int error = path != nullptr ? errno : EFAULT;  // as mkdir reports a null path
     char process[200];
     ReadProcessName(process);
     __VarnekPGL_FileLog("%s : [%s] dir create failed! errno(%d),process(%s) pid(%d) uid(%d)",
@@ -238,7 +239,7 @@ int32_t VarnekPGL_DeleteDirEx(const char *path) {
 }
 
 int32_t VarnekPGL_ClearDir(const char *path) {
-    // What cannot be made again is not deleted; the creation says why.
+    // A directory that could not be created again is not deleted. MakeDir below logs the reason.
     if (!IsTooLong(path) && VarnekPGL_DeleteDirEx(path) != 0) {
         __VarnekPGL_FileLog("%s : Directory Deletion Fail. Dir Path=[%s]", __func__, Shown(path));
         return -1;
@@ -323,7 +324,7 @@ BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttributes *attr) 
     if (path != nullptr && stat64(path, &status) == 0) {
         size = status.st_size;
     } else if (path != nullptr && errno == EOVERFLOW) {
-        // Times beyond 2038 do not fit a 32-bit system's record, but the file is there.
+        // The file exists, but its times after 2038 do not fit the record of a 32-bit system.
         size = VarnekPGL_GetFileSize64Bits(path);
     } else {
         __VarnekPGL_FileLog("%s : failed...%s", __func__, Shown(path));
@@ -338,7 +339,8 @@ BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttributes *attr) 
 
 namespace {
 
-// A shell command in a buffer of fixed size; what does not fit makes it unfit to run, never cut.
+// A shell command in a buffer of fixed size. A command that does not fit is never run, not even
+// truncated.
 template <size_t size>
 class ShellCommand {
   public:
@@ -349,7 +351,8 @@ class ShellCommand {
         return *this;
     }
 
-    // Adds a path as one word that the shell leaves alone and that no command takes for an option.
+    // Adds a path as one word. The shell expands nothing in it, and no command takes it for an
+    // option.
     ShellCommand &AddPath(const char *path) {
         const bool plain = IsPlain(path);
         if (!plain) {
@@ -371,7 +374,7 @@ class ShellCommand {
         return *this;
     }
 
-    // The command's status as system() gives it; -1 for a command that does not fit.
+    // Runs the command and returns its status as system() does; -1 for a command that does not fit.
     int Run() const { return fits_ ? system(text_) : -1; }
     const char *Text() const { return text_; }
 
@@ -397,8 +400,8 @@ class ShellCommand {
     bool fits_ = true;
 };
 
-// Whether two files are one, where stat cannot say so: a lock on one of them then keeps the other
-// from being locked.
+// Whether two paths may name the same file. It does not need stat: if they do, a lock through one
+// path prevents a lock through the other. Also true when a lock cannot be taken for another reason.
 bool ShareALock(const char *a, const char *b) {
     const int first = open(a, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
     const int second = open(b, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
@@ -412,8 +415,8 @@ bool ShareALock(const char *a, const char *b) {
     return !apart;
 }
 
-// Whether two paths lead to one file. Times beyond 2038 do not fit a 32-bit system's record: that
-// fails for both paths, if they do.
+// Whether two paths name the same file. On a 32-bit system stat fails when times after 2038 do not
+// fit its record. If the paths name the same file, it fails for both.
 bool IsSameFile(const char *a, const char *b) {
     struct stat64 first = {};
     struct stat64 second = {};
@@ -426,8 +429,8 @@ bool IsSameFile(const char *a, const char *b) {
            first.st_ino == second.st_ino;
 }
 
-// Whether a copy may run: the shell empties the destination before it reads the source, so a source
-// that it cannot read, or that is the destination, would cost the destination its content.
+// Whether a copy may run. The shell empties the destination before it reads the source. So if the
+// source could not be read, or were the destination itself, the destination would lose its content.
 bool MayCopy(const char *source, const char *destination) {
     return access(source, R_OK) == 0 && !IsDirectory(source) && !IsSameFile(source, destination);
 }

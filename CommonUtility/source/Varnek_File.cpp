@@ -1,4 +1,4 @@
-// Streams, and the log of all storage. No state is kept between calls.
+// Streams, and the log function of all file operations. No state is kept between calls.
 #include "Varnek_File.h"
 
 #include <errno.h>
@@ -17,13 +17,14 @@ namespace {
 
 constexpr size_t kFileLogSize = 1024;
 
-// A length whose count fits the signed result of the whole-file operations.
+// Limits a length, so that the count of bytes fits the signed result of the whole-file operations.
 uint32_t Countable(uint32_t length) {
     return length < INT32_MAX ? length : INT32_MAX;
 }
 
-// The size of a stream's regular file as far as the stream has been flushed; -1 for any other file.
-// The stream's position is not asked: a 32-bit C library may let it wrap at 4 GiB.
+// Returns the size of a stream's regular file, without bytes that are not flushed yet; -1 for any
+// other file. It does not use the position of the stream, because a 32-bit C library may let that
+// wrap at 4 GiB.
 int64_t SizeOfRegularFile(FILE *stream) {
     struct stat64 status = {};
     return fstat64(fileno(stream), &status) == 0 && S_ISREG(status.st_mode) ? status.st_size : -1;
@@ -106,7 +107,7 @@ int32_t VarnekPGL_TellFile(PglFileHandle hFile) {
         __VarnekPGL_FileLog("%s : NULL file pointer", __func__);
         return -1;
     }
-    // A position that 32 bits cannot hold (a directory's "end" is one) is none.
+    // A position beyond 32 bits, such as the "end" of a directory, counts as no position.
     const int64_t position = ftell(stream);
     return position <= INT32_MAX ? static_cast<int32_t>(position) : -1;
 }
@@ -153,7 +154,7 @@ uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer, ui
 int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
     if (stream != nullptr) {
-        fflush(stream);  // some systems refuse it for a stream that is only read
+        fflush(stream);  // ignored, because some systems refuse it for a read-only stream
         const int64_t size = SizeOfRegularFile(stream);
         if (size >= 0) {
             return size <= INT32_MAX ? static_cast<int32_t>(size) : -1;
@@ -168,7 +169,8 @@ int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile) {
     return size;
 }
 
-// Opens a file for an operation on the whole of it. -1 after that operation's line.
+// Opens a file for an operation on the whole file. Returns -1, after a line of that operation, on
+// failure.
 static PglFileHandle OpenWhole(const char *operation, const char *path, int32_t flags) {
     const PglFileHandle file = VarnekPGL_OpenFile(path, flags);
     if (file == -1) {
@@ -189,7 +191,7 @@ int32_t VarnekPGL_ReadFile(const char *path, void *buffer, uint32_t length) {
 
 int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uint32_t length) {
     if (buffer == nullptr && length > 0) {
-        // Opening would empty the file for nothing.
+        // Refused here, because the open below would empty the file.
         __VarnekPGL_FileLog("%s : NULL buffer", __func__);
         return 0;
     }
@@ -198,7 +200,7 @@ int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uint32_t lengt
         return VARNEK_FILE_NOT_OPENED;
     }
     const uint32_t count = VarnekPGL_WriteFileByHandle(file, buffer, Countable(length));
-    // Small data reaches a full disk only here.
+    // Small data stays in the stream's buffer until here, and so does the error of a full disk.
     if (VarnekPGL_CloseFile(file) != 0) {
         return 0;
     }
@@ -207,7 +209,7 @@ int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uint32_t lengt
 
 int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t length) {
     if (buffer == nullptr && length > 0) {
-        // Opening would create the file for nothing.
+        // Refused here, because the open below would create the file.
         __VarnekPGL_FileLog("%s : NULL buffer", __func__);
         return -1;
     }
@@ -216,7 +218,7 @@ int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t leng
         return VARNEK_FILE_NOT_OPENED;
     }
     uint32_t written = VarnekPGL_WriteFileByHandle(file, buffer, length);
-    // Small data reaches a full disk only here.
+    // Small data stays in the stream's buffer until here, and so does the error of a full disk.
     const bool closed = VarnekPGL_CloseFile(file) == 0;
     if (closed && written == length) {
         return 0;
@@ -271,8 +273,8 @@ int32_t VarnekPGL_DeleteFile(const char *path) {
 FileKind KindOfConfigFile(const char *path) {
     struct stat64 status = {};
     if (stat64(path, &status) != 0) {
-        // Of other failures the open says why. One of them is none: times beyond 2038 do not fit a
-        // 32-bit system's record.
+        // For any other error, the open will tell whether the file can be read. It can if the error
+        // is only that times after 2038 do not fit the record of a 32-bit system.
         return errno == ENOENT ? FileKind::kMissing : FileKind::kReadable;
     }
     if (!S_ISREG(status.st_mode)) {

@@ -7,12 +7,12 @@
 #include "Varnek_Storage.h"
 #include "Varnek_Support.h"
 
-// A line of this family, behind its marker.
+// Logs a failure of this family, with its marker in front.
 #define LARGE_FILE_LOG(format, ...) __VarnekPGL_FileLog("[FULLSEG_64BIT_FILE]" format, __VA_ARGS__)
 
 namespace {
 
-// Measures through the descriptor and puts its position back.
+// Returns the size of the file, and restores the position.
 int64_t SizeOfDescriptor(int fd) {
     const int64_t position = lseek64(fd, 0, SEEK_CUR);
     const int64_t size = lseek64(fd, 0, SEEK_END);
@@ -32,7 +32,7 @@ int32_t VarnekPGL_OpenFile64Bits(const char *path, int32_t flags) {
         access |= O_WRONLY;
     }
     if ((flags & PGL_FILE_MODE_CREATE_RW) != 0) {
-        // The two access modes are values, not bits: read-write takes the place of write-only.
+        // The access modes are values, not bits, so read-write has to replace write-only.
         access = (access & ~O_ACCMODE) | O_RDWR | O_CREAT;
     }
     if ((flags & readWrite) == readWrite) {
@@ -41,7 +41,7 @@ int32_t VarnekPGL_OpenFile64Bits(const char *path, int32_t flags) {
             access |= O_CREAT;
         }
     }
-    // Data is shared by the umask's leave, and never executable.
+    // The umask decides who else may use the data; it is never executable.
     const int fd = path != nullptr ? open(path, access | O_LARGEFILE, 0666) : -1;
     if (fd < 0) {
         LARGE_FILE_LOG("VarnekPGL_OpenFile64Bits: Invalid Hndl: %d Filename : [%s]", fd,
@@ -76,7 +76,7 @@ int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer, uin
     if (written >= 0 && static_cast<size_t>(written) == length) {
         return static_cast<int32_t>(length);
     }
-    // A short write reports no error, so the errno of an earlier call must not be taken for one.
+    // A short write sets no errno, so the value of an earlier call must not be reported.
     const int error = written < 0 ? errno : 0;
     LARGE_FILE_LOG(
         "VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : %d, Size : [ "

@@ -1,5 +1,5 @@
-// The linked list: nodes from malloc, one link step shared by every insertion and one by every
-// removal.
+// The linked list. Its nodes come from malloc. All insertions share one link step, and all removals
+// share one unlink step.
 #include "Varnek_List.h"
 
 #include <stdlib.h>
@@ -8,7 +8,7 @@
 
 namespace {
 
-// Links a new node for `data` before `next`, at the tail when that is null.
+// Links a new node for `data` before `next`, or at the tail if `next` is null.
 void InsertBefore(list_t *list, list_node_t *next, void *data) {
     list_node_t *node = static_cast<list_node_t *>(malloc(sizeof(list_node_t)));
     if (node != nullptr) {
@@ -16,7 +16,7 @@ void InsertBefore(list_t *list, list_node_t *next, void *data) {
     }
 }
 
-// Unlinks a node of the list, frees it and hands back its data.
+// Unlinks a node of the list, frees it and returns its data.
 void *Remove(list_t *list, list_node_t *node) {
     Unlink(list, node);
     void *data = node->data;
@@ -24,7 +24,7 @@ void *Remove(list_t *list, list_node_t *node) {
     return data;
 }
 
-// The node at a position, null outside the list.
+// Returns the node at a position, null outside the list.
 list_node_t *NodeAt(const list_t *list, int32_t position) {
     if (position < 0 || position >= list->count) {
         return nullptr;
@@ -82,7 +82,7 @@ void *list_remove(list_t *list, int32_t position) {
     if (list == nullptr) {
         return nullptr;
     }
-    // The tail is known; everything else is a walk from the head.
+    // The tail is known; any other position needs a walk from the head.
     list_node_t *node = position == list->count - 1 ? list->tail : NodeAt(list, position);
     return node != nullptr ? Remove(list, node) : nullptr;
 }

@@ -4,7 +4,7 @@
 
 #include "Varnek_List.h"
 
-// Links a node for `data` before `next`, at the tail when that is null.
+// Links a node for `data` before `next`, or at the tail if `next` is null.
 inline void LinkBefore(list_t *list, list_node_t *next, list_node_t *node, void *data) {
     list_node_t *const prev = next != nullptr ? next->prev : list->tail;
     *node = {data, prev, next};

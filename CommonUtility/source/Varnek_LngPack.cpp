@@ -1,7 +1,6 @@
-// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. One step tells the unit
-// of a byte and one the UTF-8 of a unit, also where a text goes through both at once; one step of
-// the decoder tells the length of a character for the measuring and for the decoding. So what
-// belongs together cannot differ.
+// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. UnitOf and PutUtf8 also
+// define the direct conversion from Latin-15 to UTF-8, so it cannot differ from the two steps. The
+// decoder and the computation of its output size both use CharLength, so they agree on every text.
 #include "Varnek_LngPack.h"
 
 #include <limits.h>
@@ -26,7 +25,7 @@ struct Latin15Table {
 };
 
 constexpr Latin15Table MakeLatin15Table() {
-    // Where the code differs from Unicode, and the no-break space, which becomes a plain one.
+    // The characters that differ from Unicode, and the no-break space, which becomes a space.
     constexpr Latin15Row different[] = {
         {0xA0, 0x0020}, {0xA4, 0x20AC}, {0xA6, 0x0160}, {0xA8, 0x0161}, {0xB4, 0x017D},
         {0xB8, 0x017E}, {0xBC, 0x0152}, {0xBD, 0x0153}, {0xBE, 0x0178},
@@ -42,15 +41,15 @@ constexpr Latin15Table MakeLatin15Table() {
     return table;
 }
 
-// The row of a byte is at its distance from 0xA0.
+// The row of a byte has the index byte - 0xA0.
 constexpr Latin15Table gWmLatin15CodeTable = MakeLatin15Table();
 
-// Plain characters are the same in Latin-15 and UTF-8.
+// Plain characters are the same single byte in Latin-15 and UTF-8.
 constexpr bool IsPlain(unsigned char byte) {
     return byte >= 0x20 && byte <= 0x7E;
 }
 
-// The unit of a byte; 0 for a control character, which has none.
+// Returns the unit of a byte; 0 for a control character, which is dropped.
 constexpr unsigned int UnitOf(unsigned char byte) {
     if (byte >= kFirstUpper) {
         return gWmLatin15CodeTable.row[byte - kFirstUpper].unicode;
@@ -58,7 +57,7 @@ constexpr unsigned int UnitOf(unsigned char byte) {
     return IsPlain(byte) ? byte : 0;
 }
 
-// Appends the UTF-8 of a unit, one to three bytes. Returns where they end.
+// Appends the UTF-8 of a unit, one to three bytes. Returns the end of the output.
 constexpr char *PutUtf8(char *out, unsigned int unit) {
     if (unit < 0x80) {
         *out++ = static_cast<char>(unit);
@@ -73,16 +72,19 @@ constexpr char *PutUtf8(char *out, unsigned int unit) {
     return out;
 }
 
-// Whether all bytes of a word are plain: no top bit is set, before or after 0x20 is taken off or 1
-// is added in each byte.
+// Whether all bytes of a word are plain. A byte is plain if the top bit is clear in the byte
+// itself, in the byte minus 0x20 (where a byte below 0x20 sets it), and in the byte plus 1 (where
+// 0x7F sets it). The arithmetic is done on all bytes at once, so a byte may borrow from the next
+// one or carry into it. That does no harm: only a byte that is not plain does so, and its own top
+// bit is set.
 using Word = uintptr_t;
 constexpr bool ArePlain(Word bytes) {
     constexpr Word kOnes = ~Word{0} / 0xFF;
     return ((bytes | (bytes - 0x20 * kOnes) | (bytes + kOnes)) & 0x80 * kOnes) == 0;
 }
 
-// The UTF-8 of a Latin-15 byte: its bytes, the first in the lowest place, and in the highest how
-// many there are, which is none for a control character.
+// The UTF-8 of each Latin-15 byte. The lowest byte of an entry is the first byte of the UTF-8, and
+// the highest byte of the entry is the number of bytes, 0 for a control character.
 struct Utf8Table {
     uint32_t of[0x100];
 };
@@ -103,7 +105,8 @@ constexpr Utf8Table MakeUtf8Table() {
 
 constexpr Utf8Table kUtf8 = MakeUtf8Table();
 
-// Writes the UTF-8 of a byte, and whatever lies behind it, into four bytes. Returns where it ends.
+// Writes a whole entry of four bytes, which begins with the UTF-8 of a byte. Returns the end of the
+// UTF-8.
 char *PutLatin15(char *out, unsigned char byte) {
     const uint32_t utf8 = kUtf8.of[byte];
     const uint32_t stored = LittleEndian(utf8);
@@ -111,8 +114,8 @@ char *PutLatin15(char *out, unsigned char byte) {
     return out + (utf8 >> 24);
 }
 
-// Converts `length` bytes straight to UTF-8, for which there is room: three bytes for each, and one
-// more. Plain characters go a word at a time. Returns where the output ends.
+// Converts `length` bytes directly to UTF-8. The output needs room for three bytes for each of them
+// and one more. Plain characters are copied a word at a time. Returns the end of the output.
 char *PutLatin15(char *out, const unsigned char *in, size_t length) {
     const unsigned char *const end = in + length;
     while (static_cast<size_t>(end - in) >= sizeof(Word)) {
@@ -134,7 +137,8 @@ char *PutLatin15(char *out, const unsigned char *in, size_t length) {
     return out;
 }
 
-// Bytes of the character at `text`, of which `length` may be read, at least one; 0 when malformed.
+// Returns the number of bytes of the character at `text`, 0 when it is malformed. Reads at most
+// `length` bytes, of which there is at least one.
 int CharLength(const unsigned char *text, int length) {
     if (text[0] < 0x80) {
         return 1;
@@ -275,7 +279,7 @@ int __WmLngStrlenByByte(const char *szText, int length) {
         return 2;
     }
     const unsigned char *text = reinterpret_cast<const unsigned char *>(szText);
-    // A text that needs 2 GiB of output or more gets the largest size there is.
+    // For a text that needs 2 GiB of output or more, the result is the largest size.
     while (length > 0 && *text != 0 && count < INT_MAX / 2) {
         int step = CharLength(text, length);
         if (step == 0) {
@@ -357,8 +361,9 @@ BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
         TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: outputData or szInput is NULL  !\n");
         return FALSE;
     }
-    // The bytes of input that are accepted: three times the stated size and one, as long as no size
-    // below overflows. The buffer follows the input itself, not what the caller says of it.
+    // The input may have three times the stated size and one more byte, limited so that no size
+    // below overflows. The size of the buffer follows from the input itself, not from the stated
+    // size.
     const uint64_t stated = 3 * static_cast<uint64_t>(szInputSize) + 1;
     const int capacity = stated < INT_MAX / 4 ? static_cast<int>(stated) : INT_MAX / 4;
     const size_t length = LengthWithin(szInput, static_cast<size_t>(capacity) + 1);
@@ -375,7 +380,7 @@ BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
         TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: WmConvertLatin15Code2PCode. ERROR  !\n");
         return FALSE;
     }
-    // Both steps at once, without the units in between.
+    // The direct conversion does both steps without storing the units.
     char *end = PutLatin15(utf8, reinterpret_cast<const unsigned char *>(szInput), length);
     *end = '\0';
     TRACE_LOW_QUICK("VarnekPGL_ConvertLatin15toUTF8: Convert String => %s !\n", utf8);

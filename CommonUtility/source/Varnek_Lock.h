@@ -1,6 +1,6 @@
-// The library's own locks, the scope that holds one, and the scope that holds a named mutex. Under
-// clang, -Wthread-safety checks that what is VARNEK_GUARDED_BY a lock is used by its holder only.
-// Private.
+// The library's own locks, a scope that holds one, and a scope that holds a named mutex. Under
+// clang, -Wthread-safety checks that only the holder of a lock uses the data that is
+// VARNEK_GUARDED_BY it. Private.
 #ifndef VARNEK_SOURCE_LOCK_H
 #define VARNEK_SOURCE_LOCK_H
 
@@ -17,7 +17,8 @@
 #define VARNEK_GUARDED_BY(lock) VARNEK_THREAD_SAFETY(guarded_by(lock))
 #define VARNEK_REQUIRES(lock) VARNEK_THREAD_SAFETY(requires_capability(lock))
 
-// Unlocked when zero, as static storage is: that is so on every target. Never destroyed.
+// A lock in static storage. It is zero at the start, which means unlocked on every target. It is
+// never destroyed.
 struct VARNEK_THREAD_SAFETY(capability("mutex")) Lock {
     pthread_mutex_t mutex;
 
@@ -25,8 +26,8 @@ struct VARNEK_THREAD_SAFETY(capability("mutex")) Lock {
     void Release() VARNEK_THREAD_SAFETY(release_capability()) { pthread_mutex_unlock(&mutex); }
 };
 
-// Holds a lock to the end of the scope, or up to its release where a trace or a callback comes
-// after. It may be taken again after that.
+// Holds a lock until the end of the scope, or until Release, which callers use before a trace or a
+// callback. After a release the lock may be acquired again.
 class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
   public:
     explicit Hold(Lock &lock) VARNEK_THREAD_SAFETY(acquire_capability(lock)) : lock_(lock) {
@@ -52,7 +53,7 @@ class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
     bool held_ = false;
 };
 
-// The table of the named mutexes, for the two operations below. Varnek_Semaphore.cpp owns it, and
+// The table of the named mutexes, for the two operations below. Varnek_Semaphore.cpp owns it and
 // writes the lines of their failures.
 constexpr int MAX_MUTEX_MGR_INFO_ARR_SIZE = 40;
 struct MUTEX_MGR_INFO {
@@ -63,9 +64,9 @@ extern __attribute__((visibility("hidden"))) SlotTable<MUTEX_MGR_INFO, MAX_MUTEX
 pthread_mutex_t *LockFailed(const void *slot, int32_t hMutex, int error);  // null
 BOOL UnlockFailed(int error);                                              // FALSE
 
-// What VarnekPGL_AcquireMutex does; hands the mutex out, null when it was not taken. It cannot be
-// deleted while it is held, so UnlockMutex, which is the rest of VarnekPGL_ReleaseMutex, looks for
-// nothing.
+// LockMutex does what VarnekPGL_AcquireMutex does, but returns the mutex, or null on failure. A
+// held mutex cannot be deleted, so UnlockMutex does what VarnekPGL_ReleaseMutex does without
+// another lookup.
 inline pthread_mutex_t *LockMutex(int32_t hMutex) {
     auto *const slot = gMutexArr.Find(hMutex);
     const int error = slot != nullptr ? pthread_mutex_lock(&slot->info.linuxMutex) : 0;
@@ -78,9 +79,9 @@ inline BOOL UnlockMutex(pthread_mutex_t *mutex) {
     return __builtin_expect(error == 0, 1) ? TRUE : UnlockFailed(error);
 }
 
-// Holds a named mutex to the end of the scope, or up to its release; nothing for an object without
-// a mutex (kNoMutex). IsHeld says whether the mutex could be taken; one that could not is released
-// all the same, so that the log has the lines of both calls.
+// Holds a named mutex until the end of the scope or until Release. With kNoMutex it does nothing.
+// IsHeld says whether the acquisition succeeded. If it failed, the release is called nevertheless,
+// so that the log has the lines of both failures.
 class HoldMutex {
   public:
     static constexpr int32_t kNoMutex = -1;

@@ -1,6 +1,6 @@
-// Named mutexes and named semaphores. The two families repeat one design over the slot table, but
-// differ in words, in when they trace and in what a deletion may refuse; each stands on its own
-// here.
+// Named mutexes and named semaphores. Both families use the slot table in the same way. But they
+// have different messages, trace at different points, and a deletion refuses different things, so
+// they do not share code here.
 #include "Varnek_Semaphore.h"
 
 #include <pthread.h>
@@ -21,7 +21,7 @@ struct SEM_MGR_INFO {
     sem_t linuxSem;
 };
 
-// A lock for each table. It guards every change of its table; lookups read the table without it.
+// Each table has a lock that guards every change. Lookups read the table without it.
 Lock gMutexArrLock;
 Lock gSemArrLock;
 using Semaphores = SlotTable<SEM_MGR_INFO, MAX_SEM_MGR_INFO_ARR_SIZE>;
@@ -69,8 +69,8 @@ int32_t __Varnek_create_mutex(const char *szMutexName) {
     return hHandle;
 }
 
-// Destroys a mutex that nobody holds. Some systems destroy a held mutex and some refuse; trying the
-// lock first makes it a refusal everywhere.
+// Destroys a mutex unless a thread holds it. Some systems would destroy a held mutex and some would
+// refuse; with the trylock the result is the same everywhere.
 bool DestroyMutex(pthread_mutex_t *mutex) {
     if (!Succeeded(pthread_mutex_trylock(mutex))) {
         return false;
@@ -192,7 +192,7 @@ int32_t __Varnek_create_semaphore(const char *szSemName, uint32_t count) {
     return hHandle;
 }
 
-// The unlimited wait. An interruption ends it like any failure.
+// Waits without limit. A signal ends the wait as a failure.
 BOOL WaitForever(int32_t hSem, Semaphores::Slot *slot) {
     const int retSem = sem_wait(&slot->info.linuxSem);
     TRACE_LOW_QUICK("VarnekPGL_WaitSemaphore: hSem[%d], arrIdx[%d]\n", hSem,
@@ -204,7 +204,7 @@ BOOL WaitForever(int32_t hSem, Semaphores::Slot *slot) {
     return TRUE;
 }
 
-// The limited wait. It looks the handle up afresh, as late as it can: right before the wait.
+// Waits with a limit. It looks the handle up again, as late as possible before the wait.
 BOOL WaitUntilDeadline(int32_t hSem, uint32_t timeout) {
     timespec curTime = {};
     timespec semTimeOut = {};

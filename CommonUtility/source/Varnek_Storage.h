@@ -1,7 +1,7 @@
-// What the sources of storage share, and the reading of whole files for the areas above. Private.
+// Helpers that the sources of File share, and the reading of whole files for other areas. Private.
 //
-// Storage reports through __VarnekPGL_FileLog and nothing through the trace, which reads its own
-// configuration through storage.
+// File reports through __VarnekPGL_FileLog and never through the trace, because the trace reads its
+// configuration through File.
 #ifndef VARNEK_SOURCE_STORAGE_H
 #define VARNEK_SOURCE_STORAGE_H
 
@@ -11,8 +11,8 @@
 #include "Varnek_File.h"
 #include "Varnek_Support.h"
 
-// Writes a failure of storage at error priority under "SBTVD_File", cut to 1023 characters. Leaves
-// errno alone.
+// Logs a failure of a file operation at error priority under "SBTVD_File". The text is truncated to
+// 1023 characters. Preserves errno.
 void __VarnekPGL_FileLog(const char *format, ...) __attribute__((format(printf, 1, 2)));
 
 constexpr uint32_t kSeekBases = 3;  // SEEK_SET 0, SEEK_CUR 1, SEEK_END 2
@@ -21,29 +21,29 @@ inline bool IsTooLong(const char *path) {
     return path != nullptr && strnlen(path, MAX_PGL_FILE_PATH_LEN) >= MAX_PGL_FILE_PATH_LEN;
 }
 
-// The stream behind a handle, null for none. -1 is what a failed open gave the caller.
+// Returns the stream of a handle, null for none. A failed open returns the handle -1.
 inline FILE *StreamOf(PglFileHandle hFile) {
     return hFile != -1 ? reinterpret_cast<FILE *>(hFile) : nullptr;
 }
 
-// A handle as the log shows it.
+// Returns a handle in the form that the log shows.
 inline unsigned ShownHandle(intptr_t handle) {
     return static_cast<unsigned>(handle);
 }
 
-// What is in a configuration file's place. Only a readable one is opened: another one could block
-// its reader, or take all the memory.
+// The kind of file at the path of a configuration file. Only a readable one is opened: any other
+// could block its reader or use up the memory.
 enum class FileKind {
     kMissing,
-    kReadable,  // as far as can be seen without opening it
-    kOdd,       // no regular file
+    kReadable,  // probably; only an open can tell
+    kOdd,       // not a regular file
     kTooLarge,  // more than kMaxConfigSize bytes
 };
 constexpr int64_t kMaxConfigSize = 1048576;
 FileKind KindOfConfigFile(const char *path);
 
-// What a read of a whole file brought: `count` bytes in a block from malloc, a NUL behind them.
-// Null without memory. The owner frees it.
+// The result of reading a whole file: `count` bytes and a NUL, in a block from malloc, which the
+// owner frees. `data` is null when there was no memory.
 struct FileText {
     char *data;
     uint32_t count;
@@ -52,8 +52,8 @@ struct FileText {
 // Reads up to `size` bytes from the stream's position.
 FileText ReadText(PglFileHandle file, uint32_t size);
 
-// Reads the `size` bytes that a file is known to have. Null when there is no memory, or fewer
-// bytes.
+// Reads a file of `size` bytes. Returns a block that the caller frees; null when there is no
+// memory, or the file has become shorter.
 char *ReadWholeFile(const char *path, int32_t size);
 
 #endif

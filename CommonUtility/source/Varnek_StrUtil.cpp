@@ -1,5 +1,5 @@
-// Helpers on NUL-terminated strings. Letters are folded here rather than by the C library, so that
-// a locale which the process sets cannot change what a key or a name matches.
+// Helpers for NUL-terminated strings. They convert the case of letters without the C library, so
+// that the locale of the process cannot change which keys and names match.
 #include "Varnek_StrUtil.h"
 
 #include <string.h>
@@ -37,7 +37,7 @@ void WriteDigits(char *out, uint32_t value, uint32_t radix, const char *digits) 
     *out = '\0';
 }
 
-// The end of what remains when trailing whitespace goes.
+// Returns the end of the text without its trailing whitespace.
 char *EndOfText(char *text) {
     char *end = text + strlen(text);
     while (end > text && IsBlank(end[-1])) {
@@ -61,7 +61,7 @@ char *VarnekPGL_Stristr(const char *haystack, const char *needle) {
         if (needle[matched] == '\0') {
             return const_cast<char *>(haystack);
         }
-        // Whatever else would match from here on is too long.
+        // The rest of the haystack is shorter than the needle.
         if (haystack[matched] == '\0') {
             return nullptr;
         }

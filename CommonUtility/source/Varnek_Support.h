@@ -1,4 +1,4 @@
-// Small things that several areas share. Private.
+// Small helpers that several areas share. Private.
 #ifndef VARNEK_SOURCE_SUPPORT_H
 #define VARNEK_SOURCE_SUPPORT_H
 
@@ -9,7 +9,7 @@
 
 #include <limits>
 
-// What a log line shows of a text that may be null.
+// Returns a text for a log line, also for null.
 inline const char *Shown(const char *text) {
     return text != nullptr ? text : "(null)";
 }
@@ -19,18 +19,18 @@ inline bool IsLineEnd(char c) {
     return c == '\r' || c == '\n';
 }
 
-// What strnlen tells, by a call that C libraries write in their processor's own instructions.
+// Returns the same as strnlen. It uses memchr, which C libraries optimise more often than strnlen.
 inline size_t LengthWithin(const char *text, size_t most) {
     const void *end = memchr(text, '\0', most);
     return end != nullptr ? static_cast<size_t>(static_cast<const char *>(end) - text) : most;
 }
 
-// The system's text for an error number, the calling thread's until it asks again.
+// Returns the system's text for an error number. It is valid until the calling thread asks again.
 inline const char *ErrorText(int error) {
     return strerror(error);  // NOLINT(concurrency-mt-unsafe): a buffer per thread on every target
 }
 
-// Leaves the caller's errno as it was, whatever the calls in between do to it.
+// Restores the caller's errno at the end of the scope.
 class ErrnoKeeper {
   public:
     ErrnoKeeper() : kept_(errno) {}
@@ -42,8 +42,8 @@ class ErrnoKeeper {
     int kept_;
 };
 
-// Whether a pthread call succeeded. Such a call returns its error; afterwards errno holds it, as
-// the traces expect.
+// Whether a pthread call succeeded. Such a call returns its error, which is stored in errno,
+// because the traces read it there.
 inline bool Succeeded(int pthreadResult) {
     if (pthreadResult != 0) {
         errno = pthreadResult;
@@ -51,13 +51,13 @@ inline bool Succeeded(int pthreadResult) {
     return pthreadResult == 0;
 }
 
-// Four bytes, the most significant first, wherever they lie.
+// Reads four bytes at any alignment, the most significant first.
 inline uint32_t BigEndian(const unsigned char *p) {
     return static_cast<uint32_t>(p[0]) << 24 | static_cast<uint32_t>(p[1]) << 16 |
            static_cast<uint32_t>(p[2]) << 8 | p[3];
 }
 
-// A word whose least significant byte comes first, from the machine's order or into it.
+// Converts a word between the machine's byte order and little-endian order.
 template <typename Word>
 constexpr Word LittleEndian(Word word) {
     if constexpr (__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__) {
@@ -67,7 +67,7 @@ constexpr Word LittleEndian(Word word) {
                                               : __builtin_bswap32(static_cast<uint32_t>(word)));
 }
 
-// A word as the machine loads it, wherever it lies.
+// Loads a word in the machine's byte order, at any alignment.
 template <typename Word>
 Word Load(const unsigned char *p) {
     Word word = 0;
@@ -75,13 +75,13 @@ Word Load(const unsigned char *p) {
     return word;
 }
 
-// Seconds as the system takes them: where its own have 32 bits, those after 2038 are its last one.
+// Converts seconds to the system's type. If that has 32 bits, times after 2038 become its last one.
 inline time_t SystemSeconds(int64_t seconds) {
     constexpr time_t kLast = std::numeric_limits<time_t>::max();
     return seconds < kLast ? static_cast<time_t>(seconds) : kLast;
 }
 
-// The point in time `timeout` milliseconds after `now`.
+// Returns the time `timeout` milliseconds after `now`.
 inline timespec DeadlineAfter(const timespec &now, uint32_t timeout) {
     constexpr int64_t kSecond = 1000000000;
     const int64_t nanoseconds = now.tv_nsec + int64_t{timeout} * 1000000;
@@ -91,7 +91,7 @@ inline timespec DeadlineAfter(const timespec &now, uint32_t timeout) {
     return deadline;
 }
 
-// The first 32-bit word of an OS object, which tells its state to a reader of the log.
+// Returns the first 32-bit word of an OS object. Log lines show it, because it contains the state.
 template <typename OsObject>
 int FirstWord(const OsObject &object) {
     int32_t word = 0;

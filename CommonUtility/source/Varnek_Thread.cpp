@@ -3,8 +3,8 @@
 // The registry's guard is held while a record is created or made invisible. Each queue has a lock
 // of its own. Its holder sees whether the record is still there, and while it is, the record's
 // semaphore is alive as long as the lock is held. A thread that needs the semaphore without the
-// lock, to wait or to wake the owner, counts as one of the record's users: a removal leaves it to
-// the last user to take the record apart. So no lock is ever held across a wait, and none while
+// lock, to wait or to wake the owner, counts as one of the record's users: the last user of a
+// removed record disposes of it. So no lock is ever held across a wait, and none while
 // another is taken.
 //
 // A thread starts in ThreadEntry, which waits for its creator to release the guard. So the record
@@ -48,7 +48,7 @@ struct THREAD_MGR_INFO {
     // level and module at which that operation reports unread messages.
     const char *removedBy VARNEK_GUARDED_BY(queueLock);
     uint32_t unreadMask VARNEK_GUARDED_BY(queueLock);
-    // From the removal, which sets it under the guard, until the record has been taken apart.
+    // From the removal, which sets it under the guard, until the disposal.
     std::atomic<bool> isLeftover;
     pthread_t linuxThread;  // for a debugger
 };
@@ -133,7 +133,7 @@ bool EnsureGuard() {
 
 // Users of a record ------------------------------------------------------------------------------
 
-// Takes a removed record apart. Only the thread for which IsLast has been true calls it, and nobody
+// Disposes of a removed record. Only the thread for which IsLast has been true calls it, and nobody
 // else looks at more than the handle of a removed record. So the queue needs no lock here.
 void Dispose(THREAD_MGR_INFO &info) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
     if (sem_destroy(&info.msgQSem) != 0) {

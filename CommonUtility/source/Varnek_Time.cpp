@@ -1,6 +1,6 @@
 // The clock, the calendar and the arithmetic on records. In the supported range every fourth year
-// is a leap year, so the calendar repeats every 1461 days. Seconds are added modulo 2^32
-// throughout.
+// is a leap year, so the calendar repeats every 1461 days. All additions of seconds are modulo
+// 2^32.
 #include "Varnek_Time.h"
 
 #include <errno.h>
@@ -28,11 +28,11 @@ constexpr uint32_t kCycle = 3 * kYear + kLeapYear;
 constexpr int64_t kEndOfRange = 1924992000;  // 2031-01-01
 constexpr int64_t kLastDay = kEndOfRange - kDay;
 
-// The days before each month, minus one: a day of the month counts from 1.
+// The number of days before each month, minus one, because the days of a month count from 1.
 constexpr int32_t kCommonMonths[] = {-1, 30, 58, 89, 119, 150, 180, 211, 242, 272, 303, 333, 364};
 constexpr int32_t kLeapMonths[] = {-1, 30, 59, 90, 120, 151, 181, 212, 243, 273, 304, 334, 365};
 
-// Negative, 0 or positive, as the first field that differs tells.
+// Compares the fields from the year down. Returns a negative number, 0 or a positive number.
 int Compare(const VarnekCDateTime &a, const VarnekCDateTime &b) {
     constexpr int32_t VarnekCDateTime::*kFields[] = {
         &VarnekCDateTime::iYear, &VarnekCDateTime::iMonth,  &VarnekCDateTime::iDay,
@@ -46,7 +46,7 @@ int Compare(const VarnekCDateTime &a, const VarnekCDateTime &b) {
     return 0;
 }
 
-// Whether `days` whole days fill the month of this number; months 0 and above 12 never fill.
+// Whether `days` whole days fill the month with this number; a month outside 1 to 12 is never full.
 bool FillsMonth(int32_t month, int32_t days) {
     switch (month) {
         case 1:
@@ -69,7 +69,7 @@ bool FillsMonth(int32_t month, int32_t days) {
     }
 }
 
-// Gives a record without a valid date the first one there is.
+// Replaces an invalid date with 1970-01-01.
 void RepairDate(VarnekCDateTime *dt) {
     if (__VarnekPGL_ValidateDate(dt) == TRUE) {
         return;
@@ -135,7 +135,7 @@ uint32_t VarnekPGL_DateTimeToSeconds(const VarnekCDateTime *dt) {
     if (year > kLastYear - kFirstYear || month > 11) {
         return 0;
     }
-    // The third year has the first leap day, which has passed from March on.
+    // The third year has the first leap day; from March on it has passed.
     const uint32_t leapDays = (year + (month >= 2 ? 2 : 1)) / 4;
     const uint32_t days = year * 365 + leapDays + static_cast<uint32_t>(kCommonMonths[month]) +
                           static_cast<uint32_t>(dt->iDay);
@@ -166,7 +166,7 @@ BOOL VarnekPGL_SecondsToDataTime(uint32_t seconds, VarnekCDateTime *dt) {
         rest -= kYear;
     }
     const int32_t day = static_cast<int32_t>(rest / kDay);
-    // Months have at most 31 days, so this is the right month or one before it, never one behind.
+    // Months have at most 31 days, so this estimate is the right month or an earlier one.
     int32_t month = day / 32 + 1;
     while (months[month] < day) {
         ++month;
@@ -206,8 +206,8 @@ uint32_t VarnekCDateTime::GetElapsedSeconds() const {
     if (iYear < 0 || iYear > kLastSpanYear) {
         return VARNEK_FAIL(0u, "Invalid Year!! iYear=[%d]\n", iYear);
     }
-    // The point that lies this span after the epoch: what has passed is one less than the number of
-    // the day and of the month.
+    // The point this span after 1970-01-01. Days and months of a point count from 1, so they are
+    // one more than the number that has passed.
     VarnekCDateTime point = *this;
     point.iYear = iYear + kFirstYear;
     int32_t passed = iMonth;

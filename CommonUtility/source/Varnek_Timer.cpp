@@ -1,11 +1,13 @@
-// The timer service: one POSIX timer a slot, made at the first start and kept until the deletion.
-// Every access to the table, the OS calls for a slot included, is under one lock, which is never
-// held while a callback runs.
+// The timer service. Each slot has one POSIX timer, which the first start creates and the deletion
+// deletes. Every access to the table, OS calls for a slot included, is under one lock, which is
+// never held while a callback runs.
 //
-// The system may deliver an expiry late, and drops it when the timer is armed again before that. So
-// a delivery says no more than that something may be due. A start that finds an expired one which
-// has not called back yet puts that one among the owed, and each delivery pays everything that is
-// due: the owed starts and, once its time is up, the last one.
+// The system delivers an expiry on a thread of its own, so the delivery may come late: after the
+// owner has seen the timer expire and has started it again. The system may even drop the delivery,
+// because arming a timer discards a pending one. So a delivery only means that some start may be
+// due. If a start has expired but not called back when the timer is started again, it becomes an
+// owed start. Each delivery calls back for everything that is due: all owed starts and, if its time
+// is up, the last start. docs/locking.md explains why each start calls back exactly once.
 #include "Varnek_Timer.h"
 
 #include <signal.h>
@@ -36,20 +38,20 @@ struct TIMER_MGR_INFO {
     void *pUserData;
     bool bTimerCreated;
     bool bAwaited;    // the last start has neither called back nor been cancelled
-    OwedStart *owed;  // the oldest one first
+    OwedStart *owed;  // oldest first
 };
 
 Lock gTimerArrLock;
 TIMER_MGR_INFO gTimerArr[MAX_TIMER_MGR_INFO_ARR_SIZE] VARNEK_GUARDED_BY(gTimerArrLock);
 int32_t gTimerArrSize VARNEK_GUARDED_BY(gTimerArrLock) = 0;
 
-// The record of a timer in use, null for an unknown handle.
+// Returns the record of a timer in use, null for an unknown handle.
 TIMER_MGR_INFO *FindTimer(uint32_t timer) VARNEK_REQUIRES(gTimerArrLock) {
     return timer < MAX_TIMER_MGR_INFO_ARR_SIZE && gTimerArr[timer].bUsed ? &gTimerArr[timer]
                                                                          : nullptr;
 }
 
-// The handle of the timer in use under this name, -1 for none.
+// Returns the handle of the timer in use with this name, -1 for none.
 int32_t FindName(const char *szTmName) VARNEK_REQUIRES(gTimerArrLock) {
     for (int32_t timer = 0; timer < MAX_TIMER_MGR_INFO_ARR_SIZE; timer++) {
         if (gTimerArr[timer].bUsed && strcmp(gTimerArr[timer].szTmName, szTmName) == 0) {
@@ -75,31 +77,31 @@ timespec Milliseconds(int64_t milliseconds) {
     return time;
 }
 
-// Reads whether the last start has time left. Returns the call's result.
+// Reads whether the last start has time left. Returns the result of the OS call.
 int ReadArmed(const TIMER_MGR_INFO &info, bool *armed) {
     itimerspec left = {};
     const int result = timer_gettime(info.timerId, &left);
-    // An OS timer that runs for no start is the one that Disarm leaves for the owed.
+    // If no start is awaited, a running OS timer is the one that Disarm set for the owed starts.
     *armed = info.bAwaited && (left.it_value.tv_sec > 0 || left.it_value.tv_nsec > 0);
     return result;
 }
 
-// Sets the OS timer to expire once; a time of 0 disarms it. Returns the call's result.
+// Sets the OS timer to expire once; a time of 0 disarms it. Returns the result of the OS call.
 int SetTime(const TIMER_MGR_INFO &info, const timespec &time) {
     itimerspec expiry = {};
     expiry.it_value = time;
     return timer_settime(info.timerId, 0, &expiry, nullptr);
 }
 
-// Calls the last start off. The system drops a pending delivery with it, so that owed starts need
-// another one, at once. Returns the call's result.
+// Cancels the last start. The system also drops a pending delivery, so if there are owed starts,
+// this requests another delivery at once. Returns the result of the OS call.
 int Disarm(const TIMER_MGR_INFO &info) {
     timespec time = {};
     time.tv_nsec = info.owed != nullptr ? 1 : 0;
     return SetTime(info, time);
 }
 
-// Puts the last start, which has expired, among the owed. False without memory.
+// Makes the last start, which has expired, an owed start. Returns false without memory.
 bool OweLastStart(TIMER_MGR_INFO *info) {
     OwedStart *start = static_cast<OwedStart *>(malloc(sizeof(OwedStart)));
     if (start == nullptr) {
@@ -115,7 +117,8 @@ bool OweLastStart(TIMER_MGR_INFO *info) {
     return true;
 }
 
-// Takes the oldest start that is due out of the record. A null callback for none.
+// Removes the oldest start that is due from the record and returns it, with a null callback if none
+// is due.
 OwedStart TakeDue(TIMER_MGR_INFO *info) {
     if (OwedStart *oldest = info->owed) {
         const OwedStart due = *oldest;
@@ -158,7 +161,7 @@ void TimerCallbackEntry(sigval value) {
         TRACE_ERROR("Timer Callback! But Timer Callback Function is NULL!");
         return;
     }
-    // The timer may be deleted while a callback runs, and its slot may have another owner then.
+    // The timer may be deleted during a callback, and its slot may have another owner afterwards.
     for (OwedStart due = TakeDue(info); due.pfnCallback != nullptr;) {
         hold.Release();
         due.pfnCallback(timer, due.pUserData);
@@ -168,7 +171,7 @@ void TimerCallbackEntry(sigval value) {
     }
 }
 
-// Makes the OS timer of a slot. Returns the call's result.
+// Creates the OS timer of a slot. Returns the result of the OS call.
 int MakeTimer(uint32_t timer, timer_t *timerId) {
     sigevent event = {};
     event.sigev_notify = SIGEV_THREAD;
@@ -251,7 +254,7 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
         info->bTimerCreated = false;
         return FALSE;
     }
-    // An expiry in between waits for the lock and then finds these.
+    // If the timer expires already, the delivery waits for the lock and then finds these values.
     info->pfnCallback = callback;
     info->pUserData = userData;
     info->bAwaited = true;
@@ -265,7 +268,7 @@ BOOL VarnekPGL_CancelTimer(uint32_t timer) {
     Hold hold(gTimerArrLock);
     TIMER_MGR_INFO *info = FindTimer(timer);
     if (info == nullptr) {
-        // A free slot's name is empty, and no other handle has a name.
+        // A free slot has an empty name, and an invalid handle has none.
         return VARNEK_FAIL(FALSE, "VarnekPGL_CancelTimer. Invalid Timer Handle=[%d]..name = %s",
                            static_cast<int>(timer), "");
     }
@@ -349,7 +352,7 @@ void VarnekPGL_MSleep(int32_t msec) {
     nanosleep(&time, nullptr);
 }
 
-// Counts seconds under a name that says otherwise; that is so on purpose, its callers rely on it.
+// Sleeps for seconds, although the name suggests microseconds. Callers rely on it.
 void VarnekPGL_USleep(uint32_t seconds) {
     const timespec time = Milliseconds(int64_t{seconds} * 1000);
     nanosleep(&time, nullptr);

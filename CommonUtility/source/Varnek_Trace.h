@@ -1,4 +1,4 @@
-// How the library itself reports: its trace masks and the one-line failure. Private.
+// The library's own trace macros, and the macro that traces and returns a failure. Private.
 #ifndef VARNEK_SOURCE_TRACE_H
 #define VARNEK_SOURCE_TRACE_H
 
@@ -6,10 +6,10 @@
 
 #include "Varnek_Debug.h"
 
-// What a trace may write: the enabled levels and modules where a trace mask holds its own, none of
-// them when the output is off, and flags in bits that neither uses. A load of the debug
-// configuration writes it; before the first one every bit is set, since nothing is known to be off.
-// The word itself says all that a trace asks of it, so every access is relaxed.
+// The traces that are enabled: the bits of the enabled levels and modules, none of them when the
+// output is off, and flags in bits that neither uses. A load of the debug configuration writes this
+// word. Before the first load every bit is set, because nothing is known to be off. A trace needs
+// no other data, so every access is relaxed.
 constexpr uint32_t kOutputOn = 0x02000000u;
 constexpr uint32_t kOwnLowOn = 0x04000000u;  // the level Low and this library's module
 constexpr uint32_t kNotLoaded = 0x08000000u;
@@ -20,16 +20,15 @@ extern __attribute__((visibility("hidden"))) std::atomic<uint32_t> gDebugState;
 #define TRACE_MID(...) VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_COMMON, __VA_ARGS__)
 #define TRACE_LOW(...) VARNEK_TRACE(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON, __VA_ARGS__)
 
-// TRACE_LOW for operations that are called often. The place is stored as ever, but the call is left
-// out when it would write nothing, and with it the arguments' way to the stack and back.
+// TRACE_LOW for operations that are called often. It always stores file and line, but skips the
+// call when that would write nothing, which saves passing the arguments.
 #define TRACE_LOW_QUICK(...)                                        \
     (VarnekDbg_StorePlace(__FILE__, __LINE__),                      \
      (gDebugState.load(std::memory_order_relaxed) & kOwnLowOn) == 0 \
          ? (void)0                                                  \
          : VarnekPGL_TraceOut(VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON, __VA_ARGS__))
 
-// One row of a failure table: traces the Error line and is the result. The `return` stays with the
-// caller.
+// Traces an Error line and evaluates to the result. The caller writes the `return`.
 #define VARNEK_FAIL(result, ...) (TRACE_ERROR(__VA_ARGS__), (result))
 
 #endif

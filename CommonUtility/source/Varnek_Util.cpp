@@ -1,7 +1,7 @@
-// CRC-32 over memory, sections and stored files. The register takes the bytes of a step through as
-// many tables, 16 where there is room for them, then 4, then single ones. It is held with its bytes
-// reversed, the first in the lowest place: so a little-endian machine takes a word of data as it
-// lies. Bytes are combined by value, so neither byte order nor alignment matters to the result.
+// CRC-32 over memory, sections and stored files. A step processes as many bytes as it uses tables:
+// 16 on 64-bit systems, then 4, then single bytes. The register is stored with its bytes reversed,
+// so that a little-endian machine can combine it with a word of data without swapping. The bytes
+// are combined by value, so neither byte order nor alignment affects the result.
 #include "Varnek_Util.h"
 
 #include <stdlib.h>
@@ -16,13 +16,13 @@ namespace {
 constexpr uint32_t kPolynomial = 0x04C11DB7u;
 constexpr uint32_t kInitial = 0xFFFFFFFFu;
 constexpr int32_t kTrailer = 4;     // bytes of a stored CRC
-constexpr int32_t kMinPayload = 4;  // bytes that a stored CRC covers at least
+constexpr int32_t kMinPayload = 4;  // minimum of bytes that a stored CRC covers
 
-// A table is 1 KiB. On the 32-bit target 16 would be half of the first cache, for sections of a few
-// hundred bytes at a megabyte or two a second.
+// A table takes 1 KiB. On the 32-bit target, 16 tables would fill half of the first-level cache.
+// That does not pay for sections of a few hundred bytes at one or two megabytes a second.
 constexpr bool kWide = sizeof(void *) == 8;
 
-// word[i] is the register, reversed, after byte i and some more bytes of 0.
+// word[i] is the reversed register after byte i and a number of zero bytes.
 struct CrcTable {
     uint32_t word[256];
 };
@@ -39,7 +39,7 @@ constexpr CrcTable MakeCrcTable(int zeros) {
     return table;
 }
 
-// Objects of their own, so that the address of each stays in a register.
+// The tables are separate objects, so that the compiler keeps the address of each in a register.
 template <int zeros>
 constexpr CrcTable kCrc = MakeCrcTable(zeros);
 static_assert(kCrc<0>.word[1] == 0xB71DC104u && kCrc<0>.word[255] == 0xB440F7B1u);
@@ -48,14 +48,14 @@ uint32_t Word(const unsigned char *data) {
     return LittleEndian(Load<uint32_t>(data));
 }
 
-// The register, reversed, after the four bytes of `word` and `zeros` bytes of 0.
+// Returns the reversed register after the four bytes of `word` and `zeros` zero bytes.
 template <int zeros>
 uint32_t After(uint32_t word) {
     return kCrc<zeros + 3>.word[word & 0xFF] ^ kCrc<zeros + 2>.word[word >> 8 & 0xFF] ^
            kCrc<zeros + 1>.word[word >> 16 & 0xFF] ^ kCrc<zeros>.word[word >> 24];
 }
 
-// The whole file in a block that the caller frees, or null after the trace.
+// Reads the whole file into a block that the caller frees. Returns null, after a trace, on failure.
 unsigned char *ReadWhole(const char *path, int32_t size) {
     char *data = ReadWholeFile(path, size);
     if (data == nullptr) {
@@ -142,7 +142,7 @@ BOOL VarnekUtil_AppendCRC32ToFile(const char *path) {
         static_cast<unsigned char>(crc >> 8), static_cast<unsigned char>(crc)};
     TRACE_MID("Append CRC Value, File=[%s], CRC32=[0x%08x]\n", path, crc);
     free(buffer);
-    // A failed append is logged by the file layer; by contract it does not change the result.
+    // File logs a failed append; by contract it does not change the result.
     VarnekPGL_AppendFile(path, trailer, sizeof trailer);
     return TRUE;
 }

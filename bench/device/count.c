@@ -1,7 +1,7 @@
-// A plugin of qemu's user-mode emulator: counts what an ARM program executes between two marks, and
-// writes it to a file when the program ends. A mark is the instruction `dbg #7`, which does
-// nothing. What the plugin needs of the emulator's interface is declared here, since Debian ships
-// no header.
+// A plugin of qemu's user-mode emulator. It counts what an ARM program executes between two marks,
+// and writes the counts to a file when the program ends. A mark is the instruction `dbg #7`, which
+// does nothing. Debian ships no header of the emulator's plugin interface, so the required part is
+// declared here.
 //   -plugin count.so,out=FILE
 #include <stddef.h>
 #include <stdint.h>
@@ -29,7 +29,8 @@ struct qemu_plugin_insn *qemu_plugin_tb_get_insn(const struct qemu_plugin_tb *tb
 const void *qemu_plugin_insn_data(const struct qemu_plugin_insn *insn);
 size_t qemu_plugin_insn_size(const struct qemu_plugin_insn *insn);
 
-// One set for all threads of the program, added to without a lock: only one may run at a time.
+// The counts of all threads of the program. There is no lock, because only one thread may run at a
+// time.
 struct Counts {
     uint64_t instructions;
     uint64_t barriers;
@@ -55,9 +56,10 @@ static int IsOneOf(const struct Kind *kinds, size_t count, uint32_t word) {
     return 0;
 }
 
-// Instructions of four bytes, as Thumb-2 with its first halfword on top, and as ARM. The emulator
-// does not say which of the two a program is in. A word that is one of these in one encoding is in
-// the other a call or a coprocessor's store, of a kind that no compiler makes.
+// Patterns of instructions of four bytes: in Thumb-2, with the first halfword in the upper half,
+// and in ARM. The emulator does not say which encoding a program uses. That does not matter: a word
+// that matches in one encoding is, in the other one, a call or a coprocessor store that no compiler
+// generates.
 static const struct Kind kBarriers[] = {
     {0xFFFFFFE0u, 0xF3BF8F40u},  // dsb, dmb
 };

@@ -1,4 +1,4 @@
-# Three Debian packages: the library, the PC stand-ins that it loads, and what a developer needs.
+# Three Debian packages: the library, the PC stand-ins that it loads, and the development files.
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_NAME libvarnekutils-ltn)
 set(CPACK_PACKAGE_VENDOR "")
@@ -14,8 +14,8 @@ set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${CMAKE_LIBRARY_OUTPUT_DIRECTORY})
 
-# package(COMPONENT NAME SECTION DESCRIPTION): control fields, and the copyright and the changes in the
-# package's own document folder.
+# package(COMPONENT NAME SECTION DESCRIPTION): sets the control fields, and installs the copyright and the changelog in
+# the document directory of the package.
 macro(package component name section description)
     string(TOUPPER ${component} COMPONENT)
     set(CPACK_DEBIAN_${COMPONENT}_PACKAGE_NAME ${name})
@@ -26,15 +26,17 @@ macro(package component name section description)
 endmacro()
 
 package(library libvarnekutils-ltn libs "common utility library of an ISDB-Tb receiver stack
-Threads with message queues, mutexes, semaphores, timers, files, a trace
-that is filtered by level and module, and what broadcast code needs: bit
-stream, ring buffer, CRC-32, text conversion, configuration.")
-package(standins libvarnekutils-ltn-standins libs "a device's log and feature store, on a PC
-libvarnekutils-ltn loads them. The log writes to standard error as logcat
-does. The feature store answers from a text file.")
+It provides threads with message queues, mutexes, semaphores, timers and
+files, a trace that is filtered by level and module, and tools for
+broadcast code: bit stream, ring buffer, CRC-32, text conversion and
+configuration.")
+package(standins libvarnekutils-ltn-standins libs "PC stand-ins for a device's log and feature store
+libvarnekutils-ltn loads these libraries. The log writes to standard error
+as logcat does. The feature store answers from a text file.")
 package(dev libvarnekutils-ltn-dev libdevel "development files of libvarnekutils-ltn
-Headers, package files for CMake and pkg-config, commented defaults, a
-stand-in for the timers under ThreadSanitizer, guide and examples.")
+This package has the headers, package files for CMake and pkg-config,
+commented defaults, a stand-in for the timers under ThreadSanitizer, the
+guide and the examples.")
 set(CPACK_DEBIAN_LIBRARY_PACKAGE_DEPENDS "libvarnekutils-ltn-standins (= ${PROJECT_VERSION})")
 set(CPACK_DEBIAN_DEV_PACKAGE_DEPENDS "libvarnekutils-ltn (= ${PROJECT_VERSION}), libc6-dev")
 

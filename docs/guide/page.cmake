@@ -1,7 +1,7 @@
-# Reads fenced blocks out of a page. As a script it runs a page's program and compares what the page says
-# that it prints: cmake -DPAGE=... -DPROGRAM=... -DEMULATOR=... -DDATA_DIR=... -P page.cmake
+# Reads fenced blocks out of a page. As a script, it runs the page's program and compares its output with the page:
+# cmake -DPAGE=... -DPROGRAM=... -DEMULATOR=... -DDATA_DIR=... -P page.cmake
 
-# The first block of PAGE whose opening fence is ```LANGUAGE, or an empty text.
+# Returns the first block of PAGE whose opening fence is ```LANGUAGE, or an empty text.
 function(read_block result page language)
     file(READ "${page}" text)
     string(FIND "${text}" "\n```${language}\n" begin)
@@ -21,7 +21,7 @@ if(NOT CMAKE_SCRIPT_MODE_FILE STREQUAL CMAKE_CURRENT_LIST_FILE)
     return()
 endif()
 
-# The library's data directory holds what the page says, and nothing from an earlier run.
+# The data directory contains the files that the page shows, and nothing from an earlier run.
 file(REMOVE_RECURSE "${DATA_DIR}")
 file(MAKE_DIRECTORY "${DATA_DIR}")
 foreach(name IN ITEMS debug_ltn.ini Varnek_Config.cfg)
@@ -42,7 +42,7 @@ read_block(expected "${PAGE}" text)
 if(NOT printed STREQUAL expected)
     message(FATAL_ERROR "The page shows\n${expected}the program prints\n${printed}")
 endif()
-# Of the log everything but date, time, process and thread.
+# Date, time, process and thread differ in each run, so they are removed from the log.
 read_block(expected "${PAGE}" log)
 foreach(text IN ITEMS expected logged)
     string(REGEX REPLACE "[0-9-]+ [0-9:.]+ +[0-9]+ +[0-9]+ ([VDIEF]) " "\\1 " ${text} "${${text}}")

@@ -1,11 +1,11 @@
-// exchange: two threads that send each other messages, at the pace of a timer.
+// exchange: two threads that send each other messages, paced by a timer.
 //
 //   timer      sends Tick to the counter, from a thread of the system
 //   counter    counts ticks, sends Show to the display, waits for Shown, and starts the timer again
 //   display    prints, and answers with Shown; a Quit ends it
 //
-// The threads find each other by name. Who waits does so for a limited time, so the program ends
-// whatever goes wrong.
+// The threads find each other by name. All waits have a time-out, so the program ends whatever goes
+// wrong.
 #include <cstdio>
 #include <cstring>
 
@@ -17,7 +17,7 @@ namespace {
 
 enum Kind : int32_t { kTick, kShow, kShown, kQuit };
 
-// What these threads put into a message.
+// The content of a message between these threads.
 struct Content {
     Kind kind;
     int32_t round;
@@ -52,8 +52,8 @@ bool Receive(Content *content) {
     return true;
 }
 
-// The callback leaves the work to a thread: it must not keep the timer service waiting, and a
-// message needs no lock.
+// The callback only sends a message. It must not keep the timer service waiting, and a message
+// needs no lock.
 void OnTimer(uint32_t, void *) {
     Send(kCounter, kTick, 0);
 }
@@ -113,7 +113,8 @@ int main() {
         std::fputs("exchange: a message went missing\n", stderr);
         return 1;
     }
-    // The semaphore stays: a thread that has signalled may still be inside that call.
+    // The semaphore is not deleted, because a thread that has signalled may still be inside that
+    // call.
     VarnekPGL_DeleteThread(hCounter);
     VarnekPGL_DeleteThread(hDisplay);
     VarnekPGL_DeleteTimer(hTimer);

@@ -1,5 +1,5 @@
-// The library converts the characters. This file handles the character table selector in front,
-// line breaks, and characters that the conversions cannot hold.
+// The library converts the characters. This file handles the character table selector at the start,
+// line breaks, and characters that the conversions do not support.
 #include "BroadcastText.h"
 
 #include <algorithm>
@@ -13,7 +13,7 @@ namespace {
 
 using Units = std::vector<unsigned short>;
 
-constexpr unsigned char kFirstPrintable = 0x20;  // a text that begins below begins with a selector
+constexpr unsigned char kFirstPrintable = 0x20;  // a lower first byte is a selector
 constexpr unsigned char kSelectNumbered = 0x10;  // the table's number follows in two bytes
 constexpr unsigned char kSelectUnicode = 0x11;
 constexpr unsigned char kSelectUtf8 = 0x15;
@@ -28,7 +28,7 @@ size_t SelectorSize(unsigned char first) {
 
 constexpr unsigned char kCarriageReturn = 0x0D;
 constexpr unsigned char kLineFeed = 0x0A;
-constexpr unsigned char kBreak = 0x8A;  // broadcasting's own line break; U+E08A in Unicode
+constexpr unsigned char kBreak = 0x8A;  // the line break of broadcasting; U+E08A in Unicode
 constexpr unsigned short kReplacement = 0xFFFD;
 
 std::string ConvertLatin15(const std::string &line) {
@@ -47,7 +47,7 @@ bool IsControl(char c) {
     return static_cast<unsigned char>(c) < 0x20 || static_cast<unsigned char>(c) == kBreak;
 }
 
-// Line by line, since the conversion drops control characters. Most texts have one line.
+// Converts line by line, because the library's conversion drops control characters.
 std::string FromLatin15(const std::string &text) {
     if (std::none_of(text.begin(), text.end(), IsControl)) {
         return ConvertLatin15(text);
@@ -58,7 +58,7 @@ std::string FromLatin15(const std::string &text) {
         const unsigned char byte = static_cast<unsigned char>(text[i]);
         const bool pair = byte == kCarriageReturn && i + 1 < text.size() && text[i + 1] == '\n';
         if (byte == 0 || pair) {
-            continue;  // a zero byte must not end the text; of a pair, the line feed counts
+            continue;  // skips a zero byte, which would end the text, and the first of CR LF
         }
         if (byte == kCarriageReturn || byte == kLineFeed || byte == kBreak) {
             result += ConvertLatin15(line) + '\n';
@@ -74,7 +74,7 @@ bool IsBreak(unsigned short unit) {
     return unit == kCarriageReturn || unit == kLineFeed || unit == kBreak || unit == 0xE08A;
 }
 
-// Control characters, also those that broadcasting puts at U+E080.
+// Whether a unit is a control character, also one of those that broadcasting has from U+E080 on.
 bool IsUnprintable(unsigned short unit) {
     return unit < 0x20 || (unit >= 0x7F && unit < 0xA0) || (unit >= 0xE080 && unit < 0xE0A0);
 }
@@ -116,13 +116,13 @@ std::string FromUnicode(const std::string &text) {
     return FromUnits(units);
 }
 
-// The bytes of the character that a UTF-8 text begins with.
-//   valid    whether it is well-formed
-//   returns  of a malformed one, the bytes that could have begun a character, at least 1
+// Returns the number of bytes of the first character of a UTF-8 text.
+//   valid    out: whether it is well-formed
+//   returns  for a malformed one, the number of bytes that could begin a character, at least 1
 size_t MeasureCharacter(const unsigned char *text, size_t size, bool &valid) {
     const unsigned char lead = text[0];
     const size_t length = lead < 0x80 ? 1 : lead < 0xC2 ? 0 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
-    // The second byte tells overlong forms, surrogates and code points beyond Unicode.
+    // The second byte shows overlong forms, surrogates and code points beyond Unicode.
     const unsigned char least = lead == 0xE0 ? 0xA0 : lead == 0xF0 ? 0x90 : 0x80;
     const unsigned char most = lead == 0xED ? 0x9F : lead == 0xF4 ? 0x8F : 0xBF;
     size_t count = 1;
@@ -137,8 +137,8 @@ size_t MeasureCharacter(const unsigned char *text, size_t size, bool &valid) {
     return count;
 }
 
-// Puts U+FFFD where the library's conversion, which takes its input to be well-formed and of at
-// most three bytes a character, would make up another letter.
+// Replaces malformed characters and those of four bytes with U+FFFD. The library's conversion does
+// not support them and would return other letters.
 std::string ReplaceMalformed(const std::string &text) {
     std::string result;
     for (size_t i = 0; i < text.size();) {
@@ -147,7 +147,7 @@ std::string ReplaceMalformed(const std::string &text) {
         const size_t count = MeasureCharacter(rest, text.size() - i, valid);
         if (!valid || count > 3) {
             result += "\xEF\xBF\xBD";
-        } else if (*rest != 0) {  // a zero byte must not end the text
+        } else if (*rest != 0) {  // a zero byte would end the text
             result.append(text, i, count);
         }
         i += count;

@@ -1,4 +1,4 @@
-// Texts of service information, shown in UTF-8.
+// Converts the texts of service information to UTF-8.
 #ifndef RECEIVER_BROADCASTTEXT_H
 #define RECEIVER_BROADCASTTEXT_H
 
@@ -6,9 +6,9 @@
 
 namespace receiver {
 
-// Converts a text as a descriptor carries it. It is ISO/IEC 8859-15, unless its first bytes select
-// UTF-8 or 16-bit Unicode; other selectors are skipped and the rest taken as ISO/IEC 8859-15.
-// Characters beyond 16 bits and malformed ones become U+FFFD, line breaks of any kind "\n".
+// Converts the text of a descriptor. It is ISO/IEC 8859-15, unless its first bytes select UTF-8 or
+// 16-bit Unicode. Other selectors are skipped, and the rest is read as ISO/IEC 8859-15. Characters
+// that are malformed or beyond 16 bits become U+FFFD. Line breaks of any kind become "\n".
 //   returns  well-formed UTF-8 without other control characters
 std::string ToUtf8(const std::string &bytes);
 

@@ -1,5 +1,5 @@
-// The calendar rule is the one of EN 300 468, annex C, in integers; the decimal fractions of its
-// constants become factors of 100 and 10000.
+// The calendar rule is that of EN 300 468, annex C, in integers. Factors of 100 and 10000 replace
+// the decimal fractions of its constants.
 #include "BroadcastTime.h"
 
 #include <cstdio>
@@ -13,7 +13,7 @@ namespace {
 
 constexpr int kFirstDay = 15079;  // 1900-03-01
 
-// Two decimal digits; -1 when they are none.
+// Decodes two decimal digits; -1 when one is above 9.
 int DecodeBcdByte(uint32_t byte) {
     const int tens = static_cast<int>((byte >> 4) & 0x0F);
     const int units = static_cast<int>(byte & 0x0F);
@@ -51,7 +51,7 @@ std::optional<DateTime> Shifted(const DateTime &time, int seconds) {
     VarnekCDateTime point = {time.year, time.month, time.day, time.hour, time.minute, time.second};
     const VarnekCDateTime span = {0, 0, 0, 0, 0, std::abs(seconds)};
     const uint32_t elapsed = VarnekPGL_DateTimeToSeconds(&point);
-    // Outside the library's calendar a point counts as 0 seconds.
+    // The library returns 0 seconds for a point outside its calendar.
     if (elapsed == 0 || (seconds < 0 && elapsed < span.GetElapsedSeconds())) {
         return std::nullopt;
     }

@@ -1,4 +1,4 @@
-// Packets are written a block at a time, since each write of the library is a system call.
+// Packets are written in blocks, because each write of the library is a system call.
 #include "Capture.h"
 
 #include <unistd.h>
@@ -60,7 +60,7 @@ void Capture::Finish() {
 
 void Capture::Write() {
     if (!empty_) {
-        // The library never truncates. A device or a pipe has no length.
+        // The library's open never truncates, so this does. Devices and pipes have no length.
         if (ftruncate(file_, 0) != 0 && errno != EINVAL) {
             failure_ = "the old content could not be removed";
             return;

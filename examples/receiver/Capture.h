@@ -1,4 +1,4 @@
-// A second file, into which the packets go that the receiver's tables come from.
+// The capture: a second file with the packets that carry the receiver's tables.
 #ifndef RECEIVER_CAPTURE_H
 #define RECEIVER_CAPTURE_H
 
@@ -9,7 +9,7 @@
 
 namespace receiver {
 
-// One thread writes to it; the result is asked for when that is through.
+// One thread writes to it; when that thread has finished, another one may ask for the result.
 class Capture {
   public:
     Capture() = default;
@@ -17,24 +17,24 @@ class Capture {
     Capture &operator=(const Capture &) = delete;
     ~Capture();
 
-    // Opens the file, and creates it if need be. Its old content stays until there is something to
-    // write.
+    // Opens the file, and creates it if necessary. Its old content stays until there is something
+    // to write.
     //   returns  false when it cannot be written
     bool Open(const std::string &path);
     bool IsOpen() const { return file_ >= 0; }
 
-    // Takes the 188 bytes of a packet. The first failure ends the capture.
+    // Writes the 188 bytes of a packet. The first failure ends the capture.
     void Push(const unsigned char *packet);
     void Finish();
 
-    //   returns  empty; else why the capture ended early
+    //   returns  empty, or the reason why the capture ended early
     const std::string &Failure() const { return failure_; }
 
   private:
     void Write();
 
     int32_t file_ = -1;
-    bool empty_ = false;  // nothing of an earlier file is left
+    bool empty_ = false;  // the old content is gone
     std::vector<unsigned char> waiting_;
     std::string failure_;
 };

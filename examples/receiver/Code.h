@@ -11,14 +11,14 @@ namespace receiver {
 class Code {
   public:
     constexpr Code() = default;
-    // From the bytes that carry it; bytes that no code has make an empty one.
+    // Takes the bytes of a descriptor; bytes that cannot be a code give an empty one.
     explicit constexpr Code(uint32_t bytes) {
         if (MayBeOfCode(bytes >> 16) && MayBeOfCode(bytes >> 8) && MayBeOfCode(bytes)) {
             bytes_ = bytes;
         }
     }
 
-    // From a text, which is a code when it has three characters.
+    // Takes a text, which is a code if it has three characters.
     static constexpr Code Of(const char *text) {
         uint32_t bytes = 0;
         int length = 0;

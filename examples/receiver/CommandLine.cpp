@@ -1,4 +1,4 @@
-// Each option is a row of one table, which both the parsing and the help go by.
+// Each option is a row of one table, which both the parser and the help use.
 #include "CommandLine.h"
 
 #include <algorithm>
@@ -12,7 +12,7 @@ namespace {
 
 constexpr unsigned kLargestRegion = 63;
 
-//   returns  empty; else what is wrong with the value
+//   returns  empty, or an error message about the value
 using Setter = std::string (*)(Options &options, const std::string &value);
 
 std::string SetRegion(Options &options, const std::string &value) {
@@ -43,21 +43,20 @@ constexpr struct {
     Setter set;
     const char *help;
 } kOptions[] = {
-    {"--json", nullptr, Set<&Options::json>, "show all as one JSON object"},
+    {"--json", nullptr, Set<&Options::json>, "show everything as one JSON object"},
     {"--region", "N", SetRegion,
-     "show local times of this region, where the nation has several; without it, the first one's"},
+     "show local times of this region if the nation has several; the default is the first one"},
     {"--capture", "FILE", SetCapture,
-     "write the packets of the tables to a file; where the configuration has its capture switch "
-     "on, "
-     "the default is the stream's name with \".capture\""},
-    {"--quiet", nullptr, Set<&Options::quiet>, "no progress line"},
-    {"--log", nullptr, Set<&Options::log>, "the library's log goes to stderr, not to its file"},
+     "write the packets that carry tables to a file; if the capture switch of the configuration is "
+     "on, the default is the stream's name with \".capture\""},
+    {"--quiet", nullptr, Set<&Options::quiet>, "show no progress line"},
+    {"--log", nullptr, Set<&Options::log>, "write the library's log to stderr, not to its file"},
     {"--version", nullptr, Set<&Options::version>, "show the version"},
-    {"--help", nullptr, Set<&Options::help>, "show this"},
+    {"--help", nullptr, Set<&Options::help>, "show this help"},
 };
 
-// Takes the option at `i`, and its value, where it has one.
-//   returns  empty; else what is wrong with it
+// Parses the option at `i`, and its value if it has one.
+//   returns  empty, or an error message
 std::string TakeOption(const std::vector<std::string> &arguments, size_t &i, Options &options) {
     const std::string name = arguments[i] == "-h" ? "--help" : arguments[i];
     const auto *option = std::find_if(std::begin(kOptions), std::end(kOptions),
@@ -107,9 +106,10 @@ std::string ParseArguments(const std::vector<std::string> &arguments, Options &o
 void WriteHelp(std::FILE *out, size_t width) {
     Paragraphs text(out, width);
     text.Add("usage: ", "receiver [OPTION...] FILE");
-    text.Add("  ",
-             "Reads a transport stream, from standard input where FILE is \"-\", and shows its "
-             "services, events and counters.");
+    text.Add(
+        "  ",
+        "Reads a transport stream and shows its services, events and counters. If FILE is \"-\", "
+        "it reads standard input.");
     for (const auto &option : kOptions) {
         std::string lead = std::string("  ") + option.name;
         lead += option.value != nullptr ? std::string(" ") + option.value : "";

@@ -1,4 +1,4 @@
-// The user's wishes.
+// The options of the command line.
 #ifndef RECEIVER_COMMANDLINE_H
 #define RECEIVER_COMMANDLINE_H
 
@@ -22,11 +22,11 @@ struct Options {
     std::string path;
 };
 
-// Takes the arguments, the program's name left out.
-//   returns  empty; else what is wrong with them
+// Parses the arguments, without the program's name.
+//   returns  empty, or an error message
 std::string ParseArguments(const std::vector<std::string> &arguments, Options &options);
 
-// Tells how the program is called, in lines of at most `width` columns.
+// Writes the usage of the program, in lines of at most `width` columns.
 void WriteHelp(std::FILE *out, size_t width);
 
 }  // namespace receiver

@@ -1,5 +1,5 @@
-// Packet header, continuity, section assembly and CRC, in this order. The PMT PIDs are taken from
-// the PAT here and not where tables are understood, so that no packet between the two is missed.
+// Packet header, continuity, section assembly and CRC, in this order. The PMT PIDs are read from
+// the PAT here rather than in the table parser, so that no packet in between is missed.
 #include "Demultiplexer.h"
 
 #include <utility>
@@ -13,12 +13,12 @@ namespace {
 
 constexpr size_t kSmallestCheckedSection = 7;  // a header and a CRC
 
-// Time and date, running status, stuffing and discontinuity information end without a CRC.
+// Tables without a CRC: time and date, running status, stuffing and discontinuity information.
 bool CarriesCrc(unsigned char table_id) {
     return table_id != kTableTdt && table_id != 0x71 && table_id != 0x72 && table_id != 0x7E;
 }
 
-// 33 bits of 90 kHz, six reserved ones, nine of 27 MHz.
+// A PCR has 33 bits in units of 90 kHz, six reserved bits, and nine bits in units of 27 MHz.
 uint64_t ReadPcr(const unsigned char *bytes) {
     uint64_t value = 0;
     for (int i = 0; i < 6; ++i) {
@@ -34,7 +34,7 @@ struct Demultiplexer::Header {
     bool unit_start;
     uint16_t pid;
     bool scrambled;
-    bool reserved;  // an adaptation_field_control that no packet may have
+    bool reserved;  // the adaptation_field_control has a reserved value
     bool has_payload;
     uint8_t counter;
     bool discontinuity;
@@ -98,7 +98,7 @@ void Demultiplexer::Push(const unsigned char *packet) {
     counters_.incomplete += static_cast<unsigned>(given_up);
 }
 
-// Reads by hand and not field by field, since every packet of the stream comes through here.
+// Reads the bytes directly instead of field by field, because it processes every packet.
 Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
     constexpr size_t kHeaderSize = 4;
     Header header{};
@@ -122,8 +122,8 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
     return header;
 }
 
-// Tells how a packet follows the latest one of its PID. Only a payload moves the counter on; a
-// packet with one may be sent twice, and a counter may jump where the packet announces it.
+// Says how a packet follows the previous one of its PID. Only a packet with a payload increments
+// the counter. Such a packet may be sent twice, and a counter may jump if the packet announces it.
 Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header, PidState &state) {
     const int last = std::exchange(state.last, header.counter);
     const bool repeatable = std::exchange(state.repeatable, header.has_payload);
@@ -156,9 +156,9 @@ void Demultiplexer::OnSection(uint16_t pid, const unsigned char *section, size_t
     handler_(pid, section, size);
 }
 
-// A PID that the PAT no longer names may carry anything, so its section in progress goes. New uses
-// come before old ones go: a repeated PAT must not disturb the section in progress on a PID that it
-// keeps.
+// A PID that the PAT no longer names may carry anything, so its unfinished section is dropped. New
+// uses are added before old ones are removed, so that a repeated PAT does not drop the unfinished
+// section of a PID that it still names.
 void Demultiplexer::UpdatePmtPids(const unsigned char *section, size_t size) {
     Pat pat;
     SectionHeader header{};

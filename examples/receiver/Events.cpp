@@ -1,4 +1,4 @@
-// The table counts the bytes of texts and lists too, so that long ones cannot fill the memory.
+// The table also counts the bytes of texts and lists, so that long ones cannot exhaust the memory.
 #include "Events.h"
 
 #include <utility>
@@ -34,7 +34,7 @@ void EventTable::Keep(const EventKey &key, Event event) {
         return;
     }
     Event &kept = found->second;
-    // Both accounts must fit, because parts of the old one may stay.
+    // The old and the new data must fit together, because parts of the old data may stay.
     if (bytes_ + BytesOf(event) > kMostBytes) {
         ++left_out_;
         return;

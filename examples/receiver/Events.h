@@ -24,7 +24,7 @@ struct EventKey {
 };
 
 struct Rating {
-    Code country;  // whose rules the value goes by
+    Code country;  // its rules define the value
     uint8_t value;
 };
 
@@ -42,15 +42,15 @@ struct Event {
 
 class EventTable {
   public:
-    // Far more than a week of every service takes; keeps memory bounded on hostile streams.
+    // Far more than a week of every service needs. The limit bounds the memory for hostile streams.
     static constexpr size_t kMostEvents = 65536;
     static constexpr size_t kMostBytes = 16 << 20;  // of the events' texts and lists
 
-    // Keeps the latest account of an event. Tables tell of it in different depth, so the earlier
-    // account stays where the new one is empty.
+    // Stores the latest data about an event. Tables describe an event in different detail, so
+    // earlier fields stay if the new ones are empty.
     void Keep(const EventKey &key, Event event);
 
-    // Counts how often there was no room for an event, or for a new account of one.
+    // Returns how often there was no room for an event, or for new data about one.
     uint64_t LeftOut() const { return left_out_; }
 
     bool Has(const EventKey &key) const { return events_.count(key) != 0; }

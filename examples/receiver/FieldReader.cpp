@@ -1,9 +1,10 @@
-// Each read first claims its bits from the reader's share, then takes them from the stream.
+// Each read first subtracts its bits from those that the reader has left, and then reads the
+// stream.
 #include "FieldReader.h"
 
 namespace receiver {
 
-// The bit stream takes a plain pointer but only ever reads through it.
+// The bit stream takes a pointer to non-const data, but only reads through it.
 FieldReader::FieldReader(const unsigned char *bytes, size_t size)
     : stream_(const_cast<unsigned char *>(bytes), static_cast<unsigned>(size), 0),
       bits_left_(static_cast<int>(size) * 8) {}

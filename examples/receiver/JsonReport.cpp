@@ -1,4 +1,4 @@
-// Each function writes one part of the report: some members of the outermost object, or one array.
+// Each function writes a part of the report: some members of the outermost object, or an array.
 #include "JsonReport.h"
 
 #include "JsonWriter.h"

@@ -1,4 +1,4 @@
-// Every value goes through Member, which knows about commas, lines and keys.
+// Every value is written through Member, which handles commas, lines and keys.
 #include "JsonWriter.h"
 
 #include <cinttypes>
@@ -71,10 +71,10 @@ void JsonWriter::NewLine() {
     std::fprintf(out_, "\n%*s", static_cast<int>(open_.size() * 2), "");
 }
 
-// Writes the stretches between two escapes in one piece.
+// Writes the text between two escapes in one piece.
 void JsonWriter::Quote(const std::string &text) {
     std::fputc('"', out_);
-    size_t plain = 0;  // start of the stretch that has not been written
+    size_t plain = 0;  // start of the text that has not been written
     for (size_t i = 0; i < text.size(); ++i) {
         const unsigned char c = static_cast<unsigned char>(text[i]);
         if (c >= 0x20 && c != '"' && c != '\\') {

@@ -1,5 +1,5 @@
-// Writes JSON text (RFC 8259) to a file: each member of the outermost object on a line, and each
-// element of an array there; deeper levels stay on its line.
+// Writes JSON text (RFC 8259) to a file. Each member of the outermost object gets a line, and so
+// does each element of an array in it. Deeper levels stay on the same line.
 #ifndef RECEIVER_JSONWRITER_H
 #define RECEIVER_JSONWRITER_H
 
@@ -45,7 +45,7 @@ class JsonWriter {
 
     std::FILE *out_;
     std::string open_;   // brackets that are open
-    bool first_ = true;  // nothing yet within the innermost
+    bool first_ = true;  // the innermost one is still empty
 };
 
 }  // namespace receiver

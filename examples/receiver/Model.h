@@ -1,6 +1,6 @@
-// The content of a stream's tables: the parser fills it, the report shows it. It holds only the
-// tables that apply now and to this stream, and other streams' events apart from its own. Times
-// are as the stream carries them.
+// The content of a stream's tables. The parser fills it, and the report shows it. It contains only
+// tables that apply now and to this stream. Events of other streams are stored separately. Times
+// are those of the stream, not converted.
 #ifndef RECEIVER_MODEL_H
 #define RECEIVER_MODEL_H
 
@@ -26,16 +26,16 @@ struct Program {  // a PAT entry
 
 struct Component {  // a PMT entry
     uint16_t pid;
-    uint16_t data_component_id;  // where the descriptor is the one of a data component
+    uint16_t data_component_id;  // if the descriptor is that of a data component
     uint8_t stream_type;
-    uint8_t descriptor;  // tag of the one that tells the kind of data, 0 for none
+    uint8_t descriptor;  // tag of the descriptor that says what kind of data it is, 0 for none
     Code languages[2];   // of audio
 };
 
 struct ProgramMap {    // a PMT
-    uint16_t pmt_pid;  // where it came
+    uint16_t pmt_pid;  // the PID that carried it
     uint16_t pcr_pid;
-    bool emergency;  // a warning to the population is on
+    bool emergency;  // an emergency warning is active
     std::vector<Component> components;
 };
 
@@ -45,7 +45,7 @@ struct NetworkStream {  // an entry of the NIT, about a transport stream
     std::string name;
     std::optional<uint16_t> area_code;
     std::optional<uint8_t> guard_interval;
-    bool dvb;                                // sent in a way that only DVB has
+    bool dvb;                                // uses a delivery system that only DVB has
     std::vector<uint16_t> one_seg_services;  // service_ids
 };
 
@@ -69,8 +69,8 @@ struct LocalOffset {
     int next_minutes;  // from then on
 };
 
-// A table that comes in numbered sections. A section takes the place of the earlier one of its
-// number: repeats change nothing, and a new version takes over as it comes in.
+// A table of numbered sections. A section replaces the earlier one with its number. So repetitions
+// change nothing, and a new version replaces the old one section by section.
 template <typename Content>
 class Sections {
   public:
@@ -88,22 +88,23 @@ class Sections {
 };
 
 struct Model {
-    // The limit for all PMTs together is far above any stream's need.
+    // The limit for all PMTs together; no stream comes near it.
     static constexpr size_t kMostComponents = 65536;
 
     std::optional<uint16_t> transport_stream_id;
     std::optional<uint16_t> network_id;
     Name network_name;
-    std::optional<DateTime> time;  // the latest, as the stream carries it
+    std::optional<DateTime> time;  // the latest, not converted
     std::vector<LocalOffset> local_offsets;
     Sections<std::vector<Program>> pat;
     Sections<std::vector<ServiceInfo>> sdt;
     Sections<NetworkSection> nit;
     std::map<uint16_t, ProgramMap> pmts;  // by service_id
-    size_t components = 0;                // in these
-    uint64_t components_left_out = 0;     // for lack of room
+    size_t components = 0;                // in all PMTs
+    uint64_t components_left_out = 0;     // because there was no room
     EventTable events;
-    EventTable other_events;  // of other transport streams, which must not push this stream's out
+    EventTable other_events;  // of other transport streams; separate, so that they leave room for
+                              // this one's
 };
 
 }  // namespace receiver

@@ -1,4 +1,4 @@
-// A name that the stream gives to something, held in the library's string.
+// A name from the stream, stored in the library's string.
 #ifndef RECEIVER_NAME_H
 #define RECEIVER_NAME_H
 
@@ -12,9 +12,9 @@ namespace receiver {
 class Name {
   public:
     Name() = default;
-    Name(const std::string &text) : text_(text.c_str()) {}  // a name is its text
+    Name(const std::string &text) : text_(text.c_str()) {}  // implicit on purpose
 
-    // Empty also when there was no memory for it.
+    // Also empty when there was no memory for the name.
     std::string Text() const {
         const std::unique_ptr<char[]> copy(text_.String());
         return copy != nullptr ? copy.get() : "";

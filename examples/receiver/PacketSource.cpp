@@ -1,5 +1,6 @@
-// Two states: locked, where each packet ends where the next sync byte must be, and searching, byte
-// by byte, with a bounded look ahead. Both only move forward, so any input takes linear time.
+// The source has two states. When locked, it expects the next sync byte at the end of each packet.
+// When searching, it goes byte by byte, with a limited look-ahead. Both states only move forward,
+// so any input takes linear time.
 #include "PacketSource.h"
 
 #include <algorithm>
@@ -14,23 +15,24 @@ constexpr size_t kTimestampSize = 4;
 constexpr size_t kDistances[] = {kPacketSize, kTimestampedSize, 204};
 constexpr size_t kLargestDistance = 204;
 
-// Sync bytes in a row that make a start. The first byte of a stream and the distance already in use
-// need few, so that short stretches between losses count. Anywhere else it takes more, and headers
-// that packets may have: tables in all kinds of files hold a byte of this value at even distances.
-// More than seven would miss streams in datagrams, which hold seven packets behind a header.
+// The number of consecutive sync bytes that is taken for a start of packets. Few are enough at the
+// first byte of a stream, and at the packet distance already in use, so that short runs of packets
+// between losses count. Elsewhere it takes more, and also valid packet headers, because many other
+// files contain this byte at regular distances. More than seven would miss streams in datagrams,
+// which have seven packets after a header.
 constexpr size_t kSyncsToFind = 5;
 constexpr size_t kSyncsToResume = 3;
 constexpr size_t kLookAhead = (kSyncsToFind - 1) * kLargestDistance + 4;
 
-// Bytes in front of the first sync byte of a stream that is cut at a packet.
+// The number of bytes before the first sync byte, if the stream begins with a complete packet.
 constexpr size_t Lead(size_t distance) {
     return distance == kTimestampedSize ? kTimestampSize : 0;
 }
 
 }  // namespace
 
-// While packets follow one another, they are handed on from where they lie; a packet that two
-// blocks share is put together first.
+// Consecutive packets are passed on without a copy. Only a packet that spans two blocks is
+// assembled first.
 void PacketSource::Feed(const unsigned char *bytes, size_t count) {
     counters_.bytes += count;
     if (locked_ && !pending_.empty()) {
@@ -92,7 +94,7 @@ void PacketSource::Run(bool at_end) {
     next_ -= used;
 }
 
-// Moves next_ to a byte where packets start, as far as the bytes at hand can tell.
+// Moves next_ to a byte where packets start, as far as the available bytes show.
 bool PacketSource::Search(bool at_end) {
     for (; next_ < pending_.size(); ++next_) {
         if (!at_end && pending_.size() - next_ < kLookAhead) {
@@ -116,8 +118,9 @@ bool PacketSource::Search(bool at_end) {
     return false;
 }
 
-// Away from the end of the stream the look ahead holds every sync byte asked for. Near the end as
-// many as remain must do, but where nothing else speaks for packets, not fewer than three.
+// The look-ahead contains all sync bytes that are required, except near the end of the stream.
+// There the remaining ones are enough; but at least three are required if there is no other sign of
+// packets.
 bool PacketSource::StartsPackets(size_t at, size_t distance) const {
     const uint64_t offset = pending_offset_ + at;
     const size_t room = pending_.size() - at;
@@ -138,7 +141,7 @@ bool PacketSource::StartsPackets(size_t at, size_t distance) const {
     return expected || found >= kSyncsToResume;
 }
 
-// Tells whether the header, as far as it is at hand, has no transport error and a valid
+// Whether the available part of the header has no transport error and a valid
 // adaptation_field_control.
 bool PacketSource::MayBeHeader(size_t at) const {
     return at + 3 >= pending_.size() ||

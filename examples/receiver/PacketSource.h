@@ -1,5 +1,6 @@
-// Finds the packets in a stream of bytes: packets of 188 bytes, of 192 (a four-byte time stamp in
-// front) and of 204 (16 parity bytes behind), recognised by the distance of their sync bytes.
+// Finds the packets in a stream of bytes. Packets have 188 bytes, 192 (with a four-byte time stamp
+// in front) or 204 (with 16 parity bytes at the end). The distance of the sync bytes gives the
+// size.
 #ifndef RECEIVER_PACKETSOURCE_H
 #define RECEIVER_PACKETSOURCE_H
 
@@ -11,24 +12,24 @@
 namespace receiver {
 
 struct PacketCounters {
-    uint64_t bytes = 0;        // all that was fed
-    uint64_t packets = 0;      // whole ones; a packet that the end of the stream cuts is none
-    uint64_t sync_losses = 0;  // garbage in front of the first packet is one
+    uint64_t bytes = 0;        // all bytes that were fed
+    uint64_t packets = 0;      // complete packets, without one that the end of the stream cuts off
+    uint64_t sync_losses = 0;  // bytes before the first packet count as one loss
     unsigned packet_size = 0;  // distance of the sync bytes, 0 until packets were found
 };
 
-// Bytes go in, in blocks of any size; whole packets come out, in order. Holds back at most about a
-// thousand bytes. After a loss it takes up the stream at the first sync byte that several others
-// follow at the packet distance, and no byte belongs to two packets.
+// The input is blocks of bytes of any size; the output is complete packets in order. The source
+// buffers about a thousand bytes at most. After a loss it continues at the first sync byte that is
+// followed by several others at the packet distance. No byte belongs to two packets.
 class PacketSource {
   public:
-    // Called with packets of 188 bytes, one right behind the other, valid during the call.
+    // Called with consecutive packets of 188 bytes, which are valid during the call.
     using Handler = std::function<void(const unsigned char *packets, size_t count)>;
 
     explicit PacketSource(Handler handler) : handler_(std::move(handler)) {}
 
     void Feed(const unsigned char *bytes, size_t count);
-    // Judges the bytes that were held back, because no more will come.
+    // Processes the bytes that are still buffered, at the end of the stream.
     void Finish();
 
     const PacketCounters &Counters() const { return counters_; }

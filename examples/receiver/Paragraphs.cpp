@@ -1,4 +1,4 @@
-// Everything goes out through Add, so no line can be wider than it should.
+// All output goes through Add, so no line can be too wide.
 #include "Paragraphs.h"
 
 #include <algorithm>
@@ -10,7 +10,7 @@ bool BeginsCharacter(char c) {
     return (static_cast<unsigned char>(c) & 0xC0) != 0x80;
 }
 
-// The bytes of the next `count` characters, or of those that are left.
+// Returns the number of bytes of the next `count` characters, or of those that are left.
 size_t BytesOf(const std::string &text, size_t from, size_t count) {
     size_t at = from;
     while (at < text.size()) {

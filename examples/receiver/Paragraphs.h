@@ -1,4 +1,4 @@
-// Text in lines of bounded width.
+// Writes text in lines of limited width.
 #ifndef RECEIVER_PARAGRAPHS_H
 #define RECEIVER_PARAGRAPHS_H
 
@@ -9,10 +9,10 @@
 
 namespace receiver {
 
-// Columns that a UTF-8 text takes, one for each character.
+// Returns the number of columns of a UTF-8 text, one for each character.
 size_t WidthOf(const std::string &text);
 
-// Fills a text up with blanks.
+// Pads a text with spaces.
 std::string Padded(const std::string &text, size_t width);
 
 class Paragraphs {
@@ -20,14 +20,15 @@ class Paragraphs {
     static constexpr size_t kUsualWidth = 80;
     static constexpr size_t kLeastWidth = 40;
 
-    // A width below the least one counts as that.
+    // A width below the minimum counts as the minimum.
     Paragraphs(std::FILE *out, size_t width);
 
-    // Writes `text` behind `lead`, which is narrower than the least width. It is broken at blanks,
-    // and words at the end of a line where they are too long for one; further lines begin where the
-    // text began. Line breaks in it count as blanks.
+    // Writes `text` after `lead`, which is narrower than the minimum width. Lines break at spaces,
+    // or inside a word that is longer than a line. Further lines are indented to the start of the
+    // text. Line breaks in the text count as spaces.
     void Add(const std::string &lead, const std::string &text);
-    // The same of items with commas between them, which are kept whole where they fit a line.
+    // Writes items in the same way, with commas between them. An item that fits a line is not
+    // broken.
     void AddList(const std::string &lead, const std::vector<std::string> &items);
     void AddEmptyLine() { std::fputc('\n', out_); }
 

@@ -1,12 +1,12 @@
-// Each PID with a clock is measured by itself, since programs of a stream may have clocks of their
-// own.
+// Each PID with a clock is measured separately, because the programs of a stream may have different
+// clocks.
 #include "PcrMeter.h"
 
 namespace receiver {
 namespace {
 
-constexpr uint64_t kCycle = (uint64_t{1} << 33) * 300;  // where the clock starts over
-// Streams have ten references a second and more, so a longer step is a jump or damage.
+constexpr uint64_t kCycle = (uint64_t{1} << 33) * 300;  // the clock wraps here
+// Streams have at least ten references a second, so a longer step is a jump or damage.
 constexpr uint64_t kLongestStep = 27000000;
 
 }  // namespace

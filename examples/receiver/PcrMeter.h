@@ -1,4 +1,4 @@
-// Measures a stream's duration and bit rate by its program clock references.
+// Measures a stream's duration and bit rate with its program clock references.
 #ifndef RECEIVER_PCRMETER_H
 #define RECEIVER_PCRMETER_H
 
@@ -7,8 +7,8 @@
 
 namespace receiver {
 
-// The time and the packets between the clock references of one PID. Stretches over which the clock
-// was set anew do not count.
+// The time and the packets between the clock references of one PID. Intervals in which the clock
+// jumps do not count.
 struct PcrSpan {
     uint64_t ticks = 0;    // of 27 MHz
     uint64_t packets = 0;  // of the whole stream
@@ -16,12 +16,12 @@ struct PcrSpan {
 
 class PcrMeter {
   public:
-    // Takes a clock reference.
-    //   position  packets of the stream that came before
-    //   restart   the packet announces that the clock was set anew
+    // Adds a clock reference.
+    //   position  number of packets of the stream before this one
+    //   restart   whether the packet announces that the clock jumps
     void Push(uint16_t pid, uint64_t pcr, uint64_t position, bool restart);
 
-    // The span of the PID whose clock was seen longest.
+    // Returns the span of the PID with the longest measured time.
     PcrSpan Longest() const;
 
   private:

@@ -4,10 +4,9 @@
 //      \ counters           \ counters                 \ model, end
 //       +--------------------+--------------------------+---------> control <-- timer's ticks
 //
-// Packets go through a ring, and a message says how many bytes came into it; everything else goes
-// with its message. First the threads, then their messages, last the life of all in RunPipeline. An
-// end message goes down the chain behind the data, so a thread that sees it has seen everything,
-// and each thread's result is with control before the end gets there.
+// Packets go through a ring, and a message says how many bytes were written to it. All other data
+// is passed in messages. An end message follows the data down the chain, so a thread that receives
+// it has received all data, and control has each thread's result before it receives the end.
 #include "Pipeline.h"
 
 #include <algorithm>
@@ -32,43 +31,44 @@ namespace receiver {
 namespace {
 
 constexpr size_t kBlockSize = 65536;
-// The size of one message's data: large enough that waking the other thread costs little.
+// The size of a message's data. It is large, so that the cost of waking the other thread is small.
 constexpr size_t kBatchSize = 1024 * kPacketSize;
 constexpr uint32_t kBatchesWaiting = 8;
 constexpr uint32_t kTickTime = 250;  // milliseconds
 
-// In the order of their creation: whom a thread sends to is there before it.
+// In the order of their creation. A thread is created after the one that it sends to.
 enum ThreadIndex { kControl, kParser, kDemultiplexer, kReader, kThreadCount };
 
-// The threads share this. A handle is -1 until its object exists; a thread uses only those that
-// were there before it.
+// The threads share this. A handle is -1 until its object exists. A thread uses only objects that
+// were created before it.
 struct Pipeline {
-    StreamFile &file;  // the reader's as long as that runs
+    StreamFile &file;  // used only by the reader while it runs
     uint64_t size;     // of the file in bytes, 0 when it is not known
     const PipelineOptions &options;
 
-    // It holds as much as the batches that may wait. It neither waits nor takes half, so semaphores
-    // see to it that there is room. Made before the mutex: when the registry has no place left for
-    // the ring's own, there is none for ours either, and the pipeline does not start.
+    // The ring has room for all batches that may wait. A write to it does not wait and is never
+    // partial, so semaphores ensure that there is room. The ring is created before the mutex: if
+    // there is no mutex left for the ring, there is none for us either, and the pipeline does not
+    // start.
     VarnekCRingBuffer ring{static_cast<int>(kBatchSize * kBatchesWaiting)};
 
     int32_t packet_room = -1;   // semaphore: batches that may still be sent to the demultiplexer
-    int32_t section_room = -1;  // semaphore: the same, of sections to the parser
-    int32_t ended = -1;         // semaphore: threads that are through
+    int32_t section_room = -1;  // semaphore: the same for sections to the parser
+    int32_t ended = -1;         // semaphore: threads that have finished
     int32_t mutex = -1;
     int32_t timer = -1;
     int32_t threads[kThreadCount] = {-1, -1, -1, -1};
 
     uint64_t bytes_read = 0;  // under the mutex
-    Report report = {};       // control's as long as it runs
+    Report report = {};       // used only by control while it runs
 };
 
 // Messages ---------------------------------------------------------------------------------------
 
-// A message hands its object over: the thread that takes it out of the queue deletes it. None but
-// messages without an object may be left in a queue when its thread goes.
+// A message transfers the ownership of its object: the thread that receives it deletes the object.
+// When a thread ends, only messages without an object may remain in its queue.
 enum class Kind : uint32_t {
-    kPackets,  // no object; its length is the number of bytes that came into the ring
+    kPackets,  // no object; the length is the number of bytes that were written to the ring
     kSections,
     kPacketCounters,
     kSectionCounters,
@@ -96,7 +96,8 @@ bool TrySend(int32_t thread, const Message &message) {
     return VarnekPGL_SendMessage(thread, &record) != FALSE;
 }
 
-// To a thread that is there: only memory can be lacking, which ends the program as elsewhere.
+// Sends to a thread that exists. So a failure means that there is no memory, which ends the program
+// as it does elsewhere.
 void Send(int32_t thread, const Message &message) {
     if (!TrySend(thread, message)) {
         throw std::bad_alloc();
@@ -114,7 +115,7 @@ Object Take(const Message &message) {
     return std::move(*object);
 }
 
-// The calling thread's next message. Nothing but a signal can cut the wait short.
+// Receives the calling thread's next message. Only a signal can end the wait early.
 Message Receive() {
     THREAD_MSG record{};
     int32_t left = 0;
@@ -216,8 +217,8 @@ void RunParser(Pipeline &pipeline) {
     Send(pipeline.threads[kControl], {Kind::kEnd});
 }
 
-// Runs on a thread of the timer service, perhaps late, when the pipeline is gone. So it is handed
-// nothing but the control thread's handle, which reaches nobody then.
+// Runs on a thread of the timer service, and may run after the pipeline has ended. So its only
+// argument is the control thread's handle, which is invalid by then.
 void OnTimer(uint32_t, void *control) {
     TrySend(static_cast<int32_t>(reinterpret_cast<intptr_t>(control)), {Kind::kTick});
 }
@@ -250,9 +251,9 @@ void RunControl(Pipeline &pipeline) {
     line.Erase();
 }
 
-// The thread's last act, when nothing of its body is left. It signals with the mutex held, so that
-// a thread that has seen every signal and then gets the mutex knows that nobody is within the
-// semaphore.
+// The last action of a thread, when all its objects are destroyed. It signals while it holds the
+// mutex. So a thread that has received every signal, and then acquires the mutex, knows that no
+// thread still uses the semaphore.
 template <void (*Body)(Pipeline &)>
 void *RunThread(void *argument) {
     Pipeline &pipeline = *static_cast<Pipeline *>(argument);
@@ -275,7 +276,7 @@ constexpr struct {
 constexpr int32_t kPriority = 50;
 constexpr uint32_t kStackSize = 1 << 20;
 
-// Life -------------------------------------------------------------------------------------------
+// Start and end ----------------------------------------------------------------------------------
 
 //   returns  as RunPipeline
 std::string CreateObjects(Pipeline &pipeline) {
@@ -338,7 +339,7 @@ std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report
         }
     }
     if (started > 0 && started < kThreadCount) {
-        // The one in front, which would send the end down the chain, is not there.
+        // The reader, which would send the end down the chain, does not exist.
         Send(pipeline.threads[started - 1], {Kind::kEnd});
     }
     for (int i = 0; i < started; ++i) {

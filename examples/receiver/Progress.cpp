@@ -1,4 +1,4 @@
-// A shorter text gets blanks over the rest of the longer one, so that any terminal can show it.
+// A shorter text is padded with spaces to overwrite a longer one, which works on any terminal.
 #include "Progress.h"
 
 #include <algorithm>
@@ -13,7 +13,7 @@ std::string DescribeProgress(uint64_t done, uint64_t size, double seconds) {
     if (size == 0) {
         std::snprintf(text, sizeof text, "%.0f MB", bytes / kMega);
     } else {
-        // A file that grows is never more than done.
+        // A file that grows must not show more than 100 %.
         std::snprintf(text, sizeof text, "%.0f %% of %.0f MB",
                       std::min(bytes / total * 100.0, 100.0), total / kMega);
     }

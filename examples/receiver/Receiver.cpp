@@ -1,4 +1,4 @@
-// Takes the command line, runs the pipeline over the file, and shows its report.
+// Parses the command line, runs the pipeline on the file, and shows its report.
 #include "Receiver.h"
 
 #include <fcntl.h>
@@ -22,7 +22,7 @@
 namespace receiver {
 namespace {
 
-constexpr int kInterrupted = 130;  // as shells have it for a program that Ctrl-C ended
+constexpr int kInterrupted = 130;  // as shells report it for a program that Ctrl-C ended
 
 int Fail(std::FILE *err, const std::string &path, const std::string &message) {
     std::fprintf(err, "receiver: %s: %s\n", path.c_str(), message.c_str());
@@ -33,8 +33,8 @@ std::string SystemText(int error) {
     return std::generic_category().message(error);
 }
 
-// Tells why a stream that could be opened cannot be shown.
-//   returns  empty when it can
+// Says why the content of an open file cannot be shown.
+//   returns  empty when it can be shown
 std::string FindFault(const Report &report, int read_error) {
     const PacketCounters &packets = report.packets;
     const std::string bytes = std::to_string(packets.bytes) + " bytes";
@@ -50,7 +50,7 @@ std::string FindFault(const Report &report, int read_error) {
                : "";
 }
 
-// The library's configuration: the file when there is one, else its initial values.
+// Gets the library's configuration: from the file if there is one, otherwise its initial values.
 Settings LoadSettings(const Options &options) {
     VarnekCfg_LoadConfigFile();
     Settings settings;
@@ -61,8 +61,9 @@ Settings LoadSettings(const Options &options) {
     return settings;
 }
 
-// Opens the capture that is asked for, if any. Standard input has no place beside it.
-//   returns  empty; else what is wrong with it
+// Opens the capture that the options or the configuration ask for, if any. Standard input has no
+// path, so there the configuration alone opens no capture.
+//   returns  empty, or an error message
 std::string OpenCapture(const Options &options, const StreamFile &file, Capture &capture) {
     std::string path = options.capture;
     if (path.empty() && options.path != "-" && VarnekCfg_GetTSCaptueEnable() != 0) {
@@ -88,7 +89,7 @@ size_t TerminalWidth(std::FILE *file) {
     return known && size.ws_col != 0 ? size.ws_col : Paragraphs::kUsualWidth;
 }
 
-// Leads descriptor 2 into a file, or nowhere when there is no such place.
+// Redirects descriptor 2 to a file, or to nowhere when the file cannot be opened.
 void DivertLog(const char *path) {
     constexpr int kFlags = O_WRONLY | O_CREAT | O_TRUNC | O_APPEND | O_CLOEXEC;
     int log = open(path, kFlags, 0666);
@@ -109,7 +110,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     Options options;
     const std::string wrong = ParseArguments(arguments, options);
     if (!wrong.empty()) {
-        std::fprintf(err, "receiver: %s\nusage: receiver [OPTION...] FILE (--help tells more)\n",
+        std::fprintf(err, "receiver: %s\nusage: receiver [OPTION...] FILE (--help shows more)\n",
                      wrong.c_str());
         return 2;
     }
@@ -128,7 +129,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     StreamFile file;
     errno = 0;
     if (!file.Open(options.path) && !stopped()) {
-        // An open that is refused without asking the system leaves no error number.
+        // The library refuses some opens without a system call, so errno may be 0.
         return Fail(err, options.path,
                     "cannot be opened" + (errno != 0 ? ": " + SystemText(errno) : ""));
     }
@@ -153,8 +154,8 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
         return Fail(err, options.path, fault);
     }
     if (surroundings.stop != nullptr) {
-        // The reading is over: nothing is left to stop but the program, and a signal must not cut
-        // the result short.
+        // The reading is over. From here on Ctrl-C ends the program. The handler would only
+        // interrupt a write of the result.
         std::signal(SIGINT, SIG_DFL);
     }
     if (options.json) {

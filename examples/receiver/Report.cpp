@@ -10,7 +10,7 @@ namespace receiver {
 namespace {
 
 constexpr double kTicksPerSecond = 27e6;
-constexpr int kBrasiliaMinutes = -180;  // from UTC; there is no other official time all year round
+constexpr int kBrasiliaMinutes = -180;  // from UTC, all year round
 
 }  // namespace
 

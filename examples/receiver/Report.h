@@ -1,5 +1,5 @@
-// What was read, and how its parts belong together: services joined from their tables, events in
-// order, times in UTC and local. The summary and the JSON object both show this.
+// The result of a reading: services joined from their tables, events in order, times in UTC and
+// local time. Both the summary and the JSON object show it.
 #ifndef RECEIVER_REPORT_H
 #define RECEIVER_REPORT_H
 
@@ -15,7 +15,7 @@
 
 namespace receiver {
 
-// What the receiver is set up for: the library's configuration, and the region that the user names.
+// The receiver's settings: the library's configuration, and the region that the user names.
 struct Settings {
     int standard_type = 2;
     std::string nation = "BRA";
@@ -30,10 +30,11 @@ struct Report {
     Model model;
 };
 
-// Tells whether the bytes hold so little of a stream that they are something else.
+// Whether so few of the bytes are packets that the file is not a transport stream.
 bool IsHardlyStream(const Report &report);
 
-// The clock references give the duration in milliseconds and the bit rate in bits per second.
+// Return the duration in milliseconds and the bit rate in bits per second, from the clock
+// references.
 std::optional<int64_t> DurationOf(const Report &report);
 std::optional<int64_t> BitRateOf(const Report &report);
 
@@ -45,13 +46,13 @@ struct Service {
 };
 
 // Joins the services that the PAT or the SDT names, by service_id. They point into the model. A PMT
-// counts only when it came where the PAT says.
+// counts only if it came on the PID that the PAT names.
 std::map<uint16_t, Service> JoinServices(const Model &model);
 
-// Finds the NIT's entry on this stream; null without one.
+// Finds the entry of this stream in the NIT; null without one.
 const NetworkStream *FindOwnStream(const Model &model);
 
-// Tells whether the NIT or the PMT of a service signals a warning to the population.
+// Whether the NIT or the PMT of a service signals an emergency warning.
 bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services);
 
 struct ListedEvent {
@@ -60,8 +61,8 @@ struct ListedEvent {
     bool other_stream;
 };
 
-// Lists all events by start, those whose start is not known last. Another stream's account of an
-// event that this stream tells of is left out.
+// Lists all events by start; events whose start is not known come last. If both this and another
+// stream describe an event, only the description of this stream is listed.
 std::vector<ListedEvent> ListEvents(const Model &model);
 
 // Converts the stream's times. In Brazil they are the official time of Brasilia, and local offsets
@@ -70,20 +71,21 @@ class StreamClock {
   public:
     explicit StreamClock(const Report &report);
 
-    // The nation whose rules the stream follows: the receiver's when the TOT has it or says
-    // nothing, else the TOT's first; empty for a DVB stream that says nothing.
+    // The nation whose rules the stream follows. It is the receiver's nation if the TOT names it or
+    // names none, otherwise the first nation in the TOT. It is empty for a DVB stream whose TOT
+    // names none.
     const Code &Nation() const { return nation_; }
 
-    // The offset that local times are shown with: the one for the receiver's nation and region, or
-    // else, where the user names no region, the first. Null for none.
+    // The offset for local times: that of the receiver's nation and region. If there is none and
+    // the user names no region, it is the first offset. Null for none.
     const LocalOffset *Offset() const { return offset_; }
 
-    // These convert a time as the stream carries it; nothing comes out when it is not known. The
-    // local time takes the offset that applies then.
+    // These convert a time of the stream, and return nothing when it is not known. The local time
+    // uses the offset that applies at that time.
     std::optional<DateTime> Utc(const std::optional<DateTime> &time) const;
     std::optional<DateTime> Local(const std::optional<DateTime> &time) const;
 
-    // Shows the offset from UTC as "-03:00"; `minutes` are as the stream carries them.
+    // Formats the offset from UTC, such as "-03:00"; `minutes` is the value in the stream.
     std::string OffsetText(int minutes) const;
 
   private:

@@ -1,5 +1,5 @@
-// A section begins only where a pointer_field says so or right behind another section in the same
-// packet; anything that does not fit waits for the next such place.
+// A section begins only where a pointer_field says, or directly after another section in the same
+// packet. After anything that does not fit, the assembler waits for the next such place.
 #include "SectionAssembler.h"
 
 #include <algorithm>
@@ -12,8 +12,8 @@ namespace {
 constexpr unsigned char kStuffing = 0xFF;
 constexpr size_t kHeaderSize = 3;
 
-// The largest section_length that a table may have: program tables and most service information
-// stay within 1024 bytes, event tables and private ones within 4096.
+// Returns the largest section_length that a table may have. Sections of program tables and most
+// service information have at most 1024 bytes, event tables and private ones 4096.
 uint16_t LargestLength(unsigned char table_id) {
     const bool program_table = table_id <= 0x03;
     const bool service_table = table_id >= 0x40 && table_id <= 0x4D;
@@ -53,8 +53,8 @@ int SectionAssembler::Drop() {
     return dropped;
 }
 
-// Adds to the section in progress and hands it on when it is whole.
-//   returns  behind the bytes used; `end` when the rest of the packet cannot be made sense of
+// Appends to the unfinished section, and passes it on when it is complete.
+//   returns  the end of the bytes used; `end` when the rest of the packet is invalid
 const unsigned char *SectionAssembler::Take(const unsigned char *from, const unsigned char *end,
                                             const Handler &handler, int &given_up) {
     from = Fill(from, end, kHeaderSize);
@@ -77,7 +77,7 @@ const unsigned char *SectionAssembler::Take(const unsigned char *from, const uns
     return from;
 }
 
-// Appends bytes until the section holds `size` of them.
+// Appends bytes until the section has `size` bytes.
 const unsigned char *SectionAssembler::Fill(const unsigned char *from, const unsigned char *end,
                                             size_t size) {
     if (section_.size() >= size) {

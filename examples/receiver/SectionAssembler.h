@@ -1,4 +1,4 @@
-// Puts the sections of one PID together from the payloads of its packets.
+// Assembles the sections of one PID from the payloads of its packets.
 #ifndef RECEIVER_SECTIONASSEMBLER_H
 #define RECEIVER_SECTIONASSEMBLER_H
 
@@ -11,18 +11,18 @@ namespace receiver {
 
 class SectionAssembler {
   public:
-    // Called with a whole section, section_length + 3 bytes from its table_id on, valid during the
-    // call. Its CRC has not been looked at.
+    // Called with a complete section, section_length + 3 bytes from its table_id on, which is valid
+    // during the call. Its CRC has not been checked.
     using Handler = std::function<void(const unsigned char *section, size_t size)>;
 
-    // Takes the payload of the PID's next packet. `unit_start` is the packet's
-    // payload_unit_start_indicator: the payload begins with a pointer_field.
-    //   returns  the sections that were given up: cut short by the next one, or with a length that
-    //            their table does not allow
+    // Processes the payload of the PID's next packet. `unit_start` is the packet's
+    // payload_unit_start_indicator; it means that the payload begins with a pointer_field.
+    //   returns  the number of abandoned sections: those that the next section cut short, or whose
+    //            length their table does not allow
     int Push(const unsigned char *payload, size_t size, bool unit_start, const Handler &handler);
 
-    // Forgets the section in progress, because a packet is missing.
-    //   returns  1 when there was one, else 0
+    // Drops the unfinished section, because a packet is missing.
+    //   returns  1 if there was one, otherwise 0
     int Drop();
 
   private:
@@ -31,7 +31,7 @@ class SectionAssembler {
     const unsigned char *Fill(const unsigned char *from, const unsigned char *end, size_t size);
 
     std::vector<unsigned char>
-        section_;  // the section in progress, as far as it has come; empty: none
+        section_;  // the bytes of the unfinished section so far; empty for none
 };
 
 }  // namespace receiver

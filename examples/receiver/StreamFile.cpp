@@ -1,5 +1,5 @@
-// A read that waits, on a quiet pipe for example, looks up now and then: which thread a signal
-// interrupts is not known, so the reading cannot rely on being that one.
+// A read may wait, for example on a quiet pipe. It checks regularly whether it should stop, because
+// a signal may interrupt another thread instead of this one.
 #include "StreamFile.h"
 
 #include <poll.h>
@@ -13,7 +13,7 @@
 namespace receiver {
 namespace {
 
-constexpr int kPatience = 100;  // milliseconds between two looks at `stop`
+constexpr int kPatience = 100;  // milliseconds between two checks of `stop`
 
 }  // namespace
 

@@ -1,5 +1,5 @@
-// The stream that the receiver reads, a file or standard input, through the library's operations
-// for large files.
+// The receiver's input, a file or standard input. It is read with the library's operations for
+// large files.
 #ifndef RECEIVER_STREAMFILE_H
 #define RECEIVER_STREAMFILE_H
 
@@ -18,20 +18,20 @@ class StreamFile {
     ~StreamFile();
 
     // Opens a file, once; "-" is standard input.
-    //   returns  false when it cannot be opened, with errno as it was left
+    //   returns  false when it cannot be opened; errno says why
     bool Open(const std::string &path);
 
-    // Waits for bytes, as long as `stop` is not set; null waits for ever.
+    // Waits for bytes until `stop` is set; with null it waits forever.
     //   returns  the bytes read; 0 at the end, on an error, and when it was stopped
     size_t Read(unsigned char *buffer, size_t size, const std::atomic<bool> *stop);
 
-    // The system's number of the error that ended the reading; 0 for none.
+    // Returns the number of the error that ended the reading; 0 for none.
     int Error() const { return error_; }
 
     //   returns  the size in bytes; 0 when it is not known
     uint64_t Size() const;
 
-    // Tells whether this path names the same file.
+    // Whether this path names the same file.
     bool IsSameAs(const std::string &path) const;
 
   private:

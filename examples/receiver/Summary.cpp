@@ -1,5 +1,5 @@
-// Joins the parts of a report and writes them for people: names as the stream gives them, codes in
-// words.
+// Joins the parts of a report and writes them for people, with the names in the stream and with
+// words for codes.
 #include "Summary.h"
 
 #include <algorithm>
@@ -132,7 +132,7 @@ void AddServices(const Services &services, Paragraphs &out) {
     }
 }
 
-// Tells whether an event is over at this time; false when that is not known.
+// Whether an event is over at this time; false when that is not known.
 bool IsOver(const Event &event, const std::optional<DateTime> &now) {
     if (!now || !event.start || !event.duration) {
         return false;
@@ -141,7 +141,7 @@ bool IsOver(const Event &event, const std::optional<DateTime> &now) {
     return end && !(*now < *end);
 }
 
-// Puts genre and the nation's own rating in brackets.
+// Returns the genre and the nation's own rating, in parentheses.
 std::string DescribeContent(const Event &event, const Code &nation) {
     std::vector<std::string> items;
     for (const uint8_t genre : event.genres) {
@@ -158,7 +158,7 @@ std::string DescribeContent(const Event &event, const Code &nation) {
     return items.empty() ? "" : " (" + Joined(items) + ")";
 }
 
-// Lists this stream's events: present ones and coming ones first, past ones last.
+// Lists this stream's events: current and future ones first, past ones last.
 void AddEvents(const Report &report, const Services &services, const StreamClock &clock,
                Paragraphs &out) {
     const Model &model = report.model;
@@ -237,7 +237,7 @@ void AddTables(const DemultiplexerCounters &sections, Paragraphs &out) {
     }
 }
 
-// Names the PIDs that the services use.
+// Lists the names of the PIDs that the services use.
 std::map<uint16_t, std::string> NamePids(const Services &services) {
     std::map<uint16_t, std::string> names;
     for (const auto &[id, service] : services) {

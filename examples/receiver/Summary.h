@@ -1,4 +1,4 @@
-// Shows a report to people.
+// Writes a report for people.
 #ifndef RECEIVER_SUMMARY_H
 #define RECEIVER_SUMMARY_H
 

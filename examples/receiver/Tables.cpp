@@ -1,5 +1,5 @@
-// One function per table. Each reads its fixed fields, then its loops through readers that end
-// where the loop ends.
+// Each table has a function. It reads the fixed fields, and then the loops, with readers that end
+// with the loop.
 #include "Tables.h"
 
 #include <algorithm>
@@ -30,11 +30,11 @@ constexpr uint8_t kDescriptorPartialReception = 0xFB;
 constexpr uint8_t kDescriptorEmergency = 0xFC;
 constexpr uint8_t kDescriptorDataComponent = 0xFD;
 
-// These tell the kind of a component beside its stream_type: teletext, subtitles, sound codings,
-// application signalling, data component.
+// These descriptors define the kind of a component in addition to its stream_type: teletext,
+// subtitles, sound codings, application signalling, data component.
 constexpr uint8_t kDescriptorsOfContent[] = {0x56, 0x59, 0x6A, 0x6F,
                                              0x7A, 0x7B, 0x7C, kDescriptorDataComponent};
-// Only DVB has these: delivery by satellite, by cable and on the ground.
+// The delivery systems that only DVB has: satellite, cable and terrestrial.
 constexpr uint8_t kDescriptorsOfDvb[] = {0x43, 0x44, 0x5A};
 
 template <size_t Count>
@@ -42,7 +42,7 @@ bool Contains(const uint8_t (&tags)[Count], uint8_t tag) {
     return std::find(std::begin(tags), std::end(tags), tag) != std::end(tags);
 }
 
-// Calls `visit(tag, body)` for each whole descriptor of a loop.
+// Calls `visit(tag, body)` for each complete descriptor of a loop.
 template <typename Visit>
 void ForEachDescriptor(FieldReader loop, Visit visit) {
     while (loop.BytesLeft() >= 2) {
@@ -56,7 +56,7 @@ void ForEachDescriptor(FieldReader loop, Visit visit) {
     }
 }
 
-// Reads up to the section's own fields; `fields` ends in front of the CRC then.
+// Reads the header of a section. `fields` then contains the fields between header and CRC.
 bool ReadHeader(FieldReader &fields, SectionHeader &header) {
     fields.Skip(24);
     header.extension = fields.U16();
@@ -76,7 +76,7 @@ std::optional<DateTime> ReadDateTime(FieldReader &fields) {
     return DecodeDateTime(mjd, fields.U32(24));
 }
 
-// hhmm in decimal digits, as minutes.
+// Converts the decimal digits hhmm to minutes.
 int ReadOffset(FieldReader &fields, bool negative) {
     const int minutes = DecodeBcdTime(uint32_t{fields.U16()} << 8).value_or(0) / 60;
     return negative ? -minutes : minutes;
@@ -103,7 +103,7 @@ void ReadLocalOffsets(FieldReader &body, std::vector<LocalOffset> &offsets) {
     }
 }
 
-// Tells whether a warning is on in any of the areas that the descriptor lists.
+// Whether a warning is active in any of the areas that the descriptor lists.
 bool ReadsAsEmergency(FieldReader &body) {
     while (body.BytesLeft() >= 4) {
         body.Skip(16);
@@ -118,7 +118,7 @@ bool ReadsAsEmergency(FieldReader &body) {
     return false;
 }
 
-// The language and, of a component with two of them, the second one.
+// Reads the language and, if a component has two, the second one.
 void ReadAudioLanguages(FieldReader &body, Code (&languages)[2]) {
     body.Skip(40);
     const bool two = body.U8(1) != 0;
@@ -159,12 +159,12 @@ void ReadStreamDescriptor(uint8_t tag, FieldReader &body, NetworkStream &stream)
     }
 }
 
-// A text that several descriptors of an event carry on: named items, then free text. An item
-// without a name goes on with the one before.
+// A text that several descriptors of an event continue: named items, and then free text. An item
+// without a name continues the previous one.
 class ExtendedText {
   public:
-    // Takes a descriptor in the language of the first one, or in the wanted one from where that
-    // comes.
+    // Uses the descriptors in the language of the first one, until the first descriptor in the
+    // wanted language; from then on it uses that language.
     void Read(FieldReader &body, const Code &wanted) {
         body.Skip(8);
         const Code language = ReadCode(body);
@@ -198,7 +198,7 @@ class ExtendedText {
     std::string text_;
 };
 
-// The first name stays until one in the wanted language comes.
+// Keeps the first name, until there is one in the wanted language.
 void ReadShortEvent(FieldReader &body, const Code &wanted, Event &event) {
     const Code language = ReadCode(body);
     const bool named = !event.name.empty();

@@ -1,4 +1,4 @@
-// Understands the sections of program and service information tables.
+// Parses the sections of program and service information tables.
 #ifndef RECEIVER_TABLES_H
 #define RECEIVER_TABLES_H
 
@@ -14,26 +14,26 @@ namespace receiver {
 // The fields that follow section_length in most tables.
 struct SectionHeader {
     uint16_t extension;  // transport_stream_id, service_id, ...
-    bool current;        // false: announces what will apply later
+    bool current;        // false if the section announces what will apply later
     uint8_t number;
     uint8_t last;
 };
 
 using Pat = std::vector<Program>;
 
-// Takes the programs from a PAT section with a right CRC, without the entry for the network.
+// Reads the programs from a PAT section with a correct CRC, without the entry for the network.
 //   returns  false when the section does not apply now, or is too short for its header
 bool ParsePat(const unsigned char *section, size_t size, SectionHeader &header, Pat &pat);
 
-// Fills a model from sections, in the order in which they come. Sections and tables that it does
-// not understand change nothing; a loop that leads outside its section ends there.
+// Fills a model from sections, in the order of their arrival. Unknown sections and tables are
+// ignored. A loop that claims to be longer than its section ends with the section.
 class TableParser {
   public:
     // The model must outlive the parser.
-    //   language  the one that is taken of an event's texts in several; else the first
+    //   language  selects one of an event's texts in several languages; otherwise the first is used
     explicit TableParser(Model &model, Code language = {}) : model_(model), language_(language) {}
 
-    // Takes a whole section with a right CRC, or none to check.
+    // Parses a complete section with a correct CRC, or without one.
     void Push(uint16_t pid, const unsigned char *section, size_t size);
 
   private:

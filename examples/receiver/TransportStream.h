@@ -1,4 +1,4 @@
-// The basics of packets, and the PIDs and table_ids that the receiver tells apart.
+// The basics of packets, and the PIDs and table_ids that the receiver knows.
 #ifndef RECEIVER_TRANSPORTSTREAM_H
 #define RECEIVER_TRANSPORTSTREAM_H
 
@@ -11,7 +11,7 @@ constexpr size_t kPacketSize = 188;
 constexpr unsigned char kSyncByte = 0x47;
 constexpr size_t kPidCount = 8192;
 
-// The PID of a packet.
+// Returns the PID of a packet.
 inline uint16_t PidOf(const unsigned char *packet) {
     return static_cast<uint16_t>((packet[1] & 0x1F) << 8 | packet[2]);
 }
@@ -31,7 +31,7 @@ constexpr uint16_t kPidSdttOneSeg = 0x0028;  // software downloads within one se
 constexpr uint16_t kPidCdt = 0x0029;         // common data, such as logos
 constexpr uint16_t kPidNull = 0x1FFF;
 
-// Sections are assembled on these wherever they come; unknown tables are only counted.
+// Sections are assembled on all of these PIDs; unknown tables are only counted.
 constexpr uint16_t kTablePids[] = {
     kPidPat, kPidCat,  kPidNit,       kPidSdt,       kPidEit,        kPidTime, kPidSdtt,
     kPidBit, kPidNbit, kPidEitMobile, kPidEitOneSeg, kPidSdttOneSeg, kPidCdt,

@@ -1,5 +1,5 @@
-// Tables of codes and words come first, the functions that search them after. Codes without a word
-// are shown as numbers.
+// The tables of codes and words come first, followed by the functions that search them. Codes
+// without a word are shown as numbers.
 #include "Words.h"
 
 #include <algorithm>
@@ -164,7 +164,7 @@ constexpr Word kStreamTypes[] = {
     {0x87, "E-AC-3 audio"},
 };
 
-// A descriptor's tag tells the kind of private data and sections.
+// The tag of a descriptor defines the kind of private data and sections.
 constexpr Word kPrivateData[] = {
     {0x56, "teletext"},     {0x59, "subtitles"}, {0x6A, "AC-3 audio"}, {0x6F, "AIT"},
     {0x7A, "E-AC-3 audio"}, {0x7B, "DTS audio"}, {0x7C, "AAC audio"},
@@ -196,7 +196,7 @@ constexpr Word kBrazilianAges[] = {
 
 constexpr Word kBrazilianContents[] = {{0x10, "drugs"}, {0x20, "violence"}, {0x40, "sex"}};
 
-// The nations are those with ISDB-T.
+// The nations with ISDB-T.
 constexpr struct {
     const char *language;
     const char *nations;

@@ -1,4 +1,4 @@
-// receiver [OPTION...] FILE: shows what a transport stream carries.
+// receiver [OPTION...] FILE: shows the contents of a transport stream.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -17,7 +17,7 @@ void OnInterrupt(int /*signal*/) {
     gStop = true;
 }
 
-// Leaves SA_RESTART out, so that a wait for the other end of a pipe ends too.
+// Does not set SA_RESTART, so that the signal also ends a wait for the other end of a pipe.
 void CatchInterrupt() {
     struct sigaction action = {};
     action.sa_handler = OnInterrupt;
@@ -25,8 +25,8 @@ void CatchInterrupt() {
     sigaction(SIGINT, &action, nullptr);
 }
 
-// The system would give the number of a closed standard descriptor to the next file that is opened.
-// A descriptor that can only do the opposite takes it instead, so that reads and writes fail.
+// If a standard descriptor is closed, the next file that is opened would get its number. This opens
+// /dev/null under that number instead, for the opposite direction, so that reads and writes fail.
 void TakeStandardDescriptors() {
     for (int descriptor = STDIN_FILENO; descriptor <= STDERR_FILENO; ++descriptor) {
         if (fcntl(descriptor, F_GETFD) < 0) {
@@ -35,7 +35,8 @@ void TakeStandardDescriptors() {
     }
 }
 
-// Messages go where stderr goes, by a descriptor of their own: the log is led away from that one.
+// Opens the destination of stderr under another descriptor, because descriptor 2 is redirected for
+// the log.
 std::FILE *OpenMessages() {
     const int descriptor = fcntl(STDERR_FILENO, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
     std::FILE *messages = descriptor < 0 ? nullptr : fdopen(descriptor, "w");

@@ -1,4 +1,4 @@
-// Fields first, then sections, tables, and packets.
+// The order is fields, sections, tables, packets.
 #include "StreamWriter.h"
 
 #include <algorithm>

@@ -1,5 +1,5 @@
-// Writes tables, sections and packets of a transport stream: for the sample program, and for tests
-// and fuzz targets that need streams of their own.
+// Writes tables, sections and packets of a transport stream, for the sample program, and for tests
+// and fuzz targets that generate streams.
 #ifndef SAMPLESTREAM_STREAMWRITER_H
 #define SAMPLESTREAM_STREAMWRITER_H
 
@@ -15,34 +15,35 @@ using Bytes = std::vector<unsigned char>;
 
 Bytes operator+(Bytes left, const Bytes &right);
 
-// Fields; a value is cut to their width.
+// Return a field; a value that is too large is truncated to its width.
 Bytes U8(unsigned value);
 Bytes U16(unsigned value);
 Bytes U24(unsigned value);
-// A text's bytes; the same behind their number.
+// Return the bytes of a text, and the same after their number.
 Bytes Raw(const std::string &text);
 Bytes Counted(const std::string &text);
-// A time of day or a duration as six decimal digits; a day with seconds from its beginning on.
+// Return a time of day or a duration as six decimal digits, and a day with the seconds since its
+// start.
 Bytes Bcd(int seconds);
 Bytes MakeDateTime(unsigned mjd, int seconds);
-// A descriptor; a loop behind its 12-bit length, with `flags` in the four bits above.
+// Return a descriptor, and a loop after its 12-bit length, with `flags` in the four bits above it.
 Bytes Descriptor(unsigned tag, const Bytes &body);
 Bytes Loop(unsigned flags, const Bytes &content);
 
-// Gives a section, whose bytes 1 and 2 hold the flags above its length, that length and its CRC.
+// Completes a section, whose bytes 1 and 2 contain the flags, with its length and its CRC.
 Bytes Seal(Bytes section);
 
-// Where a section belongs: version is a byte with reserved bits, version_number and
-// current_next_indicator.
+// The position of a section in its table. `version` is a byte with reserved bits, version_number
+// and current_next_indicator.
 struct Place {
     unsigned number = 0;
     unsigned last = 0;
     unsigned version = 0xC1;
 };
-// A section with the usual header.
+// Returns a section with the usual header.
 Bytes MakeSection(unsigned table, unsigned extension, const Bytes &body, const Place &place = {});
 
-// Tables. Their loops are made of entries, which may be added up.
+// Return tables. Their loops consist of entries, which may be concatenated with +.
 Bytes MakePat(unsigned stream, const std::vector<std::pair<unsigned, unsigned>> &pids,
               const Place &place = {});  // by service_id
 Bytes MakeComponent(unsigned stream_type, unsigned pid, const Bytes &descriptors = {});
@@ -53,37 +54,37 @@ Bytes MakeNit(unsigned network, unsigned stream, const Bytes &network_descriptor
 Bytes MakeService(unsigned service, const std::string &provider, const std::string &name);
 Bytes MakeSdt(unsigned stream, const Bytes &services, const Place &place = {});
 Bytes MakeShortEvent(const std::string &language, const std::string &name, const std::string &text);
-// `status` is running_status and free_CA_mode.
+// `status` contains running_status and free_CA_mode.
 Bytes MakeEvent(unsigned id, const Bytes &start, const Bytes &duration, const Bytes &descriptors,
                 unsigned status = 0);
 Bytes MakeEit(unsigned table, unsigned service, unsigned stream, const Bytes &events,
               const Place &place = {});
-// The offset of a region in whole hours, without a change in sight.
+// Returns the offset of a region in whole hours, without a change in the near future.
 Bytes MakeLocalOffset(const std::string &country, unsigned region, int hours);
 Bytes MakeTot(const Bytes &time, const Bytes &offsets);
 
-// Header flags: the high byte is that of byte 1 of a packet, the low byte that of byte 3.
+// Header flags: the high byte belongs to byte 1 of a packet, the low byte to byte 3.
 constexpr unsigned kTransportError = 0x8000;
 constexpr unsigned kUnitStart = 0x4000;
 constexpr unsigned kScrambled = 0x0080;
 constexpr unsigned kAdaptation = 0x0020;
 constexpr unsigned kPayload = 0x0010;
 
-// A packet of 188 bytes.
-//   content  what follows the header: an adaptation field with its length when the flags announce
-//            one, then the payload; it is filled up with 0xFF
+// Returns a packet of 188 bytes.
+//   content  the bytes after the header: an adaptation field with its length if the flags announce
+//            one, and then the payload; it is padded with 0xFF
 Bytes MakePacket(uint16_t pid, unsigned counter, const Bytes &content, unsigned flags = kPayload);
 
-// A packet's content with the flags that it needs.
+// The content of a packet, with the header flags that it needs.
 struct Content {
     Bytes bytes;
     unsigned flags;
 };
 
-// Sections that follow one another without a gap, in as few packets as they take.
+// Packs sections without gaps into as few packets as possible.
 std::vector<Content> SplitSections(const std::vector<Bytes> &sections);
 
-// A stream that grows packet by packet, each PID's counted on.
+// A stream that grows packet by packet. It increments the continuity counter of each PID.
 class StreamWriter {
   public:
     void Send(uint16_t pid, const Content &content);

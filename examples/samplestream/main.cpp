@@ -1,6 +1,5 @@
-// Makes a sample transport stream: an ISDB-Tb multiplex of 20 seconds with a full-segment and a
-// one-seg service, thinned out to the needs of a receiver of tables. Every run makes the same
-// bytes.
+// Generates a sample transport stream: an ISDB-Tb multiplex of 20 seconds with a full-segment and a
+// one-seg service, reduced to what a receiver of tables needs. Every run writes the same bytes.
 //   samplestream FILE
 // Texts are in ISO/IEC 8859-15. One service description section is damaged on purpose.
 #include <cstdint>
@@ -19,7 +18,7 @@ namespace {
 using namespace streamwriter;
 
 // A service_id is 11 bits of the network, two of the kind (3: one-seg) and three of the number; the
-// PMT of one-seg service n comes on PID 0x1FC8 + n.
+// PMT of one-seg service n is on PID 0x1FC8 + n.
 constexpr uint16_t kNetwork = 0x0642;
 constexpr uint16_t kOtherNetwork = 0x0643;
 constexpr uint16_t kFullSegService = (kNetwork & 0x7FF) << 5;
@@ -37,16 +36,17 @@ constexpr uint16_t kPidOneSegVideo = 0x0181, kPidOneSegAudio = 0x0182;
 constexpr size_t kPacketSize = 188;
 constexpr int kRounds = 16;
 constexpr int kRoundPackets = 100;
-constexpr uint64_t kPcrTicks = 27000000ull * 20 / (uint64_t{kRounds} * kRoundPackets);  // a packet
+// Ticks per packet.
+constexpr uint64_t kPcrTicks = 27000000ull * 20 / (uint64_t{kRounds} * kRoundPackets);
 
-// All times are the official time of Brasilia, UTC-3, as broadcasts in Brazil carry it.
+// All times are in the official time of Brasilia, UTC-3, as in broadcasts in Brazil.
 constexpr uint16_t kDay = 60476;     // 2024-06-15
-constexpr int kFirstSecond = 71990;  // 19:59:50, ten seconds before the next event begins
+constexpr int kFirstSecond = 71990;  // 19:59:50, ten seconds before the next event
 constexpr int kEventChange = 72000;  // 20:00:00
 
 struct Programme {
     uint16_t service, id;
-    int start;        // seconds since kDay began, may lie on the next day
+    int start;        // seconds since the start of kDay, may be on the next day
     int duration;     // seconds
     uint8_t genre;    // two levels of Brazil's genres
     uint8_t content;  // 1 drugs, 2 violence, 4 sex
@@ -83,7 +83,7 @@ constexpr Programme kProgrammes[] = {
 
 // Tables ----------------------------------------------------------------------------------------
 
-// A component with its tag, and further descriptors.
+// Returns a component with its tag and further descriptors.
 Bytes TaggedComponent(unsigned stream_type, uint16_t pid, unsigned tag, const Bytes &descriptors) {
     return MakeComponent(stream_type, pid, Descriptor(0x52, U8(tag)) + descriptors);
 }
@@ -108,7 +108,7 @@ Bytes OneSegPmt() {
 Bytes OwnNit() {
     const std::string name = "Ip\xEA";
     const Bytes services = U16(kFullSegService) + U8(0x01) + U16(kOneSegService) + U8(0x01);
-    // An area, a guard interval of 1/16, mode 3, and a frequency in sevenths of a megahertz.
+    // The area, a guard interval of 1/16, mode 3, and a frequency in sevenths of a megahertz.
     const Bytes delivery = U16(0x0A5 << 4 | 1 << 2 | 2) + U16(0x0E07);
     // The key on the remote control, and one kind of transmission with one service.
     const Bytes information = U8(12) + U8(static_cast<unsigned>(name.size()) << 2 | 1) + Raw(name) +
@@ -119,14 +119,13 @@ Bytes OwnNit() {
                    {0, 0, 0xC3});
 }
 
-// One section for each service.
+// Each service has one section.
 Bytes OwnSdt(unsigned number, uint16_t service, const std::string &name) {
     return MakeSdt(kNetwork, MakeService(service, "Ip\xEA Comunica\xE7\xE3o", name),
                    {number, 1, 0xC5});
 }
 
-// Names the makers of a programme in two descriptors; the second one goes on where the first one
-// ends.
+// Lists the makers of a programme in two descriptors; the second one continues the first one.
 Bytes Credits() {
     const Bytes first = Counted("Dire\xE7\xE3o") + Counted("B\xE1rbara Le\xE3o");
     const Bytes second = Counted("") + Counted(" e J\xFAlio Ara\xFAjo");
@@ -152,7 +151,7 @@ Bytes Entry(const Programme &programme, unsigned running) {
                      descriptors, running << 1);
 }
 
-// The present event and the following one in a section each, as at `now`.
+// Returns a section for the present event and one for the following event at the time `now`.
 std::vector<Bytes> PresentFollowing(uint16_t service, int now) {
     const bool own = service != kOtherService;
     std::vector<Bytes> sections;
@@ -168,7 +167,7 @@ std::vector<Bytes> PresentFollowing(uint16_t service, int now) {
     return sections;
 }
 
-// The whole evening of a service, and an event without a time at the end.
+// Returns the whole evening of a service, with an event without a time at the end.
 Bytes Schedule(uint16_t service) {
     Bytes entries;
     for (const Programme &programme : kProgrammes) {
@@ -181,7 +180,8 @@ Bytes Schedule(uint16_t service) {
                    entries + MakeEvent(0x01FF, U16(0xFFFF) + not_known, not_known, {}));
 }
 
-// Time, with the offsets of two regions from Brazil's official time: none, and an hour behind.
+// Returns the time, with the offsets of two regions from Brazil's official time: none and minus one
+// hour.
 Bytes OwnTot(int now) {
     return MakeTot(MakeDateTime(kDay, now),
                    MakeLocalOffset("BRA", 3, 0) + MakeLocalOffset("BRA", 4, -1));
@@ -191,12 +191,12 @@ Bytes OwnTdt(int now) {
     return Bytes{0x70, 0x70, 0x05} + MakeDateTime(kDay, now);
 }
 
-// Broadcaster information: one broadcaster, nothing said about it.
+// Returns broadcaster information with one broadcaster and no descriptors.
 Bytes OwnBit() {
     return MakeSection(0xC4, kNetwork, Loop(0xF, {}) + U8(0xFF) + Loop(0xF, {}));
 }
 
-// A table that the receiver counts, without content.
+// Returns a table without content, which the receiver only counts.
 Bytes Empty(unsigned table) {
     return MakeSection(table, kNetwork, {});
 }
@@ -205,10 +205,9 @@ Bytes Empty(unsigned table) {
 
 class Multiplex {
   public:
-    // Queues sections that follow one another without a gap, in as few packets as they take.
+    // Queues sections, without gaps between them, in as few packets as possible.
     void Queue(uint16_t pid, const std::vector<Bytes> &sections);
-    // Sends queued packets among filler until `packets` more are written. Queued ones take
-    // every third packet at most.
+    // Writes `packets` packets. At most every third one is a queued packet; the others are filler.
     void Run(int packets);
     const Bytes &Stream() const { return writer_.Stream(); }
 
@@ -236,7 +235,8 @@ void Multiplex::Run(int packets) {
     }
 }
 
-// Stands for video, audio, captions and the carousel: packets that only their headers tell apart.
+// Writes the packets for video, audio, captions and the carousel, which differ in their headers
+// only.
 void Multiplex::SendFiller(int slot) {
     constexpr uint16_t kPids[] = {kPidVideo, kPidVideo,       kPidAudio, kPidVideo,
                                   kPidVideo, kPidOneSegVideo, kPidNull,  kPidVideo,

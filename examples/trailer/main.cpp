@@ -1,6 +1,6 @@
-// trailer FILE: appends the CRC-32 of a file to it, as data carousels are stored.
-// trailer --check FILE: tells whether a file ends in its CRC-32; exits with 1 when it does not.
-// The file may have any size: it is read in pieces.
+// trailer FILE: appends the CRC-32 of a file to it; data carousels are stored in this format.
+// trailer --check FILE: checks whether a file ends in its CRC-32; exits with 1 when it does not.
+// The file may have any size, because it is read in pieces.
 #include <algorithm>
 #include <cstdio>
 #include <cstring>
@@ -14,7 +14,7 @@ namespace {
 constexpr int32_t kPiece = 64 * 1024;
 constexpr int32_t kSmallest = 4;  // of a piece and of a file
 
-// The CRC of everything up to the end of a further piece, whose first bytes it changes.
+// Extends a CRC over the next piece of the data. Changes the piece's first four bytes.
 uint32_t GoOn(uint32_t crc, unsigned char *piece, int32_t length) {
     for (int i = 0; i < 4; ++i) {
         piece[i] ^= static_cast<unsigned char>(~crc >> (24 - 8 * i));
@@ -32,7 +32,7 @@ bool ReadAll(int32_t hFile, unsigned char *to, int32_t length) {
     return true;
 }
 
-// The CRC of a file's whole content.
+// Computes the CRC of a file's whole content.
 bool Measure(int32_t hFile, uint32_t &crc) {
     int64_t left = VarnekPGL_GetFileSizeByHandle64Bits(hFile);
     if (left < kSmallest) {
@@ -42,7 +42,7 @@ bool Measure(int32_t hFile, uint32_t &crc) {
     std::vector<unsigned char> piece(kPiece);
     crc = 0xFFFFFFFF;  // the register before the first byte
     while (left > 0) {
-        // What remains is nothing, or at least the smallest piece.
+        // The rest after this piece is empty or has at least the size of the smallest piece.
         const bool tail = left > kPiece && left < kPiece + kSmallest;
         const auto length =
             static_cast<int32_t>(std::min<int64_t>(left, tail ? kPiece - kSmallest : kPiece));
@@ -82,7 +82,7 @@ int main(int argc, char **argv) {
     uint32_t crc = 0;
     bool done = Measure(hFile, crc);
     if (done && check) {
-        // Over data that ends in its own CRC the result is 0.
+        // The CRC of data that ends in its own CRC is 0.
         std::printf("%s: CRC %s\n", path, crc == 0 ? "right" : "wrong");
         done = crc == 0;
     } else if (done) {

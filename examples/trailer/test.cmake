@@ -1,4 +1,4 @@
-# Lets the program append CRCs to files of awkward sizes, check them, and find a damage:
+# Runs the program to append CRCs to files of awkward sizes, check them, and detect a damaged file:
 #   cmake -DPROGRAM=... -DEMULATOR=... -DFILE=... -P test.cmake
 
 # run(STATUS ARGUMENT...)
@@ -15,7 +15,7 @@ file(READ "${FILE}" content HEX)
 if(NOT content STREQUAL "3132333435363738390376e6e7")
     message(FATAL_ERROR "The check value is wrong: ${content}")
 endif()
-# Around one piece and around two, with and without the trailer.
+# Sizes around one piece and two pieces, with and without the trailer.
 foreach(length IN ITEMS 4 65532 65535 65536 65537 65540 131071 131073 200000)
     string(REPEAT "a" ${length} content)
     file(WRITE "${FILE}" "${content}")

@@ -1,4 +1,4 @@
-// Stand-in for the target's log library: logcat's "threadtime" lines on stderr.
+// Stand-in for the device's log library: writes logcat's "threadtime" lines to stderr.
 #include <stdio.h>
 #include <string.h>
 #include <sys/syscall.h>
@@ -15,9 +15,9 @@ static char PriorityLetter(int priority) {
     return letters[known ? priority : 0];
 }
 
-// Writes one log entry and returns the number of bytes of it that were written, or -1. As in
-// logcat, each line of the text gets the header; each line leaves in one write(), so that lines of
-// several threads do not mix.
+// Writes one log entry and returns the number of bytes that were written, or -1. As in logcat, each
+// line of the text gets the header. Each line is written with one write(), so that lines of several
+// threads do not mix.
 int __android_log_write(int priority, const char *tag, const char *text) {
     struct timespec now;
     struct tm local;

@@ -1,5 +1,5 @@
-// Stand-in for the target's feature store: KEY=value lines of one text file, read once in the life
-// of the process. Of a key that stands twice the first line counts.
+// Stand-in for the device's feature store: KEY=value lines of one text file, which a process reads
+// once. If a key occurs twice, the first line counts.
 #include <pthread.h>
 #include <stdio.h>
 #include <string.h>
@@ -8,7 +8,7 @@
 
 enum { STORE_SIZE = 65536 };
 
-// Every line end is replaced by a terminator, and the last line is followed by one.
+// The content of the file, with a terminator in place of every line end and after the last line.
 static char gStore[STORE_SIZE];
 static size_t gStoreLength = 0;
 static pthread_once_t gStoreLoaded = PTHREAD_ONCE_INIT;
@@ -27,8 +27,8 @@ static void LoadStore(void) {
     }
 }
 
-// The text value of a feature, or the given default when the store does not have it. The value
-// stays valid and unchanged; any thread may ask.
+// Returns the text value of a feature, or the given default when the store does not have it. The
+// value stays valid and unchanged. Thread-safe.
 const char *VellNativeFeature_getStringWithDefault(const char *key, const char *defaultValue) {
     pthread_once(&gStoreLoaded, LoadStore);
     const size_t keyLength = key != NULL ? strlen(key) : 0;

@@ -1,7 +1,7 @@
-// POSIX timers with thread notification on ordinary threads, for programs under ThreadSanitizer,
-// which does not survive the C library's own. Compile this file into the program; it takes the
-// place of the C library's timer_ functions. Each timer has a thread. Times are relative and timers
-// expire once, as varnekutils_ltn uses them.
+// POSIX timers with thread notification, built on ordinary threads. ThreadSanitizer cannot handle
+// the C library's timers, so a program that runs under it compiles this file, which replaces the
+// timer_ functions. Each timer has a thread. Times are relative and timers expire once, because
+// varnekutils_ltn uses them in this way only.
 #include <signal.h>
 #include <time.h>
 
@@ -23,7 +23,7 @@ struct Timer {
     bool deleted = false;
     Clock::time_point due;
 
-    // Each expiry calls back on a thread of its own, as the system does.
+    // Each expiry calls back on a new thread, as in the system.
     void Run() {
         std::unique_lock<std::mutex> guard(lock);
         while (!deleted) {
@@ -49,7 +49,7 @@ Timer *Of(timer_t id) {
 
 extern "C" {
 
-// The C library's headers have names of their own for the parameters.
+// The C library's headers name the parameters differently.
 // NOLINTBEGIN(readability-inconsistent-declaration-parameter-name)
 int timer_create(clockid_t, sigevent *event, timer_t *id) {
     Timer *timer = new (std::nothrow) Timer;

@@ -1,6 +1,6 @@
-// Google Benchmark's names, as far as the benchmarks use them, for programs whose instructions are
-// counted: the benchmark that the command line names runs with so many turns, between two marks for
-// the plugin (count.c).
+// The part of Google Benchmark's interface that the benchmarks use, for programs whose instructions
+// are counted. It runs the benchmark that the command line names, for TURNS iterations, between two
+// marks for the plugin (count.c).
 //   PROGRAM ROW:CONTENDER TURNS
 #ifndef VARNEK_BENCH_DEVICE_BENCHMARK_H
 #define VARNEK_BENCH_DEVICE_BENCHMARK_H
@@ -46,7 +46,7 @@ class State {
     int64_t iterations() const { return turns_; }
     int thread_index() const { return 0; }
     void SetItemsProcessed(int64_t) {}
-    // Nothing was measured then.
+    // After an error there is nothing to measure.
     void SkipWithError(const char *what) const {
         std::fprintf(stderr, "%s\n", what);
         std::_Exit(1);
@@ -73,8 +73,8 @@ class Benchmark {
 
     const std::string &Name() const { return name_; }
     void Run(int turns) const {
-        // First the turns in which functions are bound and the heap settles. By the end of the
-        // pause the program's other thread sleeps.
+        // The first iterations are not counted, because the linker binds functions and the heap
+        // grows. At the end of the pause, the program's other thread sleeps.
         State warm(kWarm, argument_, false);
         function_(warm);
         usleep(kPause);
@@ -151,7 +151,7 @@ inline void RunSpecifiedBenchmarks() {
     std::_Exit(1);
 }
 
-// Makes the compiler compute a value, and forget what it knows of memory.
+// Make the compiler compute a value, and discard its knowledge of memory.
 template <typename T>
 void DoNotOptimize(const T &value) {
     asm volatile("" : : "r,m"(value) : "memory");
