@@ -106,8 +106,8 @@ class SlotTable {
         const int32_t handle = ++given_;
         StoreName(NumberOf(slot), PackedName(name, LengthWithin(name, kNameSize - 1)));
         HintOf(handle).store(static_cast<uint32_t>(NumberOf(slot)), std::memory_order_relaxed);
-        slot->handle.store(handle, std::memory_order_release);
         count_.fetch_add(1, std::memory_order_relaxed);
+        slot->handle.store(handle, std::memory_order_release);
         return handle;
     }
 

@@ -13,6 +13,7 @@
 // ended threads to new ones, but what a key holds goes with its thread.
 #include "Varnek_Thread.h"
 
+#include <limits.h>
 #include <pthread.h>
 #include <sched.h>
 #include <semaphore.h>
@@ -42,12 +43,10 @@ struct THREAD_MGR_INFO {
     // lock.
     sem_t msgQSem;
     int32_t units VARNEK_GUARDED_BY(queueLock);
-    uint32_t unanswered VARNEK_GUARDED_BY(queueLock);  // waits for which no unit was posted yet
-    uint32_t users VARNEK_GUARDED_BY(queueLock);       // of the semaphore, without the lock
-    // For the last user of a removed record: the operation that removed it, null before, and the
-    // level and module at which that operation reports unread messages.
+    bool mustWake VARNEK_GUARDED_BY(queueLock);   // the owner waits, and no unit was posted for it
+    uint32_t users VARNEK_GUARDED_BY(queueLock);  // of the semaphore, without the lock
+    // The operation that removed the record, for its last user; null before.
     const char *removedBy VARNEK_GUARDED_BY(queueLock);
-    uint32_t unreadMask VARNEK_GUARDED_BY(queueLock);
     // From the removal, which sets it under the guard, until the disposal.
     std::atomic<bool> isLeftover;
     pthread_t linuxThread;  // for a debugger
@@ -63,6 +62,9 @@ struct Start {
 };
 
 constexpr int kLeaveTries = 1000;  // of a millisecond
+// The queue of a thread that only peeks keeps every unit. Far enough from the end of the type that
+// posted units can be added.
+constexpr int32_t kMostUnits = SEM_VALUE_MAX / 2;
 
 using Threads = SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE>;
 Threads gThreadInfoArr;
@@ -103,7 +105,7 @@ bool MakeSelfKey() {
     if (pthread_key_create(&key, KeepSelf) != 0) {
         return false;
     }
-    gSelfKey.store(static_cast<uint32_t>(key) + 1, std::memory_order_relaxed);
+    gSelfKey.store(static_cast<uint32_t>(key) + 1, std::memory_order_release);
     return true;
 }
 
@@ -133,33 +135,27 @@ bool EnsureGuard() {
 
 // Users of a record ------------------------------------------------------------------------------
 
-// Disposes of a removed record. Only the thread for which IsLast has been true calls it, and nobody
-// else looks at more than the handle of a removed record. So the queue needs no lock here.
-void Dispose(THREAD_MGR_INFO &info) VARNEK_THREAD_SAFETY(no_thread_safety_analysis) {
-    if (sem_destroy(&info.msgQSem) != 0) {
-        TRACE_ERROR("***** %s : semaphore destroy FAIL!! errCode = [%d]", info.removedBy,
-                    VarnekPGL_SysGetLastErro());
+// The operation that removed the record, if it has been removed and no user is left; null if not.
+// One thread gets it, the removal itself or the last user, and that thread disposes of the record.
+const char *LastUseOf(THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
+    if (info.users > 0) {
+        return nullptr;
     }
-    if (info.MsgQ.count > 0) {
-        VARNEK_TRACE(info.unreadMask, "***** %s : MsgQ is not empty!!size = [%d]", info.removedBy,
-                     info.MsgQ.count);
-        for (list_node_t *node = info.MsgQ.head; node != nullptr;) {
-            list_node_t *const next = node->next;
-            free(node);
-            node = next;
-        }
-        list_initialize(&info.MsgQ);
-    }
-    info.units = 0;
-    info.unanswered = 0;
+    const char *const operation = info.removedBy;
     info.removedBy = nullptr;
-    info.isLeftover.store(false, std::memory_order_release);
+    return operation;
 }
 
-// Whether the record has been removed and has no user left. True once for each removal: in the
-// removal itself, or when the last user leaves.
-bool IsLast(const THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
-    return info.removedBy != nullptr && info.users == 0;
+// Gives up what a removed record still has. Its slot is free after that. Does nothing for null.
+void Dispose(THREAD_MGR_INFO &info, const char *operation) {
+    if (operation == nullptr) {
+        return;
+    }
+    if (sem_destroy(&info.msgQSem) != 0) {
+        TRACE_ERROR("***** %s : semaphore destroy FAIL!! errCode = [%d]", operation,
+                    VarnekPGL_SysGetLastErro());
+    }
+    info.isLeftover.store(false, std::memory_order_release);
 }
 
 // Threads ----------------------------------------------------------------------------------------
@@ -185,17 +181,26 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
     const int32_t count = gThreadInfoArr.Withdraw(slot);
     hold.Release();
 
-    // The record is this thread's and its users' now.
+    // Whoever takes the lock of the queue after this does not find the handle. The owner may be
+    // waiting for a message: the post wakes it. Without a waiter the post goes with the semaphore.
     Hold queue(info.queueLock);
+    list_t unread = info.MsgQ;
+    list_initialize(&info.MsgQ);
+    info.units = 0;
     info.removedBy = operation;
-    info.unreadMask = unreadMask;
-    // The owner may be waiting for a message: this wakes it, and it finds its record gone. Without
-    // a waiter the post goes with the semaphore.
     sem_post(&info.msgQSem);
-    const bool last = IsLast(info);
+    const char *const lastUse = LastUseOf(info);
     queue.Release();
-    if (last) {
-        Dispose(info);
+    Dispose(info, lastUse);
+
+    if (unread.count > 0) {
+        VARNEK_TRACE(unreadMask, "***** %s : MsgQ is not empty!!size = [%d]", operation,
+                     unread.count);
+    }
+    while (unread.head != nullptr) {
+        list_node_t *const node = unread.head;
+        Unlink(&unread, node);
+        free(node);
     }
     TRACE_LOW("***** END : %s, %d", operation, count);
     return TRUE;
@@ -216,7 +221,10 @@ void *ThreadEntry(void *begin) {
     }
     const pthread_key_t key =
         static_cast<pthread_key_t>(gSelfKey.load(std::memory_order_relaxed) - 1);
-    pthread_setspecific(key, reinterpret_cast<void *>(intptr_t{start.hHandle}));
+    if (!Succeeded(pthread_setspecific(key, reinterpret_cast<void *>(intptr_t{start.hHandle})))) {
+        TRACE_ERROR("***** %s : thread handle cannot be kept!! errCode = [%d]", __func__,
+                    VarnekPGL_SysGetLastErro());
+    }
     pthread_setname_np(pthread_self(), start.systemName);
     return start.function(start.argument);
 }
@@ -357,7 +365,7 @@ struct Self {
 inline __attribute__((always_inline)) Self FindSelf() {
     TRACE_LOW_QUICK("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]",
                     static_cast<int>(pthread_self()));
-    const uint32_t key = gSelfKey.load(std::memory_order_relaxed);
+    const uint32_t key = gSelfKey.load(std::memory_order_acquire);
     const void *const held =
         key != 0 ? pthread_getspecific(static_cast<pthread_key_t>(key - 1)) : nullptr;
     const int32_t kept = static_cast<int32_t>(reinterpret_cast<intptr_t>(held));
@@ -463,37 +471,37 @@ inline __attribute__((always_inline)) Sent Enqueue(Threads::Slot *slot, int32_t 
                                                    Queued *queued, bool urgent) {
     THREAD_MGR_INFO &info = slot->info;
     Sent sent = {};
-    bool last = false;
     Hold hold(info.queueLock);
     sent.found = slot->Has(hThread, std::memory_order_relaxed);
     if (!sent.found) {
         return sent;
     }
     LinkBefore(&info.MsgQ, urgent ? info.MsgQ.head : nullptr, &queued->node, &queued->message);
-    if (info.unanswered == 0) {
-        info.units++;
-    } else {
-        // The post comes without the lock, which the owner takes as soon as it wakes.
-        info.unanswered--;
+    const char *lastUse = nullptr;
+    if (info.mustWake) {
+        info.mustWake = false;
         info.users++;
-        hold.Release();
-        if (sem_post(&info.msgQSem) != 0) {
-            sent.postError = VarnekPGL_SysGetLastErro();
-        }
+        hold.Release();  // the owner takes the lock as soon as it wakes
+        const int error = sem_post(&info.msgQSem) == 0 ? 0 : VarnekPGL_SysGetLastErro();
         hold.Acquire();
         info.users--;
-        if (sent.postError != 0) {
-            info.unanswered++;  // the next message wakes the owner
+        sent.postError = error;
+        if (error != 0 && info.units > 0 && sem_post(&info.msgQSem) == 0) {
+            info.units--;  // of a message that relied on this one to wake the owner
+        } else if (error != 0) {
+            info.mustWake = true;
         }
-        last = IsLast(info);
+        lastUse = LastUseOf(info);
+    } else if (info.units < kMostUnits) {
+        info.units++;
+    } else {
+        sent.postError = EOVERFLOW;
     }
     if (!urgent && sent.postError == 0 && ReadUnits(info, &sent.semCount) != 0) {
         sent.valueError = VarnekPGL_SysGetLastErro();
     }
     hold.Release();
-    if (last) {
-        Dispose(info);
-    }
+    Dispose(info, lastUse);
     // cppcheck-suppress memleak  // the list owns the block, by the node in it
     return sent;
 }
@@ -525,8 +533,7 @@ struct Receipt {
     int semCount;    // the units before that, -1 when unread
 };
 
-// Takes a unit that is counted, with its message. Where none is counted, the calling thread becomes
-// a user of its record, for WaitAndTake.
+// Takes a unit that is counted, with its message.
 inline __attribute__((always_inline)) Receipt TakeCounted(Threads::Slot *self, int32_t hThread) {
     THREAD_MGR_INFO &info = self->info;
     Receipt receipt = {};
@@ -539,9 +546,6 @@ inline __attribute__((always_inline)) Receipt TakeCounted(Threads::Slot *self, i
     receipt.counted = TakeUnit(info);
     if (receipt.counted) {
         receipt.queued = TakeFirst(info, &receipt.left);
-    } else {
-        info.unanswered++;
-        info.users++;
     }
     return receipt;
 }
@@ -559,27 +563,32 @@ int WaitForMessage(sem_t *msgQSem, uint32_t timeout) {
     return sem_timedwait(msgQSem, &deadline);
 }
 
-// Waits for a unit and takes its message. The calling thread is a user of its record until this
-// returns. `error` is the number of the error that ended the wait, 0 for none.
-Receipt WaitAndTake(Threads::Slot *self, int32_t hThread, uint32_t timeout, int *error) {
+// Takes a unit, with its message, and waits for one if none is counted. Returns the number of the
+// error that ended the wait, 0 for none. The owner registers right before it waits: a log function
+// that is called between the two might receive messages itself.
+int WaitAndTake(Threads::Slot *self, int32_t hThread, uint32_t timeout, Receipt *receipt) {
     THREAD_MGR_INFO &info = self->info;
-    Receipt receipt = {};
-    *error = WaitForMessage(&info.msgQSem, timeout) == 0 ? 0 : VarnekPGL_SysGetLastErro();
+    int error = 0;
+    const char *lastUse = nullptr;
     Hold hold(info.queueLock);
-    info.users--;
-    receipt.found = self->Has(hThread, std::memory_order_relaxed);
-    if (*error != 0 && info.unanswered > 0) {
-        info.unanswered--;
+    receipt->found = self->Has(hThread, std::memory_order_relaxed);
+    if (receipt->found && !TakeUnit(info)) {
+        info.mustWake = true;
+        info.users++;
+        hold.Release();
+        error = WaitForMessage(&info.msgQSem, timeout) == 0 ? 0 : VarnekPGL_SysGetLastErro();
+        hold.Acquire();
+        info.mustWake = false;
+        info.users--;
+        receipt->found = self->Has(hThread, std::memory_order_relaxed);
+        lastUse = LastUseOf(info);
     }
-    if (*error == 0 && receipt.found) {
-        receipt.queued = TakeFirst(info, &receipt.left);
+    if (receipt->found && error == 0) {
+        receipt->queued = TakeFirst(info, &receipt->left);
     }
-    const bool last = IsLast(info);
     hold.Release();
-    if (last) {
-        Dispose(info);
-    }
-    return receipt;
+    Dispose(info, lastUse);
+    return error;
 }
 
 }  // namespace
@@ -672,8 +681,7 @@ BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *co
     }
     TRACE_LOW_QUICK("VarnekPGL_ReceiveMessage: semCount = %d", receipt.semCount);
     if (!receipt.counted) {
-        int error = 0;
-        receipt = WaitAndTake(slot, curThread, timeout, &error);
+        const int error = WaitAndTake(slot, curThread, timeout, &receipt);
         if (error != 0) {
             return VARNEK_FAIL(
                 FALSE, "***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [%d]",
