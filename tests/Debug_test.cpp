@@ -3,7 +3,6 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
-#include <thread>
 
 #include "support/VarnekTest.h"
 
@@ -138,19 +137,7 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
 
 TEST_F(DebugAlone, EightFirstTracesLoadOnceAndAllGetThrough) {
     WriteAll(kWorking, "LogToUSB=1\nError=1\nCommon=1\n");
-    std::atomic<int> waiting{8};
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 8; i++) {
-        threads.emplace_back([&waiting] {
-            waiting--;
-            while (waiting > 0) {
-            }
-            VARNEK_TRACE(0x80000001, "here");
-        });
-    }
-    for (std::thread &thread : threads) {
-        thread.join();
-    }
+    AtOnce(8, [](int) { VARNEK_TRACE(0x80000001, "here"); });
     int summaries = 0;
     int traces = 0;
     for (const LogLine &line : TakeLog()) {

@@ -143,18 +143,12 @@ TEST_F(File, SizesAndPositions) {
 }
 
 TEST_F(File, LogLinesOfThreadsAreCutAndNeverMix) {
-    std::vector<std::thread> threads;
-    for (char c = 'a'; c < 'e'; c++) {
-        threads.emplace_back([c] {
-            const std::string path(2000, c);
-            for (int i = 0; i < 200; i++) {
-                VarnekPGL_OpenFile(path.c_str(), PGL_FILE_MODE_READ);
-            }
-        });
-    }
-    for (std::thread &thread : threads) {
-        thread.join();
-    }
+    AtOnce(4, [](int thread) {
+        const std::string path(2000, static_cast<char>('a' + thread));
+        for (int i = 0; i < 200; i++) {
+            VarnekPGL_OpenFile(path.c_str(), PGL_FILE_MODE_READ);
+        }
+    });
     const std::string head = "VarnekPGL_OpenFile : file path(";
     for (const LogLine &line : TakeLog()) {
         ASSERT_EQ(line.tag, "SBTVD_File");

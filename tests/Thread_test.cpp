@@ -204,24 +204,13 @@ TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
             std::this_thread::sleep_for(std::chrono::milliseconds(20));
         }
     };
-    std::atomic<int> waiting{8};
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 8; i++) {
-        threads.emplace_back([&waiting, i] {
-            waiting--;
-            while (waiting > 0) {
-            }
-            VarnekPGL_CreateThread(("t" + std::to_string(i)).c_str(), 1, 0, Nothing, nullptr);
-        });
-    }
-    for (std::thread &thread : threads) {
-        thread.join();
-    }
+    const auto name = [](int i) { return "t" + std::to_string(i); };
+    AtOnce(8, [&name](int i) { VarnekPGL_CreateThread(name(i).c_str(), 1, 0, Nothing, nullptr); });
     gLogHook = nullptr;
     EXPECT_THAT(TakeErrors(), IsEmpty());
     EXPECT_EQ(VarnekPGL_GetMutexByName("VarnekThreadMutex"), 1);
     for (int i = 0; i < 8; i++) {
-        EXPECT_NE(VarnekPGL_GetThreadByName(("t" + std::to_string(i)).c_str()), -1);
+        EXPECT_NE(VarnekPGL_GetThreadByName(name(i).c_str()), -1);
     }
 }
 

@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 #include <sys/types.h>
 
+#include <atomic>
 #include <chrono>
 #include <string>
 #include <thread>
@@ -41,7 +42,24 @@ extern void (*gLogHook)(const LogLine &line);
 std::string ReadAll(const std::string &path);
 void WriteAll(const std::string &path, const std::string &content);
 
-// Waits until `condition` holds, for twenty seconds at most. Whether it did.
+// Runs work(0), work(1) ... in as many threads, which start it at the same moment.
+template <typename Work>
+void AtOnce(int threads, Work work) {
+    std::atomic<int> waiting{threads};
+    std::vector<std::thread> all;
+    for (int i = 0; i < threads; ++i) {
+        all.emplace_back([&waiting, &work, i] {
+            for (--waiting; waiting > 0;) {
+            }
+            work(i);
+        });
+    }
+    for (std::thread &thread : all) {
+        thread.join();
+    }
+}
+
+// Waits until `condition` holds, for twenty seconds at most, and returns whether it does.
 template <typename Condition>
 bool Eventually(Condition condition) {
     const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(20);
@@ -63,10 +81,12 @@ class VarnekTest : public ::testing::Test {
     // A path in this test's own folder.
     std::string Path(const std::string &name) const { return folder_ + "/" + name; }
 
-    // Appends a call's result, and this thread's lines since the last TakeLog(), to the test's transcript. It has to be
-    // that of tests/expected/SUITE.TEST.txt; a run with VARNEK_WRITE_EXPECTED in its environment writes that file.
+    // Appends a text, or a call's result and this thread's lines since the last TakeLog(), to the test's transcript.
+    // The transcript must equal tests/expected/SUITE.TEST.txt. A run with VARNEK_WRITE_EXPECTED in its environment
+    // writes that file.
+    void Note(const std::string &text) { transcript_ += text; }
     void Note(const std::string &call, int64_t result);
-    // Has the transcript show `name` for what differs from run to run. (The system's handles are hidden always.)
+    // Replaces a text that differs from run to run by `name` in the transcript. The system's handles are always hidden.
     void Show(const std::string &text, const std::string &name) { names_.emplace_back(text, name); }
 
   private:
