@@ -9,6 +9,7 @@
 #include <csignal>
 #include <cstring>
 #include <filesystem>
+#include <map>
 #include <thread>
 
 #include "support/VarnekTest.h"
@@ -24,25 +25,15 @@ using ::testing::StartsWith;
 class File : public VarnekTest {};
 
 TEST_F(File, FlagsResolveInTheirOrder) {
-    const struct {
-        int32_t flags;
-        const char *result;  // of writing "new" over, or behind, "old"
-    } rows[] = {
-        {1, "new"}, {2, "old"}, {4, "new"}, {6, "new"}, {7, "new"}, {8, "oldnew"}, {10, "oldnew"}, {15, "oldnew"},
-    };
     const std::string path = Path("file");
-    for (const auto &row : rows) {
+    for (int32_t flags : {0, 1, 2, 4, 6, 7, 8, 10, 15, 16, 32}) {
         WriteAll(path, "old");
-        const PglFileHandle file = VarnekPGL_OpenFile(path.c_str(), row.flags);
-        ASSERT_NE(file, -1);
-        VarnekPGL_WriteFileByHandle(file, "new", 3);
-        EXPECT_EQ(VarnekPGL_CloseFile(file), 0);
-        EXPECT_EQ(ReadAll(path), row.result) << row.flags;
+        const PglFileHandle file = VarnekPGL_OpenFile(path.c_str(), flags);
+        const size_t written = VarnekPGL_WriteFileByHandle(file, "new", 3);
+        VarnekPGL_CloseFile(file);
+        Note("flags " + std::to_string(flags) + ": " + std::to_string(written) + " " + ReadAll(path),
+             file == -1 ? -1 : 0);
     }
-    for (int32_t flags : {0, 16, 32}) {
-        EXPECT_EQ(VarnekPGL_OpenFile(path.c_str(), flags), -1);
-    }
-    EXPECT_THAT(TakeLog(), IsEmpty());
 }
 
 TEST_F(File, PathsOf256CharactersAreRefused) {
@@ -95,16 +86,10 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
 }
 
 TEST_F(File, AFullDiskIsNotReportedAsStored) {
-    EXPECT_EQ(VarnekPGL_WriteFile("/dev/full", "abc", 3), 0);
-    EXPECT_EQ(VarnekPGL_AppendFile("/dev/full", "abc", 3), -1);
-    const auto lines = TakeErrors();
-    ASSERT_EQ(lines.size(), 3u);
-    EXPECT_THAT(lines[0], StartsWith("VarnekPGL_CloseFile : fail hFile = 0x"));
-    EXPECT_THAT(lines[1], StartsWith("VarnekPGL_CloseFile : fail hFile = 0x"));
-    EXPECT_EQ(lines[2], "VarnekPGL_AppendFile : name = /dev/full: Fail! write size = 0, desired size = 3");
     const std::string large(100000, 'x');
-    EXPECT_EQ(VarnekPGL_AppendFile("/dev/full", large.data(), 100000), -1);
-    EXPECT_THAT(TakeErrors()[0], HasSubstr("desired size = 100000"));
+    NOTE(VarnekPGL_WriteFile("/dev/full", "abc", 3));
+    NOTE(VarnekPGL_AppendFile("/dev/full", "abc", 3));
+    NOTE(VarnekPGL_AppendFile("/dev/full", large.data(), 100000));
 }
 
 TEST_F(File, SizesAndPositions) {
@@ -159,45 +144,23 @@ TEST_F(File, LogLinesOfThreadsAreCutAndNeverMix) {
 class LargeFile : public VarnekTest {};
 
 TEST_F(LargeFile, FlagsGiveTheirAccess) {
-    const struct {
-        int32_t flags;
-        int access;
-        bool creates;
-    } rows[] = {
-        {2, O_RDONLY, false},
-        {4, O_WRONLY, false},
-        {8, O_RDONLY | O_APPEND, false},
-        {12, O_WRONLY | O_APPEND, false},
-        {6, O_RDWR, false},
-        {14, O_RDWR, false},
-        {1, O_RDWR, true},
-        {3, O_RDWR, true},
-        {5, O_RDWR, true},
-        {7, O_RDWR, true},
-        {9, O_RDWR | O_APPEND, true},
-        {15, O_RDWR, true},
-    };
     const std::string path = Path("file");
-    for (const auto &row : rows) {
-        WriteAll(path, "kept");
-        const int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), row.flags);
-        EXPECT_EQ(fcntl(fd, F_GETFL) & (O_ACCMODE | O_APPEND), row.access) << row.flags;
-        VarnekPGL_CloseFile64Bits(fd);
-        EXPECT_EQ(ReadAll(path), "kept");
-        std::filesystem::remove(path);
-        const int32_t created = VarnekPGL_OpenFile64Bits(path.c_str(), row.flags);
-        EXPECT_EQ(created >= 0, row.creates) << row.flags;
-        if (created >= 0) {
+    for (int32_t flags = 0; flags < 16; flags++) {
+        for (const bool exists : {true, false}) {
+            std::filesystem::remove(path);
+            if (exists) {
+                WriteAll(path, "kept");
+            }
+            TakeLog();
+            const int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), flags);
+            const int access = fd < 0 ? -1 : fcntl(fd, F_GETFL) & (O_ACCMODE | O_APPEND);
             struct stat status = {};
-            fstat(created, &status);
-            EXPECT_EQ(status.st_mode & 0777u, 0644u);
-            VarnekPGL_CloseFile64Bits(created);
+            fstat(fd, &status);
+            Note("flags " + std::to_string(flags) + ", " + std::to_string(status.st_size) + " bytes", access);
+            EXPECT_TRUE(fd < 0 || exists || (status.st_mode & 0777u) == 0644);
+            VarnekPGL_CloseFile64Bits(fd);
         }
     }
-    EXPECT_THAT(TakeErrors()[0],
-                "[FULLSEG_64BIT_FILE]VarnekPGL_OpenFile64Bits: Invalid Hndl: -1 "
-                "Filename : [" +
-                    path + "]");
 }
 
 TEST_F(LargeFile, BeyondFourGiB) {
@@ -266,6 +229,9 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     ASSERT_EQ(VarnekPGL_MakeDir(present.c_str()), 0);
     PglFmFileAttributes attributes;
     PglDirEntryInfo info = {7, ""};
+    Show("pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()), "pid(PID) uid(UID");
+    Show("errno(" + std::to_string(EEXIST), "errno(EEXIST");
+    NOTE(VarnekPGL_MakeDir(present.c_str()));
     NOTE(VarnekPGL_MakeDir(tooLong.c_str()));
     NOTE(VarnekPGL_DeleteDirEx((none + "/").c_str()));
     NOTE(VarnekPGL_DeleteDirEx(""));
@@ -281,32 +247,24 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE));
     EXPECT_EQ(info.type, 0u);
     EXPECT_FALSE(std::filesystem::exists(none));
-
-    EXPECT_EQ(VarnekPGL_MakeDir(present.c_str()), -1);
-    const auto lines = TakeErrors();
-    ASSERT_EQ(lines.size(), 1u);
-    const std::string head =
-        "VarnekPGL_MakeDir : [" + present + "] dir create failed! errno(" + std::to_string(EEXIST) + "),process(";
-    const std::string tail = ") pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()) + ")";
-    EXPECT_THAT(lines[0], AllOf(StartsWith(head), ::testing::EndsWith(tail), HasSubstr("unit_tests")));
 }
 
 TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
     std::filesystem::create_directory(Path("sub"));
     WriteAll(Path("file"), "");
     std::filesystem::create_symlink("sub", Path("link"));
-    const uint32_t typeOf[] = {PGL_ENTRY_DIR, PGL_ENTRY_DIR, PGL_ENTRY_FILE, PGL_ENTRY_FILE, PGL_ENTRY_DIR};
-    const std::vector<std::string> names = {".", "..", "file", "link", "sub"};
+    const std::multimap<std::string, uint32_t> expectedTypes = {{".", PGL_ENTRY_DIR},
+                                                                {"..", PGL_ENTRY_DIR},
+                                                                {"file", PGL_ENTRY_FILE},
+                                                                {"link", PGL_ENTRY_FILE},
+                                                                {"sub", PGL_ENTRY_DIR}};
     void *dir = VarnekPGL_OpenDir(Path("").c_str());
     PglDirEntryInfo info;
-    size_t count = 0;
+    std::multimap<std::string, uint32_t> types;
     while (VarnekPGL_ReadDir(dir, &info)) {
-        const auto found = std::find(names.begin(), names.end(), info.name);
-        ASSERT_NE(found, names.end()) << info.name;
-        EXPECT_EQ(info.type, typeOf[found - names.begin()]) << info.name;
-        count++;
+        types.emplace(info.name, info.type);
     }
-    EXPECT_EQ(count, names.size());
+    EXPECT_EQ(types, expectedTypes);
     EXPECT_EQ(info.type, 0u);
     EXPECT_THAT(TakeErrors(), ElementsAre(StartsWith("__VarnekPGL_ReadDir : return FALSE pDir = 0x")));
     EXPECT_EQ(VarnekPGL_CloseDir(dir), TRUE);
@@ -431,18 +389,15 @@ TEST_F(Command, RefusalsKeepTheDestination) {
     std::filesystem::create_hard_link(destination, Path("same"));
     const std::string longPath(520, 'x');
     for (const std::string &source : {Path("none"), Path(""), Path("same"), destination, longPath, std::string()}) {
-        EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), destination.c_str()), -1) << source;
-        EXPECT_EQ(TakeErrors().back(), "VarnekPGL_CopyFile : fail src = " + source + " dest = " + destination);
-        EXPECT_EQ(ReadAll(destination), "kept");
+        NOTE(VarnekPGL_CopyFile(source.c_str(), destination.c_str()));
     }
-    EXPECT_EQ(VarnekPGL_CopyFile(destination.c_str(), longPath.c_str()), -1);
-    EXPECT_EQ(VarnekPGL_MoveFile(destination.c_str(), longPath.c_str()), -1);
-    EXPECT_EQ(VarnekPGL_MoveFile(nullptr, destination.c_str()), -1);
-    EXPECT_EQ(TakeErrors().back(), "VarnekPGL_MoveFile : fail src = (null) dest = " + destination);
+    NOTE(VarnekPGL_CopyFile(destination.c_str(), longPath.c_str()));
+    NOTE(VarnekPGL_MoveFile(destination.c_str(), longPath.c_str()));
+    NOTE(VarnekPGL_MoveFile(nullptr, destination.c_str()));
     EXPECT_EQ(ReadAll(destination), "kept");
 }
 
-TEST_F(Command, ChmodTakesThreeModesAndHandsBackTheStatus) {
+TEST_F(Command, ChmodTakesThreeModesAndReturnsTheStatus) {
     const std::string path = Path("file");
     WriteAll(path, "");
     for (int32_t mode : {666, 755, 777}) {
@@ -451,12 +406,9 @@ TEST_F(Command, ChmodTakesThreeModesAndHandsBackTheStatus) {
         stat(path.c_str(), &status);
         EXPECT_EQ(status.st_mode & 0777u, std::stoul(std::to_string(mode), nullptr, 8));
     }
-    EXPECT_EQ(VarnekPGL_Chmod(path.c_str(), 644), -1);
-    EXPECT_THAT(TakeLog(), IsEmpty());
-    EXPECT_EQ(VarnekPGL_Chmod(Path("none").c_str(), 666), 1 << 8) << "exit status 1, as system() has it";
-    EXPECT_THAT(TakeErrors(),
-                ElementsAre("VarnekPGL_Chmod : Could not change permission [chmod 666 " + Path("none") + "]"));
-    EXPECT_EQ(VarnekPGL_Chmod(std::string(505, 'x').c_str(), 666), -1);
+    NOTE(VarnekPGL_Chmod(path.c_str(), 644));
+    NOTE(VarnekPGL_Chmod(Path("none").c_str(), 666));  // exit status 1, as system() returns it
+    NOTE(VarnekPGL_Chmod(std::string(505, 'x').c_str(), 666));
 }
 
 }  // namespace

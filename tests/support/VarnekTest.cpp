@@ -94,10 +94,10 @@ void VarnekTest::TearDown() {
         }
     }
     if (!transcript_.empty()) {
-        const std::regex handle(
-            "((?:linux ?[A-Z][a-z]+=|[pP]threadI[dD] = |tv_n?sec)\\[|(?:process|[pu]id)\\(|(?:pDir|hFile|handle) = 0x)"
-            "[^\\]), \n]*");
-        transcript_ = std::regex_replace(transcript_, handle, "$1*");
+        const std::regex system(
+            "((?:linux ?[A-Z][a-z]+=|[pP]threadI[dD] = |tv_n?sec)\\[|[pu]id\\((?=\\d)|(?:pDir|hFile|handle) = 0x)"
+            "[^\\]), \n]*|(process\\()[^)]*/");
+        transcript_ = std::regex_replace(transcript_, system, "$1$2*");
         const auto &test = *::testing::UnitTest::GetInstance()->current_test_info();
         const std::string path = std::string(VARNEK_EXPECTED) + test.test_suite_name() + "." + test.name() + ".txt";
         if (getenv("VARNEK_WRITE_EXPECTED") != nullptr) {
