@@ -81,12 +81,7 @@ TEST_F(Thread, FailuresHaveTheirLineAndResult) {
     for (int32_t priority : {0, 100, 50}) {
         NOTE(VarnekPGL_CreateThread("x", priority, 0, nullptr, nullptr));
     }
-    for (int i = 1; i <= 20; i++) {
-        EXPECT_EQ(VarnekPGL_CreateThread(std::to_string(i).c_str(), 1, 0, Nothing, nullptr), i);
-    }
-    NOTE(VarnekPGL_CreateThread("21", 1, 0, Nothing, nullptr));
-    EXPECT_TRUE(VarnekPGL_DeleteThread(20));
-    EXPECT_EQ(VarnekPGL_CreateThread("21", 1, 0, Nothing, nullptr), 21);
+    EXPECT_EQ(VarnekPGL_CreateThread("x", 50, 0, Nothing, nullptr), 1) << "a failure takes no handle";
 }
 
 TEST_F(Thread, ADuplicateTakesTheRecord) {

@@ -46,10 +46,6 @@ TEST_F(Timer, HandlesAreSlotsAndNamesAreUnique) {
     EXPECT_TRUE(VarnekPGL_IsTimerActive(0)) << "the duplicate left it alone";
     EXPECT_TRUE(VarnekPGL_DeleteTimer(0));
     EXPECT_EQ(VarnekPGL_CreateTimer("again"), 0);
-    for (int i = 2; i < 32; i++) {
-        EXPECT_EQ(VarnekPGL_CreateTimer(std::to_string(i).c_str()), i);
-    }
-    NOTE(VarnekPGL_CreateTimer("one more"));
     VarnekPGL_DestoryTimerSystem();
     EXPECT_EQ(VarnekPGL_GetTimerByName("again"), 0);
 }

@@ -36,7 +36,14 @@ struct Message {
     int32_t urgent;  // or the record that it is meant for
     char filled[24];
 };
-static_assert(sizeof(Message) == sizeof(THREAD_MSG));
+
+template <typename To, typename From>
+To As(const From &from) {
+    static_assert(sizeof(To) == sizeof from);
+    To to;
+    memcpy(&to, &from, sizeof to);
+    return to;
+}
 
 // What one thread did and saw. Other threads use only the atomics and the ring.
 struct Worker {
@@ -78,8 +85,7 @@ void Send(Worker &me) {
     const BOOL urgent = me.Below(8) == 0 ? TRUE : FALSE;
     Message message{urgent ? ++me.urgentSent : ++me.sent[to], me.index, urgent, {}};
     memset(message.filled, static_cast<char>(message.number), sizeof message.filled);
-    THREAD_MSG out;
-    memcpy(&out, &message, sizeof out);
+    const auto out = As<THREAD_MSG>(message);
     CHECK((urgent ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage)(gWorkers[to].handle, &out) == TRUE);
 }
 
@@ -89,8 +95,7 @@ bool Receive(Worker &me, bool peek) {
     if ((peek ? VarnekPGL_PeekMessage(&in, &left) : VarnekPGL_ReceiveMessage(0, &in, &left)) != TRUE) {
         return false;
     }
-    Message message;
-    memcpy(&message, &in, sizeof message);
+    const auto message = As<Message>(in);
     char expected[sizeof message.filled];
     memset(expected, static_cast<char>(message.number), sizeof expected);
     CHECK(left >= 0 && memcmp(message.filled, expected, sizeof expected) == 0);
@@ -207,8 +212,7 @@ void *ReceiveAll(void *argument) {
     int32_t count = 0;
     // A removal before the first look is no error: a removed thread has no handle.
     while (self != -1 && VarnekPGL_ReceiveMessage(WAIT_FOREVER, &in, &count) == TRUE) {
-        Message message;
-        memcpy(&message, &in, sizeof message);
+        const auto message = As<Message>(in);
         CHECK(message.urgent == self && message.number == next[message.from]++);
         ++parent.taken;
     }
@@ -242,10 +246,9 @@ void UseOthers(Worker &me) {
     }
     me.latest[other.index] = thread;
     Message message{0, me.index, thread, {}};
-    THREAD_MSG out;
-    do {
-        memcpy(&out, &message, sizeof out);
-    } while (VarnekPGL_SendMessage(thread, &out) == TRUE && ++message.number < 2000);
+    for (auto out = As<THREAD_MSG>(message); VarnekPGL_SendMessage(thread, &out) == TRUE && ++message.number < 2000;) {
+        out = As<THREAD_MSG>(message);
+    }
     me.passed += message.number;
 }
 

@@ -38,20 +38,10 @@ std::vector<LogLine> TakeLog() {
     return lines;
 }
 
-std::vector<std::string> TakeBodies(const std::string &tag) {
+std::vector<std::string> TakeBodies(const std::string &tag, int priority) {
     std::vector<std::string> bodies;
     for (const LogLine &line : TakeLog()) {
-        if (tag.empty() || line.tag == tag) {
-            bodies.push_back(line.Body());
-        }
-    }
-    return bodies;
-}
-
-std::vector<std::string> TakeErrors() {
-    std::vector<std::string> bodies;
-    for (const LogLine &line : TakeLog()) {
-        if (line.priority == 6) {
+        if ((tag.empty() || line.tag == tag) && (priority == 0 || line.priority == priority)) {
             bodies.push_back(line.Body());
         }
     }

@@ -30,11 +30,11 @@ struct LogLine {
 // Every line since the last call. Lines of all threads, in the order of their writes.
 std::vector<LogLine> TakeLog();
 
-// The bodies of all lines since the last call; with a tag, only of lines under it.
-std::vector<std::string> TakeBodies(const std::string &tag = "");
+// The bodies of all lines since the last call, or only of those with this tag and this priority.
+std::vector<std::string> TakeBodies(const std::string &tag = "", int priority = 0);
 
 // The bodies of the Error traces and storage failures since the last call.
-std::vector<std::string> TakeErrors();
+inline std::vector<std::string> TakeErrors() { return TakeBodies("", 6); }
 
 // Called for each line before it is captured, without a lock; null for none.
 extern void (*gLogHook)(const LogLine &line);
