@@ -33,12 +33,9 @@ class ConfigAlone : public VarnekTest {
 
 std::string File(const std::string &area, int64_t standard, int capture, int simulation, int64_t delay,
                  const std::string &nation) {
-    const auto line = [](const char *key, const std::string &value) {
-        return "CONFIG_" + std::string(key) + "=" + value + "\n";
-    };
-    return line("CURRENTAREANAME", area) + line("STANDARDTYPE", std::to_string(standard)) +
-           line("TSCAPTURE", std::to_string(capture)) + line("TSFILESIMUL", std::to_string(simulation)) +
-           line("CPRMPLAYER_DELAY", std::to_string(delay)) + line("SUPPORT_NATION", nation);
+    return "CONFIG_CURRENTAREANAME=" + area + "\nCONFIG_STANDARDTYPE=" + std::to_string(standard) +
+           "\nCONFIG_TSCAPTURE=" + std::to_string(capture) + "\nCONFIG_TSFILESIMUL=" + std::to_string(simulation) +
+           "\nCONFIG_CPRMPLAYER_DELAY=" + std::to_string(delay) + "\nCONFIG_SUPPORT_NATION=" + nation + "\n";
 }
 
 TEST_F(ConfigAlone, SavesOnChangeAndLoadsOnDemand) {

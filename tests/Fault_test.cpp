@@ -7,7 +7,6 @@
 #include <cstring>
 #include <filesystem>
 #include <functional>
-#include <future>
 #include <memory>
 
 #include "Varnek_CBitInputStream.h"
@@ -23,16 +22,11 @@
 #include "support/FailingCalls.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"
+#include "support/Worker.h"
 
 namespace {
 
-class Fault : public VarnekTest {
-  public:
-    void UseOwnQueue();
-
-  protected:
-    std::promise<void> done_;
-};
+class Fault : public VarnekTest {};
 
 // Notes a call of the library during which the next call of a function fails.
 #define FAULT(function, error, ...)                                                                  \
@@ -53,32 +47,27 @@ TEST_F(Fault, MutexesAndSemaphores) {
     EXPECT_TRUE(VarnekPGL_WaitSemaphore(sem, 0) && VarnekPGL_WaitSemaphore(sem, 0));
 }
 
-// Lets operations on the queue of the registered thread fail. Its handle is 1.
-void Fault::UseOwnQueue() {
-    const THREAD_MSG message = {};
-    THREAD_MSG received;
-    int32_t count = -1;
-    const auto send = [&] { return VarnekPGL_SendMessage(1, &message); };
-    const auto urgent = [&] { return VarnekPGL_SendUrgentMessage(1, &message); };
-    const auto receive = [&](uint32_t timeout) { return VarnekPGL_ReceiveMessage(timeout, &received, &count); };
-    FAULT("malloc", ENOMEM, send());
-    FAULT("malloc", ENOMEM, urgent());
-    FAULT("sem_getvalue", EINVAL, send());
-    FAULT("sem_getvalue", EINVAL, receive(0));
-    NOTE(receive(0));  // a failed send leaves neither a message nor a signal
-    FAULT("sem_post", EOVERFLOW, send());
-    FAULT("sem_post", EOVERFLOW, urgent());
-    FAULT("sem_wait", EINTR, receive(WAIT_FOREVER));
-    FAULT("clock_gettime", EFAULT, receive(7));
-    EXPECT_TRUE(VarnekPGL_PeekMessage(&received, &count)) << "a message whose post failed stays queued";
-    EXPECT_EQ(count, 1);
-    done_.set_value();
-}
-
 TEST_F(Fault, Messages) {
-    const auto run = [](void *self) { return static_cast<Fault *>(self)->UseOwnQueue(), self; };
-    ASSERT_EQ(VarnekPGL_CreateThread("self", 1, 0, run, this), 1);
-    done_.get_future().wait();
+    const auto useOwnQueue = [this] {
+        const THREAD_MSG message = {};
+        THREAD_MSG received;
+        int32_t count = -1;
+        const auto send = [&] { return VarnekPGL_SendMessage(1, &message); };
+        const auto urgent = [&] { return VarnekPGL_SendUrgentMessage(1, &message); };
+        const auto receive = [&](uint32_t timeout) { return VarnekPGL_ReceiveMessage(timeout, &received, &count); };
+        FAULT("malloc", ENOMEM, send());
+        FAULT("malloc", ENOMEM, urgent());
+        FAULT("sem_getvalue", EINVAL, send());
+        FAULT("sem_getvalue", EINVAL, receive(0));
+        NOTE(receive(0));  // a failed send leaves neither a message nor a signal
+        FAULT("sem_post", EOVERFLOW, send());
+        FAULT("sem_post", EOVERFLOW, urgent());
+        FAULT("sem_wait", EINTR, receive(WAIT_FOREVER));
+        FAULT("clock_gettime", EFAULT, receive(7));
+        EXPECT_TRUE(VarnekPGL_PeekMessage(&received, &count)) << "a message whose post failed stays queued";
+        EXPECT_EQ(count, 1);
+    };
+    Worker(useOwnQueue).Wait();
     NOTE(VarnekPGL_DeleteThread(1));
 }
 

@@ -16,6 +16,8 @@
 
 namespace {
 
+namespace fs = std::filesystem;
+
 using ::testing::AllOf;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
@@ -37,9 +39,9 @@ TEST_F(File, FlagsResolveInTheirOrder) {
 }
 
 TEST_F(File, PathsOf256CharactersAreRefused) {
-    std::string path = std::filesystem::absolute(Path("")).string();
+    std::string path = fs::absolute(Path("")).string();
     const std::string folder = path + std::string(100, 'd');
-    std::filesystem::create_directory(folder);
+    fs::create_directory(folder);
     path = folder + "/";
     path += std::string(255 - path.size(), 'f');
     EXPECT_EQ(VarnekPGL_WriteFile(path.c_str(), "x", 1), 1);
@@ -115,7 +117,7 @@ TEST_F(File, SizesAndPositions) {
 
     const std::string large = Path("large");
     WriteAll(large, "");
-    std::filesystem::resize_file(large, 5LL << 30);
+    fs::resize_file(large, 5LL << 30);
     EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), 0);
     const PglFileHandle beyond = VarnekPGL_OpenFile(large.c_str(), PGL_FILE_MODE_READ);
     if (beyond != -1 && sizeof(long) == 8) {  // on 32 bits there is no such position
@@ -147,7 +149,7 @@ TEST_F(LargeFile, FlagsGiveTheirAccess) {
     const std::string path = Path("file");
     for (int32_t flags = 0; flags < 16; flags++) {
         for (const bool exists : {true, false}) {
-            std::filesystem::remove(path);
+            fs::remove(path);
             if (exists) {
                 WriteAll(path, "kept");
             }
@@ -246,13 +248,13 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_FmGetFileAttributes(none.c_str(), &attributes));
     NOTE(VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE));
     EXPECT_EQ(info.type, 0u);
-    EXPECT_FALSE(std::filesystem::exists(none));
+    EXPECT_FALSE(fs::exists(none));
 }
 
 TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
-    std::filesystem::create_directory(Path("sub"));
+    fs::create_directory(Path("sub"));
     WriteAll(Path("file"), "");
-    std::filesystem::create_symlink("sub", Path("link"));
+    fs::create_symlink("sub", Path("link"));
     const std::multimap<std::string, uint32_t> expectedTypes = {{".", PGL_ENTRY_DIR},
                                                                 {"..", PGL_ENTRY_DIR},
                                                                 {"file", PGL_ENTRY_FILE},
@@ -279,41 +281,41 @@ TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
 
 TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
     const std::string outside = Path("outside");
-    std::filesystem::create_directory(outside);
+    fs::create_directory(outside);
     WriteAll(outside + "/kept", "kept");
     for (const char *suffix : {"", "/", "\\", "//"}) {
         const std::string tree = Path("tree");
         std::string level = tree;
         for (int depth = 0; depth < 60 && level.size() < 240; depth++) {
-            std::filesystem::create_directory(level);
+            fs::create_directory(level);
             WriteAll(level + "/f", "");
             level += "/d";
         }
-        std::filesystem::create_directory_symlink("../outside", tree + "/link");
-        std::filesystem::create_symlink("nowhere", tree + "/dangling");
+        fs::create_directory_symlink("../outside", tree + "/link");
+        fs::create_symlink("nowhere", tree + "/dangling");
         // A 32-bit system cannot stat what has such times.
         ASSERT_EQ(system(("touch -h -d @4102444800 " + tree + "/link").c_str()), 0);
         EXPECT_EQ(VarnekPGL_DeleteDir((tree + suffix).c_str()), 0) << suffix;
-        EXPECT_FALSE(std::filesystem::exists(tree));
+        EXPECT_FALSE(fs::exists(tree));
         EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
     }
     for (const char *suffix : {"", "/", "//", "/.", "/.//"}) {
-        std::filesystem::create_directory_symlink("outside", Path("root"));
+        fs::create_directory_symlink("outside", Path("root"));
         EXPECT_EQ(VarnekPGL_DeleteDirEx((Path("root") + suffix).c_str()), 0) << suffix;
-        EXPECT_FALSE(std::filesystem::exists(std::filesystem::symlink_status(Path("root"))));
+        EXPECT_FALSE(fs::exists(fs::symlink_status(Path("root"))));
         EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
     }
     EXPECT_EQ(VarnekPGL_ClearDir(outside.c_str()), 0);
-    EXPECT_TRUE(std::filesystem::is_empty(outside));
+    EXPECT_TRUE(fs::is_empty(outside));
 }
 
 TEST_F(Directory, ADirectoryThatIsSwappedForALinkIsNotEntered) {
     const std::string outside = Path("outside"), inner = Path("tree/inner");
-    std::filesystem::create_directory(outside);
+    fs::create_directory(outside);
     WriteAll(outside + "/kept", "kept");
     for (int i = 0; i < 1000; i++) {
-        std::filesystem::create_directories(inner);
-        std::filesystem::create_directory_symlink(outside, Path("link"));
+        fs::create_directories(inner);
+        fs::create_directory_symlink(outside, Path("link"));
         std::thread swapper([&] {
             rename(inner.c_str(), Path("aside").c_str());
             rename(Path("link").c_str(), inner.c_str());
@@ -322,25 +324,25 @@ TEST_F(Directory, ADirectoryThatIsSwappedForALinkIsNotEntered) {
         swapper.join();
         ASSERT_EQ(ReadAll(outside + "/kept"), "kept");
         for (const char *left : {"tree", "aside", "link"}) {
-            std::filesystem::remove_all(Path(left));
+            fs::remove_all(Path(left));
         }
     }
 }
 
 TEST_F(Directory, WhatCannotBeDeletedStaysAndIsReported) {
     const std::string tree = Path("tree");
-    std::filesystem::create_directory(tree);
+    fs::create_directory(tree);
     WriteAll(tree + "/gone", "");
     std::string deep = tree;
     while (deep.size() + 60 < 256) {
         deep += "/" + std::string(50, 'd');
-        std::filesystem::create_directory(deep);
+        fs::create_directory(deep);
     }
     const std::string kept = deep + "/" + std::string(100, 'k');
     WriteAll(kept, "kept");
     EXPECT_EQ(VarnekPGL_DeleteDirEx(tree.c_str()), -1);
     EXPECT_EQ(ReadAll(kept), "kept");
-    EXPECT_FALSE(std::filesystem::exists(tree + "/gone"));
+    EXPECT_FALSE(fs::exists(tree + "/gone"));
     EXPECT_THAT(TakeErrors(),
                 ::testing::IsSupersetOf({"VarnekPGL_DeleteDirEx : exceed max file path length : " + kept,
                                          "VarnekPGL_DeleteDirEx : rmdir[" + tree + "] Fail. return FALSE"}));
@@ -363,8 +365,8 @@ TEST_F(Command, TimesBeyond2038DoNoHarm) {
 }
 
 TEST_F(Command, AnyPathIsOneWord) {
-    const std::filesystem::path home = std::filesystem::current_path();
-    std::filesystem::current_path(Path(""));
+    const fs::path home = fs::current_path();
+    fs::current_path(Path(""));
     for (const char *name :
          {"plain", "two words", "it's", "\"quoted\"", "semi;touch hurt", "`touch hurt`", "$(touch hurt)", "$HOME",
           "new\nline", "-rf", "- x", "*", "~", "a\\b", "&", "#c", "\xC3\xA9t\xC3\xA9", "'; touch hurt; '"}) {
@@ -378,15 +380,15 @@ TEST_F(Command, AnyPathIsOneWord) {
         EXPECT_EQ(access(name, X_OK), 0) << name;
         EXPECT_EQ(VarnekPGL_DeleteFile(name), 0) << name;
     }
-    EXPECT_FALSE(std::filesystem::exists("hurt"));
+    EXPECT_FALSE(fs::exists("hurt"));
     EXPECT_THAT(TakeErrors(), IsEmpty());
-    std::filesystem::current_path(home);
+    fs::current_path(home);
 }
 
 TEST_F(Command, RefusalsKeepTheDestination) {
     const std::string destination = Path("destination");
     WriteAll(destination, "kept");
-    std::filesystem::create_hard_link(destination, Path("same"));
+    fs::create_hard_link(destination, Path("same"));
     const std::string longPath(520, 'x');
     for (const std::string &source : {Path("none"), Path(""), Path("same"), destination, longPath, std::string()}) {
         NOTE(VarnekPGL_CopyFile(source.c_str(), destination.c_str()));

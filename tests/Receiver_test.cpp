@@ -15,6 +15,7 @@
 #include "BroadcastText.h"
 #include "BroadcastTime.h"
 #include "Paragraphs.h"
+#include "Varnek_Version.h"
 #include "support/Families.h"
 #include "support/ReceiverRun.h"
 #include "support/VarnekTest.h"
@@ -24,9 +25,30 @@ namespace {
 
 using namespace streamwriter;
 using ::testing::ElementsAre;
-using ::testing::HasSubstr;
 
-class Receiver : public VarnekTest {};
+struct Result {
+    int status;
+    std::string out, err;
+};
+
+Result RunProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
+    Result result;
+    result.out = Written([&](std::FILE *out) {
+        result.err = Written([&](std::FILE *err) { result.status = RunReceiver(arguments, {out, err, stop}); });
+    });
+    return result;
+}
+
+class Receiver : public VarnekTest {
+  protected:
+    // Runs the program and notes its status, its errors and the beginning of its output.
+    Result NoteProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
+        const Result result = RunProgram(arguments, stop);
+        Note(::testing::PrintToString(arguments) + " = " + std::to_string(result.status) + "\n" + result.err);
+        Note(result.out.substr(0, 450) + "\n");
+        return result;
+    }
+};
 
 Bytes Fill(size_t size, unsigned char value) { return Bytes(size, value); }
 
@@ -43,17 +65,9 @@ Bytes Numbered(size_t first, size_t count, const Bytes &lead = {}, const Bytes &
 
 std::string SampleText() { return ReadAll(VARNEK_SAMPLE); }
 
-Bytes Random(std::mt19937 &random, size_t size) {
-    Bytes bytes(size);
-    for (unsigned char &byte : bytes) {
-        byte = Low(random());
-    }
-    return bytes;
-}
-
 TEST_F(Receiver, FindsPacketsInAnyCompany) {
     std::mt19937 random(47);
-    const Bytes stamp = Fill(4, 0x11), parity = Fill(16, 0x22), noise = Random(random, 300);
+    const Bytes stamp = Fill(4, 0x11), parity = Fill(16, 0x22), noise = RandomBytes(random, 300);
     Bytes damaged = Numbered(0, 20), cut = Numbered(0, 20), table, datagrams, text;
     damaged[1316] = 0x46;  // the eighth's sync byte
     cut.erase(cut.begin() + 1000, cut.begin() + 1040);
@@ -88,7 +102,7 @@ TEST_F(Receiver, FindsPacketsInAnyCompany) {
         {"less than a packet", Fill(187, 0x47), 0, 0, 0, 0},
         {"a table with even strides", noise + table, 0, 0, 0, 0},
         {"text", text, 0, 0, 0, 0},
-        {"noise", Random(random, 3000000), 0, 0, 0, 0},
+        {"noise", RandomBytes(random, 3000000), 0, 0, 0, 0},
     };
     for (const auto &c : cases) {
         for (const size_t block : {size_t{1}, size_t{190}, size_t{65536}}) {
@@ -407,19 +421,6 @@ TEST_F(Receiver, BreaksLines) {
     }
 }
 
-struct Result {
-    int status;
-    std::string out, err;
-};
-
-Result RunProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
-    Result result;
-    result.out = Written([&](std::FILE *out) {
-        result.err = Written([&](std::FILE *err) { result.status = RunReceiver(arguments, {out, err, stop}); });
-    });
-    return result;
-}
-
 TEST_F(Receiver, AnswersEveryInput) {
     WriteAll(Path("empty"), "");
     WriteAll(Path("text"), std::string(9999, 'x'));
@@ -431,6 +432,7 @@ TEST_F(Receiver, AnswersEveryInput) {
     WriteAll(Path("-dash"), long_stream);
     const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, Fill(4, 0)) + Fill(9000, 0x11);
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
+    Show("receiver " + std::to_string(VARNEK_VERSION_MAJOR), "receiver MAJOR");
     const std::vector<std::string> cases[] = {
         {},
         {"--nonsense", Path("text")},
@@ -438,6 +440,7 @@ TEST_F(Receiver, AnswersEveryInput) {
         {Path("text"), "--capture"},
         {"--region", "64", Path("text")},
         {"--help"},
+        {"--version"},
         {Path("missing")},
         {std::string(300, 'x')},
         {"--json", Path("empty")},
@@ -448,11 +451,8 @@ TEST_F(Receiver, AnswersEveryInput) {
         {"--", Path("-dash")},
     };
     for (const std::vector<std::string> &arguments : cases) {
-        const Result result = RunProgram(arguments);
-        Note(::testing::PrintToString(arguments) + " = " + std::to_string(result.status) + "\n");
-        Note(result.err + result.out.substr(0, 500) + "\n");
+        NoteProgram(arguments);
     }
-    EXPECT_EQ(RunProgram({"--version"}).out.find("receiver 1."), 0u);
     std::FILE *full = std::fopen("/dev/full", "w");
     ASSERT_NE(full, nullptr);
     EXPECT_EQ(RunReceiver({VARNEK_SAMPLE}, {full, stderr}), 1);
@@ -470,10 +470,7 @@ TEST_F(Receiver, ReportsAReadError) {
     ASSERT_EQ(write(terminal, packets.data(), packets.size()), static_cast<ssize_t>(packets.size()));
     close(terminal);
     ASSERT_EQ(dup2(input, STDIN_FILENO), STDIN_FILENO);
-    const Result result = RunProgram({"-"});
-    EXPECT_EQ(result.status, 1);
-    EXPECT_THAT(result.out, HasSubstr("10 packets of 188 bytes"));
-    EXPECT_EQ(result.err, "receiver: -: read failed: Input/output error\n");
+    NoteProgram({"-"});
 }
 
 // The other end of the pipe writes nothing.
@@ -485,60 +482,49 @@ TEST_F(Receiver, StopsWhileItWaits) {
         std::this_thread::sleep_for(std::chrono::milliseconds(50));
         stop = true;
     });
-    const Result result = RunProgram({Path("pipe")}, &stop);
+    NoteProgram({Path("pipe")}, &stop);
     user.join();
     close(other_end);
-    EXPECT_EQ(result.status, 130);
-    EXPECT_THAT(result.out, HasSubstr("0 packets"));
-    EXPECT_EQ(result.err, "");
 }
 
 // Fills the registry of a family, and frees a place for each run until a run has all that it needs.
 TEST_F(Receiver, LeavesNothingBehind) {
-    const std::string expected = RunProgram({"--json", VARNEK_SAMPLE}).out;
     Show(VARNEK_SAMPLE, "SAMPLE");
+    const std::string expected = RunProgram({"--json", VARNEK_SAMPLE}).out;
     for (const Family &family : kFamilies) {
         std::vector<int32_t> fillers = family.Fill();
         for (bool enough = false; !enough; fillers.pop_back()) {
-            const Result result = RunProgram({"--json", VARNEK_SAMPLE});
+            const Result result = NoteProgram({"--json", VARNEK_SAMPLE});
             enough = result.status == 0;
             EXPECT_EQ(result.out, enough ? expected : "");
-            Note("with room for " + std::to_string(family.Room()) + " " + family.name + " = " +
-                 std::to_string(result.status) + "\n" + result.err);
+            Note("There was room for " + std::to_string(family.Room()) + " " + family.name + ".\n");
             ASSERT_FALSE(fillers.empty());
             family.remove(fillers.back());
         }
-        for (const int32_t handle : fillers) {
-            family.remove(handle);
-        }
+        std::for_each(fillers.begin(), fillers.end(), family.remove);
     }
 }
 
 // A capture has the packets that the tables come from. It is a stream with the same tables.
 TEST_F(Receiver, Captures) {
+    Show(VARNEK_SAMPLE, "SAMPLE");
     const std::string captured = Path("captured.ts");
     WriteAll(captured, std::string(1000000, 'x'));
     WriteAll(Path("text"), std::string(9999, 'x'));
-    EXPECT_EQ(RunProgram({"--capture", captured, Path("text")}).status, 1);
+    NoteProgram({"--capture", captured, Path("text")});
     EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "there was nothing to write";
 
-    const Result first = RunProgram({"--json", "--quiet", "--capture", captured, VARNEK_SAMPLE});
-    EXPECT_EQ(first.status, 0) << first.err;
+    const Result first = NoteProgram({"--json", "--quiet", "--capture", captured, VARNEK_SAMPLE});
     EXPECT_LT(ReadAll(captured).size(), SampleText().size());
-    const Result again = RunProgram({"--json", captured});
+    const Result again = NoteProgram({"--json", captured});
     const auto tables = [](const Result &result) {
-        const size_t begin = result.out.find("\"sections\"");
-        return result.out.substr(begin, result.out.find("\"pids\"") - begin) +
-               result.out.substr(result.out.find("\"transport_stream_id\""));
+        return result.out.substr(result.out.find("\"transport_stream_id\""));
     };
     EXPECT_EQ(tables(again), tables(first));
 
-    EXPECT_EQ(RunProgram({"--capture", captured, captured}).status, 1) << "a stream is not overwritten";
-    EXPECT_EQ(RunProgram({"--capture", Path(""), captured}).status, 1);
-    const Result full = RunProgram({"--capture", "/dev/full", VARNEK_SAMPLE});
-    EXPECT_EQ(full.status, 1);
-    EXPECT_THAT(full.err, HasSubstr("the capture ended early: no space is left"));
-    EXPECT_THAT(full.out, HasSubstr("1600 packets")) << "the reading goes on";
+    NoteProgram({"--capture", captured, captured});  // a stream is not overwritten
+    NoteProgram({"--capture", Path(""), captured});
+    NoteProgram({"--capture", "/dev/full", VARNEK_SAMPLE});  // the reading goes on
 }
 
 // On a damaged stream too, the program's threads give the report that one thread gives.

@@ -11,6 +11,7 @@
 #include "../CommonUtility/source/Varnek_SlotTable.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"
+#include "support/Worker.h"
 
 namespace {
 
@@ -23,34 +24,6 @@ THREAD_MSG Message(char text) {
     memset(message.data, text, sizeof message.data);
     return message;
 }
-
-// A registered thread that carries out one piece of work; Wait gives the time when it is done.
-class Worker {
-  public:
-    explicit Worker(std::function<void()> work, const char *name = "worker")
-        : work_(std::move(work)), handle_(VarnekPGL_CreateThread(name, 50, 256 * 1024, Run, this)) {}
-    ~Worker() { Wait(); }
-
-    int32_t Handle() const { return handle_; }
-    void Wait() {
-        if (handle_ != -1) {
-            done_.get_future().wait();
-            handle_ = -1;
-        }
-    }
-
-  private:
-    static void *Run(void *self) {
-        auto *worker = static_cast<Worker *>(self);
-        worker->work_();
-        worker->done_.set_value();
-        return nullptr;
-    }
-
-    std::function<void()> work_;
-    std::promise<void> done_;
-    int32_t handle_;
-};
 
 class Thread : public VarnekTest {};
 class MessageQueue : public VarnekTest {};
@@ -127,17 +100,13 @@ TEST_F(Thread, AThreadFindsItselfFirstOfAll) {
 
 TEST_F(Thread, AThreadWithAnEndedThreadsSystemIdIsUnknown) {
     pthread_t ended{};
-    Worker worker([&ended] { ended = pthread_self(); });
-    worker.Wait();
-    for (int i = 0; i < 100; i++) {
-        bool same = false;
+    Worker([&ended] { ended = pthread_self(); }).Wait();
+    bool same = false;
+    for (int i = 0; i < 100 && !same; i++) {
         std::thread([&same, ended] {
             same = pthread_equal(ended, pthread_self()) != 0;
             EXPECT_EQ(VarnekPGL_GetCurrentThread(), -1);
         }).join();
-        if (same) {
-            return;
-        }
     }
 }
 

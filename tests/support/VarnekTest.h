@@ -7,8 +7,11 @@
 #include <gtest/gtest.h>
 #include <sys/types.h>
 
+#include <algorithm>
 #include <atomic>
 #include <chrono>
+#include <functional>
+#include <random>
 #include <string>
 #include <thread>
 #include <utility>
@@ -41,6 +44,12 @@ extern void (*gLogHook)(const LogLine &line);
 
 std::string ReadAll(const std::string &path);
 void WriteAll(const std::string &path, const std::string &content);
+
+inline std::vector<unsigned char> RandomBytes(std::mt19937 &random, size_t size) {
+    std::vector<unsigned char> bytes(size);
+    std::generate(bytes.begin(), bytes.end(), std::ref(random));
+    return bytes;
+}
 
 // Runs work(0), work(1) ... in as many threads, which start it at the same moment.
 template <typename Work>
