@@ -13,16 +13,8 @@
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
 
-// A file in the library's data directory. It is rewritten in place, since a new file each time would cost more than all
-// the rest.
-class DataFile {
-  public:
-    explicit DataFile(const char *name) : name_(name) {}
-    void Write(const std::string &content) const;
-
-  private:
-    const std::string name_;
-};
+// Writes a file in the library's data directory in place, since a new file each time would cost more than all the rest.
+void WriteDataFile(const std::string &name, const std::string &content);
 
 // The input's bytes in order, and zeros after its end.
 class Input {

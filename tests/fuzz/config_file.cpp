@@ -6,9 +6,8 @@
 #include "Varnek_Config.h"
 
 int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
-    static const DataFile file("Varnek_Config.cfg");
     Input input(data, size);
-    file.Write(input.Text().data());
+    WriteDataFile("Varnek_Config.cfg", input.Text().data());
     const std::vector<char> feature = input.Text();
     gFeature = feature.data();
 

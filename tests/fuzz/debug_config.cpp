@@ -22,8 +22,7 @@ void OnLog(int, const char *tag, const char *text) {
 
 // How many traces of each level and of each module get through when all are tried.
 Masks Load(const std::string &text) {
-    static const DataFile file("debug_ltn.ini");
-    file.Write(text);
+    WriteDataFile("debug_ltn.ini", text);
     gShown = 0;
     VarnekPGL_InitializeDebug();
     Masks passing;
