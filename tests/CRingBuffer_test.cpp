@@ -55,8 +55,8 @@ TEST_F(RingBuffer, EveryRefusalHasItsLine) {
     NOTE(ring.Reset(0));
     NOTE(ring.Reset(8));
     NOTE(VarnekCRingBuffer(-1).GetDistance());
-    // The writer's and the reader's position and loop count: in an overflow, in an underflow within a lap and over
-    // laps, and a lap too far apart.
+    // The positions and the loop counts of writer and reader: an overflow, an underflow within a lap and over laps, and
+    // one lap too many.
     Fields state = FieldsOf(ring);
     const int states[][4] = {{3, 2, 1, 0}, {2, 3, 0, 0}, {2, 2, 0, 1}, {2, 3, 2, 0}};
     for (const auto &[w, r, wl, rl] : states) {

@@ -1,4 +1,4 @@
-// The owning string against an optional std::string, and what it owns.
+// Compares the owning string with an optional std::string, and checks its memory.
 #include "Varnek_CString.h"
 
 #include <cstring>
@@ -89,8 +89,8 @@ TEST_F(String, OwnsItsArrayAndNoOther) {
     const VarnekCString null(nullptr);
     EXPECT_EQ((copy == null) + (copy < null), 0);
     const auto lines = TakeLog();
-    EXPECT_EQ(lines[0].priority, 4) << "a question about null strings is High";
-    EXPECT_EQ(lines[1].priority, 6) << "an order of null strings is an Error";
+    EXPECT_EQ(lines[0].priority, 4) << "a comparison for equality traces null strings as High";
+    EXPECT_EQ(lines[1].priority, 6) << "a comparison for order traces null strings as an Error";
 }
 
 }  // namespace

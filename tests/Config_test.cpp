@@ -1,5 +1,4 @@
-// The configuration file: what is loaded from hostile and from friendly ones, what is saved, and
-// where the nation comes from. The file is put back as it was.
+// The configuration file: loads of well-formed and of hostile files, saves, and the source of the nation.
 #include "Varnek_Config.h"
 
 #include <fcntl.h>
@@ -21,7 +20,7 @@ const std::string kPath = VARNEK_DATA_DIR "Varnek_Config.cfg";
 
 class ConfigAlone : public VarnekTest {
   protected:
-    // What is saved after this was loaded.
+    // Loads this content, saves the settings and returns the saved file.
     static std::string Reloaded(const std::string &content) {
         WriteAll(kPath, content);
         VarnekCfg_LoadConfigFile();
@@ -74,7 +73,7 @@ TEST_F(ConfigAlone, AnyFileLoads) {
         {type.substr(0, 19), none},
         {area + many('x', 100000), File(cut, 0, 0, 0, 0, "BRA")},
         {nation + many('x', 100000) + "\n" + type + "4", File("", 4, 0, 0, 0, cut)},
-        // Of a line, 254 characters are looked at.
+        // A load reads 254 characters of a line.
         {many('x', 233) + type + "51", ofType(5)},
         {many('x', 235) + type + "51", none},
         {type + "99999999999999999999", ofType(INT32_MAX)},
@@ -82,7 +81,7 @@ TEST_F(ConfigAlone, AnyFileLoads) {
         {"CONFIG_TSCAPTURE=257\nCONFIG_TSFILESIMUL=-1", File("", 0, 1, 255, 0, "BRA")},
         {type + "5\n" + many('\0', 1) + type + "6", ofType(5)},
         {many('\n', (1 << 20) - 21) + type + "8", ofType(8)},
-        {many('\n', (1 << 20) - 20) + type + "9", ofType(8)},  // over 1 MiB: unreadable
+        {many('\n', (1 << 20) - 20) + type + "9", ofType(8)},  // more than 1 MiB, which is not read
         {type + "9\r" + many('\xFF', 1 << 19) + "\r" + type + "10", ofType(10)},
     };
     for (const auto &row : rows) {
@@ -108,7 +107,7 @@ TEST_F(ConfigAlone, AnUnreadableFileLeavesTheSettings) {
     }
 }
 
-TEST_F(ConfigAlone, ASaveKeepsTheModeAndWhatAnotherNameLeadsTo) {
+TEST_F(ConfigAlone, ASaveKeepsTheModeAndTheLinks) {
     const std::string other = std::filesystem::absolute(Path("other"));
     WriteAll(kPath, "");
     chmod(kPath.c_str(), 0640);
@@ -123,9 +122,9 @@ TEST_F(ConfigAlone, ASaveKeepsTheModeAndWhatAnotherNameLeadsTo) {
         WriteAll(other, "");
         EXPECT_EQ((hard ? link : symlink)(other.c_str(), kPath.c_str()), 0);
         VarnekCfg_SaveConfigFile();
-        EXPECT_EQ(ReadAll(other), File("", 2, 0, 0, 68, "")) << "saved in place";
+        EXPECT_EQ(ReadAll(other), File("", 2, 0, 0, 68, "")) << "the save did not write to the linked file";
     }
-    // A process that stands still in a save does not stop this one.
+    // A process that hangs in a save does not block this one.
     std::filesystem::remove(kPath);
     const int directory = open(VARNEK_DATA_DIR, O_RDONLY | O_CLOEXEC);
     EXPECT_EQ(flock(directory, LOCK_EX), 0);

@@ -29,7 +29,7 @@ class DebugAlone : public VarnekTest {
         WriteAll(kDefault, ReadAll(VARNEK_DEFAULTS "debug_ltn.ini"));
     }
 
-    // Whether a trace from this line with this mask gets through.
+    // Traces with this mask, and returns whether the trace reaches the log.
     static bool Passes(uint32_t mask) {
         TakeLog();
         VARNEK_TRACE(mask, "probe");
@@ -37,15 +37,14 @@ class DebugAlone : public VarnekTest {
     }
 };
 
-TEST_F(DebugAlone, EveryLevelAndModuleHasItsLook) {
+TEST_F(DebugAlone, EveryLevelAndModuleHasItsPriorityAndTag) {
     WriteAll(kWorking,
              "LogToUSB=1\nError=1\r\nHigh=1\r\rMid=1\nLow=1\nCommon=1\nJNI=1\nMainControl=1\nESG=1\n"
              "SessionManager=1\nSectionParser=1\nDsmccDC=1\nDsmccOC=1\nTsDemux=1\nCPRM=1\n"
              "SMPlayer=1\nGingaAppMgr=1");
     VarnekPGL_InitializeDebug();
     TakeLog();
-    // Each module, with each level and with several; and masks without a module, without a level and with neither's
-    // bits.
+    // Each module with one or several levels; then masks without a known level or module, which trace nothing.
     for (uint32_t mask : {0x80000001u, 0x40000002u, 0x20000004u, 0x10000008u, 0xC0000010u, 0x81000020u, 0x80000040u,
                           0x80000080u, 0x80000100u, 0x80000200u, 0x80000400u, 0x80000800u, 0x80000003u, 0x80000000u,
                           0x00000001u, 0x08000001u, 0x80001000u, 0x83FFF000u}) {
@@ -70,7 +69,7 @@ TEST_F(DebugAlone, ALineEnablesByTheFirstKeyInIt) {
              "LogToUSB=1\r\n\r\n\nError=1\rCommon=1",
              "LogToUSB=1\nError=1\nGingaAppMgr=1",
              "LogToUSB=1\nError=1\nSMPlayer=1",
-             // Cut at 51 characters: the key before counts, the '1' behind does not.
+             // The line is cut at 51 characters: its key counts, and the '1' after the cut does not.
              "LogToUSB=1\nCommon=1\nError=1\nHigh                                              0  1",
          }) {
         WriteAll(kWorking, file);
@@ -101,7 +100,7 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
     NOTE(load());  // more than 1 MiB
     std::filesystem::remove(kWorking);
     NOTE(load());
-    EXPECT_EQ(ReadAll(kWorking), ReadAll(kDefault)) << "the working copy is seeded";
+    EXPECT_EQ(ReadAll(kWorking), ReadAll(kDefault)) << "the working copy is not the default file";
     EXPECT_TRUE(Passes(0x80000001));
     EXPECT_FALSE(Passes(0x80000002));
 }
@@ -129,7 +128,7 @@ TEST_F(DebugAlone, ALogFunctionMayTrace) {
     EXPECT_THAT(TakeBodies("SBTVD_COM"), ElementsAre("one"));
 }
 
-TEST_F(DebugAlone, OpensTheDebugFilesToEveryUser) {
+TEST_F(DebugAlone, MakesTheDebugFilesWritableForEveryUser) {
     const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg";
     for (const std::string &path : {std::string(kWorking), settings}) {
         WriteAll(path, "#");

@@ -1,4 +1,4 @@
-// Failing calls of the C library: results, lines, and that nothing stays behind.
+// Failing calls of the C library: each has its result and its lines, and leaves nothing behind.
 #include <unistd.h>
 
 #include <atomic>
@@ -34,7 +34,8 @@ class Fault : public VarnekTest {};
      FailCall(function, 0, 0))
 
 TEST_F(Fault, MutexesAndSemaphores) {
-    FAULT("pthread_mutex_init", ENOMEM, VarnekPGL_CreateThread("new", 1, 0, Nothing, nullptr));  // its first guard
+    FAULT("pthread_mutex_init", ENOMEM,
+          VarnekPGL_CreateThread("new", 1, 0, Nothing, nullptr));  // the guard of the first thread
     const int32_t mutex = VarnekPGL_CreateMutex("mutex");
     const int32_t sem = VarnekPGL_CreateSemaphore("sem", 2);
     FAULT("pthread_mutex_lock", EINVAL, VarnekPGL_AcquireMutex(mutex));
@@ -64,7 +65,7 @@ TEST_F(Fault, Messages) {
         FAULT("sem_post", EOVERFLOW, urgent());
         FAULT("sem_wait", EINTR, receive(WAIT_FOREVER));
         FAULT("clock_gettime", EFAULT, receive(7));
-        EXPECT_TRUE(VarnekPGL_PeekMessage(&received, &count)) << "a message whose post failed stays queued";
+        EXPECT_TRUE(VarnekPGL_PeekMessage(&received, &count)) << "a message whose post failed is not queued any more";
         EXPECT_EQ(count, 1);
     };
     Worker(useOwnQueue).Wait();
@@ -113,7 +114,7 @@ class FaultAlone : public Fault {
                     note += "\n    " + error.substr(0, error.find('\n'));
                 }
                 Note(ordered ? note + "\n" : "");
-                ASSERT_EQ(run(), success) << "something stays behind";
+                ASSERT_EQ(run(), success) << "the failure left something behind";
             }
         }
     }
@@ -278,7 +279,7 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
     Force("settings", [&] {
         *VarnekCfg_GetConfigInfo() = initial;
         VarnekCfg_SetStandard(VarnekCfg_GetConfigInfo()->standardType + 1);
-        VarnekCfg_GetConfigInfo()->cprmPlayerDelay = 7;  // stays when nothing is loaded
+        VarnekCfg_GetConfigInfo()->cprmPlayerDelay = 7;  // kept when the load fails
         VarnekCfg_LoadConfigFile();
         return VarnekCfg_GetConfigInfo()->cprmPlayerDelay;
     });

@@ -110,14 +110,14 @@ TEST_F(File, SizesAndPositions) {
     EXPECT_EQ(VarnekPGL_ReadFile(path.c_str(), buffer, 5), 5);
     EXPECT_THAT(TakeLog(), IsEmpty());
     // Some systems refuse to seek in a directory, which makes two lines.
-    EXPECT_EQ(VarnekPGL_GetFileSize(Path("").c_str()), 0) << "a directory has no size";
+    EXPECT_EQ(VarnekPGL_GetFileSize(Path("").c_str()), 0) << "a directory has a size";
 
     const std::string large = Path("large");
     WriteAll(large, "");
     fs::resize_file(large, 5LL << 30);
     EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), 0);
     const PglFileHandle beyond = VarnekPGL_OpenFile(large.c_str(), PGL_FILE_MODE_READ);
-    if (beyond != -1 && sizeof(long) == 8) {  // on 32 bits there is no such position
+    if (beyond != -1 && sizeof(long) == 8) {  // 32 bits have no such position
         VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_SET);
         VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_CUR);
         EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(beyond), -1);
@@ -287,7 +287,7 @@ TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
         }
         fs::create_directory_symlink("../outside", tree + "/link");
         fs::create_symlink("nowhere", tree + "/dangling");
-        // A 32-bit system cannot stat what has such times.
+        // A 32-bit system cannot stat a file with such times.
         ASSERT_EQ(system(("touch -h -d @4102444800 " + tree + "/link").c_str()), 0);
         EXPECT_EQ(VarnekPGL_DeleteDir((tree + suffix).c_str()), 0) << suffix;
         EXPECT_FALSE(fs::exists(tree));
@@ -323,7 +323,7 @@ TEST_F(Directory, ADirectoryThatIsSwappedForALinkIsNotEntered) {
     }
 }
 
-TEST_F(Directory, WhatCannotBeDeletedStaysAndIsReported) {
+TEST_F(Directory, AFileThatCannotBeDeletedStaysAndIsReported) {
     const std::string tree = Path("tree");
     fs::create_directory(tree);
     WriteAll(tree + "/gone", "");
@@ -351,7 +351,7 @@ TEST_F(Command, TimesBeyond2038DoNoHarm) {
     EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), copy.c_str()), 0);
     EXPECT_EQ(ReadAll(copy), "content");
     ASSERT_EQ(link(source.c_str(), Path("same").c_str()), 0);
-    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), Path("same").c_str()), -1) << "onto itself";
+    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), Path("same").c_str()), -1) << "a file was copied onto itself";
     EXPECT_EQ(ReadAll(source), "content");
     PglFmFileAttributes attributes;
     EXPECT_TRUE(VarnekPGL_FmGetFileAttributes(source.c_str(), &attributes));

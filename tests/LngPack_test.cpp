@@ -1,4 +1,4 @@
-// Text conversion: the code tables as text, every unit there and back, and malformed input.
+// Text conversion: the code tables as text, every unit to UTF-8 and back, and malformed input.
 #include "Varnek_LngPack.h"
 
 #include <cstdlib>
@@ -25,12 +25,12 @@ TEST_F(LngPack, Latin15BecomesUtf8) {
                  " ¡¢£€¥Š§š©ª«¬\u00AD®¯°±²³Žµ¶·ž¹º»ŒœŸ¿"
                  "ÀÁÂÃÄÅÆÇÈÉÊËÌÍÎÏÐÑÒÓÔÕÖ×ØÙÚÛÜÝÞßàáâãäåæçèéêëìíîïðñòóôõö÷øùúûüýþÿ");
     NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, "caf\xE9", 4));
-    // Nothing to convert, or far more than stated, leaves the text alone.
+    // The text stays when there is nothing to convert, or far more than stated.
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "", 0), TRUE);
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\x09\x0A\x1B\x7F\x85", 5), TRUE);
     NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, "12345", 1));
     EXPECT_STREQ(text, "café");
-    // A little more than stated does not outgrow the work buffers, nor does the largest statement.
+    // A little more than stated fits the work buffers, and so does the largest statement.
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4\xA4\xA4\xA4", 1), TRUE);
     EXPECT_STREQ(text, "€€€€");
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4", UINT32_MAX), TRUE);

@@ -54,7 +54,7 @@ Bytes Fill(size_t size, unsigned char value) { return Bytes(size, value); }
 
 unsigned char Low(size_t value) { return static_cast<unsigned char>(value); }
 
-// Packets whose number is in their counter and in their payload.
+// Makes packets whose number is in their counter and in their payload.
 Bytes Numbered(size_t first, size_t count, const Bytes &lead = {}, const Bytes &trail = {}) {
     Bytes out;
     for (size_t i = first; i < first + count; ++i) {
@@ -65,7 +65,7 @@ Bytes Numbered(size_t first, size_t count, const Bytes &lead = {}, const Bytes &
 
 std::string SampleText() { return ReadAll(VARNEK_SAMPLE); }
 
-TEST_F(Receiver, FindsPacketsInAnyCompany) {
+TEST_F(Receiver, FindsPacketsAmongOtherBytes) {
     std::mt19937 random(47);
     const Bytes stamp = Fill(4, 0x11), parity = Fill(16, 0x22), noise = RandomBytes(random, 300);
     Bytes damaged = Numbered(0, 20), cut = Numbered(0, 20), table, datagrams, text;
@@ -120,7 +120,7 @@ TEST_F(Receiver, FindsPacketsInAnyCompany) {
     }
 }
 
-TEST_F(Receiver, FollowsContinuity) {
+TEST_F(Receiver, CountsContinuityErrors) {
     const Content plain{{}, kPayload}, scrambled{{}, kScrambled | kPayload}, nothing{{}, 0};
     const Content error{{}, kTransportError | kScrambled | kPayload};
     const Content empty{{183, 0x00}, kAdaptation}, jump{{1, 0x80}, kAdaptation | kPayload};
@@ -185,7 +185,7 @@ TEST_F(Receiver, AssemblesSections) {
     const Content far{Bytes{184} + small, start}, inner{small, kPayload};
     const struct {
         const char *name;
-        std::vector<Content> contents;  // the flags' low four bits: steps of the counter beside 1
+        std::vector<Content> contents;  // the flags' low four bits are steps of the counter beyond 1
         uint64_t good, bad_crc, incomplete;
     } cases[] = {
         {"two in a packet", SplitSections({small, small}), 2, 0, 0},
@@ -221,7 +221,7 @@ TEST_F(Receiver, AssemblesSections) {
 }
 
 TEST_F(Receiver, DecodesTimes) {
-    // The system's calendar is the judge, up to 2038 where its seconds have 32 bits.
+    // Compares with the system's calendar, up to 2038 where its seconds have 32 bits.
     constexpr int64_t last = std::min<int64_t>(65535, 40587 + std::numeric_limits<time_t>::max() / 86400);
     for (unsigned mjd = 40587; mjd <= last; ++mjd) {
         const time_t day = static_cast<time_t>(mjd - 40587) * 86400;
@@ -257,7 +257,7 @@ TEST_F(Receiver, DecodesTexts) {
         {"\x11\x20\xAC\x00\x41\xE0\x86\x00\x0D\x00\x0A\xE0\x8A\x00\x42\x00"s, "€A\n\nB"},
         {"\x11\xD8\x3D\xDE\x00\x00\x41\xD8\x3D\x00\x42\xDE\x00"s, "\uFFFDA\uFFFDB\uFFFD"},
         {"\x15\xE2\x82\xAC \xC3\xA9\x07\xEE\x82\x8A\x0D\x0A.\0."s, "€ é\n\n.."},
-        // four bytes, a half surrogate, overlong, cut, a byte that nothing begins with, beyond Unicode
+        // four bytes, a half surrogate, overlong, cut, a byte that begins no character, beyond Unicode
         {"\x15.\xF0\x9F\x98\x80.\xED\xA0\x80.\xE0\x9F\xBF.\xE2\x82.\xC0\xAF.\xF4\x90\x80\x80.\xC3",
          ".\uFFFD.\uFFFD\uFFFD\uFFFD.\uFFFD\uFFFD\uFFFD.\uFFFD.\uFFFD\uFFFD."
          "\uFFFD\uFFFD\uFFFD\uFFFD.\uFFFD"},
@@ -284,7 +284,7 @@ Report ReadSections(const std::vector<std::pair<uint16_t, Bytes>> &sections) {
     return ReadStream(writer.Stream());
 }
 
-// Events of one hour on 1993-10-13.
+// Makes an event of one hour on 1993-10-13.
 Bytes At(unsigned id, int hour, const Bytes &descriptors) {
     return MakeEvent(id, MakeDateTime(0xC079, hour * 3600), Bcd(3600), descriptors);
 }
@@ -293,7 +293,7 @@ Bytes OneEvent(unsigned table, unsigned service, unsigned id, int hour, const st
     return MakeEit(table, service, 1, At(id, hour, name.empty() ? Bytes() : MakeShortEvent("por", name, "")));
 }
 
-TEST_F(Receiver, KeepsWhatApplies) {
+TEST_F(Receiver, KeepsTheCurrentTables) {
     Bytes overrun = MakeService(3, "", "lost"), loop_overrun = MakeService(6, "", "whole"),
           pmt_overrun = MakeComponent(0x1B, 0x100);
     overrun[9] = 10;  // the name's length
@@ -377,7 +377,7 @@ TEST_F(Receiver, KeepsWhatApplies) {
 }
 
 // A table of events limits their number and the length of their texts.
-TEST_F(Receiver, BoundsEvents) {
+TEST_F(Receiver, LimitsEvents) {
     EventTable few, long_ones;
     Event event;
     for (unsigned i = 0; i < EventTable::kMostEvents + 10; ++i) {
@@ -401,7 +401,7 @@ TEST_F(Receiver, ReadsTheSample) {
     Note(ToJson(report));
     EXPECT_EQ(ToJson(report), ToJson(ReadStream(sample, 1)));
     Note(ToSummary(report, 80));
-    for (const uint8_t region : {uint8_t{4}, uint8_t{5}}) {  // the sample names the first
+    for (const uint8_t region : {uint8_t{4}, uint8_t{5}}) {  // the sample has only the first
         report.settings.region = region;
         const std::string summary = ToSummary(report, 80);
         Note("Region " + std::to_string(region) + ":\n" + summary.substr(0, summary.find("\nCounters")));
@@ -425,7 +425,7 @@ TEST_F(Receiver, AnswersEveryInput) {
     WriteAll(Path("empty"), "");
     WriteAll(Path("text"), std::string(9999, 'x'));
     WriteAll(Path("cut.ts"), SampleText().substr(0, 100000));
-    std::string long_stream;  // more than may wait between two threads
+    std::string long_stream;  // more than fits between two threads
     for (int i = 0; i < 12; ++i) {
         long_stream += SampleText();
     }
@@ -488,7 +488,7 @@ TEST_F(Receiver, StopsWhileItWaits) {
 }
 
 // Fills the registry of a family, and frees a place for each run until a run has all that it needs.
-TEST_F(Receiver, LeavesNothingBehind) {
+TEST_F(Receiver, FreesItsObjects) {
     Show(VARNEK_SAMPLE, "SAMPLE");
     const std::string expected = RunProgram({"--json", VARNEK_SAMPLE}).out;
     for (const Family &family : kFamilies) {
@@ -512,7 +512,7 @@ TEST_F(Receiver, Captures) {
     WriteAll(captured, std::string(1000000, 'x'));
     WriteAll(Path("text"), std::string(9999, 'x'));
     NoteProgram({"--capture", captured, Path("text")});
-    EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "there was nothing to write";
+    EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "a run without packets wrote a capture";
 
     const Result first = NoteProgram({"--json", "--quiet", "--capture", captured, VARNEK_SAMPLE});
     EXPECT_LT(ReadAll(captured).size(), SampleText().size());

@@ -20,7 +20,7 @@ class Semaphore : public VarnekTest {};
 TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
     EXPECT_EQ(VarnekPGL_CreateMutex("one"), 1);
     EXPECT_EQ(VarnekPGL_CreateMutex(k31.c_str()), 2);
-    EXPECT_EQ(VarnekPGL_CreateMutex(k32.c_str()), -1) << "a failure takes no handle";
+    EXPECT_EQ(VarnekPGL_CreateMutex(k32.c_str()), -1) << "a failure took a handle";
     EXPECT_EQ(VarnekPGL_GetMutexByName(k31.c_str()), 2);
     EXPECT_EQ(VarnekPGL_GetMutexByName("One"), -1);
     EXPECT_TRUE(VarnekPGL_DeleteMutex(1));
@@ -33,12 +33,12 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
     }
     TakeLog();
     EXPECT_TRUE(VarnekPGL_AcquireMutex(2) && VarnekPGL_ReleaseMutex(2));
-    EXPECT_THAT(TakeLog(), IsEmpty()) << "acquire and release trace nothing";
+    EXPECT_THAT(TakeLog(), IsEmpty()) << "acquire or release traced";
     EXPECT_TRUE(VarnekPGL_AcquireMutex(299) && VarnekPGL_ReleaseMutex(299));
 }
 
 TEST_F(Mutex, NamesThatResembleEachOther) {
-    // The first two have one digest; a slot keeps the rest of a longer name that it had before.
+    // The first two have the same digest. A slot keeps the end of a longer name that it had before.
     const char *const names[] = {"aaaazaaa", "baaa[aaa", "aaaazaaabbbb", "aaaa", "aaa"};
     EXPECT_TRUE(VarnekPGL_DeleteMutex(VarnekPGL_CreateMutex("baaa[aaabbbbcccc")));
     for (const char *name : names) {
@@ -80,7 +80,7 @@ TEST_F(Mutex, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_ReleaseMutex(2147483647));
     NOTE(VarnekPGL_GetMutexByName(nullptr));
     NOTE(VarnekPGL_GetMutexByName(""));
-    EXPECT_EQ(VarnekPGL_GetMutexByName("held"), held) << "a held mutex survives";
+    EXPECT_EQ(VarnekPGL_GetMutexByName("held"), held) << "a failure removed the mutex";
     EXPECT_TRUE(VarnekPGL_ReleaseMutex(held));
     EXPECT_TRUE(VarnekPGL_DeleteMutex(held));
 }
@@ -103,7 +103,7 @@ TEST_F(Semaphore, HandlesCountApartAndUnitsAreKept) {
     for (BOOL taken : {TRUE, TRUE, TRUE, FALSE}) {
         EXPECT_EQ(VarnekPGL_WaitSemaphore(sem, 0), taken);
     }
-    EXPECT_THAT(TakeErrors(), IsEmpty()) << "a time-out traces no Error";
+    EXPECT_THAT(TakeErrors(), IsEmpty()) << "a time-out traced an Error";
     EXPECT_TRUE(VarnekPGL_SignalSemaphore(sem));
     EXPECT_TRUE(VarnekPGL_WaitSemaphore(sem, WAIT_FOREVER));
     NOTE(VarnekPGL_CreateSemaphore(k31.c_str(), 0));

@@ -54,7 +54,7 @@ TEST_F(Thread, FailuresHaveTheirLineAndResult) {
     for (int32_t priority : {0, 100, 50}) {
         NOTE(VarnekPGL_CreateThread("x", priority, 0, nullptr, nullptr));
     }
-    EXPECT_EQ(VarnekPGL_CreateThread("x", 50, 0, Nothing, nullptr), 1) << "a failure takes no handle";
+    EXPECT_EQ(VarnekPGL_CreateThread("x", 50, 0, Nothing, nullptr), 1) << "a failure took a handle";
 }
 
 TEST_F(Thread, ADuplicateTakesTheRecord) {
@@ -150,11 +150,11 @@ TEST_F(Thread, HandlesEnd) {
     EXPECT_EQ(table.NumberOf(table.Find(INT32_MAX)), 1);
     EXPECT_EQ(table.FirstFree(), nullptr);
     EXPECT_EQ(table.Withdraw(table.Find(INT32_MAX - 1)), 1);
-    EXPECT_EQ(table.FirstFree(), nullptr) << "no handle is left for a free slot";
+    EXPECT_EQ(table.FirstFree(), nullptr) << "there was no handle left for the free slot";
 }
 
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
-    // Gives every thread the time to find that there is no guard yet.
+    // Every thread has time to find that there is no guard yet.
     gLogHook = [](const LogLine &line) {
         if (line.text.find("START : __Varnek_create_mutex") != std::string::npos) {
             std::this_thread::sleep_for(std::chrono::milliseconds(20));
@@ -177,7 +177,7 @@ TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
 #endif
 #if defined(__OPTIMIZE__) && !IS_INSTRUMENTED
 
-// The bytes of its stack that a thread uses for `work`, the log function of this program included.
+// Measures the bytes of its stack that a thread uses for `work`, including the log function of this program.
 size_t StackOf(void (*work)()) {
     constexpr size_t kSize = 262144;
     static char stack[kSize] __attribute__((aligned(4096)));
@@ -304,7 +304,7 @@ TEST_F(MessageQueue, ARemovalWakesTheWaiterAndNothingIsDestroyedUnderIt) {
         const int32_t next = VarnekPGL_CreateThread("next", 1, 0, Nothing, nullptr);
         EXPECT_EQ(next, handle + 1);
         const THREAD_MSG message = Message('n');
-        EXPECT_TRUE(VarnekPGL_SendMessage(next, &message)) << "meant for the next owner alone";
+        EXPECT_TRUE(VarnekPGL_SendMessage(next, &message)) << "the next record gets no message";
         worker.Wait();
         TakeLog();
         VarnekPGL_DeleteThread(next);

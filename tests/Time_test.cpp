@@ -1,5 +1,5 @@
-// The calendar against the C library's, spans and comparisons against their definition, and the
-// clock at moments of the test's choice.
+// Compares the calendar with the C library's, spans and comparisons with their definition, and reads a clock that the
+// tests set.
 #include "Varnek_Time.h"
 
 #include <sys/time.h>
@@ -17,7 +17,7 @@ using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
 
-time_t gNow = -1;  // what the clock shows, if it was set
+time_t gNow = -1;  // the clock's time if a test set it, or else -1
 
 class Time : public VarnekTest {};
 
@@ -59,7 +59,7 @@ TEST_F(Time, TheCalendarIsTheCLibrarys) {
 
 TEST_F(Time, SpansCountFromZero) {
     const struct {
-        int span[3], end[3];  // years, months and days; the date that lies them after 1970
+        int span[3], end[3];  // years, months and days, and the date so long after 1970
     } rows[] = {
         {{0, 0, 0}, {1970, 1, 1}},   {{0, 1, 30}, {1970, 2, 31}},   {{0, 0, 40}, {1970, 1, 41}},
         {{0, 1, 31}, {1970, 3, 1}},  {{0, 2, 27}, {1970, 3, 28}},   {{2, 2, 28}, {1972, 4, 1}},
@@ -161,7 +161,7 @@ TEST_F(Time, NullRecordsAreReported) {
 
 }  // namespace
 
-// As the C library declares it.
+// The C library's declarations.
 #ifdef __GLIBC__
 using ZonePointer = void *;
 #define CLOCK_NOEXCEPT noexcept
@@ -170,7 +170,7 @@ using ZonePointer = struct timezone *;
 #define CLOCK_NOEXCEPT
 #endif
 
-// The process's clock, for the library too. -2 is a clock that cannot be read.
+// The clock of the whole process, including the library. It cannot be read when gNow is -2.
 extern "C" int gettimeofday(timeval *out, ZonePointer) CLOCK_NOEXCEPT {
     timespec now = {};
     clock_gettime(CLOCK_REALTIME, &now);

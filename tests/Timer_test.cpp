@@ -14,7 +14,7 @@ namespace {
 using ::testing::IsEmpty;
 using Clock = std::chrono::steady_clock;
 
-// What a callback leaves behind.
+// The traces of a callback.
 struct Expiries {
     std::atomic<int> count{0};
     std::atomic<uint32_t> timer{99};
@@ -32,7 +32,7 @@ class Timer : public VarnekTest {};
 
 TEST_F(Timer, HandlesAreSlotsAndNamesAreUnique) {
     const std::string k40(40, 'n');
-    EXPECT_EQ(VarnekPGL_GetTimerByName(""), -1) << "free slots have no name";
+    EXPECT_EQ(VarnekPGL_GetTimerByName(""), -1) << "a free slot has a name";
     EXPECT_EQ(VarnekPGL_CreateTimer(k40.c_str()), 0);
     EXPECT_EQ(VarnekPGL_CreateTimer(""), 1);
     EXPECT_EQ(VarnekPGL_GetTimerByName(""), 1);
@@ -43,7 +43,7 @@ TEST_F(Timer, HandlesAreSlotsAndNamesAreUnique) {
     NOTE(VarnekPGL_CreateTimer((k40 + "n").c_str()));
     NOTE(VarnekPGL_CreateTimer(nullptr));
     NOTE(VarnekPGL_GetTimerByName(nullptr));
-    EXPECT_TRUE(VarnekPGL_IsTimerActive(0)) << "the duplicate left it alone";
+    EXPECT_TRUE(VarnekPGL_IsTimerActive(0)) << "the duplicate changed the timer";
     EXPECT_TRUE(VarnekPGL_DeleteTimer(0));
     EXPECT_EQ(VarnekPGL_CreateTimer("again"), 0);
     VarnekPGL_DestoryTimerSystem();
@@ -100,7 +100,7 @@ TEST_F(Timer, ACancelledStartNeverCallsBack) {
 TEST_F(Timer, EachStartCallsBackOnceHoweverLateItsDelivery) {
     VarnekPGL_CreateTimer("timer");
     for (const bool cancelled : {false, true}) {
-        // Holds the first delivery until the second start has been made.
+        // The first delivery waits for the second start.
         static std::atomic<int> deliveries;
         static std::atomic<bool> held;
         deliveries = 0;

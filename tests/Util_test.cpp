@@ -1,4 +1,4 @@
-// The CRC against the definition by bits, its check value, and its uses on sections and files.
+// Compares the CRC with its definition by bits, and uses it on sections and files.
 #include "Varnek_Util.h"
 
 #include <unistd.h>
@@ -88,7 +88,7 @@ TEST_F(Util, FilesThatCannotCarryACrcAreRefused) {
     WriteAll(path, "123");
     NOTE(VarnekUtil_AppendCRC32ToFile(path.c_str()));
     EXPECT_EQ(ReadAll(path), "123");
-    // A file of the kernel that promises a page and holds a line.
+    // A file of the kernel states the size of a page and has only a line.
     const char *line = "/sys/devices/system/cpu/online";
     if (access(line, R_OK) == 0) {
         for (const auto operation : {VarnekUtil_CheckFileCRC32, VarnekUtil_AppendCRC32ToFile}) {

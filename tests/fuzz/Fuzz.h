@@ -29,7 +29,7 @@ class Input {
         const int byte = Byte();
         return byte != 128 ? (byte < 128 ? byte : byte - 256) : static_cast<int>(uint32_t{Byte()} << 24 | Byte());
     }
-    // Up to `limit` bytes, in a block of exactly their size, so that a sanitizer sees one too many.
+    // Up to `limit` bytes, in a block of exactly their size, so that a sanitizer sees an access behind it.
     template <typename Char = uint8_t>
     std::vector<Char> Bytes(size_t limit = SIZE_MAX) {
         const size_t count = left_ < limit ? left_ : limit;

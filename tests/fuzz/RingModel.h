@@ -67,7 +67,7 @@ struct RingModel : Fields {
         if (n > w - r + (Ahead() > 0 ? size : 0)) {
             return -11;
         }
-        rl = Plus(rl, r / size);  // a reader that was set to the end starts over
+        rl = Plus(rl, r / size);  // a reader at the end continues at the beginning
         r %= size;
         for (int i = 0; i < n; ++i, Step(r, rl)) {
             dest[i] = bytes[static_cast<size_t>(r)];

@@ -20,7 +20,7 @@
 namespace {
 
 constexpr int kThreads = 8;
-constexpr int kUnits = 3;  // of the semaphore that all share
+constexpr int kUnits = 3;  // of the shared semaphore
 constexpr int kPacket = 188;
 
 std::atomic<bool> gStop{false}, gStorm{false};
@@ -29,11 +29,11 @@ std::atomic<int64_t> gTraces{0}, gLines{0};
 int32_t gMutex, gSemaphore;
 int64_t gGuarded = 0;
 
-// A message as the threads agree on it: `number` counts what one thread sent to another one.
+// The content of a message. `number` counts the messages from one thread to another one.
 struct Message {
     int64_t number;
     int32_t from;
-    int32_t urgent;  // or the record that it is meant for
+    int32_t urgent;  // or the record that receives it
     char filled[24];
 };
 
@@ -53,7 +53,7 @@ struct Worker {
     int64_t sent[kThreads], received[kThreads], urgentSent, urgentReceived;
     int64_t peeked, objects, locks, units, starts, short_lived, written, read, operations;
     int64_t lookups, passed;
-    int32_t latest[kThreads];  // the record of each other one that it sent to last
+    int32_t latest[kThreads];  // the last record of each other worker that it sent to
     std::atomic<int64_t> fired, ended, taken;
     VarnekCRingBuffer *ring;  // between an even worker, which writes, and the next one
 
@@ -210,7 +210,7 @@ void *ReceiveAll(void *argument) {
     int64_t next[kThreads] = {};
     THREAD_MSG in;
     int32_t count = 0;
-    // A removal before the first look is no error: a removed thread has no handle.
+    // A removed thread has no handle. It may have been removed before it asks for it.
     while (self != -1 && VarnekPGL_ReceiveMessage(WAIT_FOREVER, &in, &count) == TRUE) {
         const auto message = As<Message>(in);
         CHECK(message.urgent == self && message.number == next[message.from]++);
@@ -287,7 +287,7 @@ void *Work(void *argument) {
     while (gSenders > 0) {
         std::this_thread::yield();
     }
-    // Each message that was peeked leaves a signal behind, at which a receive returns empty-handed.
+    // Each peeked message leaves a signal behind, which ends a receive without a message.
     for (int64_t empty = 0; empty <= me.peeked;) {
         empty += Receive(me, false) ? 0 : 1;
     }
@@ -295,7 +295,7 @@ void *Work(void *argument) {
     return nullptr;
 }
 
-// The room in each registry beside the objects that live.
+// Describes the room in each registry beside the living objects.
 std::string RoomInTables() {
     std::string room;
     for (const Family &family : kFamilies) {

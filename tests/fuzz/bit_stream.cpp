@@ -1,4 +1,5 @@
-// The bit stream: a sequence of operations on borrowed and copied bytes, against the model that moves single bits.
+// The bit stream: a sequence of operations on borrowed and copied bytes, compared with the model that moves single
+// bits.
 #include "BitStreamModel.h"
 #include "Fuzz.h"
 #include "Varnek_CBitInputStream.h"

@@ -1,5 +1,5 @@
-// The configuration file: any text loads, and the record that a load makes is unchanged by saving it and
-// loading it again. What follows a 0 is the feature store's text.
+// The configuration file: any text loads, and saving the loaded record and loading it again changes nothing. The text
+// of the feature store follows a 0.
 #include <cstring>
 
 #include "Fuzz.h"

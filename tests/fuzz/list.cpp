@@ -1,4 +1,4 @@
-// The linked list: a sequence of operations against a vector. Every link is checked after each operation.
+// The linked list: a sequence of operations compared with a vector. Every link is checked after each operation.
 #include <algorithm>
 
 #include "Fuzz.h"

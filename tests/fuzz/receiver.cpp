@@ -15,7 +15,7 @@ namespace {
 using receiver::Bytes;
 using receiver::kPacketSize;
 
-// Every PID with tables that the receiver knows by itself, and two for the PAT to name.
+// Every PID whose tables the receiver reads without a PAT, and two that a PAT may name.
 constexpr uint16_t kPids[] = {0x0000, 0x0010, 0x0011, 0x0012, 0x0014, 0x0026, 0x0027, 0x0101, 0x1FC8};
 
 Bytes StreamOf(Input &input) {
@@ -33,7 +33,7 @@ Bytes StreamOf(Input &input) {
     return writer.Stream();
 }
 
-// Well-formed UTF-8 without a control character but line feeds: as UTF-8 of a broadcast, it decodes to itself.
+// Checks for well-formed UTF-8 without control characters other than line feeds. Such a text decodes to itself.
 bool IsText(const std::string &text) { return receiver::ToUtf8("\x15" + text) == text; }
 
 bool FitsWidth(const std::string &text, size_t width) {

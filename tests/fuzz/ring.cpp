@@ -1,4 +1,5 @@
-// The ring buffer: a sequence of operations, from inconsistent states too, against the model that moves single bytes.
+// The ring buffer: a sequence of operations, from inconsistent states too, compared with the model that moves single
+// bytes.
 #include <algorithm>
 #include <numeric>
 

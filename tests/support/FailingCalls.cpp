@@ -45,7 +45,7 @@ Call &Find(const char *name) {
 std::atomic<int> gDrops{0};
 void (*gDeliver)(sigval value) = nullptr;
 
-// Has the timer's deliveries pass a place where they can be dropped.
+// Routes the timer's deliveries through a function that can drop them.
 sigevent *Droppable(sigevent *event) {
     gDeliver = event->sigev_notify_function;
     event->sigev_notify_function = [](sigval value) {
@@ -126,7 +126,7 @@ WRAP(int, (__real_closedir(directory), errno = gCall_closedir.error, -1), closed
 WRAP_POSIX(gettimeofday, (timeval * time, void *zone), time, zone)
 WRAP_POSIX(system, (const char *command), command)
 
-// Of these, the library uses operator new[](size_t, const std::nothrow_t &), under its mangled name.
+// Of these, the library uses operator new[](size_t, const std::nothrow_t &). Its mangled name depends on size_t.
 #if __SIZEOF_POINTER__ == 8
 #define NEW_ARRAY _ZnamRKSt9nothrow_t
 #else

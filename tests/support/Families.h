@@ -1,4 +1,4 @@
-// The library's families of objects with a registry of limited size, and how to fill a registry.
+// The families of objects that the library keeps in registries of limited size.
 #ifndef VARNEK_TESTS_SUPPORT_FAMILIES_H
 #define VARNEK_TESTS_SUPPORT_FAMILIES_H
 
