@@ -34,8 +34,8 @@ class Fault : public VarnekTest {};
      FailCall(function, 0, 0))
 
 TEST_F(Fault, MutexesAndSemaphores) {
-    FAULT("pthread_mutex_init", ENOMEM,
-          VarnekPGL_CreateThread("new", 1, 0, Nothing, nullptr));  // the guard of the first thread
+    // The first thread makes the guard of all threads.
+    FAULT("pthread_mutex_init", ENOMEM, VarnekPGL_CreateThread("new", 1, 0, Nothing, nullptr));
     const int32_t mutex = VarnekPGL_CreateMutex("mutex");
     const int32_t sem = VarnekPGL_CreateSemaphore("sem", 2);
     FAULT("pthread_mutex_lock", EINVAL, VarnekPGL_AcquireMutex(mutex));
