@@ -159,7 +159,8 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         const auto nothing = [](uint32_t, void *) {};
         const auto start = [=] { return VarnekPGL_StartTimer(timer, 60000, nothing, nullptr); };
         const BOOL started = start() + VarnekPGL_IsTimerActive(timer) + start() + VarnekPGL_CancelTimer(timer);
-        return started + (start() != FALSE || start() != FALSE ? 1 : 0) + VarnekPGL_DeleteTimer(timer);
+        const BOOL again = start();
+        return started + (again != FALSE ? again : start()) + VarnekPGL_DeleteTimer(timer);
     });
     Force("list", [&] {
         list_t list;
@@ -182,7 +183,7 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
             unsigned char flag = 1;
             each->ReadByte(8, flag);
             each->RwindToFirst();
-            results = results * 1000 + flag * 100 + each->GetByteArray(raw, 8);
+            results = results * 1000 + int64_t{flag} * 100 + each->GetByteArray(raw, 8);
         }
         return results;
     });
@@ -190,8 +191,9 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         VarnekCRingBuffer ring(8), copy(ring);
         int64_t results = ring.Reset(9);
         for (VarnekCRingBuffer *each : {&ring, &copy}) {
-            results = results * 1000 + each->Write(raw, 8) * 100 + each->GetSpaceReading() + each->GetSpaceWriting();
-            results = results * 1000 + each->GetDistance() + each->Reset(4) * 10 + each->Write(raw, 1);
+            results =
+                results * 1000 + int64_t{each->Write(raw, 8)} * 100 + each->GetSpaceReading() + each->GetSpaceWriting();
+            results = results * 1000 + each->GetDistance() + int64_t{each->Reset(4)} * 10 + each->Write(raw, 1);
         }
         return results;
     });
