@@ -1,5 +1,5 @@
-// What a bit stream owns, and one without a source. Its operations are held against a model by a fuzz
-// target, which runs as a test.
+// A bit stream's lines and memory, and one without a source. A fuzz target, which runs as a test, compares the
+// operations with a model.
 #include "Varnek_CBitInputStream.h"
 
 #include <memory>
@@ -31,6 +31,16 @@ TEST_F(BitInputStream, WithoutASourceEverythingIsRefused) {
         EXPECT_THAT(flags, ElementsAre(0, 0));
     }
     EXPECT_EQ(VarnekCBitInputStream(&byte, 1, 1).GetByteArray(nullptr, 1), -10);
+}
+
+TEST_F(BitInputStream, EveryRefusalHasItsLine) {
+    unsigned char byte = 0xA5, flag = 1;
+    VarnekCBitInputStream stream(&byte, 1, 1);
+    NOTE(stream.ReadByte(9, flag));
+    NOTE(stream.ReadInt(-1, flag));
+    for (const int count : {3, 6, -1, 9, 5, 1, 0, -1}) {
+        NOTE(stream.GetBits(count, flag));
+    }
 }
 
 TEST_F(BitInputStream, CopiesOwnWhatTheirSourceOwns) {

@@ -1,11 +1,9 @@
-// A ring without storage, and its mutexes. Its operations are held against a model by a fuzz target, which
-// runs as a test, and the soak has threads at both ends.
+// A ring's lines and mutexes, and one without storage. A fuzz target, which runs as a test, compares the operations
+// with a model, and the soak has threads at both ends of a ring.
 #include "Varnek_CRingBuffer.h"
 
-#include <algorithm>
 #include <memory>
 #include <set>
-#include <thread>
 
 #include "Varnek_Semaphore.h"
 #include "support/RingFields.h"
@@ -39,6 +37,39 @@ TEST_F(RingBuffer, WithoutStorageEverythingIsRefused) {
     EXPECT_EQ(large.GetDistance(), 83);
 }
 
+TEST_F(RingBuffer, EveryRefusalHasItsLine) {
+    VarnekCRingBuffer ring(8);
+    unsigned char bytes[9] = {};
+    NOTE(ring.Read(bytes, 1));
+    NOTE(ring.Write(bytes, 5));
+    NOTE(ring.Write(bytes, 4));
+    NOTE(ring.Read(bytes, 6));
+    for (const int count : {-1, 9}) {
+        NOTE(ring.Write(bytes, count));
+        NOTE(ring.Read(bytes, count));
+        for (const int origin : {SEEK_SET, SEEK_CUR, SEEK_END, 3}) {
+            NOTE(ring.Seek(count, origin));
+        }
+    }
+    NOTE(ring.Flush());
+    NOTE(ring.Reset(0));
+    NOTE(ring.Reset(8));
+    NOTE(VarnekCRingBuffer(-1).GetDistance());
+    // The positions and the loop counts of writer and reader: an overflow, an underflow within a lap and over laps, and
+    // one lap too many.
+    Fields state = FieldsOf(ring);
+    const int states[][4] = {{3, 2, 1, 0}, {2, 3, 0, 0}, {2, 2, 0, 1}, {2, 3, 2, 0}};
+    for (const auto &[w, r, wl, rl] : states) {
+        std::tie(state.w, state.r, state.wl, state.rl) = std::tie(w, r, wl, rl);
+        SetFields(ring, state);
+        NOTE(ring.GetSpaceReading());
+        NOTE(ring.Seek(0, SEEK_CUR));
+        NOTE(ring.Write(bytes, 1));
+        SetFields(ring, state);
+        NOTE(ring.Read(bytes, 1));
+    }
+}
+
 TEST_F(RingBuffer, EachHasAMutexOfItsOwn) {
     {
         const VarnekCRingBuffer first(8), invalid(0), copy(first), second(8);
@@ -49,15 +80,11 @@ TEST_F(RingBuffer, EachHasAMutexOfItsOwn) {
     }
     EXPECT_EQ(VarnekPGL_GetMutexByName("VarnekRingBuf000"), -1);
     std::vector<std::unique_ptr<VarnekCRingBuffer>> rings(40);
-    std::vector<std::thread> threads;
-    for (size_t t = 0; t < 8; ++t) {
-        threads.emplace_back([&rings, t] {
-            for (size_t i = t; i < rings.size(); i += 8) {
-                rings[i] = std::make_unique<VarnekCRingBuffer>(4);
-            }
-        });
-    }
-    std::for_each(threads.begin(), threads.end(), [](std::thread &thread) { thread.join(); });
+    AtOnce(8, [&rings](int thread) {
+        for (size_t i = static_cast<size_t>(thread); i < rings.size(); i += 8) {
+            rings[i] = std::make_unique<VarnekCRingBuffer>(4);
+        }
+    });
     EXPECT_THAT(TakeErrors(), IsEmpty());
     std::set<int32_t> mutexes;
     for (const auto &ring : rings) {

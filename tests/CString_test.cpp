@@ -1,4 +1,4 @@
-// The owning string against an optional std::string, and what it owns.
+// Compares the owning string with an optional std::string, and checks its memory.
 #include "Varnek_CString.h"
 
 #include <cstring>
@@ -36,45 +36,35 @@ TEST_F(String, BehavesLikeAnOptionalText) {
         const auto append = [&](const Text &tail, bool refused, const char *line) {
             refused ? lines.assign(2, line) : void(next = old.value_or("") + *tail);
         };
-        switch (random() % 7) {
-            case 0:
-                strings[i] = text;
-                next = given;
-                break;
-            case 1:
-                strings[i] = strings[j];
-                next = other;
-                break;
-            case 2:
-                strings[i].SetMemAllocedString(NewArray(text));
-                if (given) {
-                    next = given;
-                } else {
-                    lines.push_back("Argument String is NULL!\n");
-                }
-                break;
-            case 3:
-                append(given, !given, "Adding String is NULL!\n");
-                ASSERT_EQ(TextOf(strings[i] + text), next);
-                strings[i] += text;
-                break;
-            case 4:
-                append(other, other.value_or("").empty(), "No String!\n");
-                ASSERT_EQ(TextOf(strings[i] + strings[j]), next);
-                strings[i] += strings[j];
-                break;
-            default: {
-                const VarnekCString &a = strings[i], &b = strings[j];
-                const int order = old && other ? strcmp(old->c_str(), other->c_str()) : 0;
-                std::vector<int> expected = {old == other, 0, 0, 0, 0};
-                if (old && other) {
-                    expected = {order == 0, order > 0, order < 0, order >= 0, order <= 0};
-                } else {
-                    lines.assign(5, one);
-                    lines[0] = old || other ? one : "Two strings are NULL!\n";
-                }
-                ASSERT_EQ((std::vector<int>{a == b, a > b, a < b, a >= b, a <= b}), expected);
+        const size_t kind = random() % 7;
+        if (kind == 0) {
+            strings[i] = text;
+            next = given;
+        } else if (kind == 1) {
+            strings[i] = strings[j];
+            next = other;
+        } else if (kind == 2) {
+            strings[i].SetMemAllocedString(NewArray(text));
+            given ? void(next = given) : lines.push_back("Argument String is NULL!\n");
+        } else if (kind == 3) {
+            append(given, !given, "Adding String is NULL!\n");
+            ASSERT_EQ(TextOf(strings[i] + text), next);
+            strings[i] += text;
+        } else if (kind == 4) {
+            append(other, other.value_or("").empty(), "No String!\n");
+            ASSERT_EQ(TextOf(strings[i] + strings[j]), next);
+            strings[i] += strings[j];
+        } else {
+            const VarnekCString &a = strings[i], &b = strings[j];
+            const int order = old && other ? strcmp(old->c_str(), other->c_str()) : 0;
+            std::vector<int> expected = {old == other, 0, 0, 0, 0};
+            if (old && other) {
+                expected = {order == 0, order > 0, order < 0, order >= 0, order <= 0};
+            } else {
+                lines.assign(5, one);
+                lines[0] = old || other ? one : "Two strings are NULL!\n";
             }
+            ASSERT_EQ((std::vector<int>{a == b, a > b, a < b, a >= b, a <= b}), expected);
         }
         ASSERT_EQ(TextOf(strings[i]), models[i] = next) << step;
         ASSERT_EQ(TakeBodies(), lines) << step;
@@ -99,8 +89,8 @@ TEST_F(String, OwnsItsArrayAndNoOther) {
     const VarnekCString null(nullptr);
     EXPECT_EQ((copy == null) + (copy < null), 0);
     const auto lines = TakeLog();
-    EXPECT_EQ(lines[0].priority, 4) << "a question about null strings is High";
-    EXPECT_EQ(lines[1].priority, 6) << "an order of null strings is an Error";
+    EXPECT_EQ(lines[0].priority, 4) << "a comparison for equality traces null strings as High";
+    EXPECT_EQ(lines[1].priority, 6) << "a comparison for order traces null strings as an Error";
 }
 
 }  // namespace

@@ -9,46 +9,36 @@
 #include <csignal>
 #include <cstring>
 #include <filesystem>
+#include <map>
 #include <thread>
 
 #include "support/VarnekTest.h"
 
 namespace {
 
-using ::testing::AllOf;
+namespace fs = std::filesystem;
+
 using ::testing::ElementsAre;
-using ::testing::HasSubstr;
 using ::testing::IsEmpty;
-using ::testing::StartsWith;
 
 class File : public VarnekTest {};
 
 TEST_F(File, FlagsResolveInTheirOrder) {
-    const struct {
-        int32_t flags;
-        const char *result;  // of writing "new" over, or behind, "old"
-    } rows[] = {
-        {1, "new"}, {2, "old"}, {4, "new"}, {6, "new"}, {7, "new"}, {8, "oldnew"}, {10, "oldnew"}, {15, "oldnew"},
-    };
     const std::string path = Path("file");
-    for (const auto &row : rows) {
+    for (int32_t flags : {0, 1, 2, 4, 6, 7, 8, 10, 15, 16, 32}) {
         WriteAll(path, "old");
-        const PglFileHandle file = VarnekPGL_OpenFile(path.c_str(), row.flags);
-        ASSERT_NE(file, -1);
-        VarnekPGL_WriteFileByHandle(file, "new", 3);
-        EXPECT_EQ(VarnekPGL_CloseFile(file), 0);
-        EXPECT_EQ(ReadAll(path), row.result) << row.flags;
+        const PglFileHandle file = VarnekPGL_OpenFile(path.c_str(), flags);
+        const size_t written = VarnekPGL_WriteFileByHandle(file, "new", 3);
+        VarnekPGL_CloseFile(file);
+        Note("flags " + std::to_string(flags) + ": " + std::to_string(written) + " " + ReadAll(path),
+             file == -1 ? -1 : 0);
     }
-    for (int32_t flags : {0, 16, 32}) {
-        EXPECT_EQ(VarnekPGL_OpenFile(path.c_str(), flags), -1);
-    }
-    EXPECT_THAT(TakeLog(), IsEmpty());
 }
 
 TEST_F(File, PathsOf256CharactersAreRefused) {
-    std::string path = std::filesystem::absolute(Path("")).string();
+    std::string path = fs::absolute(Path("")).string();
     const std::string folder = path + std::string(100, 'd');
-    std::filesystem::create_directory(folder);
+    fs::create_directory(folder);
     path = folder + "/";
     path += std::string(255 - path.size(), 'f');
     EXPECT_EQ(VarnekPGL_WriteFile(path.c_str(), "x", 1), 1);
@@ -95,16 +85,10 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
 }
 
 TEST_F(File, AFullDiskIsNotReportedAsStored) {
-    EXPECT_EQ(VarnekPGL_WriteFile("/dev/full", "abc", 3), 0);
-    EXPECT_EQ(VarnekPGL_AppendFile("/dev/full", "abc", 3), -1);
-    const auto lines = TakeErrors();
-    ASSERT_EQ(lines.size(), 3u);
-    EXPECT_THAT(lines[0], StartsWith("VarnekPGL_CloseFile : fail hFile = 0x"));
-    EXPECT_THAT(lines[1], StartsWith("VarnekPGL_CloseFile : fail hFile = 0x"));
-    EXPECT_EQ(lines[2], "VarnekPGL_AppendFile : name = /dev/full: Fail! write size = 0, desired size = 3");
     const std::string large(100000, 'x');
-    EXPECT_EQ(VarnekPGL_AppendFile("/dev/full", large.data(), 100000), -1);
-    EXPECT_THAT(TakeErrors()[0], HasSubstr("desired size = 100000"));
+    NOTE(VarnekPGL_WriteFile("/dev/full", "abc", 3));
+    NOTE(VarnekPGL_AppendFile("/dev/full", "abc", 3));
+    NOTE(VarnekPGL_AppendFile("/dev/full", large.data(), 100000));
 }
 
 TEST_F(File, SizesAndPositions) {
@@ -126,14 +110,14 @@ TEST_F(File, SizesAndPositions) {
     EXPECT_EQ(VarnekPGL_ReadFile(path.c_str(), buffer, 5), 5);
     EXPECT_THAT(TakeLog(), IsEmpty());
     // Some systems refuse to seek in a directory, which makes two lines.
-    EXPECT_EQ(VarnekPGL_GetFileSize(Path("").c_str()), 0) << "a directory has no size";
+    EXPECT_EQ(VarnekPGL_GetFileSize(Path("").c_str()), 0) << "a directory has a size";
 
     const std::string large = Path("large");
     WriteAll(large, "");
-    std::filesystem::resize_file(large, 5LL << 30);
+    fs::resize_file(large, 5LL << 30);
     EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), 0);
     const PglFileHandle beyond = VarnekPGL_OpenFile(large.c_str(), PGL_FILE_MODE_READ);
-    if (beyond != -1 && sizeof(long) == 8) {  // on 32 bits there is no such position
+    if (beyond != -1 && sizeof(long) == 8) {  // 32 bits have no such position
         VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_SET);
         VarnekPGL_SeekFile(beyond, INT32_MAX, SEEK_CUR);
         EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(beyond), -1);
@@ -143,18 +127,12 @@ TEST_F(File, SizesAndPositions) {
 }
 
 TEST_F(File, LogLinesOfThreadsAreCutAndNeverMix) {
-    std::vector<std::thread> threads;
-    for (char c = 'a'; c < 'e'; c++) {
-        threads.emplace_back([c] {
-            const std::string path(2000, c);
-            for (int i = 0; i < 200; i++) {
-                VarnekPGL_OpenFile(path.c_str(), PGL_FILE_MODE_READ);
-            }
-        });
-    }
-    for (std::thread &thread : threads) {
-        thread.join();
-    }
+    AtOnce(4, [](int thread) {
+        const std::string path(2000, static_cast<char>('a' + thread));
+        for (int i = 0; i < 200; i++) {
+            VarnekPGL_OpenFile(path.c_str(), PGL_FILE_MODE_READ);
+        }
+    });
     const std::string head = "VarnekPGL_OpenFile : file path(";
     for (const LogLine &line : TakeLog()) {
         ASSERT_EQ(line.tag, "SBTVD_File");
@@ -165,45 +143,23 @@ TEST_F(File, LogLinesOfThreadsAreCutAndNeverMix) {
 class LargeFile : public VarnekTest {};
 
 TEST_F(LargeFile, FlagsGiveTheirAccess) {
-    const struct {
-        int32_t flags;
-        int access;
-        bool creates;
-    } rows[] = {
-        {2, O_RDONLY, false},
-        {4, O_WRONLY, false},
-        {8, O_RDONLY | O_APPEND, false},
-        {12, O_WRONLY | O_APPEND, false},
-        {6, O_RDWR, false},
-        {14, O_RDWR, false},
-        {1, O_RDWR, true},
-        {3, O_RDWR, true},
-        {5, O_RDWR, true},
-        {7, O_RDWR, true},
-        {9, O_RDWR | O_APPEND, true},
-        {15, O_RDWR, true},
-    };
     const std::string path = Path("file");
-    for (const auto &row : rows) {
-        WriteAll(path, "kept");
-        const int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), row.flags);
-        EXPECT_EQ(fcntl(fd, F_GETFL) & (O_ACCMODE | O_APPEND), row.access) << row.flags;
-        VarnekPGL_CloseFile64Bits(fd);
-        EXPECT_EQ(ReadAll(path), "kept");
-        std::filesystem::remove(path);
-        const int32_t created = VarnekPGL_OpenFile64Bits(path.c_str(), row.flags);
-        EXPECT_EQ(created >= 0, row.creates) << row.flags;
-        if (created >= 0) {
+    for (int32_t flags = 0; flags < 16; flags++) {
+        for (const bool exists : {true, false}) {
+            fs::remove(path);
+            if (exists) {
+                WriteAll(path, "kept");
+            }
+            TakeLog();
+            const int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), flags);
+            const int access = fd < 0 ? -1 : fcntl(fd, F_GETFL) & (O_ACCMODE | O_APPEND);
             struct stat status = {};
-            fstat(created, &status);
-            EXPECT_EQ(status.st_mode & 0777u, 0644u);
-            VarnekPGL_CloseFile64Bits(created);
+            fstat(fd, &status);
+            Note("flags " + std::to_string(flags) + ", " + std::to_string(status.st_size) + " bytes", access);
+            EXPECT_TRUE(fd < 0 || exists || (status.st_mode & 0777u) == 0644);
+            VarnekPGL_CloseFile64Bits(fd);
         }
     }
-    EXPECT_THAT(TakeErrors()[0],
-                "[FULLSEG_64BIT_FILE]VarnekPGL_OpenFile64Bits: Invalid Hndl: -1 "
-                "Filename : [" +
-                    path + "]");
 }
 
 TEST_F(LargeFile, BeyondFourGiB) {
@@ -272,6 +228,9 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     ASSERT_EQ(VarnekPGL_MakeDir(present.c_str()), 0);
     PglFmFileAttributes attributes;
     PglDirEntryInfo info = {7, ""};
+    Show("pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()), "pid(PID) uid(UID");
+    Show("errno(" + std::to_string(EEXIST), "errno(EEXIST");
+    NOTE(VarnekPGL_MakeDir(present.c_str()));
     NOTE(VarnekPGL_MakeDir(tooLong.c_str()));
     NOTE(VarnekPGL_DeleteDirEx((none + "/").c_str()));
     NOTE(VarnekPGL_DeleteDirEx(""));
@@ -286,35 +245,24 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_FmGetFileAttributes(none.c_str(), &attributes));
     NOTE(VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE));
     EXPECT_EQ(info.type, 0u);
-    EXPECT_FALSE(std::filesystem::exists(none));
-
-    EXPECT_EQ(VarnekPGL_MakeDir(present.c_str()), -1);
-    const auto lines = TakeErrors();
-    ASSERT_EQ(lines.size(), 1u);
-    const std::string head =
-        "VarnekPGL_MakeDir : [" + present + "] dir create failed! errno(" + std::to_string(EEXIST) + "),process(";
-    const std::string tail = ") pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()) + ")";
-    EXPECT_THAT(lines[0], AllOf(StartsWith(head), ::testing::EndsWith(tail), HasSubstr("unit_tests")));
+    EXPECT_FALSE(fs::exists(none));
 }
 
 TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
-    std::filesystem::create_directory(Path("sub"));
+    fs::create_directory(Path("sub"));
     WriteAll(Path("file"), "");
-    std::filesystem::create_symlink("sub", Path("link"));
-    const uint32_t typeOf[] = {PGL_ENTRY_DIR, PGL_ENTRY_DIR, PGL_ENTRY_FILE, PGL_ENTRY_FILE, PGL_ENTRY_DIR};
-    const std::vector<std::string> names = {".", "..", "file", "link", "sub"};
+    fs::create_symlink("sub", Path("link"));
     void *dir = VarnekPGL_OpenDir(Path("").c_str());
     PglDirEntryInfo info;
-    size_t count = 0;
+    std::multimap<std::string, uint32_t> types;
     while (VarnekPGL_ReadDir(dir, &info)) {
-        const auto found = std::find(names.begin(), names.end(), info.name);
-        ASSERT_NE(found, names.end()) << info.name;
-        EXPECT_EQ(info.type, typeOf[found - names.begin()]) << info.name;
-        count++;
+        types.emplace(info.name, info.type);
     }
-    EXPECT_EQ(count, names.size());
+    for (const auto &[name, type] : types) {
+        Note(name + " " + std::to_string(type) + "\n");
+    }
+    NOTE(VarnekPGL_ReadDir(dir, &info));
     EXPECT_EQ(info.type, 0u);
-    EXPECT_THAT(TakeErrors(), ElementsAre(StartsWith("__VarnekPGL_ReadDir : return FALSE pDir = 0x")));
     EXPECT_EQ(VarnekPGL_CloseDir(dir), TRUE);
     PglFmFileAttributes attributes;
     memset(&attributes, 0xFF, sizeof attributes);
@@ -327,41 +275,41 @@ TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
 
 TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
     const std::string outside = Path("outside");
-    std::filesystem::create_directory(outside);
+    fs::create_directory(outside);
     WriteAll(outside + "/kept", "kept");
     for (const char *suffix : {"", "/", "\\", "//"}) {
         const std::string tree = Path("tree");
         std::string level = tree;
         for (int depth = 0; depth < 60 && level.size() < 240; depth++) {
-            std::filesystem::create_directory(level);
+            fs::create_directory(level);
             WriteAll(level + "/f", "");
             level += "/d";
         }
-        std::filesystem::create_directory_symlink("../outside", tree + "/link");
-        std::filesystem::create_symlink("nowhere", tree + "/dangling");
-        // A 32-bit system cannot stat what has such times.
+        fs::create_directory_symlink("../outside", tree + "/link");
+        fs::create_symlink("nowhere", tree + "/dangling");
+        // A 32-bit system cannot stat a file with such times.
         ASSERT_EQ(system(("touch -h -d @4102444800 " + tree + "/link").c_str()), 0);
         EXPECT_EQ(VarnekPGL_DeleteDir((tree + suffix).c_str()), 0) << suffix;
-        EXPECT_FALSE(std::filesystem::exists(tree));
+        EXPECT_FALSE(fs::exists(tree));
         EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
     }
     for (const char *suffix : {"", "/", "//", "/.", "/.//"}) {
-        std::filesystem::create_directory_symlink("outside", Path("root"));
+        fs::create_directory_symlink("outside", Path("root"));
         EXPECT_EQ(VarnekPGL_DeleteDirEx((Path("root") + suffix).c_str()), 0) << suffix;
-        EXPECT_FALSE(std::filesystem::exists(std::filesystem::symlink_status(Path("root"))));
+        EXPECT_FALSE(fs::exists(fs::symlink_status(Path("root"))));
         EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
     }
     EXPECT_EQ(VarnekPGL_ClearDir(outside.c_str()), 0);
-    EXPECT_TRUE(std::filesystem::is_empty(outside));
+    EXPECT_TRUE(fs::is_empty(outside));
 }
 
 TEST_F(Directory, ADirectoryThatIsSwappedForALinkIsNotEntered) {
     const std::string outside = Path("outside"), inner = Path("tree/inner");
-    std::filesystem::create_directory(outside);
+    fs::create_directory(outside);
     WriteAll(outside + "/kept", "kept");
     for (int i = 0; i < 1000; i++) {
-        std::filesystem::create_directories(inner);
-        std::filesystem::create_directory_symlink(outside, Path("link"));
+        fs::create_directories(inner);
+        fs::create_directory_symlink(outside, Path("link"));
         std::thread swapper([&] {
             rename(inner.c_str(), Path("aside").c_str());
             rename(Path("link").c_str(), inner.c_str());
@@ -370,25 +318,25 @@ TEST_F(Directory, ADirectoryThatIsSwappedForALinkIsNotEntered) {
         swapper.join();
         ASSERT_EQ(ReadAll(outside + "/kept"), "kept");
         for (const char *left : {"tree", "aside", "link"}) {
-            std::filesystem::remove_all(Path(left));
+            fs::remove_all(Path(left));
         }
     }
 }
 
-TEST_F(Directory, WhatCannotBeDeletedStaysAndIsReported) {
+TEST_F(Directory, AFileThatCannotBeDeletedStaysAndIsReported) {
     const std::string tree = Path("tree");
-    std::filesystem::create_directory(tree);
+    fs::create_directory(tree);
     WriteAll(tree + "/gone", "");
     std::string deep = tree;
     while (deep.size() + 60 < 256) {
         deep += "/" + std::string(50, 'd');
-        std::filesystem::create_directory(deep);
+        fs::create_directory(deep);
     }
     const std::string kept = deep + "/" + std::string(100, 'k');
     WriteAll(kept, "kept");
     EXPECT_EQ(VarnekPGL_DeleteDirEx(tree.c_str()), -1);
     EXPECT_EQ(ReadAll(kept), "kept");
-    EXPECT_FALSE(std::filesystem::exists(tree + "/gone"));
+    EXPECT_FALSE(fs::exists(tree + "/gone"));
     EXPECT_THAT(TakeErrors(),
                 ::testing::IsSupersetOf({"VarnekPGL_DeleteDirEx : exceed max file path length : " + kept,
                                          "VarnekPGL_DeleteDirEx : rmdir[" + tree + "] Fail. return FALSE"}));
@@ -403,7 +351,7 @@ TEST_F(Command, TimesBeyond2038DoNoHarm) {
     EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), copy.c_str()), 0);
     EXPECT_EQ(ReadAll(copy), "content");
     ASSERT_EQ(link(source.c_str(), Path("same").c_str()), 0);
-    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), Path("same").c_str()), -1) << "onto itself";
+    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), Path("same").c_str()), -1) << "a file was copied onto itself";
     EXPECT_EQ(ReadAll(source), "content");
     PglFmFileAttributes attributes;
     EXPECT_TRUE(VarnekPGL_FmGetFileAttributes(source.c_str(), &attributes));
@@ -411,8 +359,8 @@ TEST_F(Command, TimesBeyond2038DoNoHarm) {
 }
 
 TEST_F(Command, AnyPathIsOneWord) {
-    const std::filesystem::path home = std::filesystem::current_path();
-    std::filesystem::current_path(Path(""));
+    const fs::path home = fs::current_path();
+    fs::current_path(Path(""));
     for (const char *name :
          {"plain", "two words", "it's", "\"quoted\"", "semi;touch hurt", "`touch hurt`", "$(touch hurt)", "$HOME",
           "new\nline", "-rf", "- x", "*", "~", "a\\b", "&", "#c", "\xC3\xA9t\xC3\xA9", "'; touch hurt; '"}) {
@@ -426,29 +374,26 @@ TEST_F(Command, AnyPathIsOneWord) {
         EXPECT_EQ(access(name, X_OK), 0) << name;
         EXPECT_EQ(VarnekPGL_DeleteFile(name), 0) << name;
     }
-    EXPECT_FALSE(std::filesystem::exists("hurt"));
+    EXPECT_FALSE(fs::exists("hurt"));
     EXPECT_THAT(TakeErrors(), IsEmpty());
-    std::filesystem::current_path(home);
+    fs::current_path(home);
 }
 
 TEST_F(Command, RefusalsKeepTheDestination) {
     const std::string destination = Path("destination");
     WriteAll(destination, "kept");
-    std::filesystem::create_hard_link(destination, Path("same"));
+    fs::create_hard_link(destination, Path("same"));
     const std::string longPath(520, 'x');
     for (const std::string &source : {Path("none"), Path(""), Path("same"), destination, longPath, std::string()}) {
-        EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), destination.c_str()), -1) << source;
-        EXPECT_EQ(TakeErrors().back(), "VarnekPGL_CopyFile : fail src = " + source + " dest = " + destination);
-        EXPECT_EQ(ReadAll(destination), "kept");
+        NOTE(VarnekPGL_CopyFile(source.c_str(), destination.c_str()));
     }
-    EXPECT_EQ(VarnekPGL_CopyFile(destination.c_str(), longPath.c_str()), -1);
-    EXPECT_EQ(VarnekPGL_MoveFile(destination.c_str(), longPath.c_str()), -1);
-    EXPECT_EQ(VarnekPGL_MoveFile(nullptr, destination.c_str()), -1);
-    EXPECT_EQ(TakeErrors().back(), "VarnekPGL_MoveFile : fail src = (null) dest = " + destination);
+    NOTE(VarnekPGL_CopyFile(destination.c_str(), longPath.c_str()));
+    NOTE(VarnekPGL_MoveFile(destination.c_str(), longPath.c_str()));
+    NOTE(VarnekPGL_MoveFile(nullptr, destination.c_str()));
     EXPECT_EQ(ReadAll(destination), "kept");
 }
 
-TEST_F(Command, ChmodTakesThreeModesAndHandsBackTheStatus) {
+TEST_F(Command, ChmodTakesThreeModesAndReturnsTheStatus) {
     const std::string path = Path("file");
     WriteAll(path, "");
     for (int32_t mode : {666, 755, 777}) {
@@ -457,12 +402,9 @@ TEST_F(Command, ChmodTakesThreeModesAndHandsBackTheStatus) {
         stat(path.c_str(), &status);
         EXPECT_EQ(status.st_mode & 0777u, std::stoul(std::to_string(mode), nullptr, 8));
     }
-    EXPECT_EQ(VarnekPGL_Chmod(path.c_str(), 644), -1);
-    EXPECT_THAT(TakeLog(), IsEmpty());
-    EXPECT_EQ(VarnekPGL_Chmod(Path("none").c_str(), 666), 1 << 8) << "exit status 1, as system() has it";
-    EXPECT_THAT(TakeErrors(),
-                ElementsAre("VarnekPGL_Chmod : Could not change permission [chmod 666 " + Path("none") + "]"));
-    EXPECT_EQ(VarnekPGL_Chmod(std::string(505, 'x').c_str(), 666), -1);
+    NOTE(VarnekPGL_Chmod(path.c_str(), 644));
+    NOTE(VarnekPGL_Chmod(Path("none").c_str(), 666));  // exit status 1, as system() returns it
+    NOTE(VarnekPGL_Chmod(std::string(505, 'x').c_str(), 666));
 }
 
 }  // namespace

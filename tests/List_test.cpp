@@ -1,4 +1,4 @@
-// A list that is null. Operations are held against a model by a fuzz target, which runs as a test.
+// A list that is null. A fuzz target, which runs as a test, compares the operations with a model.
 #include "Varnek_List.h"
 
 #include "support/VarnekTest.h"

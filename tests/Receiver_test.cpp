@@ -1,5 +1,5 @@
-// The example receiver, stage by stage on made packets and sections, then whole on the sample
-// stream: its JSON to the letter, its exit statuses, and damaged streams.
+// The example receiver: each stage on made packets and sections, then the whole program on the sample stream, on
+// damaged streams and on inputs that it refuses.
 #include "Receiver.h"
 
 #include <fcntl.h>
@@ -9,15 +9,14 @@
 #include <unistd.h>
 
 #include <ctime>
-#include <functional>
 #include <limits>
 #include <random>
 
 #include "BroadcastText.h"
 #include "BroadcastTime.h"
 #include "Paragraphs.h"
-#include "Varnek_Semaphore.h"
-#include "Varnek_Thread.h"
+#include "Varnek_Version.h"
+#include "support/Families.h"
 #include "support/ReceiverRun.h"
 #include "support/VarnekTest.h"
 
@@ -25,14 +24,37 @@ namespace receiver {
 namespace {
 
 using namespace streamwriter;
-using ::testing::HasSubstr;
-using ::testing::Not;
+using ::testing::ElementsAre;
+
+struct Result {
+    int status;
+    std::string out, err;
+};
+
+Result RunProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
+    Result result;
+    result.out = Written([&](std::FILE *out) {
+        result.err = Written([&](std::FILE *err) { result.status = RunReceiver(arguments, {out, err, stop}); });
+    });
+    return result;
+}
+
+class Receiver : public VarnekTest {
+  protected:
+    // Runs the program and notes its status, its errors and the beginning of its output.
+    Result NoteProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
+        const Result result = RunProgram(arguments, stop);
+        Note(::testing::PrintToString(arguments) + " = " + std::to_string(result.status) + "\n" + result.err);
+        Note(result.out.substr(0, 450) + "\n");
+        return result;
+    }
+};
 
 Bytes Fill(size_t size, unsigned char value) { return Bytes(size, value); }
 
 unsigned char Low(size_t value) { return static_cast<unsigned char>(value); }
 
-// Packets that carry their number in the payload.
+// Makes packets whose number is in their counter and in their payload.
 Bytes Numbered(size_t first, size_t count, const Bytes &lead = {}, const Bytes &trail = {}) {
     Bytes out;
     for (size_t i = first; i < first + count; ++i) {
@@ -43,17 +65,9 @@ Bytes Numbered(size_t first, size_t count, const Bytes &lead = {}, const Bytes &
 
 std::string SampleText() { return ReadAll(VARNEK_SAMPLE); }
 
-Bytes Random(std::mt19937 &random, size_t size) {
-    Bytes bytes(size);
-    for (unsigned char &byte : bytes) {
-        byte = Low(random());
-    }
-    return bytes;
-}
-
-TEST(Receiver, FindsPacketsInAnyCompany) {
+TEST_F(Receiver, FindsPacketsAmongOtherBytes) {
     std::mt19937 random(47);
-    const Bytes stamp = Fill(4, 0x11), parity = Fill(16, 0x22), noise = Random(random, 300);
+    const Bytes stamp = Fill(4, 0x11), parity = Fill(16, 0x22), noise = RandomBytes(random, 300);
     Bytes damaged = Numbered(0, 20), cut = Numbered(0, 20), table, datagrams, text;
     damaged[1316] = 0x46;  // the eighth's sync byte
     cut.erase(cut.begin() + 1000, cut.begin() + 1040);
@@ -67,57 +81,46 @@ TEST(Receiver, FindsPacketsInAnyCompany) {
     const struct {
         const char *name;
         Bytes stream;
-        size_t packets, losses, size;
+        size_t packets, losses, size, continuity;
     } cases[] = {
-        {"188", Numbered(0, 300), 300, 0, 188},
-        {"192", Numbered(0, 300, stamp), 300, 0, 192},
-        {"204", Numbered(0, 300, {}, parity), 300, 0, 204},
-        {"one packet", Numbered(0, 1), 1, 0, 188},
-        {"one of 192", Numbered(0, 1, stamp), 1, 0, 192},
-        {"time stamps that look like sync bytes", Numbered(0, 9, {0x47, 0x01, 0x00, 0x10}), 9, 0, 192},
-        {"garbage in front", noise + Numbered(0, 20), 20, 1, 188},
-        {"garbage between, twice", Numbered(0, 9) + noise + Numbered(9, 4) + noise + Numbered(13, 5), 18, 2, 188},
-        {"garbage soon", Numbered(0, 3) + noise + Numbered(3, 17), 20, 1, 188},
-        {"garbage before the last packet", Numbered(0, 9) + noise + Numbered(9, 1), 10, 1, 188},
-        {"datagrams of seven", datagrams, 70, 10, 188},
-        {"a damaged sync byte", damaged, 19, 1, 188},
-        {"bytes missing within a packet", cut, 19, 1, 188},
-        {"cut in a packet", Numbered(0, 9) + Bytes{0x47, 0x01, 0x00}, 9, 0, 188},
-        {"cut in parity", Numbered(0, 9, {}, parity) + Numbered(9, 1), 10, 0, 204},
-        {"sync bytes and nothing else", Fill(188 * 50 + 7, 0x47), 50, 0, 188},
-        {"less than a packet", Fill(187, 0x47), 0, 0, 0},
-        {"a table with even strides", noise + table, 0, 0, 0},
-        {"text", text, 0, 0, 0},
-        {"noise", Random(random, 3000000), 0, 0, 0},
+        {"188", Numbered(0, 300), 300, 0, 188, 0},
+        {"192", Numbered(0, 300, stamp), 300, 0, 192, 0},
+        {"204", Numbered(0, 300, {}, parity), 300, 0, 204, 0},
+        {"one packet", Numbered(0, 1), 1, 0, 188, 0},
+        {"one of 192", Numbered(0, 1, stamp), 1, 0, 192, 0},
+        {"time stamps that look like sync bytes", Numbered(0, 9, {0x47, 0x01, 0x00, 0x10}), 9, 0, 192, 0},
+        {"garbage in front", noise + Numbered(0, 20), 20, 1, 188, 0},
+        {"garbage between, twice", Numbered(0, 9) + noise + Numbered(9, 4) + noise + Numbered(13, 5), 18, 2, 188, 0},
+        {"garbage soon", Numbered(0, 3) + noise + Numbered(3, 17), 20, 1, 188, 0},
+        {"garbage before the last packet", Numbered(0, 9) + noise + Numbered(9, 1), 10, 1, 188, 0},
+        {"datagrams of seven", datagrams, 70, 10, 188, 0},
+        {"a damaged sync byte", damaged, 19, 1, 188, 1},
+        {"bytes missing within a packet", cut, 19, 1, 188, 1},
+        {"cut in a packet", Numbered(0, 9) + Bytes{0x47, 0x01, 0x00}, 9, 0, 188, 0},
+        {"cut in parity", Numbered(0, 9, {}, parity) + Numbered(9, 1), 10, 0, 204, 0},
+        {"sync bytes and nothing else", Fill(188 * 50 + 7, 0x47), 50, 0, 188, 0},
+        {"less than a packet", Fill(187, 0x47), 0, 0, 0, 0},
+        {"a table with even strides", noise + table, 0, 0, 0, 0},
+        {"text", text, 0, 0, 0, 0},
+        {"noise", RandomBytes(random, 3000000), 0, 0, 0, 0},
     };
     for (const auto &c : cases) {
         for (const size_t block : {size_t{1}, size_t{190}, size_t{65536}}) {
             if (block == 1 && c.stream.size() > 100000) {
                 continue;
             }
-            Bytes numbers;
-            PacketSource source([&](const unsigned char *packets, size_t count) {
-                for (size_t i = 0; i < count; ++i) {
-                    EXPECT_EQ(packets[i * kPacketSize], 0x47);
-                    numbers.push_back(packets[i * kPacketSize + 5]);
-                }
-            });
-            for (size_t at = 0; at < c.stream.size(); at += block) {
-                source.Feed(&c.stream[at], std::min(block, c.stream.size() - at));
-            }
-            source.Finish();
-            EXPECT_EQ(source.Counters().packets, c.packets) << c.name << ", block " << block;
-            EXPECT_EQ(source.Counters().sync_losses, c.losses) << c.name << ", block " << block;
-            EXPECT_EQ(source.Counters().packet_size, c.size) << c.name << ", block " << block;
-            EXPECT_EQ(numbers.size(), c.packets) << c.name;
-            for (size_t i = 0; i < numbers.size() && c.stream[1] != kSyncByte; ++i) {
-                EXPECT_LE(Low(i == 0 ? numbers[0] : numbers[i] - numbers[i - 1] - 1u), 1) << c.name;
-            }
+            const Report report = ReadStream(c.stream, block);
+            const uint16_t pid = c.stream[1] == kSyncByte ? 0x0747 : 0x0100;
+            EXPECT_THAT(
+                (std::array<uint64_t, 5>{report.packets.packets, report.packets.sync_losses, report.packets.packet_size,
+                                         report.sections.continuity_errors, report.sections.pids[pid].packets}),
+                ElementsAre(c.packets, c.losses, c.size, c.continuity, c.packets))
+                << c.name << ", block " << block;
         }
     }
 }
 
-TEST(Receiver, FollowsContinuity) {
+TEST_F(Receiver, CountsContinuityErrors) {
     const Content plain{{}, kPayload}, scrambled{{}, kScrambled | kPayload}, nothing{{}, 0};
     const Content error{{}, kTransportError | kScrambled | kPayload};
     const Content empty{{183, 0x00}, kAdaptation}, jump{{1, 0x80}, kAdaptation | kPayload};
@@ -146,15 +149,15 @@ TEST(Receiver, FollowsContinuity) {
             demultiplexer.Push(MakePacket(c.pid, counter, content.bytes, content.flags).data());
         }
         const DemultiplexerCounters counters = demultiplexer.Counters();
-        EXPECT_EQ(counters.continuity_errors, c.continuity) << c.name;
-        EXPECT_EQ(counters.transport_errors, c.transport) << c.name;
-        EXPECT_EQ(counters.scrambled, c.scrambled) << c.name;
-        EXPECT_EQ(counters.pids[c.pid].continuity_errors, c.continuity) << c.name;
-        EXPECT_EQ(counters.pids[c.pid].packets, c.packets.size() - c.transport) << c.name;
+        const PidCounters &pid = counters.pids[c.pid];
+        EXPECT_THAT((std::array<uint64_t, 5>{counters.continuity_errors, counters.transport_errors, counters.scrambled,
+                                             pid.continuity_errors, pid.packets}),
+                    ElementsAre(c.continuity, c.transport, c.scrambled, c.continuity, c.packets.size() - c.transport))
+            << c.name;
     }
 }
 
-TEST(Receiver, MeasuresClocks) {
+TEST_F(Receiver, MeasuresClocks) {
     constexpr uint64_t second = 27000000, cycle = (uint64_t{1} << 33) * 300;
     PcrMeter meter;
     meter.Push(1, cycle - second / 2, 10, false);
@@ -169,7 +172,7 @@ TEST(Receiver, MeasuresClocks) {
     EXPECT_EQ(meter.Longest().packets, 120u);
 }
 
-TEST(Receiver, AssemblesSections) {
+TEST_F(Receiver, AssemblesSections) {
     const Bytes small = MakeSection(0x4E, 1, Fill(20, 1));   // 32 bytes
     const Bytes large = MakeSection(0x50, 1, Fill(388, 2));  // 400 bytes, in three packets
     Bytes damaged = small;
@@ -182,7 +185,7 @@ TEST(Receiver, AssemblesSections) {
     const Content far{Bytes{184} + small, start}, inner{small, kPayload};
     const struct {
         const char *name;
-        std::vector<Content> contents;  // the flags' low four bits: steps of the counter beside 1
+        std::vector<Content> contents;  // the flags' low four bits are steps of the counter beyond 1
         uint64_t good, bad_crc, incomplete;
     } cases[] = {
         {"two in a packet", SplitSections({small, small}), 2, 0, 0},
@@ -210,14 +213,15 @@ TEST(Receiver, AssemblesSections) {
             counter += 1 + (content.flags & 0x0F);
             demultiplexer.Push(MakePacket(0x0012, counter, content.bytes, content.flags & ~0x0Fu).data());
         }
-        EXPECT_EQ(demultiplexer.Counters().good, c.good) << c.name;
-        EXPECT_EQ(demultiplexer.Counters().bad_crc, c.bad_crc) << c.name;
-        EXPECT_EQ(demultiplexer.Counters().incomplete, c.incomplete) << c.name;
+        const DemultiplexerCounters counters = demultiplexer.Counters();
+        EXPECT_THAT((std::array<uint64_t, 3>{counters.good, counters.bad_crc, counters.incomplete}),
+                    ElementsAre(c.good, c.bad_crc, c.incomplete))
+            << c.name;
     }
 }
 
-TEST(Receiver, DecodesTimes) {
-    // The system's calendar is the judge, up to 2038 where its seconds have 32 bits.
+TEST_F(Receiver, DecodesTimes) {
+    // Compares with the system's calendar, up to 2038 where its seconds have 32 bits.
     constexpr int64_t last = std::min<int64_t>(65535, 40587 + std::numeric_limits<time_t>::max() / 86400);
     for (unsigned mjd = 40587; mjd <= last; ++mjd) {
         const time_t day = static_cast<time_t>(mjd - 40587) * 86400;
@@ -238,7 +242,7 @@ TEST(Receiver, DecodesTimes) {
     EXPECT_EQ(ToText(DecodeBcdTime(0xFFFFFF)), "");
 }
 
-TEST(Receiver, DecodesTexts) {
+TEST_F(Receiver, DecodesTexts) {
     using namespace std::string_literals;
     const std::pair<std::string, std::string> cases[] = {
         {"", ""},
@@ -253,7 +257,7 @@ TEST(Receiver, DecodesTexts) {
         {"\x11\x20\xAC\x00\x41\xE0\x86\x00\x0D\x00\x0A\xE0\x8A\x00\x42\x00"s, "€A\n\nB"},
         {"\x11\xD8\x3D\xDE\x00\x00\x41\xD8\x3D\x00\x42\xDE\x00"s, "\uFFFDA\uFFFDB\uFFFD"},
         {"\x15\xE2\x82\xAC \xC3\xA9\x07\xEE\x82\x8A\x0D\x0A.\0."s, "€ é\n\n.."},
-        // four bytes, a half surrogate, overlong, cut, a byte that nothing begins with, beyond Unicode
+        // four bytes, a half surrogate, overlong, cut, a byte that begins no character, beyond Unicode
         {"\x15.\xF0\x9F\x98\x80.\xED\xA0\x80.\xE0\x9F\xBF.\xE2\x82.\xC0\xAF.\xF4\x90\x80\x80.\xC3",
          ".\uFFFD.\uFFFD\uFFFD\uFFFD.\uFFFD\uFFFD\uFFFD.\uFFFD.\uFFFD\uFFFD."
          "\uFFFD\uFFFD\uFFFD\uFFFD.\uFFFD"},
@@ -263,8 +267,8 @@ TEST(Receiver, DecodesTexts) {
     }
 }
 
-// Reads the sections in the order given, each in packets of its own. The further packets of one come
-// behind the first packet of the next.
+// Reads sections in the order given, each in packets of its own. The first packet of a section comes before the further
+// packets of the section before it.
 Report ReadSections(const std::vector<std::pair<uint16_t, Bytes>> &sections) {
     StreamWriter writer;
     std::pair<uint16_t, std::vector<Content>> rest;
@@ -280,7 +284,7 @@ Report ReadSections(const std::vector<std::pair<uint16_t, Bytes>> &sections) {
     return ReadStream(writer.Stream());
 }
 
-// Events of one hour on 1993-10-13.
+// Makes an event of one hour on 1993-10-13.
 Bytes At(unsigned id, int hour, const Bytes &descriptors) {
     return MakeEvent(id, MakeDateTime(0xC079, hour * 3600), Bcd(3600), descriptors);
 }
@@ -289,7 +293,7 @@ Bytes OneEvent(unsigned table, unsigned service, unsigned id, int hour, const st
     return MakeEit(table, service, 1, At(id, hour, name.empty() ? Bytes() : MakeShortEvent("por", name, "")));
 }
 
-TEST(Receiver, KeepsWhatApplies) {
+TEST_F(Receiver, KeepsTheCurrentTables) {
     Bytes overrun = MakeService(3, "", "lost"), loop_overrun = MakeService(6, "", "whole"),
           pmt_overrun = MakeComponent(0x1B, 0x100);
     overrun[9] = 10;  // the name's length
@@ -304,25 +308,19 @@ TEST(Receiver, KeepsWhatApplies) {
     const struct {
         const char *name;
         std::vector<std::pair<uint16_t, Bytes>> sections;
-        std::vector<std::string> expected, unexpected;
     } cases[] = {
         {"a PAT of two sections, repeated between",
          {{0, MakePat(7, {{0, 0x10}, {1, 0x101}}, {0, 1})},
           {0, MakePat(7, {{2, 0x102}}, {1, 1})},
           {0x102, MakePmt(2, 0x100, MakeComponent(0x1B, 0x100), Descriptor(0x80, Fill(198, 0)))},
           {0, MakePat(7, {{2, 0x102}}, {1, 1})},
-          {0x101, MakePmt(1, 0x100, MakeComponent(0x02, 0x100))}},
-         {R"("pmt_pid": 257, "pcr_pid": 256, "components": [{"pid": 256, "type": 2,)",
-          R"("pmt_pid": 258, "pcr_pid": 256, "components": [{"pid": 256, "type": 27,)", R"("transport_stream_id": 7)"},
-         {R"("id": 0,)"}},
+          {0x101, MakePmt(1, 0x100, MakeComponent(0x02, 0x100))}}},
         {"a new PAT moves a service, drops another and stops its PMT",
          {{0, MakePat(7, {{1, 0x101}, {2, 0x102}})},
           {0x101, MakePmt(1, 0x100, {})},
           {0, MakePat(7, {{3, 0x103}}, {0, 0, 0xC2})},  // not yet current
           {0, MakePat(7, {{1, 0x104}}, {0, 0, 0xC3})},
-          {0x102, MakePmt(2, 0x100, {})}},
-         {R"("tables": {"0x00": 3, "0x02": 1})", R"("pmt_pid": 260, "pcr_pid": null)"},
-         {R"("id": 2,)", R"("id": 3,)"}},
+          {0x102, MakePmt(2, 0x100, {})}}},
         {"the latest PMT and names, of this stream alone",
          {{0, pat},
           {0x101, MakePmt(1, 0x100, MakeComponent(0x02, 0x100))},
@@ -333,9 +331,7 @@ TEST(Receiver, KeepsWhatApplies) {
           {0x11, MakeSdt(7, MakeService(1, "", "later"), {0, 0, 0xC4})},
           {0x11, MakeSection(0x46, 8, U16(8) + U8(0xFF) + MakeService(1, "", "foreign"))},
           {0x10, MakeNit(9, 7, Descriptor(0x40, Raw("net")), {})},
-          {0x10, MakeSection(0x41, 8, Loop(0xF, Descriptor(0x40, Raw("elsewhere"))) + Loop(0xF, {}))}},
-         {R"("name": "\"new\\")", R"([{"pid": 256, "type": 36,)", R"("network_name": "net")", R"("network_id": 9)"},
-         {"old", "gone", "later", "foreign", "elsewhere"}},
+          {0x10, MakeSection(0x41, 8, Loop(0xF, Descriptor(0x40, Raw("elsewhere"))) + Loop(0xF, {}))}}},
         {"events once each, by start, latest wins, not for another stream",
          {{0x12, OneEvent(0x50, 1, 2, 20, "second")},
           {0x12, OneEvent(0x4E, 1, 1, 18, "first")},
@@ -343,13 +339,7 @@ TEST(Receiver, KeepsWhatApplies) {
           {0x12, OneEvent(0x4F, 1, 1, 19, "wrong")},
           {0x12, OneEvent(0x60, 5, 1, 17, "elsewhere")},
           {0x27, OneEvent(0x4E, 9, 1, 22, "one-seg")},
-          {0x14, OneEvent(0x4E, 1, 1, 18, "misplaced")}},
-         {"\"events\": [\n    {\"service_id\": 5, \"event_id\": 1, \"other_stream\": true, \"start\": \"1993-10-13 20:",
-          R"(00:00", "local_start": "", "duration": "01:00:00", "language": "por", "name": "elsewhere", )",
-          "},\n    {\"service_id\": 1, \"event_id\": 1, \"other_stream\": false, \"start\": \"1993-10-13 21:",
-          "},\n    {\"service_id\": 1, \"event_id\": 2, \"other_stream\": false, \"start\": \"1993-10-14 00:",
-          "},\n    {\"service_id\": 9, \"event_id\": 1, ", R"("name": "first")", R"("name": "second")"},
-         {"wrong", "misplaced"}},
+          {0x14, OneEvent(0x4E, 1, 1, 18, "misplaced")}}},
         {"the nation's language, and what one table leaves out",
          {{0x12, MakeEit(0x4E, 1, 1,
                          At(1, 18,
@@ -357,32 +347,17 @@ TEST(Receiver, KeepsWhatApplies) {
                                 Descriptor(0x55, ratings) +
                                 Descriptor(0xC4, Bytes{0xF2, 1, 0x10, 0x11, 0xFF, 0x40} + Raw("spa"))) +
                              At(2, 19, german + english))},
-          {0x12, MakeEit(0x58, 1, 1, At(1, 18, extended("eng", "wrong") + extended("por", "X")))}},
-         {R"("language": "por", "name": "Sim", "text": "", "extended_text": "X", "audio_languages": ["spa"])",
-          R"([{"country": "ARG", "rating": "from 12"}, {"country": "BRA", "rating": "from 16, drugs, violence, sex"}])",
-          R"("language": "deu", "name": "Ja")"},
-         {"wrong"}},
+          {0x12, MakeEit(0x58, 1, 1, At(1, 18, extended("eng", "wrong") + extended("por", "X")))}}},
         {"times in Brazil",
          {{0x14, MakeTot(tot_time, MakeLocalOffset("BRA", 3, 0) + MakeLocalOffset("BRA", 4, -1))},
-          {0x12, OneEvent(0x4E, 1, 1, 22, "late")}},
-         {R"("utc_time": "1993-10-13 21:30:00")", R"("local_time": "1993-10-13 18:30:00")",
-          R"("region": 3, "offset": "-03:00")", R"("region": 4, "offset": "-04:00")",
-          R"("start": "1993-10-14 01:00:00", "local_start": "1993-10-13 22:00:00")"},
-         {}},
+          {0x12, OneEvent(0x4E, 1, 1, 22, "late")}}},
         {"times elsewhere",
          {{0x14, MakeTot(tot_time, MakeLocalOffset("FRA", 0, 2))},
-          {0x12, MakeEit(0x4E, 1, 1, At(1, 22, Descriptor(0x54, U16(0x2000))))}},
-         {R"("utc_time": "1993-10-13 18:30:00")", R"("local_time": "1993-10-13 20:30:00")",
-          R"("start": "1993-10-13 22:00:00", "local_start": "1993-10-14 00:00:00")", R"("genres": ["news"])"},
-         {}},
+          {0x12, MakeEit(0x4E, 1, 1, At(1, 22, Descriptor(0x54, U16(0x2000))))}}},
         {"a DVB stream without offsets",
-         {{0, pat}, {0x10, MakeNit(9, 7, {}, Descriptor(0x5A, {}))}, {0x14, MakeTot(tot_time, {})}},
-         {R"("utc_time": "1993-10-13 18:30:00")"},
-         {}},
+         {{0, pat}, {0x10, MakeNit(9, 7, {}, Descriptor(0x5A, {}))}, {0x14, MakeTot(tot_time, {})}}},
         {"no offsets, and nothing that speaks against Brazil",
-         {{0, pat}, {0x10, MakeNit(9, 7, {}, Descriptor(0xFA, U16(0xFFFC)))}, {0x14, MakeTot(tot_time, {})}},
-         {R"("utc_time": "1993-10-13 21:30:00")", "\"area_code\": 4095,\n  \"guard_interval\": \"1/4\""},
-         {}},
+         {{0, pat}, {0x10, MakeNit(9, 7, {}, Descriptor(0xFA, U16(0xFFFC)))}, {0x14, MakeTot(tot_time, {})}}},
         {"lengths that lead outside",
          {{0, MakePat(7, {{1, 0x101}, {2, 0x102}})},
           {0x101, MakePmt(1, 0x100, pmt_overrun)},
@@ -393,27 +368,16 @@ TEST(Receiver, KeepsWhatApplies) {
           {0x12, MakeEit(0x4E, 1, 1, Bytes{0, 1, 0xC0, 0x79, 0, 0, 0, 0, 0, 0, 0x8F, 0xFF})},
           {0x10, MakeNit(9, 7, {}, {0xCD, 2, 5, 0xFC, 0xFB, 1, 1, 0xFA, 1, 0})},
           {0x10, MakeSection(0x40, 9, {0xFF, 0xFF, 0x40, 200, 'n'}, {1, 1})},
-          {0x14, {0x70, 0x70, 3, 0xC0, 0x79, 0x12}}},
-         {"kept", "next", "whole", R"("id": 3, "name": "", "provider": "")", R"("utc_time": "")", R"("ewbs": false)",
-          "\"AAC audio (LATM)\"", R"("ts_name": "",)", R"("area_code": null)",
-          R"("extended_text": "", "audio_languages": [], "genres": [], "ratings": []})"},
-         {"lost", R"("one_seg": true)"}},
+          {0x14, {0x70, 0x70, 3, 0xC0, 0x79, 0x12}}}},
     };
     for (const auto &c : cases) {
-        const Report report = ReadSections(c.sections);
-        const std::string json = ToJson(report);
-        EXPECT_EQ(report.sections.bad_crc + report.sections.incomplete, 0u) << c.name;
-        for (const std::string &text : c.expected) {
-            EXPECT_THAT(json, HasSubstr(text)) << c.name;
-        }
-        for (const std::string &text : c.unexpected) {
-            EXPECT_THAT(json, Not(HasSubstr(text))) << c.name;
-        }
+        const std::string json = ToJson(ReadSections(c.sections));
+        Note(std::string(c.name) + ":\n" + json.substr(json.find("  \"sections\"")));
     }
 }
 
-// A table of events has its bounds, in their number and in the length of their texts.
-TEST(Receiver, BoundsEvents) {
+// A table of events limits their number and the length of their texts.
+TEST_F(Receiver, LimitsEvents) {
     EventTable few, long_ones;
     Event event;
     for (unsigned i = 0; i < EventTable::kMostEvents + 10; ++i) {
@@ -431,31 +395,20 @@ TEST(Receiver, BoundsEvents) {
     EXPECT_GE(long_ones.LeftOut(), 2 * (5000 - kept));
 }
 
-TEST(Receiver, ReadsTheSample) {
-    const std::string text = SampleText();
-    const std::string expected = ReadAll(VARNEK_EXPECTED_REPORT);
-    EXPECT_EQ(ToJson(ReadStream(Raw(text))), expected);
-    EXPECT_EQ(ToJson(ReadStream(Raw(text), 1)), expected);
-    Report report = ReadStream(Raw(text));
-    for (const char *lines : {"Clock     2024-06-15 23:00:08 UTC, BRA region 3 -03:00, BRA region 4 -04:00,\n"
-                              "          local 2024-06-15 20:00:08\nWarning   EWBS signalled\n",
-                              "  0xC858  TV Ipê Móvel  television, one-seg, Ipê Comunicação  (PMT 0x1FC8)\n"
-                              "          0x0181 H.264 video, 0x0182 AAC audio (ADTS)\n",
-                              "Events (local time)\n"
-                              "  2024-06-15 20:00:00  00:45:00  TV Ipê HD     Jornal da Região (news, all ages)\n",
-                              "  start not known      -         TV Ipê HD     -\n"
-                              "  2024-06-15 19:00:00  01:00:00  TV Ipê HD     Café com Prosa (information, all\n"
-                              "                                 ages), over\n",
-                              "  sections with a bad CRC          1\n"}) {
-        EXPECT_THAT(ToSummary(report, 80), HasSubstr(lines));
+TEST_F(Receiver, ReadsTheSample) {
+    const Bytes sample = Raw(SampleText());
+    Report report = ReadStream(sample);
+    Note(ToJson(report));
+    EXPECT_EQ(ToJson(report), ToJson(ReadStream(sample, 1)));
+    Note(ToSummary(report, 80));
+    for (const uint8_t region : {uint8_t{4}, uint8_t{5}}) {  // the sample has only the first
+        report.settings.region = region;
+        const std::string summary = ToSummary(report, 80);
+        Note("Region " + std::to_string(region) + ":\n" + summary.substr(0, summary.find("\nCounters")));
     }
-    report.settings.region = 4;
-    EXPECT_THAT(ToSummary(report, 80), HasSubstr("local 2024-06-15 19:00:08\n"));
-    report.settings.region = 5;
-    EXPECT_THAT(ToSummary(report, 80), HasSubstr("Events (UTC)\n"));
 }
 
-TEST(Receiver, BreaksLines) {
+TEST_F(Receiver, BreaksLines) {
     const std::pair<std::string, std::string> cases[] = {
         {"", "lead\n"},
         {"one\ntwo", "lead  one two\n"},
@@ -468,60 +421,37 @@ TEST(Receiver, BreaksLines) {
     }
 }
 
-struct Result {
-    int status;
-    std::string out, err;
-};
-
-Result RunProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
-    Result result;
-    result.out = Written([&](std::FILE *out) {
-        result.err = Written([&](std::FILE *err) { result.status = RunReceiver(arguments, {out, err, stop}); });
-    });
-    return result;
-}
-
-class ReceiverFiles : public VarnekTest {};
-
-TEST_F(ReceiverFiles, AnswersEveryInput) {
+TEST_F(Receiver, AnswersEveryInput) {
     WriteAll(Path("empty"), "");
     WriteAll(Path("text"), std::string(9999, 'x'));
     WriteAll(Path("cut.ts"), SampleText().substr(0, 100000));
-    std::string long_stream;  // more than may wait between two threads
+    std::string long_stream;  // more than fits between two threads
     for (int i = 0; i < 12; ++i) {
         long_stream += SampleText();
     }
     WriteAll(Path("-dash"), long_stream);
     const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, Fill(4, 0)) + Fill(9000, 0x11);
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
-    const struct {
-        std::vector<std::string> arguments;
-        int status;
-        std::string out, err;
-    } cases[] = {
-        {{}, 2, "", "receiver: no file\nusage: "},
-        {{"--nonsense", Path("text")}, 2, "", "receiver: unknown option --nonsense\n"},
-        {{Path("text"), Path("text")}, 2, "", "more than one file: "},
-        {{Path("text"), "--capture"}, 2, "", "--capture needs a value"},
-        {{"--region", "64", Path("text")}, 2, "", "no region '64'"},
-        {{"--help"}, 0, "usage: ", ""},
-        {{"--version"}, 0, "receiver 1.", ""},
-        {{Path("missing")}, 1, "", "cannot be opened: No such file or directory"},
-        {{std::string(300, 'x')}, 1, "", "x: cannot be opened: File name too long\n"},
-        {{"--json", Path("empty")}, 1, "", "empty: is empty\n"},
-        {{Path("")}, 1, "", "read failed: Is a directory"},
-        {{Path("text")}, 1, "", "no transport stream packets in 9999 bytes"},
-        {{Path("accident")}, 1, "", "hardly a transport stream: 5 packets in 18960 bytes"},
-        {{Path("cut.ts"), "--json"}, 0, "{\n  \"packets\": 531,\n", ""},
-        {{"--", Path("-dash")}, 0, "19200 packets of 188 bytes", ""},
+    Show("receiver " + std::to_string(VARNEK_VERSION_MAJOR), "receiver MAJOR");
+    const std::vector<std::string> cases[] = {
+        {},
+        {"--nonsense", Path("text")},
+        {Path("text"), Path("text")},
+        {Path("text"), "--capture"},
+        {"--region", "64", Path("text")},
+        {"--help"},
+        {"--version"},
+        {Path("missing")},
+        {std::string(300, 'x')},
+        {"--json", Path("empty")},
+        {Path("")},
+        {Path("text")},
+        {Path("accident")},
+        {Path("cut.ts"), "--json"},
+        {"--", Path("-dash")},
     };
-    for (const auto &c : cases) {
-        const Result result = RunProgram(c.arguments);
-        EXPECT_EQ(result.status, c.status) << c.err;
-        EXPECT_THAT(result.out, HasSubstr(c.out));
-        EXPECT_THAT(result.err, HasSubstr(c.err));
-        EXPECT_EQ(result.out.empty(), c.out.empty()) << result.out;
-        EXPECT_EQ(result.err.empty(), c.err.empty()) << result.err;
+    for (const std::vector<std::string> &arguments : cases) {
+        NoteProgram(arguments);
     }
     std::FILE *full = std::fopen("/dev/full", "w");
     ASSERT_NE(full, nullptr);
@@ -529,8 +459,8 @@ TEST_F(ReceiverFiles, AnswersEveryInput) {
     std::fclose(full);
 }
 
-// The first end of a terminal gives the bytes of the second one, and an error after that is closed.
-TEST_F(ReceiverFiles, TellsOfAReadError) {
+// One end of a terminal reads the bytes that the other end wrote, and then an error, since the other end is closed.
+TEST_F(Receiver, ReportsAReadError) {
     int input = -1, terminal = -1;
     termios raw{};
     cfmakeraw(&raw);
@@ -540,14 +470,11 @@ TEST_F(ReceiverFiles, TellsOfAReadError) {
     ASSERT_EQ(write(terminal, packets.data(), packets.size()), static_cast<ssize_t>(packets.size()));
     close(terminal);
     ASSERT_EQ(dup2(input, STDIN_FILENO), STDIN_FILENO);
-    const Result result = RunProgram({"-"});
-    EXPECT_EQ(result.status, 1);
-    EXPECT_THAT(result.out, HasSubstr("10 packets of 188 bytes"));
-    EXPECT_EQ(result.err, "receiver: -: read failed: Input/output error\n");
+    NoteProgram({"-"});
 }
 
-// The other end of the pipe says nothing.
-TEST_F(ReceiverFiles, StopsWhileItWaits) {
+// The other end of the pipe writes nothing.
+TEST_F(Receiver, StopsWhileItWaits) {
     ASSERT_EQ(mkfifo(Path("pipe").c_str(), 0600), 0);
     const int other_end = open(Path("pipe").c_str(), O_RDWR);
     std::atomic<bool> stop{false};
@@ -555,94 +482,53 @@ TEST_F(ReceiverFiles, StopsWhileItWaits) {
         std::this_thread::sleep_for(std::chrono::milliseconds(50));
         stop = true;
     });
-    const Result result = RunProgram({Path("pipe")}, &stop);
+    NoteProgram({Path("pipe")}, &stop);
     user.join();
     close(other_end);
-    EXPECT_EQ(result.status, 130);
-    EXPECT_THAT(result.out, HasSubstr("0 packets"));
-    EXPECT_EQ(result.err, "");
 }
 
-// Fills a registry up.
-std::vector<int32_t> CreateAll(const std::function<int32_t(const char *)> &create, const std::string &name) {
-    std::vector<int32_t> handles;
-    do {
-        handles.push_back(create((name + std::to_string(handles.size())).c_str()));
-    } while (handles.back() != -1);
-    handles.pop_back();
-    return handles;
-}
-
-void *ReturnAtOnce(void *) { return nullptr; }
-
-// With the registry of one family full but for 0, 1, 2 ... places: no more places are needed than
-// there are objects, and each run leaves as many as it found.
-TEST_F(ReceiverFiles, LeavesNothingBehind) {
-    const struct {
-        const char *family;
-        std::function<int32_t(const char *)> create;
-        BOOL (*remove)(int32_t);
-        size_t needed;
-    } families[] = {
-        {"thread", [](const char *name) { return VarnekPGL_CreateThread(name, 1, 65536, ReturnAtOnce, nullptr); },
-         VarnekPGL_DeleteThread, 4},
-        {"semaphore", [](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); }, VarnekPGL_DeleteSemaphore,
-         3},
-        {"mutex", VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex, 2},
-    };
+// Fills the registry of a family, and frees a place for each run until a run has all that it needs.
+TEST_F(Receiver, FreesItsObjects) {
+    Show(VARNEK_SAMPLE, "SAMPLE");
     const std::string expected = RunProgram({"--json", VARNEK_SAMPLE}).out;
-    for (const auto &family : families) {
-        std::vector<int32_t> fillers = CreateAll(family.create, "filler");
-        ASSERT_GT(fillers.size(), family.needed);
-        for (size_t places = 0; places <= family.needed; ++places) {
-            const Result result = RunProgram({"--json", VARNEK_SAMPLE});
-            const bool enough = places == family.needed;
-            EXPECT_EQ(result.status, enough ? 0 : 1) << family.family << places;
-            EXPECT_EQ(result.out, enough ? expected : "") << family.family << places;
-            EXPECT_EQ(result.err.find(std::string("the ") + family.family) != std::string::npos, !enough) << result.err;
-            const std::vector<int32_t> free = CreateAll(family.create, "free");
-            EXPECT_EQ(free.size(), places) << family.family;
-            for (const int32_t handle : free) {
-                family.remove(handle);
-            }
+    for (const Family &family : kFamilies) {
+        std::vector<int32_t> fillers = family.Fill();
+        for (bool enough = false; !enough; fillers.pop_back()) {
+            const Result result = NoteProgram({"--json", VARNEK_SAMPLE});
+            enough = result.status == 0;
+            EXPECT_EQ(result.out, enough ? expected : "");
+            Note("There was room for " + std::to_string(family.Room()) + " " + family.name + ".\n");
+            ASSERT_FALSE(fillers.empty());
             family.remove(fillers.back());
-            fillers.pop_back();
         }
-        for (const int32_t handle : fillers) {
-            family.remove(handle);
-        }
+        std::for_each(fillers.begin(), fillers.end(), family.remove);
     }
 }
 
-// The packets that the tables come from make a stream of their own, with the same tables.
-TEST_F(ReceiverFiles, Captures) {
+// A capture has the packets that the tables come from. It is a stream with the same tables.
+TEST_F(Receiver, Captures) {
+    Show(VARNEK_SAMPLE, "SAMPLE");
     const std::string captured = Path("captured.ts");
     WriteAll(captured, std::string(1000000, 'x'));
     WriteAll(Path("text"), std::string(9999, 'x'));
-    EXPECT_EQ(RunProgram({"--capture", captured, Path("text")}).status, 1);
-    EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "there was nothing to write";
+    NoteProgram({"--capture", captured, Path("text")});
+    EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "a run without packets wrote a capture";
 
-    const Result first = RunProgram({"--json", "--quiet", "--capture", captured, VARNEK_SAMPLE});
-    EXPECT_EQ(first.status, 0) << first.err;
+    const Result first = NoteProgram({"--json", "--quiet", "--capture", captured, VARNEK_SAMPLE});
     EXPECT_LT(ReadAll(captured).size(), SampleText().size());
-    const Result again = RunProgram({"--json", captured});
+    const Result again = NoteProgram({"--json", captured});
     const auto tables = [](const Result &result) {
-        const size_t begin = result.out.find("\"sections\"");
-        return result.out.substr(begin, result.out.find("\"pids\"") - begin) +
-               result.out.substr(result.out.find("\"transport_stream_id\""));
+        return result.out.substr(result.out.find("\"transport_stream_id\""));
     };
     EXPECT_EQ(tables(again), tables(first));
 
-    EXPECT_EQ(RunProgram({"--capture", captured, captured}).status, 1) << "a stream is not overwritten";
-    EXPECT_EQ(RunProgram({"--capture", Path(""), captured}).status, 1);
-    const Result full = RunProgram({"--capture", "/dev/full", VARNEK_SAMPLE});
-    EXPECT_EQ(full.status, 1);
-    EXPECT_THAT(full.err, HasSubstr("the capture ended early: no space is left"));
-    EXPECT_THAT(full.out, HasSubstr("1600 packets")) << "the reading goes on";
+    NoteProgram({"--capture", captured, captured});  // a stream is not overwritten
+    NoteProgram({"--capture", Path(""), captured});
+    NoteProgram({"--capture", "/dev/full", VARNEK_SAMPLE});  // the reading goes on
 }
 
-// The threads of the program come to the same result as one thread.
-TEST_F(ReceiverFiles, SurvivesDamage) {
+// On a damaged stream too, the program's threads give the report that one thread gives.
+TEST_F(Receiver, SurvivesDamage) {
     std::mt19937 random(20240615);
     for (int round = 0; round < 15; ++round) {
         std::string stream = SampleText();

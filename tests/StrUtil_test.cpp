@@ -1,5 +1,5 @@
-// The string helpers' answers to what only a table shows: null, radixes, signs. A fuzz target, which
-// runs as a test, holds them against the C library's.
+// The string helpers' results for null, radixes and signs. A fuzz target, which runs as a test, compares the helpers
+// with the C library.
 #include "Varnek_StrUtil.h"
 
 #include "support/VarnekTest.h"

@@ -1,11 +1,7 @@
-// The CRC against the definition by bits, its check value, and its uses on sections and files.
+// Compares the CRC with its definition by bits, and uses it on sections and files.
 #include "Varnek_Util.h"
 
 #include <unistd.h>
-
-#include <algorithm>
-#include <functional>
-#include <random>
 
 #include "support/VarnekTest.h"
 
@@ -17,12 +13,7 @@ using ::testing::StartsWith;
 
 class Util : public VarnekTest {};
 
-std::vector<unsigned char> Random(size_t size) {
-    static std::mt19937 random(13818);
-    std::vector<unsigned char> bytes(size);
-    std::generate(bytes.begin(), bytes.end(), std::ref(random));
-    return bytes;
-}
+std::mt19937 gRandom(13818);
 
 uint32_t CrcByBits(const unsigned char *data, size_t length) {
     uint32_t crc = 0xFFFFFFFF;
@@ -38,7 +29,7 @@ TEST_F(Util, CrcIsTheDefinitionAtEveryLengthAndAlignment) {
     EXPECT_EQ(VarnekUtil_MakeCRC32(digits, 9), 0x0376E6E7u);
     for (size_t length = 0; length <= 300; ++length) {
         for (size_t offset = 0; offset < 16; ++offset) {
-            const auto bytes = Random(offset + length);
+            const auto bytes = RandomBytes(gRandom, offset + length);
             const unsigned char *data = bytes.data() + offset;
             ASSERT_EQ(VarnekUtil_MakeCRC32(data, static_cast<int32_t>(length)), CrcByBits(data, length))
                 << length << " bytes at " << offset;
@@ -55,7 +46,7 @@ TEST_F(Util, AFlippedBitInvalidatesASection) {
     EXPECT_EQ(VarnekUtil_CheckSectionCRC32(nullptr), FALSE);
     EXPECT_THAT(TakeBodies("Varnek"), SizeIs(1));
     for (const size_t size : {7u, 40u, 4098u}) {
-        auto section = Random(size);
+        auto section = RandomBytes(gRandom, size);
         section[1] = static_cast<unsigned char>((section[1] & 0xF0) | (size - 3) >> 8);
         section[2] = static_cast<unsigned char>(size - 3);
         const uint32_t crc = CrcByBits(section.data(), size - 4);
@@ -97,7 +88,7 @@ TEST_F(Util, FilesThatCannotCarryACrcAreRefused) {
     WriteAll(path, "123");
     NOTE(VarnekUtil_AppendCRC32ToFile(path.c_str()));
     EXPECT_EQ(ReadAll(path), "123");
-    // A file of the kernel that promises a page and holds a line.
+    // A file of the kernel states the size of a page and has only a line.
     const char *line = "/sys/devices/system/cpu/online";
     if (access(line, R_OK) == 0) {
         for (const auto operation : {VarnekUtil_CheckFileCRC32, VarnekUtil_AppendCRC32ToFile}) {

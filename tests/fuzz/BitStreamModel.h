@@ -1,40 +1,25 @@
-// A model of the bit stream that moves single bits, works piece by piece, and composes the traces that
-// the stream owes.
+// A model of the bit stream that moves single bits and works piece by piece.
 #ifndef VARNEK_TESTS_FUZZ_BITSTREAMMODEL_H
 #define VARNEK_TESTS_FUZZ_BITSTREAMMODEL_H
 
 #include <algorithm>
 #include <cstdint>
-#include <string>
 #include <vector>
 
-// The same operations, bit by bit.
 struct BitStreamModel {
     explicit BitStreamModel(const std::vector<unsigned char> &source) : bytes(source) {}
 
     std::vector<unsigned char> bytes;
     int size = static_cast<int>(bytes.size());
     int index = 0;
-    int consumed = 0;  // as counted; a rewind from inside a byte makes it differ from what is taken
+    int consumed = 0;  // as counted; it differs from `taken` after a rewind from inside a byte
     int taken = 0;
     bool end = false;
-    std::vector<std::string> log;
 
-    int64_t Fail(const std::string &line, unsigned char &flag) {
-        flag = 0;
-        if (!line.empty()) {
-            log.push_back("BIS: GetBits" + line + "\n");
-        }
-        return 0;
-    }
+    static int64_t Fail(unsigned char &flag) { return flag = 0; }
     int64_t GetBits(int num, unsigned char &flag) {
-        const std::string text = "aNum=[" + std::to_string(num) + "]";
-        if (num > 8 - consumed) {
-            const std::string bit = std::to_string(consumed);
-            return Fail(" Warning: " + text + ", iBitIdxInCurByte=[" + bit + "]", flag);
-        }
-        if (end || num < 0) {
-            return Fail(end ? " Warning: End of Stream!" : ". Wrong bits number! " + text, flag);
+        if (num > 8 - consumed || end || num < 0) {
+            return Fail(flag);
         }
         int64_t value = 0;
         for (int i = 0; i < num; ++i, ++consumed) {
@@ -57,7 +42,7 @@ struct BitStreamModel {
         return value;
     }
     int64_t Read(int count, int largest, unsigned char &flag) {
-        return count < 0 || count > largest || end ? Fail("", flag) : Pieces(count, flag);
+        return count < 0 || count > largest || end ? Fail(flag) : Pieces(count, flag);
     }
     int64_t ReadBit(unsigned char &flag) { return Read(1, 1, flag); }
     int64_t ReadByte(int count, unsigned char &flag) { return Read(count, 8, flag); }

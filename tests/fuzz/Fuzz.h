@@ -1,6 +1,5 @@
-// What the fuzz targets share: the input taken apart, the traces collected, and the library's files.
-//
-// Every trace is on, so its formatting is part of the run.
+// The fuzz targets' common parts: the input taken apart, and the library's files. Every trace is on, so that its
+// formatting is part of the run.
 #ifndef VARNEK_TESTS_FUZZ_FUZZ_H
 #define VARNEK_TESTS_FUZZ_FUZZ_H
 
@@ -14,24 +13,10 @@
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
 
-// Collects the callers' texts of the traces from now on.
-void CollectTraces();
-void DropTraces();
-// Ends the run, and shows both, unless these were collected since the last call.
-void CheckTraces(const std::vector<std::string> &expected);
+// Writes a file in the library's data directory in place, since a new file each time would cost more than all the rest.
+void WriteDataFile(const std::string &name, const std::string &content);
 
-// A file in the library's data directory, rewritten in place: a new file each time would cost more
-// than all the rest.
-class DataFile {
-  public:
-    explicit DataFile(const char *name) : name_(name) {}
-    void Write(const std::string &content) const;
-
-  private:
-    const std::string name_;
-};
-
-// The input's bytes in order; zeros behind its end.
+// The input's bytes in order, and zeros after its end.
 class Input {
   public:
     Input(const uint8_t *data, size_t size) : data_(data), left_(size) {}
@@ -39,12 +24,12 @@ class Input {
     bool Empty() const { return left_ == 0; }
     uint8_t Byte() { return left_ == 0 ? uint8_t{0} : (--left_, *data_++); }
     int Below(int limit) { return Byte() % limit; }
-    // Mostly small, now and then of any size.
+    // A number that is mostly small, and now and then of any size.
     int Int() {
         const int byte = Byte();
         return byte != 128 ? (byte < 128 ? byte : byte - 256) : static_cast<int>(uint32_t{Byte()} << 24 | Byte());
     }
-    // Up to `limit` bytes, in a block of exactly their size, so that a sanitizer sees one too many.
+    // Up to `limit` bytes, in a block of exactly their size, so that a sanitizer sees an access behind it.
     template <typename Char = uint8_t>
     std::vector<Char> Bytes(size_t limit = SIZE_MAX) {
         const size_t count = left_ < limit ? left_ : limit;
@@ -53,7 +38,7 @@ class Input {
         left_ -= count;
         return bytes;
     }
-    // The bytes up to a 0 or the end, and the terminator, in a block of exactly their size.
+    // The bytes up to a 0 or the end, with a terminator, in a block of exactly their size.
     std::vector<char> Text() {
         std::vector<char> text;
         for (char c = '\0'; !Empty() && (c = static_cast<char>(Byte())) != '\0';) {

@@ -1,6 +1,6 @@
-// Stands in for libFuzzer where a target is one of the tests, in builds that it cannot make: another
-// compiler, another processor, another sanitizer.
-//   fuzz_TARGET CORPUS COUNT    runs the corpus, then COUNT inputs made of it, always the same ones
+// Replaces libFuzzer where a target is one of the tests. Such a build may have another compiler, processor or
+// sanitizer.
+//   fuzz_TARGET CORPUS COUNT    runs the corpus, then COUNT inputs made of it, which are the same in each run
 #include <algorithm>
 #include <filesystem>
 #include <fstream>
@@ -20,7 +20,7 @@ std::mt19937 gRandom(188);
 
 size_t Below(size_t limit) { return gRandom() % limit; }
 
-// One part replaced by another input's, or by noise; now and then several bytes changed.
+// Replaces a part by one of another input or by noise, and now and then changes several bytes.
 Bytes Mutated(Bytes input, const Bytes &other) {
     const size_t begin = Below(input.size() + 1);
     const size_t end = begin + Below(input.size() - begin + 1);
@@ -28,7 +28,7 @@ Bytes Mutated(Bytes input, const Bytes &other) {
     Bytes part(other.begin() + static_cast<std::ptrdiff_t>(from), other.end());
     part.resize(std::min<size_t>(part.size(), Below(200)));
     if (Below(2) == 0) {
-        // Small numbers are what most operations take.
+        // Most operations take small numbers.
         const size_t limit = Below(3) == 0 ? 256 : 16;
         std::generate(part.begin(), part.end(), [limit] { return static_cast<uint8_t>(Below(limit)); });
     }
@@ -58,7 +58,7 @@ int main(int argc, char **argv) {
         corpus.emplace_back(std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>());
         Run(corpus.back());
     }
-    // Now and then one stays, so that inputs move away from the corpus.
+    // Now and then an input joins the corpus, so that later ones move away from it.
     for (int left = atoi(argv[2]); left > 0; --left) {
         Bytes input = Mutated(corpus[Below(corpus.size())], corpus[Below(corpus.size())]);
         Run(input);

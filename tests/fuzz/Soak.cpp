@@ -1,6 +1,6 @@
-// Eight threads that do at random, for as many seconds as the first argument says, what the modules of
-// a running stack do to the library. Every operation's result is held against what the threads know of
-// each other, and at the end nothing is missing: no message, no trace, no place in a table.
+// Eight threads use the library at random as the modules of a running stack do, for as many seconds as the first
+// argument gives. Each operation's result is compared with what the threads know of each other. At the end no message,
+// no trace and no place in a table is missing.
 #include <sys/resource.h>
 
 #include <atomic>
@@ -13,16 +13,14 @@
 
 #include "Varnek_CRingBuffer.h"
 #include "Varnek_Debug.h"
-#include "Varnek_Semaphore.h"
-#include "Varnek_Thread.h"
-#include "Varnek_Timer.h"
 #include "support/Check.h"
+#include "support/Families.h"
 #include "support/Platform.h"
 
 namespace {
 
 constexpr int kThreads = 8;
-constexpr int kUnits = 3;  // of the semaphore that all share
+constexpr int kUnits = 3;  // of the shared semaphore
 constexpr int kPacket = 188;
 
 std::atomic<bool> gStop{false}, gStorm{false};
@@ -31,16 +29,23 @@ std::atomic<int64_t> gTraces{0}, gLines{0};
 int32_t gMutex, gSemaphore;
 int64_t gGuarded = 0;
 
-// A message as the threads agree on it: `number` counts what one thread sent to another one.
+// The content of a message. `number` counts the messages from one thread to another one.
 struct Message {
     int64_t number;
     int32_t from;
-    int32_t urgent;  // or the record that it is meant for
+    int32_t urgent;  // or the record that receives it
     char filled[24];
 };
-static_assert(sizeof(Message) == sizeof(THREAD_MSG));
 
-// What one thread did and saw. Its own, but for the two atomics and the ring's two ends.
+template <typename To, typename From>
+To As(const From &from) {
+    static_assert(sizeof(To) == sizeof from);
+    To to;
+    memcpy(&to, &from, sizeof to);
+    return to;
+}
+
+// What one thread did and saw. Other threads use only the atomics and the ring.
 struct Worker {
     int index;
     int32_t handle;
@@ -48,24 +53,24 @@ struct Worker {
     int64_t sent[kThreads], received[kThreads], urgentSent, urgentReceived;
     int64_t peeked, objects, locks, units, starts, short_lived, written, read, operations;
     int64_t lookups, passed;
-    int32_t latest[kThreads];  // the record of each other one that it sent to last
+    int32_t latest[kThreads];  // the last record of each other worker that it sent to
     std::atomic<int64_t> fired, ended, taken;
-    VarnekCRingBuffer *ring;  // between an even worker, who writes, and the next one
+    VarnekCRingBuffer *ring;  // between an even worker, which writes, and the next one
 
     int Below(int limit) { return static_cast<int>(random() % static_cast<unsigned int>(limit)); }
-    // Every character but the first tells whose it is, so that half a name is none.
+    // Every character but the first shows the owner, so that half a name is no one's name.
     std::string Name(char kind) const { return kind + std::string(30, static_cast<char>('a' + index)); }
 };
 Worker gWorkers[kThreads];
 
-// Which of the workers made a handle, by the handle's last bits: the handle and, in three bits, the worker.
+// The maker of each handle, by the handle's last bits: the handle and, in three bits, the worker.
 std::atomic<int64_t> gMakers[3][4096];
 
 void SetMaker(int family, int32_t handle, const Worker &maker) {
     CHECK(handle > 0 && gMakers[family][handle % 4096].exchange(int64_t{handle} * 8 + maker.index) / 8 != handle);
 }
 
-// The handle that another thread's name has just now, if any. It never is that of another name.
+// The handle that another thread's name has at the moment, or -1. It is never the handle of another name.
 int32_t LookUp(int family, int32_t (*find)(const char *), const Worker &maker, char kind) {
     const int32_t handle = find(maker.Name(kind).c_str());
     if (handle != -1) {
@@ -80,8 +85,7 @@ void Send(Worker &me) {
     const BOOL urgent = me.Below(8) == 0 ? TRUE : FALSE;
     Message message{urgent ? ++me.urgentSent : ++me.sent[to], me.index, urgent, {}};
     memset(message.filled, static_cast<char>(message.number), sizeof message.filled);
-    THREAD_MSG out;
-    memcpy(&out, &message, sizeof out);
+    const auto out = As<THREAD_MSG>(message);
     CHECK((urgent ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage)(gWorkers[to].handle, &out) == TRUE);
 }
 
@@ -91,8 +95,7 @@ bool Receive(Worker &me, bool peek) {
     if ((peek ? VarnekPGL_PeekMessage(&in, &left) : VarnekPGL_ReceiveMessage(0, &in, &left)) != TRUE) {
         return false;
     }
-    Message message;
-    memcpy(&message, &in, sizeof message);
+    const auto message = As<Message>(in);
     char expected[sizeof message.filled];
     memset(expected, static_cast<char>(message.number), sizeof expected);
     CHECK(left >= 0 && memcmp(message.filled, expected, sizeof expected) == 0);
@@ -148,7 +151,7 @@ int64_t Microseconds() {
         .count();
 }
 
-// Never comes before its start is due. Half of the callbacks do to their own timer what they may do.
+// It is never called before its start is due. Half of the callbacks use their own timer.
 void OnTimer(uint32_t timer, void *userData) {
     const Start &start = *static_cast<Start *>(userData);
     CHECK(Microseconds() >= start.due);
@@ -200,17 +203,16 @@ void UseRing(Worker &me) {
     CHECK(own.GetDistance() == 100);
 }
 
-// Receives until its record is gone. What it gets was sent to it, and is in order.
+// Receives until its record is gone. Each message was sent to this record, and they come in order.
 void *ReceiveAll(void *argument) {
     Worker &parent = *static_cast<Worker *>(argument);
     const int32_t self = VarnekPGL_GetCurrentThread();
     int64_t next[kThreads] = {};
     THREAD_MSG in;
     int32_t count = 0;
-    // A removal before the first look is no error: a removed thread has no handle.
+    // A removed thread has no handle. It may have been removed before it asks for it.
     while (self != -1 && VarnekPGL_ReceiveMessage(WAIT_FOREVER, &in, &count) == TRUE) {
-        Message message;
-        memcpy(&message, &in, sizeof message);
+        const auto message = As<Message>(in);
         CHECK(message.urgent == self && message.number == next[message.from]++);
         ++parent.taken;
     }
@@ -226,13 +228,14 @@ void UseThread(Worker &me) {
         std::this_thread::sleep_for(std::chrono::microseconds(me.Below(1000)));
     }
     CHECK(VarnekPGL_DeleteThread(thread) == TRUE);
-    // The waiter is woken.
+    // The removal wakes the waiter.
     for (++me.short_lived; me.ended < me.short_lived;) {
         std::this_thread::yield();
     }
 }
 
-// Looks for what another thread makes and deletes meanwhile, and sends to its thread until that is gone.
+// Looks for the objects that another thread makes and deletes meanwhile, and sends messages to its thread until the
+// thread is gone.
 void UseOthers(Worker &me) {
     const Worker &other = gWorkers[me.Below(kThreads)];
     me.lookups += LookUp(0, VarnekPGL_GetMutexByName, other, 'o') != -1 ? 1 : 0;
@@ -243,15 +246,21 @@ void UseOthers(Worker &me) {
     }
     me.latest[other.index] = thread;
     Message message{0, me.index, thread, {}};
-    THREAD_MSG out;
-    do {
-        memcpy(&out, &message, sizeof out);
-    } while (VarnekPGL_SendMessage(thread, &out) == TRUE && ++message.number < 2000);
+    for (auto out = As<THREAD_MSG>(message); VarnekPGL_SendMessage(thread, &out) == TRUE && ++message.number < 2000;) {
+        out = As<THREAD_MSG>(message);
+    }
     me.passed += message.number;
 }
 
-// Half of the time all do what modules do; half of the time it storms: half of the threads do nothing but create
-// and delete, and the others nothing but look for it.
+void ReceiveOrPeek(Worker &me) { Receive(me, me.Below(33) == 0); }
+
+void Trace(Worker &me) {
+    ++gTraces;
+    VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_GINGA, "soak %d%*c", me.index, 900, '.');
+}
+
+// Half of the time all threads act as modules do. The other half is a storm: half of the threads only create and
+// delete, and the others only look for these objects.
 void *Work(void *argument) {
     Worker &me = *static_cast<Worker *>(argument);
     while (gReady == 0) {
@@ -260,34 +269,25 @@ void *Work(void *argument) {
     CHECK(VarnekPGL_GetCurrentThread() == me.handle);
     for (; !gStop; ++me.operations) {
         const int kind = me.Below(100);
-        if (gStorm) {
-            (me.index % 2 != 0 ? UseOthers : kind < 50 ? UseOwnObjects : UseThread)(me);
-        } else if (kind < 27) {
-            Send(me);
-        } else if (kind < 60) {
-            Receive(me, kind == 59);
-        } else if (kind < 66) {
-            UseOthers(me);
-        } else if (kind < 76) {
-            UseSharedObjects(me);
-        } else if (kind < 82) {
-            UseOwnObjects(me);
-        } else if (kind < 83) {
-            UseTimer(me);
-        } else if (kind < 93) {
-            UseRing(me);
-        } else if (kind < 94) {
-            UseThread(me);
-        } else {
-            ++gTraces;
-            VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_GINGA, "soak %d%*c", me.index, 900, '.');
-        }
+        const auto act = gStorm      ? (me.index % 2 != 0 ? UseOthers
+                                        : kind < 50       ? UseOwnObjects
+                                                          : UseThread)
+                         : kind < 27 ? Send
+                         : kind < 60 ? ReceiveOrPeek
+                         : kind < 66 ? UseOthers
+                         : kind < 76 ? UseSharedObjects
+                         : kind < 82 ? UseOwnObjects
+                         : kind < 83 ? UseTimer
+                         : kind < 93 ? UseRing
+                         : kind < 94 ? UseThread
+                                     : Trace;
+        act(me);
     }
     --gSenders;
     while (gSenders > 0) {
         std::this_thread::yield();
     }
-    // Each message that was peeked leaves a signal behind, at which a receive returns empty-handed.
+    // Each peeked message leaves a signal behind, which ends a receive without a message.
     for (int64_t empty = 0; empty <= me.peeked;) {
         empty += Receive(me, false) ? 0 : 1;
     }
@@ -295,39 +295,20 @@ void *Work(void *argument) {
     return nullptr;
 }
 
-// How many objects of a kind fit in beside those that live.
-template <typename Create, typename Delete>
-int Room(Create create, Delete destroy) {
-    int32_t handles[256];
-    int count = 0;
-    while ((handles[count] = create(("room" + std::to_string(count)).c_str())) != -1) {
-        ++count;
-    }
-    for (int i = 0; i < count; ++i) {
-        destroy(handles[i]);
-    }
-    return count;
-}
-
-void *Nothing(void *) { return nullptr; }
-
+// Describes the room in each registry beside the living objects.
 std::string RoomInTables() {
-    const int mutexes = Room(VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex);
-    const int semaphores =
-        Room([](const char *name) { return VarnekPGL_CreateSemaphore(name, 0); }, VarnekPGL_DeleteSemaphore);
-    const int timers =
-        Room(VarnekPGL_CreateTimer, [](int32_t timer) { return VarnekPGL_DeleteTimer(static_cast<uint32_t>(timer)); });
-    const int threads = Room([](const char *name) { return VarnekPGL_CreateThread(name, 1, 0, Nothing, nullptr); },
-                             VarnekPGL_DeleteThread);
-    return std::to_string(mutexes) + " mutexes, " + std::to_string(semaphores) + " semaphores, " +
-           std::to_string(timers) + " timers, " + std::to_string(threads) + " threads";
+    std::string room;
+    for (const Family &family : kFamilies) {
+        room += std::to_string(family.Room()) + " " + family.name + ", ";
+    }
+    return room;
 }
 
-template <typename Field>
-long long Sum(Field field) {
+template <typename Count>
+long long Sum(Count Worker::*count) {
     long long sum = 0;
     for (const Worker &worker : gWorkers) {
-        sum += field(worker);
+        sum += worker.*count;
     }
     return sum;
 }
@@ -366,10 +347,10 @@ int main(int argc, char **argv) {
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
 
-    const long long locks = Sum([](const Worker &w) { return w.locks; });
+    const long long locks = Sum(&Worker::locks);
     CHECK(gGuarded == locks && gUnitsTaken == 0 && gTraces == gLines && RoomInTables() == room);
-    const long long urgentSent = Sum([](const Worker &w) { return w.urgentSent; });
-    const long long urgentReceived = Sum([](const Worker &w) { return w.urgentReceived; });
+    const long long urgentSent = Sum(&Worker::urgentSent);
+    const long long urgentReceived = Sum(&Worker::urgentReceived);
     long long sent = urgentSent;
     long long lost = urgentSent - urgentReceived;
     for (const Worker &from : gWorkers) {
@@ -382,25 +363,23 @@ int main(int argc, char **argv) {
         CHECK(gWorkers[i].ring->GetSpaceReading() == (gWorkers[i].written - gWorkers[i + 1].read) * kPacket);
         delete gWorkers[i].ring;
     }
-    const long long passed = Sum([](const Worker &w) { return w.passed; });
-    CHECK(passed >= Sum([](const Worker &w) { return w.taken.load(); }));
+    const long long passed = Sum(&Worker::passed);
+    CHECK(passed >= Sum(&Worker::taken));
     rusage usage{};
     getrusage(RUSAGE_SELF, &usage);
     printf("seconds              %d\n", seconds);
-    printf("operations           %lld\n", Sum([](const Worker &w) { return w.operations; }));
+    printf("operations           %lld\n", Sum(&Worker::operations));
     printf("messages             %lld, of which urgent %lld\n", sent, urgentSent);
     printf("lost messages        %lld\n", lost);
-    printf("locks, units         %lld, %lld\n", locks, Sum([](const Worker &w) { return w.units; }));
-    printf("mutexes, semaphores  %lld of each made and deleted\n", Sum([](const Worker &w) { return w.objects; }));
-    printf("timer starts         %lld, of which %lld called back\n", Sum([](const Worker &w) { return w.starts; }),
-           Sum([](const Worker &w) { return w.fired.load(); }));
-    printf("ring packets         %lld\n", Sum([](const Worker &w) { return w.read; }));
-    printf("threads              %lld, sent %lld messages, of which %lld were received\n",
-           Sum([](const Worker &w) { return w.short_lived; }), passed,
-           Sum([](const Worker &w) { return w.taken.load(); }));
-    printf("found elsewhere      %lld mutexes and semaphores\n", Sum([](const Worker &w) { return w.lookups; }));
+    printf("locks, units         %lld, %lld\n", locks, Sum(&Worker::units));
+    printf("mutexes, semaphores  %lld of each made and deleted\n", Sum(&Worker::objects));
+    printf("timer starts         %lld, of which %lld called back\n", Sum(&Worker::starts), Sum(&Worker::fired));
+    printf("ring packets         %lld\n", Sum(&Worker::read));
+    printf("threads              %lld, sent %lld messages, of which %lld were received\n", Sum(&Worker::short_lived),
+           passed, Sum(&Worker::taken));
+    printf("found elsewhere      %lld mutexes and semaphores\n", Sum(&Worker::lookups));
     printf("traces               %lld\n", static_cast<long long>(gTraces));
-    printf("room afterwards      %s, as before\n", room.c_str());
+    printf("room afterwards      %sas before\n", room.c_str());
     printf("largest memory       %ld KiB\n", usage.ru_maxrss);
     LeaveClean();
     return lost == 0 ? 0 : 1;

@@ -1,14 +1,13 @@
-// The configuration file: any text loads, and the record that a load makes is unchanged by saving it and
-// loading it again. What follows a 0 is the feature store's text.
+// The configuration file: any text loads, and saving the loaded record and loading it again changes nothing. The text
+// of the feature store follows a 0.
 #include <cstring>
 
 #include "Fuzz.h"
 #include "Varnek_Config.h"
 
 int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
-    static const DataFile file("Varnek_Config.cfg");
     Input input(data, size);
-    file.Write(input.Text().data());
+    WriteDataFile("Varnek_Config.cfg", input.Text().data());
     const std::vector<char> feature = input.Text();
     gFeature = feature.data();
 

@@ -1,5 +1,5 @@
-// The debug configuration: whatever its text, the traces that get through are those of some levels and some
-// modules, which are as many as the load's own report shows; and a comment at the end changes nothing.
+// The debug configuration: with any text, the traces of some levels and some modules are on. The load's report shows as
+// many. A comment at the end changes nothing.
 #include <cstring>
 #include <map>
 
@@ -20,10 +20,9 @@ void OnLog(int, const char *tag, const char *text) {
     }
 }
 
-// How many traces of each level and of each module get through when all are tried.
+// Loads a text, tries all traces, and counts those of each level and of each module that reach the log.
 Masks Load(const std::string &text) {
-    static const DataFile file("debug_ltn.ini");
-    file.Write(text);
+    WriteDataFile("debug_ltn.ini", text);
     gShown = 0;
     VarnekPGL_InitializeDebug();
     Masks passing;

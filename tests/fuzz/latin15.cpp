@@ -1,4 +1,4 @@
-// Latin-15 to UTF-8: a text becomes what its characters become one by one, which a test holds against the chart.
+// Latin-15 to UTF-8: a text is converted as its characters are, one by one. A test compares these with the chart.
 #include <algorithm>
 #include <cstring>
 

@@ -1,9 +1,10 @@
-// The example receiver from bytes to JSON: one stream, fed whole and in pieces, gives one report,
-// its counters add up, its text is fit for JSON, and no line of the summary is too wide. An input whose first byte is
-// even is a stream as it stands; any other is a list of sections {PID, length, bytes}, which get their lengths and CRCs
-// and are put into packets, so that a run gets behind those.
+// The example receiver from bytes to JSON: one stream, fed whole and in pieces, gives one report, its counters add up,
+// its text is fit for JSON, and no line of the summary is too wide. An input whose first byte is even is a stream. Any
+// other input is a list of sections {PID, length, bytes}. They get their lengths and CRCs and are put into packets, so
+// that a run gets past these checks.
 #include <numeric>
 
+#include "BroadcastText.h"
 #include "Fuzz.h"
 #include "Paragraphs.h"
 #include "Varnek_Util.h"
@@ -14,7 +15,7 @@ namespace {
 using receiver::Bytes;
 using receiver::kPacketSize;
 
-// Every PID with tables that the receiver knows by itself, and two for the PAT to name.
+// Every PID whose tables the receiver reads without a PAT, and two that a PAT may name.
 constexpr uint16_t kPids[] = {0x0000, 0x0010, 0x0011, 0x0012, 0x0014, 0x0026, 0x0027, 0x0101, 0x1FC8};
 
 Bytes StreamOf(Input &input) {
@@ -32,25 +33,8 @@ Bytes StreamOf(Input &input) {
     return writer.Stream();
 }
 
-// Well-formed UTF-8 without a control character but line feeds.
-bool IsText(const std::string &text) {
-    for (size_t i = 0; i < text.size();) {
-        const auto byte = [&](size_t at) { return at < text.size() ? static_cast<uint8_t>(text[at]) : uint8_t{0}; };
-        const uint8_t lead = byte(i);
-        const size_t length = lead < 0x80 ? 1 : lead >= 0xC2 && lead < 0xE0 ? 2 : lead >= 0xE0 && lead < 0xF0 ? 3 : 0;
-        if (length == 0 || (lead < 0x20 && lead != '\n') || (lead == 0xE0 && byte(i + 1) < 0xA0) ||
-            (lead == 0xED && byte(i + 1) >= 0xA0)) {
-            return false;
-        }
-        for (size_t k = 1; k < length; ++k) {
-            if ((byte(i + k) & 0xC0) != 0x80) {
-                return false;
-            }
-        }
-        i += length;
-    }
-    return true;
-}
+// Checks for well-formed UTF-8 without control characters other than line feeds. Such a text decodes to itself.
+bool IsText(const std::string &text) { return receiver::ToUtf8("\x15" + text) == text; }
 
 bool FitsWidth(const std::string &text, size_t width) {
     for (size_t at = 0; at < text.size(); at = text.find('\n', at) + 1) {

@@ -1,5 +1,5 @@
-// The helpers on NUL-terminated strings, against the C library and the C++ library, on blocks of exactly the texts'
-// sizes.
+// The helpers on NUL-terminated strings, compared with the C and the C++ library. Texts are in blocks of exactly their
+// size.
 #include <algorithm>
 #include <cstring>
 #include <string>

@@ -1,5 +1,5 @@
-// UTF-8 to units and back: what was decoded fits the room that was asked for, to the byte, and is
-// what its encoding decodes to.
+// UTF-8 to units and back: the decoded units fit exactly the room that was asked for, and their encoding decodes to the
+// same units.
 #include <algorithm>
 
 #include "Fuzz.h"
@@ -9,7 +9,7 @@ namespace {
 
 using Units = std::vector<unsigned short>;
 
-// In a block of exactly the room that the text needs.
+// Decodes into a block of exactly the room that the text needs.
 Units Decode(const char *text, int length) {
     const int room = __WmLngStrlenByByte(text, length);
     CHECK(room >= 2 && room % 2 == 0);

@@ -1,4 +1,4 @@
-// What must hold at any moment. Its failure ends the process, where a debugger or a fuzzer sees it.
+// Checks a condition that must always hold. A failure aborts the process, so that a debugger or a fuzzer sees it.
 #ifndef VARNEK_TESTS_SUPPORT_CHECK_H
 #define VARNEK_TESTS_SUPPORT_CHECK_H
 

@@ -17,30 +17,24 @@
 #include <cstdlib>
 #include <cstring>
 #include <new>
+#include <utility>
 
 namespace {
 
 struct Call {
+    static inline Call *first = nullptr;
+
     const char *name;
     Call *next;
     std::atomic<int> left{0};
     int error = 0;
 
-    explicit Call(const char *callName);
-    bool Fails() {
-        if (left <= 0) {
-            return false;
-        }
-        return --left == 0;
-    }
+    explicit Call(const char *callName) : name(callName), next(std::exchange(first, this)) {}
+    bool Fails() { return left > 0 && --left == 0; }
 };
 
-Call *gCalls = nullptr;
-
-Call::Call(const char *callName) : name(callName), next(gCalls) { gCalls = this; }
-
 Call &Find(const char *name) {
-    for (Call *call = gCalls; call != nullptr; call = call->next) {
+    for (Call *call = Call::first; call != nullptr; call = call->next) {
         if (strcmp(call->name, name) == 0) {
             return *call;
         }
@@ -51,7 +45,7 @@ Call &Find(const char *name) {
 std::atomic<int> gDrops{0};
 void (*gDeliver)(sigval value) = nullptr;
 
-// Has the timer's deliveries pass a place where they can be dropped.
+// Routes the timer's deliveries through a function that can drop them.
 sigevent *Droppable(sigevent *event) {
     gDeliver = event->sigev_notify_function;
     event->sigev_notify_function = [](sigval value) {
@@ -132,7 +126,7 @@ WRAP(int, (__real_closedir(directory), errno = gCall_closedir.error, -1), closed
 WRAP_POSIX(gettimeofday, (timeval * time, void *zone), time, zone)
 WRAP_POSIX(system, (const char *command), command)
 
-// Of these, the library uses operator new[](size_t, const std::nothrow_t &), under its mangled name.
+// Of these, the library uses operator new[](size_t, const std::nothrow_t &). Its mangled name depends on size_t.
 #if __SIZEOF_POINTER__ == 8
 #define NEW_ARRAY _ZnamRKSt9nothrow_t
 #else
@@ -145,7 +139,7 @@ WRAP_NAMED(void *, nullptr, NEW_ARRAY, (size_t size, const std::nothrow_t &tag),
 
 std::vector<const char *> FailingCalls() {
     std::vector<const char *> names;
-    for (const Call *call = gCalls; call != nullptr; call = call->next) {
+    for (const Call *call = Call::first; call != nullptr; call = call->next) {
         names.push_back(call->name);
     }
     return names;

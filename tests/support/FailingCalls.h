@@ -1,22 +1,20 @@
-// Calls of the C library that a test can make fail, in programs linked with --wrap for each of
-// them.
+// Calls of the C library that a test can make fail. The program is linked with --wrap for each of them.
 #ifndef VARNEK_TESTS_SUPPORT_FAILINGCALLS_H
 #define VARNEK_TESTS_SUPPORT_FAILINGCALLS_H
 
 #include <vector>
 
-// The names of all of them, that of operator new[] mangled.
+// Returns the names of all of them. That of operator new[] is mangled.
 std::vector<const char *> FailingCalls();
 
-// Makes the n-th call from now (1 for the next) of this function fail with `error`; 0 for none. A
-// pthread call returns the error, a stream's read or write 0, what returns a pointer null, the others -1, with errno
-// set.
+// Makes the n-th call of this function from now on fail with `error`: 1 is the next, 0 is none. A pthread function
+// returns the error. The others set errno and return null, 0 (fread, fwrite) or -1.
 void FailCall(const char *function, int nth, int error);
 
 // Whether the call that FailCall() asked for has not been made yet.
 bool IsStillToFail(const char *function);
 
-// Has the system drop its next delivery of a timer's expiry, and whether that has happened.
+// Drops the system's next delivery of a timer's expiry; returns whether that has happened.
 void DropDelivery();
 bool IsDeliveryDropped();
 

@@ -22,7 +22,7 @@ constexpr char kEverythingOn[] =
     "Common=1\nJNI=1\nMainControl=1\nESG=1\nSessionManager=1\nSectionParser=1\nDsmccDC=1\n"
     "DsmccOC=1\nTsDemux=1\nCPRM=1\nSMPlayer=1\nGingaAppMgr=1\n";
 
-// Other processes may remove the same entries, or be about to put their draft of the configuration in place.
+// Other processes may remove the same entries, or may be about to rename their draft of the configuration.
 void EmptyDataDirectory(bool keepConfig) {
     std::error_code ignored;
     std::filesystem::create_directories(VARNEK_DATA_DIR, ignored);
@@ -52,7 +52,7 @@ void StartClean() {
     if (std::string(std::istreambuf_iterator<char>(file), {}) == kEverythingOn) {
         return;
     }
-    // Other processes may be reading the file, so it is put in place whole.
+    // Other processes may be reading the file, so a rename replaces it as a whole.
     const std::string draft = path + std::to_string(getpid());
     std::ofstream(draft, std::ios::binary) << kEverythingOn;
     std::filesystem::rename(draft, path);

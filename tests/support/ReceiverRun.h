@@ -1,4 +1,4 @@
-// The receiver's stages in one thread, for its tests and its fuzz target.
+// Runs the receiver's stages in one thread, for its tests and its fuzz target.
 #ifndef VARNEK_TESTS_SUPPORT_RECEIVERRUN_H
 #define VARNEK_TESTS_SUPPORT_RECEIVERRUN_H
 
@@ -19,8 +19,8 @@ namespace receiver {
 
 using streamwriter::Bytes;
 
-// Reads a stream in blocks of up to `block` bytes. Blocks, packets and sections come in memory of exactly
-// their size, so that the sanitizers see a step beyond.
+// Reads a stream in blocks of up to `block` bytes. Blocks, packets and sections are in memory of exactly their size, so
+// that the sanitizers see an access behind them.
 inline Report ReadStream(const Bytes &stream, size_t block = 4096) {
     Report report;
     TableParser parser(report.model, LanguageOf(kBrazil));
@@ -43,7 +43,7 @@ inline Report ReadStream(const Bytes &stream, size_t block = 4096) {
     return report;
 }
 
-// Collects the text that a function writes to the file that it is handed.
+// Returns the text that a function writes to its file.
 template <typename Writer>
 std::string Written(Writer writer) {
     char *text = nullptr;

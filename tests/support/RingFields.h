@@ -1,4 +1,4 @@
-// A ring's memory: how a test brings about what no operation does.
+// A ring's memory, with which a test makes a state that no operation leaves behind.
 #ifndef VARNEK_TESTS_SUPPORT_RINGFIELDS_H
 #define VARNEK_TESTS_SUPPORT_RINGFIELDS_H
 
@@ -19,6 +19,10 @@ inline Fields FieldsOf(const VarnekCRingBuffer &ring) {
     static_assert(sizeof fields == sizeof ring);
     memcpy(&fields, static_cast<const void *>(&ring), sizeof fields);
     return fields;
+}
+
+inline void SetFields(VarnekCRingBuffer &ring, const Fields &fields) {
+    memcpy(static_cast<void *>(&ring), &fields, sizeof fields);
 }
 
 #endif

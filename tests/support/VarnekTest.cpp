@@ -38,20 +38,10 @@ std::vector<LogLine> TakeLog() {
     return lines;
 }
 
-std::vector<std::string> TakeBodies(const std::string &tag) {
+std::vector<std::string> TakeBodies(const std::string &tag, int priority) {
     std::vector<std::string> bodies;
     for (const LogLine &line : TakeLog()) {
-        if (tag.empty() || line.tag == tag) {
-            bodies.push_back(line.Body());
-        }
-    }
-    return bodies;
-}
-
-std::vector<std::string> TakeErrors() {
-    std::vector<std::string> bodies;
-    for (const LogLine &line : TakeLog()) {
-        if (line.priority == 6) {
+        if ((tag.empty() || line.tag == tag) && (priority == 0 || line.priority == priority)) {
             bodies.push_back(line.Body());
         }
     }
@@ -94,8 +84,10 @@ void VarnekTest::TearDown() {
         }
     }
     if (!transcript_.empty()) {
-        const std::regex handle("(linux ?[A-Z][a-z]+=|[pP]threadI[dD] = )\\[[^\\]]*");
-        transcript_ = std::regex_replace(transcript_, handle, "$1[*");
+        const std::regex system(
+            "((?:linux ?[A-Z][a-z]+=|[pP]threadI[dD] = |tv_n?sec)\\[|[pu]id\\((?=\\d)|(?:pDir|hFile|handle) = 0x)"
+            "[^\\]), \n]*|(process\\()[^)]*/");
+        transcript_ = std::regex_replace(transcript_, system, "$1$2*");
         const auto &test = *::testing::UnitTest::GetInstance()->current_test_info();
         const std::string path = std::string(VARNEK_EXPECTED) + test.test_suite_name() + "." + test.name() + ".txt";
         if (getenv("VARNEK_WRITE_EXPECTED") != nullptr) {

@@ -1,5 +1,5 @@
-// The fixture of the library's tests: captures what the library writes to the Android log, and
-// gives each test a folder of its own.
+// The fixture of the tests. It captures the lines that the library writes to the Android log, and gives each test a
+// folder of its own.
 #ifndef VARNEK_TESTS_SUPPORT_VARNEKTEST_H
 #define VARNEK_TESTS_SUPPORT_VARNEKTEST_H
 
@@ -7,7 +7,11 @@
 #include <gtest/gtest.h>
 #include <sys/types.h>
 
+#include <algorithm>
+#include <atomic>
 #include <chrono>
+#include <functional>
+#include <random>
 #include <string>
 #include <thread>
 #include <utility>
@@ -22,26 +26,49 @@ struct LogLine {
     std::string text;
     pid_t thread;
 
-    // The caller's text of a trace, without the prefix; other lines whole.
+    // Returns the caller's text of a trace, without the prefix, and other lines as a whole.
     std::string Body() const;
 };
 
-// Every line since the last call. Lines of all threads, in the order of their writes.
+// Returns the lines of all threads since the last call, in the order of their writes.
 std::vector<LogLine> TakeLog();
 
-// The bodies of all lines since the last call; with a tag, only of lines under it.
-std::vector<std::string> TakeBodies(const std::string &tag = "");
+// Returns the bodies of all lines since the last call, or only of those with this tag and this priority.
+std::vector<std::string> TakeBodies(const std::string &tag = "", int priority = 0);
 
-// The bodies of the Error traces and storage failures since the last call.
-std::vector<std::string> TakeErrors();
+// Returns the bodies of the Error traces and storage failures since the last call.
+inline std::vector<std::string> TakeErrors() { return TakeBodies("", 6); }
 
-// Called for each line before it is captured, without a lock; null for none.
+// Called without a lock for each line before it is captured; null for none.
 extern void (*gLogHook)(const LogLine &line);
 
 std::string ReadAll(const std::string &path);
 void WriteAll(const std::string &path, const std::string &content);
 
-// Waits until `condition` holds, for twenty seconds at most. Whether it did.
+inline std::vector<unsigned char> RandomBytes(std::mt19937 &random, size_t size) {
+    std::vector<unsigned char> bytes(size);
+    std::generate(bytes.begin(), bytes.end(), std::ref(random));
+    return bytes;
+}
+
+// Runs work(0), work(1) ... in threads that start them at the same moment.
+template <typename Work>
+void AtOnce(int threads, Work work) {
+    std::atomic<int> waiting{threads};
+    std::vector<std::thread> all;
+    for (int i = 0; i < threads; ++i) {
+        all.emplace_back([&waiting, &work, i] {
+            for (--waiting; waiting > 0;) {
+            }
+            work(i);
+        });
+    }
+    for (std::thread &thread : all) {
+        thread.join();
+    }
+}
+
+// Waits until `condition` holds, but at most for twenty seconds. Returns whether it holds.
 template <typename Condition>
 bool Eventually(Condition condition) {
     const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(20);
@@ -54,19 +81,21 @@ bool Eventually(Condition condition) {
     return true;
 }
 
-// Tracing is on for every level and module, and the first load is behind us.
+// Every level and every module is traced, and the debug configuration has been loaded.
 class VarnekTest : public ::testing::Test {
   protected:
     void SetUp() override;
     void TearDown() override;
 
-    // A path in this test's own folder.
+    // Returns a path in this test's own folder.
     std::string Path(const std::string &name) const { return folder_ + "/" + name; }
 
-    // Appends a call's result, and this thread's lines since the last TakeLog(), to the test's transcript. It has to be
-    // that of tests/expected/SUITE.TEST.txt; a run with VARNEK_WRITE_EXPECTED in its environment writes that file.
+    // Appends a text, or a call's result and this thread's lines since the last TakeLog(), to the test's transcript.
+    // The transcript must equal tests/expected/SUITE.TEST.txt. A run with VARNEK_WRITE_EXPECTED in its environment
+    // writes that file.
+    void Note(const std::string &text) { transcript_ += text; }
     void Note(const std::string &call, int64_t result);
-    // Has the transcript show `name` for what differs from run to run. (The system's handles are hidden always.)
+    // Replaces a text that differs from run to run by `name` in the transcript. The system's handles are always hidden.
     void Show(const std::string &text, const std::string &name) { names_.emplace_back(text, name); }
 
   private:
@@ -74,7 +103,7 @@ class VarnekTest : public ::testing::Test {
     std::vector<std::pair<std::string, std::string>> names_{{VARNEK_DATA_DIR, "DATA/"}, {VARNEK_SYSTEM_DIR, "SYSTEM/"}};
 };
 
-// Notes a call under its own text.
+// Notes a call with its source text.
 #define NOTE(...) (TakeLog(), Note(#__VA_ARGS__, (__VA_ARGS__)))
 
 #endif
