@@ -184,7 +184,7 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
     // Whoever takes the lock of the queue after this does not find the handle. The owner may be
     // waiting for a message: the post wakes it. Without a waiter the post goes with the semaphore.
     Hold queue(info.queueLock);
-    list_t unread = info.MsgQ;
+    const list_t unread = info.MsgQ;
     list_initialize(&info.MsgQ);
     info.units = 0;
     info.removedBy = operation;
@@ -197,10 +197,10 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
         VARNEK_TRACE(unreadMask, "***** %s : MsgQ is not empty!!size = [%d]", operation,
                      unread.count);
     }
-    while (unread.head != nullptr) {
-        list_node_t *const node = unread.head;
-        Unlink(&unread, node);
+    for (list_node_t *node = unread.head; node != nullptr;) {
+        list_node_t *const next = node->next;
         free(node);
+        node = next;
     }
     TRACE_LOW("***** END : %s, %d", operation, count);
     return TRUE;
