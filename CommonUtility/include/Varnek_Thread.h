@@ -35,8 +35,8 @@ VARNEK_API int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t prio
                                           void *argument);
 
 // Removes a thread's record and frees its unread messages, but not the memory that they point to.
-// This takes 0.26 s for ten million messages on a PC; no other operation waits for it. The thread
-// runs on; if it waits in a receive, the receive returns FALSE.
+// Unread messages are traced at Error. This takes 0.26 s for ten million messages on a PC; no other
+// operation waits for it. The thread runs on; if it waits in a receive, the receive returns FALSE.
 //   returns  TRUE, or FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 

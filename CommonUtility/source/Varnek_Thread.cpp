@@ -7,11 +7,11 @@
 // a removed record disposes of it. So no thread holds a lock while it waits for a message, or while
 // it takes another of these locks.
 //
-// A thread starts in ThreadEntry, which waits for its creator to release the guard. So the record
-// of a thread is visible before any of the caller's code runs in it. The entry stores the handle
-// under a thread-specific key, where the thread finds its own handle. A search by the thread's id
-// could find a wrong record, because the system gives the id of an ended thread to a new one. The
-// value under the key disappears with its thread.
+// A thread starts in ThreadEntry, which waits until the record is visible. Only then does it call
+// the function that the creator passed. The entry stores the handle under a thread-specific key,
+// where the thread finds its own handle. A search by the thread's id could find a wrong record,
+// because the system gives the id of an ended thread to a new one. The value under the key
+// disappears with its thread.
 #include "Varnek_Thread.h"
 
 #include <limits.h>
@@ -185,7 +185,7 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
     hold.Release();
 
     // A thread that takes the lock of the queue after this does not find the handle. If the owner
-    // waits for a message, the post wakes it. If not, the post is lost with the semaphore.
+    // waits for a message, the post wakes it. If not, the post disappears with the semaphore.
     Hold queue(info.queueLock);
     list_t unread = info.MsgQ;
     list_initialize(&info.MsgQ);
@@ -292,7 +292,7 @@ Threads::Slot *FirstFreeRecord() {
 
 // Returns a slot for a new record; the guard is held. If no slot is free but some are left over, it
 // waits up to about a second for their last users, with the guard released. Returns null if no slot
-// becomes free; the guard may not be held then.
+// becomes free; it is possible that the guard is no longer held then.
 Threads::Slot *ClaimRecord(HoldMutex *guard) {
     Threads::Slot *slot = FirstFreeRecord();
     for (int i = 0; i < kLeaveTries && slot == nullptr &&
