@@ -20,6 +20,7 @@
 //
 //   state            iCurByteIdx        iBitIdxInCurByte   bEndOfStream
 //   reading          current byte       0 to 7             0
+//   rewound          current byte       1 to 7             2
 //   end, by bits     last byte          8                  1
 //   end, by bytes    uiBufLen           0                  1
 //   no source        0                  0                  1

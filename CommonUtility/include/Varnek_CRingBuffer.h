@@ -24,8 +24,8 @@
 //   underflow                WL = RL, W < R; RL > WL          none           none
 //   overflow                 WL = RL + 1, W > R; WL > RL + 1  none           none
 //
-// A ring whose size is invalid or whose storage cannot be allocated has size 0, and all its
-// operations fail. Each failure is traced.
+// A ring whose size is invalid or whose storage cannot be allocated has size 0. Its writes, reads
+// and seeks fail until a Reset succeeds. Each failure is traced.
 //
 // Thread-safe: in a ring that has its mutex, the operations from Reset to Read run one at a time.
 // One case is not atomic: an operation that finds the ring in an inconsistent state releases the
@@ -69,10 +69,11 @@ class VARNEK_API VarnekCRingBuffer {
     // Copy `writelen` bytes in or `readLen` bytes out. Return 0; VARNEK_RING_INVALID for a length
     // below 0 or above the size, and for a null pointer (after a panic report);
     // VARNEK_RING_NO_SPACE when there is too little room; VARNEK_RING_NO_DATA when there are too
-    // few bytes, and when 0 bytes are read from an empty ring. An operation that finds the ring in
-    // an inconsistent state empties it and returns VARNEK_RING_NO_SPACE for an overflow and
-    // VARNEK_RING_NO_DATA for an underflow. There is one exception: a write that finds WL = RL and
-    // W < R returns VARNEK_RING_NO_DATA but leaves the ring unchanged.
+    // few bytes, and when 0 bytes are read from an empty ring. In an inconsistent state, a write or
+    // read empties the ring and returns VARNEK_RING_NO_SPACE for an overflow and
+    // VARNEK_RING_NO_DATA for an underflow. There are two exceptions. A write that finds WL = RL
+    // and W < R returns VARNEK_RING_NO_DATA but leaves the ring unchanged. With W <= R and WL > RL
+    // + 1, writes and reads treat the writer as one lap ahead.
     int Write(const unsigned char *data, int writelen);
     int Read(unsigned char *dest, int readLen);
 

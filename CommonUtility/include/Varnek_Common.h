@@ -30,8 +30,8 @@ typedef int32_t BOOL;
 #define VARNEK_LEVEL_MID 0x20000000u
 #define VARNEK_LEVEL_LOW 0x10000000u
 
-// Modules that trace; each has a tag in the log. Common is this library. A trace with any other
-// module bit is not written.
+// Modules that trace; each has a tag in the log. Common is this library. A trace with none of these
+// module bits is not written.
 #define VARNEK_MODULE_COMMON 0x001u
 #define VARNEK_MODULE_JNI 0x002u
 #define VARNEK_MODULE_MAIN_CONTROL 0x004u

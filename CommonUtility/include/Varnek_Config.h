@@ -29,18 +29,19 @@ typedef struct VarnekConfigInfo {
 //   returns  the record of the process, never null
 VARNEK_API VarnekConfigInfo *VarnekCfg_GetConfigInfo(void);
 
-// Loads the file. A key is found in any case and anywhere in a line. Lines are truncated to 254
-// characters and values to 99. A number beyond 32 bits becomes the nearest one that fits, and a
-// switch takes the low 8 bits of its number. When the file cannot be read, is not a regular file or
-// is larger than 1 MiB, the record stays unchanged.
+// Loads the file. A key may be in upper or lower case and anywhere in a line. Lines are truncated
+// to 254 characters and values to 99. A number beyond 32 bits becomes the nearest one that fits,
+// and a switch takes the low 8 bits of its number. When the file cannot be read, is not a regular
+// file or is larger than 1 MiB, the record stays unchanged.
 VARNEK_API void VarnekCfg_LoadConfigFile(void);
 
 // Saves the record; the data directory must exist. A failure is traced. The new text is written to
-// "Varnek_Config.new", flushed to the medium and renamed over the file, with the mode of the old
-// file. So a reader finds either the old text or the new one, even if the process is killed during
-// the save. The file is emptied and written in place instead when there is no room or permission
-// for a second file, when the save of another process takes longer than a second, or when the
-// existing file is a link, has a second name, belongs to another user or is not a regular file.
+// "Varnek_Config.new", flushed to the medium and renamed over the file, with the group and the mode
+// of the old file. So a reader finds either the old text or the new one, even if the process is
+// killed during the save. The file is emptied and written in place instead when there is no room or
+// permission for a second file, when the save of another process takes longer than a second, or
+// when the existing file is a symbolic link, has a second name (hard link), belongs to another user
+// or is not a regular file.
 VARNEK_API void VarnekCfg_SaveConfigFile(void);
 
 // Sets the standard type, and saves the record when the type changes.

@@ -28,8 +28,8 @@ static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
 
 // Stores the caller's file and line, and traces. `mask` is one VARNEK_LEVEL_ bit or-ed with one
 // VARNEK_MODULE_ bit; a printf format and its arguments follow. The trace adds no line feed. Only
-// the bits of the twelve modules can be enabled: a trace with any other bit alone is silently
-// dropped. A new module uses the bit of the area that it belongs to.
+// the bits of the twelve modules can be enabled: a trace with none of these bits is dropped
+// silently. A new module uses the bit of the area that it belongs to.
 #define VARNEK_TRACE(mask, ...) \
     (VarnekDbg_StorePlace(__FILE__, __LINE__), VarnekPGL_TraceOut((mask), __VA_ARGS__))
 

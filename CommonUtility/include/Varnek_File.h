@@ -1,9 +1,11 @@
 // Files by path and by stream handle, large files by descriptor, directories, and the copy, move
 // and permission commands.
 //
-// Failures are logged at error priority under the tag "SBTVD_File", whatever the debug
-// configuration says, and never through the trace. Thread-safe, except that one thread at a time
-// may use a handle. A null path fails like one that does not exist; a null buffer moves no bytes.
+// Most failures are logged at error priority under the tag "SBTVD_File", whatever the debug
+// configuration says, and never through the trace. A stream's read or write that moves too few
+// bytes is not logged. For large files, only failing opens and writes and negative descriptors are
+// logged. Thread-safe, except that one thread at a time may use a handle. A null path fails like a
+// path that does not exist; with a null buffer no bytes are moved.
 #ifndef VARNEK_FILE_H
 #define VARNEK_FILE_H
 
@@ -147,7 +149,7 @@ VARNEK_API int64_t VarnekPGL_GetFileSizeByHandle64Bits(int32_t hFile);
 #define PGL_ENTRY_FILE 1  // anything that is not a directory, or whose kind is not known
 #define PGL_ENTRY_DIR 2   // a directory
 
-// The result of an open of a directory that fails.
+// The result of VarnekPGL_OpenDir on failure.
 #define PGL_INVALID_DIR_HANDLE ((void *)(intptr_t)-1)
 
 // An entry for __VarnekPGL_ReadDir; zero it before the first read.
@@ -177,8 +179,9 @@ VARNEK_API int32_t VarnekPGL_MakeDir(const char *path);
 
 // Deletes a directory tree. The deletion continues after entries that cannot be deleted. It removes
 // links and never follows them, not even a link that replaces a directory during the deletion. It
-// needs an open descriptor for each level. It leaves entries whose path would exceed 256
-// characters, with a log line, and entries that a listing does not reach. Both names do the same.
+// needs one open descriptor for each level of the tree. It does not delete entries whose path would
+// exceed 256 characters, which it logs, or entries that a listing does not reach. Both functions do
+// the same.
 //   path     one final slash or backslash is ignored
 //   returns  0 when the directory and its contents are gone, -1 otherwise
 VARNEK_API int32_t VarnekPGL_DeleteDirEx(const char *path);
@@ -219,8 +222,8 @@ VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttribu
 // is not run. When the process ignores SIGCHLD, or another thread waits for any child, the status
 // of the command is lost: the command runs, but the result is -1.
 
-// Replaces a file's content with that of another file. When the source cannot be read, or is the
-// destination itself, the call fails and the destination keeps its content.
+// Replaces a file's content with that of another file. If the source cannot be read, or is the
+// destination itself, the call fails, and the destination keeps its content.
 //   returns  0, or -1
 VARNEK_API int32_t VarnekPGL_CopyFile(const char *source, const char *destination);
 

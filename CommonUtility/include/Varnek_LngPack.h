@@ -3,7 +3,8 @@
 //
 // Every text ends in a 0 byte or 0 unit. One unit is one character from U+0001 to U+FFFF;
 // surrogates are not paired. The caller provides the output buffers. Thread-safe; the operations
-// keep no state. Every step that a failure passes through traces it.
+// keep no state. A failure may be traced more than once, by the function that fails and by its
+// callers.
 #ifndef VARNEK_LNGPACK_H
 #define VARNEK_LNGPACK_H
 
@@ -15,7 +16,7 @@ extern "C" {
 
 // Converts Latin-15 to units. Control characters are dropped; the no-break space becomes a space.
 //   pmszOutText  out: the units and a terminator
-//   outBufSize   room in units without the terminator; the input may have as many bytes
+//   outBufSize   room in units without the terminator; the input may have at most as many bytes
 //   szInText     the Latin-15 text
 //   returns      TRUE; FALSE for a null pointer or an input that is too long
 VARNEK_API BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize,
@@ -56,7 +57,8 @@ VARNEK_API BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize,
 //            counts as an empty text
 VARNEK_API int __WmLngStrlenByByte(const char *szText, int length);
 
-// Compares a size with the required one, and traces under `szName` when it is too small.
+// Compares the size of a buffer with the required size. A buffer that is too small is traced with
+// the name `szName`.
 //   returns  TRUE when `OutBuffer` is at least `RequiredBufSize`
 VARNEK_API BOOL __WmConvertCodeBufferSizeCheck(const char *szName, int OutBuffer,
                                                int RequiredBufSize);
@@ -65,7 +67,7 @@ VARNEK_API BOOL __WmConvertCodeBufferSizeCheck(const char *szName, int OutBuffer
 //   returns  the units written, without the terminator; -1 for a null pointer
 VARNEK_API int __WmLngUTF2Unicode(unsigned short *des, const char *src, int length);
 
-// Decode one character of one, two and three bytes. The bytes must be well-formed.
+// Decode a character of one, two or three bytes. The bytes must be well-formed.
 VARNEK_API unsigned short __WmLngConvert1ByteChar(unsigned char first);
 VARNEK_API unsigned short __WmLngConvert2ByteChar(unsigned char first, unsigned char second);
 VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned char second,
@@ -75,9 +77,9 @@ VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned 
 //   outputData   in: null or a block from malloc, which is freed; out: a block from malloc that the
 //                caller frees. Unchanged when the result is FALSE or the converted text is empty
 //   szInput      the Latin-15 text
-//   szInputSize  length of the input in bytes; the text may have up to three times as many, plus
-//                one
-//   returns      TRUE; FALSE for a null pointer, a longer input or too little memory
+//   szInputSize  length of the input in bytes; a text of up to three times this length plus one
+//                byte is accepted and converted to its end
+//   returns      TRUE; FALSE for a null pointer, a text that is longer still or too little memory
 VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
                                                unsigned int szInputSize);
 

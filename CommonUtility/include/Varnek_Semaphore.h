@@ -1,11 +1,11 @@
-// Named mutexes and named counting semaphores, each kept in one process-wide table of 40.
+// Named mutexes and named counting semaphores. A process has at most 40 of each.
 //
 // Handles start at 1, rise by one with every creation and are never reused; mutexes and semaphores
 // count separately. Names have 1 to 31 characters and compare exactly. They are unique, unless two
 // threads create objects of one name at the same time. Thread-safe; no call is needed to set up the
-// tables. A failure is traced at Error. A time-out and a name that is not found are not failures
-// and are not traced. After 2147483647 creations a family has no handle left, and its creations
-// fail.
+// tables. A failure is traced at Error. A time-out, and a lookup that does not find its name, are
+// not failures and are not traced. Mutexes and semaphores have 2147483647 handles each; when these
+// are used up, every creation fails.
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H
 
@@ -19,13 +19,13 @@ extern "C" {
 // Mutexes are not recursive. Delete a mutex only when no thread can still acquire or release it.
 // The names "VarnekThreadMutex" and "VarnekRingBuf" with a number are reserved for the library.
 
-// Creates a mutex. A live mutex of this name is deleted first; when a thread holds it, it stays and
-// the creation fails.
+// Creates a mutex. A live mutex of this name is deleted first. If a thread holds that mutex, it
+// stays, and the creation fails.
 //   returns  the handle; -1 for a bad name, a full table or a failing OS call
 VARNEK_API int32_t VarnekPGL_CreateMutex(const char *szMutexName);
 
-// Deletes a mutex that nobody holds.
-//   returns  TRUE when the mutex is gone; FALSE for an unknown handle or a mutex that is held
+// Deletes a mutex that no thread holds.
+//   returns  TRUE when the mutex is deleted; FALSE for an unknown handle or a mutex that is held
 VARNEK_API BOOL VarnekPGL_DeleteMutex(int32_t hMutex);
 
 // Waits without limit until the calling thread holds the mutex. Traces nothing on success.
@@ -57,10 +57,10 @@ VARNEK_API BOOL VarnekPGL_DeleteSemaphore(int32_t hSem);
 // Takes one unit, waiting up to `timeout`.
 //   hSem     handle of a live semaphore
 //   timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
-//   returns  TRUE when a unit was taken; FALSE on a time-out and on a failure. A wait that a signal
-//            interrupts fails and is not resumed
+//   returns  TRUE when a unit was taken; FALSE on a time-out and on a failure. A wait that a POSIX
+//            signal interrupts fails and is not resumed
 //   traces   Low on entry, and after an unlimited wait; Error for an unknown handle or a failing OS
-//            wait; nothing on a time-out
+//            wait; a time-out adds no line
 VARNEK_API BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout);
 
 // Adds one unit, which wakes one waiter.

@@ -1,9 +1,9 @@
 // Named one-shot timers with a callback, and functions that sleep.
 //
-// There are 32 timers. A handle is the index of a slot, 0 to 31, and is reused after a deletion.
-// Names have 0 to 40 characters, compare exactly and are unique. A timer is created, then started
-// and cancelled any number of times, then deleted. Thread-safe, also for calls from a callback. A
-// failure is traced at Error; a name that is not found is not a failure.
+// A process has at most 32 timers. A handle is the index of a slot, 0 to 31, and is reused after a
+// deletion. Names have 0 to 40 characters, compare exactly and are unique. A timer is created, then
+// started and cancelled any number of times, then deleted. Thread-safe, also for calls from a
+// callback. A failure is traced at Error; a lookup that does not find its name is not a failure.
 #ifndef VARNEK_TIMER_H
 #define VARNEK_TIMER_H
 
@@ -14,21 +14,21 @@ extern "C" {
 #endif
 
 // The callback of a timer. It runs on a thread of the OS timer service, with no lock held. Several
-// callbacks may run at the same time, also those of one timer. A callback may use its own timer,
-// and may start it again. If the timer expires before it is cancelled or deleted, the callback may
-// still begin afterwards. So `pUserData` should be a number, a handle, or memory that outlives the
-// timer.
+// callbacks may run at the same time, even several of one timer. A callback may use its own timer,
+// and may start it again. If the timer expires before it is cancelled or deleted, its callback may
+// begin after the cancellation or deletion. So `pUserData` should be a number, a handle, or memory
+// that outlives the timer.
 typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 
-// Takes the lowest free slot. The OS timer is created by the first start.
+// Creates a timer in the lowest free slot. The first start creates the OS timer.
 //   returns  the handle; -1 for null, a name that is too long or in use, or a full table
 VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 
 // Arms the timer once. A start that succeeds and is neither cancelled nor deleted in time calls
 // back exactly once, with its own `callback` and `userData`. The callback may come late but never
-// early, and it is not lost when the timer expires and is started again before the system delivers
-// the expiry. In two cases the callback is delayed until the timer's next expiry, without a log
-// line: when the system cannot create a thread for the expiry, and when a later start fails and
+// early. It is not lost when the timer expires and is started again before the system delivers the
+// expiry. In two cases the callback is delayed until the timer's next expiry: when the system
+// cannot create a thread for the expiry, which writes no log line, and when a later start fails and
 // thereby discards the expiry.
 //   timer     handle from VarnekPGL_CreateTimer
 //   timeout   milliseconds from now, 1 or more; setting the wall clock does not change it
@@ -40,10 +40,10 @@ VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 VARNEK_API BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc callback,
                                      void *userData);
 
-// Disarms the timer: the last start does not call back unless it has expired by now. When an
-// earlier start has expired and its callback is still to come, that callback still runs.
-//   returns  TRUE when the timer is disarmed, with an Error line when it already was; FALSE for an
-//            unknown handle, a timer that was never started or a failing OS call
+// Disarms the timer: the last start does not call back unless it has expired already. If an earlier
+// start has expired but not called back yet, its callback still runs.
+//   returns  TRUE when the timer is disarmed, with an Error line if it was disarmed before the
+//            call; FALSE for an unknown handle, a timer that was never started or a failing OS call
 VARNEK_API BOOL VarnekPGL_CancelTimer(uint32_t timer);
 
 // Frees the slot and disarms the timer. Expiries that are not delivered yet are dropped; the
@@ -55,7 +55,7 @@ VARNEK_API BOOL VarnekPGL_DeleteTimer(uint32_t timer);
 //   returns  the handle of the timer of this name; -1 for none and, after an Error line, for null
 VARNEK_API int32_t VarnekPGL_GetTimerByName(const char *szTmName);
 
-// Says whether a timer is armed.
+// Checks whether a timer is armed.
 //   returns  TRUE while the timer is armed; FALSE otherwise and for an unknown handle
 VARNEK_API BOOL VarnekPGL_IsTimerActive(uint32_t timer);
 

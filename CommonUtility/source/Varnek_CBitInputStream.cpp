@@ -1,6 +1,6 @@
-// The bit input stream. A field within the current byte is taken from ucCurByte. A field that goes
-// beyond it is taken from the buffer, if five bytes are left there. All other fields are read piece
-// by piece by GetBits, which alone finds the end of the stream.
+// The bit input stream. A field that ends before the end of the current byte is taken from
+// ucCurByte. Any other field is taken from the buffer, if five bytes are left there. If not,
+// GetBits reads it piece by piece. Of these three ways, only GetBits detects the end of the stream.
 #include "Varnek_CBitInputStream.h"
 
 #include <limits.h>
@@ -11,9 +11,9 @@
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
-// Values of bEndOfStream. A rewind from within a byte loads the whole target byte but keeps the bit
-// index, so ucCurByte is not what buffer and index would give. Up to the end of that byte, fields
-// are read piece by piece.
+// Values of bEndOfStream. A rewind inside a byte loads the whole target byte into ucCurByte but
+// keeps the bit index, so ucCurByte does not correspond to buffer and index. kRewound marks this
+// state, in which GetBits reads all fields until it reaches the end of that byte.
 static constexpr unsigned char kReading = 0;
 static constexpr unsigned char kAtEnd = 1;
 static constexpr unsigned char kRewound = 2;
@@ -118,8 +118,8 @@ unsigned int VarnekCBitInputStream::GetBits(int aNum, unsigned char &success) {
     return value;
 }
 
-// Reads a field of `width` bits where the current byte has `left`. It is out of line and called
-// last, so that the usual fields save no registers for it.
+// Reads a field of `width` bits; the current byte has `left` unread bits. It is out of line and
+// called last, so that reading the usual fields does not have to save registers.
 template <typename Value>
 __attribute__((noinline, cold)) static Value ReadByPieces(VarnekCBitInputStream &stream, int left,
                                                           int width, unsigned char &success) {
@@ -133,7 +133,7 @@ __attribute__((noinline, cold)) static Value ReadByPieces(VarnekCBitInputStream 
     return static_cast<Value>(value);
 }
 
-// Inlined into each of the reads, since a table has thousands of short fields.
+// Inlined into each of the public reads, since a table has thousands of short fields.
 template <typename Value, unsigned int most>
 __attribute__((always_inline)) inline Value VarnekCBitInputStream::Read(int count,
                                                                         unsigned char &success) {

@@ -1,5 +1,5 @@
-// The byte ring. A position is below the size, with one exception: a reader may be set to the end
-// of the storage, and reads the first byte next.
+// The byte ring. A position is below the size, with one exception: a seek may set the reader to the
+// end of the storage, so that the next read starts at the first byte.
 #include "Varnek_CRingBuffer.h"
 
 #include <stdio.h>
@@ -12,17 +12,17 @@
 #include "Varnek_Semaphore.h"
 #include "Varnek_Trace.h"
 
-// The steps that several operations share. The caller holds the ring's mutex, if it has one.
+// Steps that several operations share. The caller holds the ring's mutex, if it has one.
 struct VarnekRingState {
     enum Order {
         kInOrder,
         kOverflow,   // the writer has lapped the reader
-        kUnderflow,  // the reader is a lap ahead of the writer, or more
-        kOvertaken,  // the reader is ahead of the writer in one lap
+        kUnderflow,  // the reader is one or more laps ahead of the writer
+        kOvertaken,  // both are in the same lap, and the reader is ahead of the writer
     };
 
-    // The laps by which the writer is ahead. A loop count may wrap around; the difference is right
-    // all the same.
+    // Returns the number of laps by which the writer is ahead. A loop count may wrap around; the
+    // difference is correct nevertheless.
     static int Ahead(const VarnekCRingBuffer &ring) {
         return static_cast<int>(static_cast<unsigned int>(ring.iWriteLoopCnt) -
                                 static_cast<unsigned int>(ring.iReadLoopCnt));
@@ -39,26 +39,28 @@ struct VarnekRingState {
         return ring.iReadPos < ring.iWritePos ? kOverflow : kInOrder;
     }
 
-    // The bytes that can be read from a ring whose positions are in order. A writer that is several
+    // Returns the number of bytes that can be read; the ring is kInOrder. A writer that is several
     // laps ahead counts as one lap ahead.
     static int Used(const VarnekCRingBuffer &ring) {
         return ring.iWritePos - ring.iReadPos + (Ahead(ring) > 0 ? ring.iRingSize : 0);
     }
 
-    // The check of the queries: 0 for a ring in order. For an inconsistent state it writes its two
-    // lines and returns the query's result.
+    // Checks the state for the queries. Unlike OrderOf, it reports a writer that is several laps
+    // ahead. Returns 0 for a consistent state; otherwise it writes two lines and returns the result
+    // of the query.
     static int Check(const VarnekCRingBuffer &ring);
 
     static void Empty(VarnekCRingBuffer *ring) {
         ring->iWritePos = ring->iReadPos = ring->iWriteLoopCnt = ring->iReadLoopCnt = 0;
     }
 
-    // Empties a ring that was found in an abnormal state, as Reset does with the ring's own size:
-    // the mutex is released and taken again, and the ring keeps whatever size it has then.
+    // Empties a ring that was found in an inconsistent state, as Reset with the ring's own size
+    // does. It releases the mutex for its trace and acquires it again. If another thread changes
+    // the size meanwhile, the ring keeps that size.
     static void Recover(VarnekCRingBuffer *ring, HoldMutex *hold);
 
-    // Sets the reader to a position in the writer's lap, or in the lap before if the writer is not
-    // that far.
+    // Sets the reader to a position in the writer's lap, or in the lap before if the writer has not
+    // reached that position.
     static void SetReader(VarnekCRingBuffer *ring, int pos) {
         ring->iReadPos = pos;
         ring->iReadLoopCnt = AddLaps(ring->iWriteLoopCnt, ring->iWritePos < pos ? -1 : 0);
@@ -73,11 +75,11 @@ namespace {
 
 using State = VarnekRingState;
 
-// Numbers the names of the rings' mutexes. With a name twice, the second ring would destroy the
-// first one's mutex.
+// Numbers the names of the rings' mutexes. If two rings used the same name, the second would delete
+// the mutex of the first.
 std::atomic<int32_t> gRingBufCount{0};
 
-// Moves a position on by `length` bytes, at most `size`.
+// Advances a position by `length` bytes; `length` is at most `size`.
 void Advance(int *pos, int *laps, int length, int size) {
     const int tail = size - *pos;
     if (length < tail) {
@@ -250,8 +252,8 @@ int VarnekCRingBuffer::GetDistance() const {
     if (iRingSize == 0) {
         return 0;
     }
-    // In 64 bits, since a hundred times the fill level of a large ring overflows 32. Unlike Used,
-    // this counts every lap.
+    // Computed in 64 bits, because a hundred times the fill level of a large ring overflows 32
+    // bits. Unlike Used, this counts every lap.
     const int64_t distance =
         static_cast<int64_t>(State::Ahead(*this)) * iRingSize + iWritePos - iReadPos;
     const int64_t percent = distance * 100 / iRingSize;
@@ -283,7 +285,7 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
             State::Recover(this, &hold);
             return VARNEK_RING_NO_DATA;
         case State::kOvertaken:
-            // The ring stays as it is; the next read empties it.
+            // The ring stays unchanged; the next read empties it.
             return VARNEK_FAIL(
                 VARNEK_RING_NO_DATA,
                 "Invalid Ring Buffer State! Underflow! This data will be discarded!\n");

@@ -35,8 +35,8 @@ static_assert(offsetof(VarnekConfigInfo, supportNation) == 112,
 
 namespace {
 
-constexpr size_t kLineSize = 255;  // of a line that is read, with its terminator
-constexpr size_t kFileSize = 900;  // of the text that is written, with its terminator
+constexpr size_t kLineSize = 255;  // a line that is read, with its terminator
+constexpr size_t kFileSize = 900;  // the text that is written, with its terminator
 
 constexpr char kConfigPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
 constexpr char kNewPath[] = VARNEK_DATA_DIR "Varnek_Config.new";  // before it is renamed
@@ -68,7 +68,7 @@ constexpr char kNationWithBml[] = "PHL";
 
 VarnekConfigInfo gpVarnekConfigInfo = {"", 2, 0, 0, 68, ""};
 
-// Copies as much of the text as fits.
+// Copies as much of the text as fits, and terminates it.
 template <size_t size>
 void CopyText(char (&to)[size], const char *from, size_t length) {
     const size_t count = length < size ? length : size - 1;
@@ -159,7 +159,7 @@ void FormatFile(char (&text)[kFileSize]) {
              kKeys[PLAYER_DELAY], info.cprmPlayerDelay, kKeys[NATION], info.supportNation);
 }
 
-// Reads the whole text of the open file. Null data, after a trace, when it cannot be read.
+// Reads the whole text of the open file. The data is null, after a trace, if it cannot be read.
 FileText ReadFromStart(PglFileHandle file) {
     VarnekPGL_SeekFile(file, 0, SEEK_END);
     const int32_t length = VarnekPGL_TellFile(file);
@@ -179,8 +179,8 @@ FileText ReadFromStart(PglFileHandle file) {
     return text;
 }
 
-// Whether a new file may replace the existing one: there is none, or it is a regular file of ours
-// without other names. Fills `*old`, with zeros if there is none.
+// Whether a new file may replace the existing one. It may if there is none, or if it is a regular
+// file of this user that has no second name (hard link). Fills `*old`, with zeros if there is none.
 bool MayReplace(struct stat64 *old) {
     *old = {};
     if (lstat64(kConfigPath, old) != 0) {
@@ -189,8 +189,9 @@ bool MayReplace(struct stat64 *old) {
     return S_ISREG(old->st_mode) && old->st_nlink == 1 && old->st_uid == geteuid();
 }
 
-// Gives the new file the group and the mode of the old one. This is done as late as possible,
-// because another process may change them during the save.
+// Gives the new file the group and the mode of the old one, as late as possible, because another
+// process may change them during the save. Returns false if that fails or the old file may no
+// longer be replaced.
 bool TakeOver(int fd) {
     struct stat64 old = {};
     if (!MayReplace(&old)) {
@@ -202,7 +203,7 @@ bool TakeOver(int fd) {
 
 // Writes the text to a second file, flushes that to the disk, and renames it over the settings
 // file. So a reader finds either the old text or the new one, whatever happens to this process.
-// Returns false when that fails, with the settings file unchanged.
+// Returns false on failure; the settings file is unchanged then.
 bool ReplaceFile(const char *text) {
     remove(kNewPath);
     const PglFileHandle file = VarnekPGL_OpenFile(kNewPath, kSaveFlags);
@@ -221,9 +222,9 @@ bool ReplaceFile(const char *text) {
     return false;
 }
 
-// Takes the lock that keeps the saves of other processes from the second file. The system releases
-// it when its holder ends. But a holder may be stopped, or have a child that keeps the lock, so the
-// wait is limited.
+// Takes the lock that keeps other processes from writing the second file. The system releases it
+// when its holder ends. But the holder may be stopped, or a child of the holder may keep the lock,
+// so the wait is limited.
 bool LockDirectory(int directory) {
     for (int i = 0; i < kLockTries; i++) {
         if (flock(directory, LOCK_EX | LOCK_NB) == 0) {
@@ -234,7 +235,7 @@ bool LockDirectory(int directory) {
     return false;
 }
 
-// Calls ReplaceFile if the directory and the file allow it.
+// Calls ReplaceFile under the lock, if the directory and the file allow it.
 bool SaveBeside(const char *text) {
     struct stat64 old = {};
     if (access(VARNEK_DATA_DIR, W_OK) != 0 || !MayReplace(&old)) {
@@ -299,7 +300,7 @@ void VarnekCfg_SaveConfigFile() {
                      "VarnekCfg_SaveConfigFile: Root_Path(%s) is not Exist\n", VARNEK_DATA_DIR);
         return;
     }
-    // Opening the file in place empties it, so the text is prepared before.
+    // Opening the file below empties it, so the text is composed first.
     char text[kFileSize];
     FormatFile(text);
     if (SaveBeside(text)) {
@@ -312,7 +313,7 @@ void VarnekCfg_SaveConfigFile() {
     }
     const uint32_t length = static_cast<uint32_t>(strlen(text));
     const uint32_t written = VarnekPGL_WriteFileByHandle(file, text, length);
-    // The error of a full disk may appear only when the stream is closed.
+    // On a full disk, the error may not appear until the stream is closed.
     if (VarnekPGL_CloseFile(file) != 0 || written != length) {
         CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_WriteFileByHandle() fail.!");
     }
@@ -359,7 +360,7 @@ const char *VarnekCfg_GetSupportNation() {
     }
     const char *tag = strstr(feature, kNationTag);
     const char *code = tag != nullptr ? tag + strlen(kNationTag) : "";
-    // No code contains a line end, and the settings file could not store one.
+    // A code that contains a line end is invalid, and the settings file could not store it.
     if (strcspn(code, "\r\n") < kNationLength) {
         CopyText(nation, kDefaultNation, kNationLength);
         TRACE_ERROR("%s can't find Nation TAG in TARN feature. so set default nation(BRA)",

@@ -1,6 +1,7 @@
-// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. UnitOf and PutUtf8 also
-// define the direct conversion from Latin-15 to UTF-8, so it cannot differ from the two steps. The
-// decoder and the computation of its output size both use CharLength, so they agree on every text.
+// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. The table of the direct
+// conversion from Latin-15 to UTF-8 is built with UnitOf and PutUtf8, so the result cannot differ
+// from that of the two steps. The decoder and the computation of its output size both use
+// CharLength, so they agree on every text.
 #include "Varnek_LngPack.h"
 
 #include <limits.h>
@@ -75,8 +76,8 @@ constexpr char *PutUtf8(char *out, unsigned int unit) {
 // Whether all bytes of a word are plain. A byte is plain if the top bit is clear in the byte
 // itself, in the byte minus 0x20 (where a byte below 0x20 sets it), and in the byte plus 1 (where
 // 0x7F sets it). The arithmetic is done on all bytes at once, so a byte may borrow from the next
-// one or carry into it. That does no harm: only a byte that is not plain does so, and its own top
-// bit is set.
+// one or carry into it. This does no harm: the first byte that does so is not plain, and its own
+// top bit is set.
 using Word = uintptr_t;
 constexpr bool ArePlain(Word bytes) {
     constexpr Word kOnes = ~Word{0} / 0xFF;
@@ -105,8 +106,8 @@ constexpr Utf8Table MakeUtf8Table() {
 
 constexpr Utf8Table kUtf8 = MakeUtf8Table();
 
-// Writes a whole entry of four bytes, which begins with the UTF-8 of a byte. Returns the end of the
-// UTF-8.
+// Writes all four bytes of an entry, the first of which are the UTF-8 of `byte`. Returns the end of
+// the UTF-8.
 char *PutLatin15(char *out, unsigned char byte) {
     const uint32_t utf8 = kUtf8.of[byte];
     const uint32_t stored = LittleEndian(utf8);
@@ -114,8 +115,8 @@ char *PutLatin15(char *out, unsigned char byte) {
     return out + (utf8 >> 24);
 }
 
-// Converts `length` bytes directly to UTF-8. The output needs room for three bytes for each of them
-// and one more. Plain characters are copied a word at a time. Returns the end of the output.
+// Converts `length` bytes directly to UTF-8. The output needs room for 3 * length + 1 bytes. Plain
+// characters are copied a word at a time. Returns the end of the output.
 char *PutLatin15(char *out, const unsigned char *in, size_t length) {
     const unsigned char *const end = in + length;
     while (static_cast<size_t>(end - in) >= sizeof(Word)) {
@@ -137,8 +138,8 @@ char *PutLatin15(char *out, const unsigned char *in, size_t length) {
     return out;
 }
 
-// Returns the number of bytes of the character at `text`, 0 when it is malformed. Reads at most
-// `length` bytes, of which there is at least one.
+// Returns the number of bytes of the character at `text`, 0 if it is malformed. Reads at most
+// `length` bytes; `length` is at least 1.
 int CharLength(const unsigned char *text, int length) {
     if (text[0] < 0x80) {
         return 1;
@@ -279,7 +280,7 @@ int __WmLngStrlenByByte(const char *szText, int length) {
         return 2;
     }
     const unsigned char *text = reinterpret_cast<const unsigned char *>(szText);
-    // For a text that needs 2 GiB of output or more, the result is the largest size.
+    // For a text that needs 2 GiB of output or more, the result is INT_MAX.
     while (length > 0 && *text != 0 && count < INT_MAX / 2) {
         int step = CharLength(text, length);
         if (step == 0) {
@@ -361,8 +362,8 @@ BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
         TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: outputData or szInput is NULL  !\n");
         return FALSE;
     }
-    // The input may have three times the stated size and one more byte, limited so that no size
-    // below overflows. The size of the buffer follows from the input itself, not from the stated
+    // The input may have three times the stated size plus one byte. The limit makes sure that no
+    // size below overflows. The size of the buffer depends on the input itself, not on the stated
     // size.
     const uint64_t stated = 3 * static_cast<uint64_t>(szInputSize) + 1;
     const int capacity = stated < INT_MAX / 4 ? static_cast<int>(stated) : INT_MAX / 4;

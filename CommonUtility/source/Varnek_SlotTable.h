@@ -1,20 +1,22 @@
-// The table of named objects: slots, handles and names, and nothing else. Private.
+// The table of named objects. It manages slots, handles and names, and nothing else. Private.
 //
-// A handle is published once in the life of the process, and it publishes its slot: everything that
-// belongs to the slot is complete before the handle is stored, and does not change until the handle
-// is withdrawn. Lookups take no lock. A lookup by handle reads the handle with acquire. A lookup by
-// name reads the handle, the words of the name, and the handle again. Handles never come back, so
-// if both are the same, the words in between were that handle's own: this is a sequence lock whose
-// number cannot repeat. Each name has a digest, which shows where these reads are worth their
-// barriers.
+// A handle is published once in the life of the process, and it publishes its slot: the name and
+// the Info of the slot are complete before the handle is stored, and the name does not change until
+// the handle is withdrawn. Lookups take no lock. A lookup by handle reads the handle with acquire.
+// A lookup by name reads the handle, the words of the name, and the handle again. If both reads
+// return the same handle, the words in between belong to that handle, because no handle is
+// published twice. This is a sequence lock whose sequence number cannot repeat. Each name has a
+// digest. A lookup by name compares the digests first, so that it executes barriers only where the
+// name probably matches.
 //
-// A handle says nothing about its slot's place. So that a lookup by handle does not have to scan,
-// the table remembers for each of 256 classes of handles where one of that class was last seen.
-// Such a hint may be stale or belong to another handle of the class; the handle in the slot
-// decides, and a lookup that a stale hint has misled scans once and corrects the hint.
+// A handle does not contain the index of its slot. So that a lookup by handle rarely has to scan
+// the slots, the table has 256 hints: the hint at handle % 256 is the index of the slot to check
+// first. A hint may be stale, or belong to another handle with the same remainder. So the lookup
+// compares the handle in that slot. If it is another one, the lookup scans all slots and corrects a
+// stale hint.
 //
 // A thread that changes the table holds the family's guard. The table is zero when the library is
-// loaded.
+// loaded, which is its empty state.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 
@@ -32,8 +34,8 @@ constexpr size_t kNameSize = 32;  // with the terminator
 template <typename Info, int capacity>
 class SlotTable {
   public:
-    // Each slot has its own lines of the cache, so that threads that use neighbouring slots do not
-    // slow each other.
+    // Each slot has its own cache lines, so that threads that use neighbouring slots do not slow
+    // each other down.
     struct alignas(64) Slot {
         std::atomic<int32_t> handle;
         Info info;
@@ -44,9 +46,9 @@ class SlotTable {
         }
     };
 
-    // The slot of a live handle, null for none. This is one look if the hint is right, and a scan
-    // for an unknown handle or if the hint is another's. The handle is read with `order`; after a
-    // relaxed read, only the handle of the slot may be used.
+    // Returns the slot of a live handle, null for none. It reads one slot if the hint is right, and
+    // scans all slots if not. The handle is read with `order`. A relaxed read does not make the
+    // Info visible, so it is only for a caller that sees the Info for another reason.
     Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
         if (handle <= kFree) {
             return nullptr;
@@ -83,8 +85,8 @@ class SlotTable {
     // may have changed.
     int32_t Count() const { return count_.load(std::memory_order_relaxed); }
 
-    // The lowest slot that a new object may take, of those after `last` if that is given. Null for
-    // none, and always null once every handle has been given out.
+    // Returns the lowest free slot, or with `last` the lowest one after that. Null for none, and
+    // always null once every handle has been given out.
     Slot *FirstFree(const Slot *last = nullptr) {
         for (int slot = NumberOf(last) + 1; slot < capacity && HasHandles(); slot++) {
             if (slots_[slot].Has(kFree, std::memory_order_relaxed)) {
@@ -100,8 +102,8 @@ class SlotTable {
     // The handle that the next publication gives out.
     int32_t NextHandle() const { return given_ + 1; }
 
-    // Makes a free slot visible under a name of at most 31 characters. The slot's Info is complete
-    // by now. Returns its handle.
+    // Makes a free slot visible under a name of at most 31 characters. The slot's Info must be
+    // complete. Returns its handle.
     int32_t Publish(Slot *slot, const char *name) {
         const int32_t handle = ++given_;
         StoreName(NumberOf(slot), PackedName(name, LengthWithin(name, kNameSize - 1)));
@@ -111,8 +113,7 @@ class SlotTable {
         return handle;
     }
 
-    // Makes the slot invisible; its Info may be taken apart now. Returns how many slots remain in
-    // use.
+    // Makes the slot invisible. Returns the number of slots that remain in use.
     int32_t Withdraw(Slot *slot) {
         slot->handle.store(kFree, std::memory_order_relaxed);
         digests_[NumberOf(slot)].store(0, std::memory_order_relaxed);
@@ -120,7 +121,7 @@ class SlotTable {
     }
 
   protected:
-    // Continues as if so many handles had been given out.
+    // Continues as if `given` handles had been given out. Tests use it to reach the last handles.
     void SkipHandles(int32_t given) { given_ = given; }
 
   private:
@@ -129,7 +130,8 @@ class SlotTable {
     static constexpr size_t kHints = 256;
     static constexpr size_t kSlots = static_cast<size_t>(capacity);
 
-    // A name as words, up to the one with its terminator. The words after that are not compared.
+    // A name as words, up to the word that contains its terminator. The words after that are not
+    // compared.
     struct PackedName {
         PackedName(const char *name, size_t length) : used(length / sizeof(uint32_t) + 1) {
             words[used - 1] = 0;
@@ -147,14 +149,14 @@ class SlotTable {
         uint32_t words[kNameWords];
     };
 
-    // Out of line, so that the lookups that find their handle at once save no registers for it.
+    // Out of line, so that a lookup that finds its handle at once does not have to save registers.
     __attribute__((noinline, cold)) Slot *Scan(int32_t handle, const Slot *hint) {
         for (Slot &slot : slots_) {
             if (!slot.Has(handle, std::memory_order_acquire)) {
                 continue;
             }
-            // Two live handles may share a hint. It stays with the one that has it; a hint that
-            // points to neither is stale and is corrected.
+            // Two live handles may share a hint. A hint that points to the other one is not
+            // changed. A hint that points to neither is stale and is corrected.
             const int32_t hinted = hint->handle.load(std::memory_order_relaxed);
             if (hinted == kFree || &HintOf(hinted) != &HintOf(handle)) {
                 HintOf(handle).store(static_cast<uint32_t>(NumberOf(&slot)),
@@ -165,9 +167,10 @@ class SlotTable {
         return nullptr;
     }
 
-    // The handle of a slot if this is its name, kFree otherwise. The words are not older than the
-    // handle, since its first read acquires. A word that is younger was stored after the fence of
-    // StoreName, which pairs with the fence here: then the second read finds the handle gone.
+    // Returns the handle of a slot if this is its name, kFree otherwise. The words are not older
+    // than the handle, because the first read of the handle acquires. A newer word was stored after
+    // the fence in StoreName, which pairs with the fence here, so the second read does not find the
+    // handle any more.
     int32_t HandleOfName(ptrdiff_t slot, const PackedName &wanted) const {
         const int32_t handle = slots_[slot].handle.load(std::memory_order_acquire);
         for (size_t i = 0; i < wanted.used; i++) {
@@ -192,9 +195,9 @@ class SlotTable {
     }
 
     Slot slots_[kSlots];
-    // hints_[handle % kHints] is the slot at which to look first; the handle there decides.
+    // hints_[handle % kHints] is the index of the slot to check first.
     std::atomic<uint32_t> hints_[kHints];
-    std::atomic<uint32_t> digests_[kSlots];  // of the names, 0 where there is none
+    std::atomic<uint32_t> digests_[kSlots];  // of the names; 0 in a free slot
     std::atomic<uint32_t> names_[kSlots][kNameWords];
     std::atomic<int32_t> count_;
     int32_t given_;  // handles given out so far, 1 to this one; used under the guard only

@@ -1,16 +1,17 @@
 // The thread registry and the message queues.
 //
 // The registry's guard is held while a record is created or made invisible. Each queue has a lock
-// of its own. Its holder sees whether the record is still there, and while it is, the record's
-// semaphore is alive as long as the lock is held. A thread that needs the semaphore without the
-// lock, to wait or to wake the owner, counts as one of the record's users: the last user of a
-// removed record disposes of it. So no lock is ever held across a wait, and none while
-// another is taken.
+// of its own. A thread that holds this lock can check whether the record is still there; if it is,
+// the record's semaphore stays alive until the lock is released. A thread that uses the semaphore
+// without the lock, to wait or to wake the owner, counts as a user of the record. The last user of
+// a removed record disposes of it. So no thread holds a lock while it waits for a message, or while
+// it takes another of these locks.
 //
-// A thread starts in ThreadEntry, which waits for its creator to release the guard. So the record
-// of a thread is visible before any of the caller's code runs in it. The entry leaves the handle
-// under a thread-specific key, which is how a thread knows itself: the system gives the ids of
-// ended threads to new ones, but what a key holds goes with its thread.
+// A thread starts in ThreadEntry, which waits until the record is visible. Only then does it call
+// the function that the creator passed. The entry stores the handle under a thread-specific key,
+// where the thread finds its own handle. A search by the thread's id could find a wrong record,
+// because the system gives the id of an ended thread to a new one. The value under the key
+// disappears with its thread.
 #include "Varnek_Thread.h"
 
 #include <limits.h>
@@ -38,22 +39,21 @@ constexpr size_t kSystemNameSize = 16;  // of a thread's name in the system, wit
 struct THREAD_MGR_INFO {
     Lock queueLock;
     list_t MsgQ VARNEK_GUARDED_BY(queueLock);  // empty while the record is free
-    // The semaphore and `units` together count the messages: a unit for each that was sent. It is
-    // posted if the owner waits for one. If not, it is only counted, which needs no more than the
-    // lock.
+    // Each message that is sent adds one unit. If the owner waits, the sender posts the unit to the
+    // semaphore. If not, it adds the unit to `units`, which is faster.
     sem_t msgQSem;
     int32_t units VARNEK_GUARDED_BY(queueLock);
     bool mustWake VARNEK_GUARDED_BY(queueLock);   // the owner waits, and no unit was posted for it
-    uint32_t users VARNEK_GUARDED_BY(queueLock);  // of the semaphore, without the lock
-    // The operation that removed the record, for its last user; null before.
+    uint32_t users VARNEK_GUARDED_BY(queueLock);  // threads that use msgQSem without the lock
+    // The name of the operation that removed the record, for the last user; null before that.
     const char *removedBy VARNEK_GUARDED_BY(queueLock);
-    // From the removal, which sets it under the guard, until the disposal.
+    // True from the removal, which sets it under the guard, until the disposal.
     std::atomic<bool> isLeftover;
     pthread_t linuxThread;  // for a debugger
 };
 
-// What a new thread begins with. Its creator allocates it and its entry frees it, so the record may
-// be removed before the thread runs.
+// What the creator passes to the entry of a new thread. The creator allocates it and the entry
+// frees it, so the record may be removed before the thread runs.
 struct Start {
     int32_t hHandle;
     void *(*function)(void *);
@@ -61,9 +61,9 @@ struct Start {
     char systemName[kSystemNameSize];
 };
 
-constexpr int kLeaveTries = 1000;  // of a millisecond
-// The queue of a thread that only peeks keeps every unit. Far enough from the end of the type that
-// posted units can be added.
+constexpr int kLeaveTries = 1000;  // one per millisecond
+// A thread that only peeks takes no units, so `units` needs a maximum. With this one, adding the
+// posted units does not overflow.
 constexpr int32_t kMostUnits = SEM_VALUE_MAX / 2;
 
 using Threads = SlotTable<THREAD_MGR_INFO, MAX_THREAD_MGR_INFO_ARR_SIZE>;
@@ -85,8 +85,8 @@ int32_t Guard() {
 }
 
 // Runs when a thread ends. The system has cleared the value by then, but the destructors of other
-// keys may still ask for the calling thread, or receive messages. So the handle is kept, negative,
-// for one more round of destructors.
+// keys may still call VarnekPGL_GetCurrentThread or receive messages. So the handle is stored
+// again, negated, for one more round of destructors.
 void KeepSelf(void *self) {
     const intptr_t hThread = reinterpret_cast<intptr_t>(self);
     if (hThread > 0) {
@@ -111,8 +111,9 @@ bool MakeSelfKey() {
 
 // Creates the guard and the key on first use. One thread creates them while others wait, since a
 // second mutex of the guard's name would destroy the first. Returns false if they cannot be
-// created. It also returns false to a log function that creates a thread while its own thread, in
-// here, writes the lines of the guard's creation: it would wait for itself.
+// created. It also returns false if the calling thread is already creating them, which happens when
+// the log function creates a thread during the lines of the guard's creation: that call would wait
+// for itself.
 bool EnsureGuard() {
     for (;;) {
         int32_t guard = gThreadMutex.load(std::memory_order_acquire);
@@ -135,8 +136,9 @@ bool EnsureGuard() {
 
 // Users of a record ------------------------------------------------------------------------------
 
-// The operation that removed the record, if it has been removed and no user is left; null if not.
-// One thread gets it, the removal itself or the last user, and that thread disposes of the record.
+// Returns the name of the operation that removed the record, if it has been removed and no user is
+// left; null if not. Only one thread gets the name, either the removal itself or the last user.
+// That thread has to dispose of the record.
 const char *LastUseOf(THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
     if (info.users > 0) {
         return nullptr;
@@ -146,7 +148,8 @@ const char *LastUseOf(THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
     return operation;
 }
 
-// Gives up what a removed record still has. Its slot is free after that. Does nothing for null.
+// Destroys the semaphore of a removed record, and frees its slot. Does nothing if `operation` is
+// null.
 void Dispose(THREAD_MGR_INFO &info, const char *operation) {
     if (operation == nullptr) {
         return;
@@ -160,12 +163,12 @@ void Dispose(THREAD_MGR_INFO &info, const char *operation) {
 
 // Threads ----------------------------------------------------------------------------------------
 
-// Removes the record of a handle for `operation`, which reports unread messages with `unreadMask`.
-// Without such a record it writes the operation's line and returns FALSE.
+// Removes the record of a handle. The log lines show the name `operation`; the line about unread
+// messages has the mask `unreadMask`. For an unknown handle it writes a line and returns FALSE.
 BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
     const int32_t guard = Guard();
     if (guard == kNoGuard) {
-        VarnekPGL_AcquireMutex(guard);  // reports the missing guard, as the release below does
+        VarnekPGL_AcquireMutex(guard);  // logs that the guard is missing, as the release below does
     }
     HoldMutex hold(guard);
     Threads::Slot *const slot = hold.IsHeld() ? gThreadInfoArr.Find(hThread) : nullptr;
@@ -181,8 +184,8 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
     const int32_t count = gThreadInfoArr.Withdraw(slot);
     hold.Release();
 
-    // Whoever takes the lock of the queue after this does not find the handle. The owner may be
-    // waiting for a message: the post wakes it. Without a waiter the post goes with the semaphore.
+    // A thread that takes the lock of the queue after this does not find the handle. If the owner
+    // waits for a message, the post wakes it. If not, the post disappears with the semaphore.
     Hold queue(info.queueLock);
     const list_t unread = info.MsgQ;
     list_initialize(&info.MsgQ);
@@ -238,7 +241,7 @@ int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize, St
         return result;
     }
     // An attribute that the system refuses (a stack below its minimum, a priority that the policy
-    // does not know) keeps its default.
+    // does not allow) keeps its default.
     sched_param parameter = {};
     parameter.sched_priority = priority;
     pthread_attr_setstacksize(&attributes, stackSize);
@@ -251,8 +254,8 @@ int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize, St
 }
 
 // Fills the record at `slot` and starts its thread; the guard is held. The record becomes visible
-// only when its thread exists. So the handle of a failed creation, which the next creation gets,
-// was never seen.
+// only when its thread exists. So the next creation can use the handle of a failed one, which no
+// other thread has seen.
 int32_t StartRecord(Threads::Slot *slot, const char *szThreadName, int32_t priority,
                     uint32_t stackSize, void *(*function)(void *), void *argument) {
     THREAD_MGR_INFO &info = slot->info;
@@ -278,7 +281,7 @@ int32_t StartRecord(Threads::Slot *slot, const char *szThreadName, int32_t prior
     return gThreadInfoArr.Publish(slot, szThreadName);
 }
 
-// The lowest slot whose record is neither in use nor left over; the guard is held.
+// Returns the lowest slot whose record is neither in use nor left over. The guard is held.
 Threads::Slot *FirstFreeRecord() {
     Threads::Slot *slot = gThreadInfoArr.FirstFree();
     while (slot != nullptr && slot->info.isLeftover.load(std::memory_order_acquire)) {
@@ -287,8 +290,9 @@ Threads::Slot *FirstFreeRecord() {
     return slot;
 }
 
-// Claims a slot, under the guard. If all slots are taken and some of them are left over, it waits a
-// while for their last users, with the guard released. Null for none; the guard may then be lost.
+// Returns a slot for a new record; the guard is held. If no slot is free but some are left over, it
+// waits up to about a second for their last users, with the guard released. Returns null if no slot
+// becomes free; it is possible that the guard is no longer held then.
 Threads::Slot *ClaimRecord(HoldMutex *guard) {
     Threads::Slot *slot = FirstFreeRecord();
     for (int i = 0; i < kLeaveTries && slot == nullptr &&
@@ -359,9 +363,8 @@ struct Self {
     Threads::Slot *slot;
 };
 
-// The handle is kInvalidHandle in a thread that the registry has not started, which has nothing
-// under the key, and in one whose record has been removed. Inlined, since each receive begins with
-// it.
+// Returns kInvalidHandle in a thread whose record has been removed, and in one that the registry
+// has not started, which has no value under the key. Inlined, since each receive begins with it.
 inline __attribute__((always_inline)) Self FindSelf() {
     TRACE_LOW_QUICK("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]",
                     static_cast<int>(pthread_self()));
@@ -430,8 +433,8 @@ struct Queued {
     THREAD_MSG message;
 };
 
-// A copy of a message in a block, null when memory is short. Messages are copied as bytes: a
-// caller's record may lie anywhere.
+// Returns a block with a copy of the message, null when there is no memory. Messages are copied as
+// bytes, because a caller's message may have any alignment.
 inline Queued *CopyOf(const THREAD_MSG *message) {
     Queued *const queued = static_cast<Queued *>(malloc(sizeof(Queued)));
     if (queued != nullptr) {
@@ -440,7 +443,7 @@ inline Queued *CopyOf(const THREAD_MSG *message) {
     return queued;
 }
 
-// Reads how many units are counted; -1 and errno as sem_getvalue.
+// Reads the number of units. Returns the result of sem_getvalue; on failure the number is -1.
 inline int ReadUnits(THREAD_MGR_INFO &info, int *units) VARNEK_REQUIRES(info.queueLock) {
     int posted = 0;
     const int result = sem_getvalue(&info.msgQSem, &posted);
@@ -448,7 +451,7 @@ inline int ReadUnits(THREAD_MGR_INFO &info, int *units) VARNEK_REQUIRES(info.que
     return result;
 }
 
-// Takes a unit. False when none is counted.
+// Takes a unit. Returns false when there is none.
 inline bool TakeUnit(THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
     if (info.units > 0) {
         info.units--;
@@ -462,11 +465,12 @@ struct Sent {
     bool found;  // the record
     int postError;
     int valueError;
-    int semCount;  // the units after the post, -1 when unread; not read for an urgent message
+    int semCount;  // the units after the send, -1 on failure; not read for an urgent message
 };
 
-// Puts a block into the queue, before the head when it is urgent, and counts a unit for it. Takes
-// the block over unless the record is gone. Inlined, since a stack sends all day.
+// Puts a block into the queue, in front if it is urgent, and adds a unit for it. The queue owns the
+// block afterwards, unless the record is gone. Inlined, because the modules send messages all the
+// time.
 inline __attribute__((always_inline)) Sent Enqueue(Threads::Slot *slot, int32_t hThread,
                                                    Queued *queued, bool urgent) {
     THREAD_MGR_INFO &info = slot->info;
@@ -487,7 +491,7 @@ inline __attribute__((always_inline)) Sent Enqueue(Threads::Slot *slot, int32_t 
         info.users--;
         sent.postError = error;
         if (error != 0 && info.units > 0 && sem_post(&info.msgQSem) == 0) {
-            info.units--;  // of a message that relied on this one to wake the owner
+            info.units--;  // the unit of a message whose sender relied on this post
         } else if (error != 0) {
             info.mustWake = true;
         }
@@ -506,7 +510,8 @@ inline __attribute__((always_inline)) Sent Enqueue(Threads::Slot *slot, int32_t 
     return sent;
 }
 
-// Takes the first message out of the queue, null when there is none; the caller frees its block.
+// Takes the first message out of the queue. Returns null when there is none; the caller frees the
+// block.
 inline Queued *TakeFirst(THREAD_MGR_INFO &info, int32_t *left) VARNEK_REQUIRES(info.queueLock) {
     list_node_t *const node = info.MsgQ.head;
     if (node == nullptr) {
@@ -526,14 +531,14 @@ inline void HandOut(Queued *queued, THREAD_MSG *message) {
 // What the owner finds at its queue.
 struct Receipt {
     bool found;      // the record
-    bool counted;    // a unit, which was taken
+    bool counted;    // a unit, which is now taken
     Queued *queued;  // the message, null for none
     int32_t left;    // messages behind it
-    int valueError;  // the result of the call that reads the semaphore
-    int semCount;    // the units before that, -1 when unread
+    int valueError;  // the result of sem_getvalue
+    int semCount;    // the units before one was taken, -1 on failure
 };
 
-// Takes a unit that is counted, with its message.
+// Takes a unit and a message, without waiting.
 inline __attribute__((always_inline)) Receipt TakeCounted(Threads::Slot *self, int32_t hThread) {
     THREAD_MGR_INFO &info = self->info;
     Receipt receipt = {};
@@ -550,7 +555,7 @@ inline __attribute__((always_inline)) Receipt TakeCounted(Threads::Slot *self, i
     return receipt;
 }
 
-// Waits for one unit of the semaphore. 0, or -1 and errno.
+// Waits for one unit of the semaphore. Returns 0, or -1 with errno set.
 int WaitForMessage(sem_t *msgQSem, uint32_t timeout) {
     if (timeout == WAIT_FOREVER) {
         return sem_wait(msgQSem);
@@ -563,9 +568,9 @@ int WaitForMessage(sem_t *msgQSem, uint32_t timeout) {
     return sem_timedwait(msgQSem, &deadline);
 }
 
-// Takes a unit, with its message, and waits for one if none is counted. Returns the number of the
-// error that ended the wait, 0 for none. The owner registers right before it waits: a log function
-// that is called between the two might receive messages itself.
+// Takes a unit and a message; waits for a unit if there is none. Returns the number of the error
+// that ended the wait, 0 for none. No trace comes between setting `mustWake` and the wait, because
+// the log function might receive messages itself.
 int WaitAndTake(Threads::Slot *self, int32_t hThread, uint32_t timeout, Receipt *receipt) {
     THREAD_MGR_INFO &info = self->info;
     int error = 0;

@@ -1,13 +1,13 @@
 // The timer service. Each slot has one POSIX timer, which the first start creates and the deletion
-// deletes. Every access to the table, OS calls for a slot included, is under one lock, which is
+// deletes. One lock protects every access to the table, including the OS calls for a slot. It is
 // never held while a callback runs.
 //
-// The system delivers an expiry on a thread of its own, so the delivery may come late: after the
-// owner has seen the timer expire and has started it again. The system may even drop the delivery,
+// The system delivers each expiry on a separate thread, so a delivery may be late: the owner may
+// already have seen the timer expire and started it again. The system may even drop the delivery,
 // because arming a timer discards a pending one. So a delivery only means that some start may be
 // due. If a start has expired but not called back when the timer is started again, it becomes an
-// owed start. Each delivery calls back for everything that is due: all owed starts and, if its time
-// is up, the last start. docs/locking.md explains why each start calls back exactly once.
+// owed start. Each delivery calls back for every start that is due: all owed starts, and the last
+// start if it has expired. docs/locking.md explains why each start calls back exactly once.
 #include "Varnek_Timer.h"
 
 #include <signal.h>
@@ -23,7 +23,7 @@ namespace {
 constexpr int MAX_TIMER_MGR_INFO_ARR_SIZE = 32;
 constexpr size_t kTimerNameSize = 41;  // with the terminator
 
-// An earlier start that has expired and not called back yet.
+// An earlier start that has expired but not called back yet.
 struct OwedStart {
     TimerCallbackFunc pfnCallback;
     void *pUserData;
@@ -81,7 +81,7 @@ timespec Milliseconds(int64_t milliseconds) {
 int ReadArmed(const TIMER_MGR_INFO &info, bool *armed) {
     itimerspec left = {};
     const int result = timer_gettime(info.timerId, &left);
-    // If no start is awaited, a running OS timer is the one that Disarm set for the owed starts.
+    // If no start is awaited, the OS timer runs only because Disarm set it for the owed starts.
     *armed = info.bAwaited && (left.it_value.tv_sec > 0 || left.it_value.tv_nsec > 0);
     return result;
 }
@@ -93,15 +93,15 @@ int SetTime(const TIMER_MGR_INFO &info, const timespec &time) {
     return timer_settime(info.timerId, 0, &expiry, nullptr);
 }
 
-// Cancels the last start. The system also drops a pending delivery, so if there are owed starts,
-// this requests another delivery at once. Returns the result of the OS call.
+// Cancels the last start. This makes the system drop a pending delivery. So if there are owed
+// starts, the timer is set to deliver again at once. Returns the result of the OS call.
 int Disarm(const TIMER_MGR_INFO &info) {
     timespec time = {};
     time.tv_nsec = info.owed != nullptr ? 1 : 0;
     return SetTime(info, time);
 }
 
-// Makes the last start, which has expired, an owed start. Returns false without memory.
+// Makes the last start, which has expired, an owed start. Returns false if there is no memory.
 bool OweLastStart(TIMER_MGR_INFO *info) {
     OwedStart *start = static_cast<OwedStart *>(malloc(sizeof(OwedStart)));
     if (start == nullptr) {
@@ -117,8 +117,8 @@ bool OweLastStart(TIMER_MGR_INFO *info) {
     return true;
 }
 
-// Removes the oldest start that is due from the record and returns it, with a null callback if none
-// is due.
+// Removes the oldest start that is due from the record, and returns it. The callback of the result
+// is null if none is due.
 OwedStart TakeDue(TIMER_MGR_INFO *info) {
     if (OwedStart *oldest = info->owed) {
         const OwedStart due = *oldest;
@@ -143,7 +143,7 @@ void Clear(TIMER_MGR_INFO *info) {
     *info = {};
 }
 
-// Runs on a thread of the OS timer service at each expiry.
+// The OS timer service calls this on one of its threads at each expiry.
 void TimerCallbackEntry(sigval value) {
     const uint32_t timer = static_cast<uint32_t>(value.sival_int);
     TRACE_MID("Timer Callback: Timer=[%d]", static_cast<int>(timer));
@@ -254,7 +254,7 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
         info->bTimerCreated = false;
         return FALSE;
     }
-    // If the timer expires already, the delivery waits for the lock and then finds these values.
+    // Even if the timer expires now, the delivery waits for the lock and finds these values.
     info->pfnCallback = callback;
     info->pUserData = userData;
     info->bAwaited = true;
