@@ -10,7 +10,8 @@ import gdb
 
 def table(name):
     """Yields the handle, name and Info of each used slot of a slot table."""
-    found = gdb.lookup_static_symbol(f'(anonymous namespace)::{name}').value()
+    symbol = gdb.lookup_static_symbol(f'(anonymous namespace)::{name}') or gdb.lookup_global_symbol(name)
+    found = symbol.value()
     base = found['slots_']
     for i in range(base.type.range()[1] + 1):
         handle = int(base[i]['handle']['_M_i'])
