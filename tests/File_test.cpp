@@ -114,6 +114,8 @@ TEST_F(File, SizesAndPositions) {
 
     const std::string large = Path("large");
     WriteAll(large, "");
+    fs::resize_file(large, INT32_MAX);
+    EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), INT32_MAX);
     fs::resize_file(large, 5LL << 30);
     EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), 0);
     const PglFileHandle beyond = VarnekPGL_OpenFile(large.c_str(), PGL_FILE_MODE_READ);

@@ -4,6 +4,7 @@
 #include <chrono>
 #include <thread>
 
+#include "../CommonUtility/source/Varnek_Support.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"
 
@@ -53,6 +54,16 @@ TEST_F(Mutex, NamesThatResembleEachOther) {
     for (int32_t i = 0; i < 5; i++) {
         EXPECT_EQ(VarnekPGL_GetMutexByName(names[i]), 7 + i) << names[i];
     }
+}
+
+TEST_F(Semaphore, ADeadlineCarriesItsNanoseconds) {
+    const auto after = [](uint32_t timeout) {
+        const timespec deadline = DeadlineAfter({100, 900000000}, timeout);
+        return std::pair<int64_t, int64_t>(deadline.tv_sec, deadline.tv_nsec);
+    };
+    EXPECT_EQ(after(99), std::pair(int64_t{100}, int64_t{999000000}));
+    EXPECT_EQ(after(100), std::pair(int64_t{101}, int64_t{0}));
+    EXPECT_EQ(after(1500), std::pair(int64_t{102}, int64_t{400000000}));
 }
 
 TEST_F(Semaphore, ALogFunctionMayUseTheFamilyOnceTheLockIsFree) {

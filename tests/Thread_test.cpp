@@ -313,6 +313,31 @@ TEST_F(MessageQueue, ARemovalWakesTheWaiterAndNothingIsDestroyedUnderIt) {
     }
 }
 
+TEST_F(MessageQueue, ALogFunctionMaySendAndReceiveBeforeTheWait) {
+    gLogHook = [](const LogLine &line) {
+        static bool inside = false;
+        if (inside || line.text.find("VarnekPGL_ReceiveMessage: semCount = 0") == std::string::npos) {
+            return;
+        }
+        inside = true;
+        const THREAD_MSG sent = Message('s');
+        THREAD_MSG received;
+        int32_t count = -1;
+        for (int i = 0; i < 2; i++) {
+            EXPECT_TRUE(VarnekPGL_SendMessage(VarnekPGL_GetCurrentThread(), &sent));
+        }
+        EXPECT_TRUE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &received, &count));
+        inside = false;
+    };
+    Worker([] {
+        THREAD_MSG message = Message('m');
+        int32_t count = -1;
+        EXPECT_TRUE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count));
+        EXPECT_EQ(message.data[0], 's');
+    }).Wait();
+    gLogHook = nullptr;
+}
+
 TEST_F(MessageQueue, AMessageEndsATimedWait) {
     Worker worker([] {
         THREAD_MSG message;
