@@ -377,6 +377,8 @@ TEST_F(Command, AnyPathIsOneWord) {
         EXPECT_EQ(VarnekPGL_DeleteFile(name), 0) << name;
     }
     EXPECT_FALSE(fs::exists("hurt"));
+    fs::create_directory("empty");
+    EXPECT_EQ(VarnekPGL_DeleteFile("empty"), 0) << "as remove does";
     EXPECT_THAT(TakeErrors(), IsEmpty());
     fs::current_path(home);
 }
