@@ -38,7 +38,7 @@ ROWS = [
         ('jack', 'JACK, no lock', None), ('limit', 'limit: memcpy, mutex', 1.8)),
     Row('ring/two', 'ring', 'ring, 188 bytes, two threads', ('boost', 'circular_buffer', 0.85),
         ('jack', 'JACK, no lock', None), ('limit', 'limit: memcpy, mutex', None), wall=True),
-    Row('message/same', 'messages', 'message, same thread', ('gasync', 'GAsyncQueue', 2.0),
+    Row('message/same', 'messages', 'message, same thread', ('gasync', 'GAsyncQueue', 1.3),
         ('mq', 'POSIX mq', 0.06), ('limit', 'limit: mallocs, list, locks', 2.0)),
     Row('message/oneway', 'messages', 'message, one way', ('gasync', 'GAsyncQueue', 1.0),
         ('mq', 'POSIX mq', None), ('limit', 'limit: mallocs, list, locks', 2.0), wall=True),
