@@ -315,7 +315,7 @@ TEST_F(MessageQueue, ARemovalWakesTheWaiterAndNothingIsDestroyedUnderIt) {
 
 TEST_F(MessageQueue, ALogFunctionMaySendAndReceiveBeforeTheWait) {
     gLogHook = [](const LogLine &line) {
-        static bool inside = false;
+        thread_local bool inside = false;
         if (inside || line.text.find("VarnekPGL_ReceiveMessage: semCount = 0") == std::string::npos) {
             return;
         }

@@ -10,7 +10,7 @@
 #include <mutex>
 #include <regex>
 
-void (*gLogHook)(const LogLine &line) = nullptr;
+std::atomic<void (*)(const LogLine &line)> gLogHook{nullptr};
 
 namespace {
 
@@ -20,8 +20,8 @@ std::vector<LogLine> &gLog = *new std::vector<LogLine>;
 
 void Capture(int priority, const char *tag, const char *text) {
     LogLine line{priority, tag, text, static_cast<pid_t>(syscall(SYS_gettid))};
-    if (gLogHook != nullptr) {
-        gLogHook(line);
+    if (const auto hook = gLogHook.load()) {
+        hook(line);
     }
     const std::lock_guard<std::mutex> guard(gLogLock);
     gLog.push_back(std::move(line));

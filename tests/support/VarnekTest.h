@@ -39,8 +39,8 @@ std::vector<std::string> TakeBodies(const std::string &tag = "", int priority = 
 // Returns the bodies of the Error traces and storage failures since the last call.
 inline std::vector<std::string> TakeErrors() { return TakeBodies("", 6); }
 
-// Called without a lock for each line before it is captured; null for none.
-extern void (*gLogHook)(const LogLine &line);
+// Called without a lock for each line before it is captured, in the thread that wrote the line; null for none.
+extern std::atomic<void (*)(const LogLine &line)> gLogHook;
 
 std::string ReadAll(const std::string &path);
 void WriteAll(const std::string &path, const std::string &content);
