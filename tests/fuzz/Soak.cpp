@@ -7,6 +7,7 @@
 #include <chrono>
 #include <cstdio>
 #include <cstring>
+#include <mutex>
 #include <random>
 #include <string>
 #include <thread>
@@ -55,6 +56,8 @@ struct Worker {
     int64_t lookups, passed;
     int32_t latest[kThreads];  // the last record of each other worker that it sent to
     std::atomic<int64_t> fired, ended, taken;
+    std::mutex timerLock;
+    int64_t timers;           // its timers so far, changed under timerLock
     VarnekCRingBuffer *ring;  // between an even worker, which writes, and the next one
 
     int Below(int limit) { return static_cast<int>(random() % static_cast<unsigned int>(limit)); }
@@ -141,7 +144,7 @@ void UseOwnObjects(Worker &me) {
 
 // One start of a timer. It outlives a late callback.
 struct Start {
-    std::atomic<int64_t> due;
+    std::atomic<int64_t> due, timer;  // as the worker counts its timers
     Worker *worker;
 };
 Start gStarts[kThreads][1024];
@@ -151,12 +154,15 @@ int64_t Microseconds() {
         .count();
 }
 
-// It is never called before its start is due. Half of the callbacks use their own timer.
+// It is never called before its start is due. Half of the callbacks use their own timer, but not after its deletion:
+// the handle may belong to another worker's timer by then.
 void OnTimer(uint32_t timer, void *userData) {
     const Start &start = *static_cast<Start *>(userData);
     CHECK(Microseconds() >= start.due);
-    const int64_t nth = ++start.worker->fired;
-    if (start.worker->index % 2 == 0) {
+    Worker &worker = *start.worker;
+    const int64_t nth = ++worker.fired;
+    const std::lock_guard<std::mutex> guard(worker.timerLock);
+    if (worker.index % 2 == 0 && start.timer == worker.timers) {
         nth % 2 == 0 ? VarnekPGL_CancelTimer(timer) : VarnekPGL_StartTimer(timer, 20, OnTimer, userData);
     }
 }
@@ -171,11 +177,16 @@ void UseTimer(Worker &me) {
     for (uint32_t timeout : {1u, 20u, 1u + static_cast<uint32_t>(me.Below(3))}) {
         Start &start = gStarts[me.index][me.starts++ % 1024];
         start.worker = &me;
+        start.timer = me.timers;
         start.due = Microseconds() + int64_t{timeout} * 1000;
         CHECK(VarnekPGL_StartTimer(handle, timeout, OnTimer, &start) == TRUE || !mine);
         std::this_thread::sleep_for(std::chrono::microseconds(900 + me.Below(200)));
         VarnekPGL_CancelTimer(handle);
         CHECK(VarnekPGL_IsTimerActive(handle) == FALSE || !mine);
+    }
+    {
+        const std::lock_guard<std::mutex> guard(me.timerLock);
+        ++me.timers;
     }
     CHECK(VarnekPGL_DeleteTimer(handle) == TRUE);
     CHECK(me.fired <= me.starts || !mine);
