@@ -167,7 +167,11 @@ TEST_F(LargeFile, FlagsGiveTheirAccess) {
 TEST_F(LargeFile, BeyondFourGiB) {
     const std::string path = Path("sparse");
     const int64_t end = (int64_t{5} << 30) + 7;
+    // A process without a standard input gets 0 as its first handle.
+    const int input = dup(STDIN_FILENO);
+    close(STDIN_FILENO);
     const int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_CREATE_RW);
+    EXPECT_EQ(fd, 0);
     EXPECT_EQ(VarnekPGL_SeekFile64Bits(fd, end - 3, SEEK_SET), 0);
     EXPECT_EQ(VarnekPGL_WriteFileByHandle64Bits(fd, "end", 3), 3);
     EXPECT_EQ(VarnekPGL_SeekFile64Bits(fd, -3, SEEK_CUR), 0);
@@ -179,6 +183,8 @@ TEST_F(LargeFile, BeyondFourGiB) {
     EXPECT_EQ(VarnekPGL_TellFile64Bits(fd), 5);
     EXPECT_EQ(VarnekPGL_FlushFile64Bits(fd), 0);
     EXPECT_EQ(VarnekPGL_CloseFile64Bits(fd), 0);
+    dup2(input, STDIN_FILENO);
+    close(input);
     EXPECT_EQ(VarnekPGL_GetFileSize64Bits(path.c_str()), end);
     EXPECT_EQ(VarnekPGL_GetFileSize64Bits(Path("none").c_str()), 0);
     EXPECT_THAT(TakeLog(), IsEmpty());
