@@ -162,7 +162,7 @@ def lines(figures):
             yield *head, shown(statistics.median(theirs)), f'{ratio:.2f}', wanted, verdict
 
 
-HEAD = ('row', 'ours', 'ours, least to most', 'beside', 'theirs', 'ratio', 'goal', '')
+HEAD = ('row', 'ours', 'ours, least to most', 'peer', 'its cost', 'ratio', 'goal', '')
 
 
 def named_once(table):
@@ -297,7 +297,7 @@ def section(directory, figures):
            f'Linux {platform.release().split("-")[0]}, {compiler}.')
     yield f'{score(table)}.'
     yield ''
-    yield '| row | ours | least to most | beside | theirs | ratio | goal | |'
+    yield '| row | ours | least to most | peer | its cost | ratio | goal | |'
     yield '|---|---|---|---|---|---|---|---|'
     for fields in named_once(table):
         fields[-1] = {'MISSED': '**missed**'}.get(fields[-1], fields[-1])

@@ -137,7 +137,7 @@ def size_of(library):
     return int(text) + int(data)
 
 
-HEAD = ('operation', 'g++', 'clang', 'beside', 'theirs', 'ratio', 'goal', '')
+HEAD = ('operation', 'g++', 'clang', 'peer', 'its cost', 'ratio', 'goal', '')
 
 
 def lines(prefixes):
