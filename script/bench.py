@@ -49,7 +49,7 @@ ROWS = [
     *[Row(f'mutex/{slot}', 'locks', f'acquire + release, {slot} slot', ('bare', 'pthread mutex', 1.6),
           ('limit', 'limit: library call', 1.3)) for slot in ('first', 'last')],
     *[Row(f'mutex2/{where}', 'locks', f'two threads, {text}', ('onethread', 'one thread', 1.5))
-      for where, text in (('neighbours', 'next slots'), ('apart', 'slots apart'))],
+      for where, text in (('neighbours', 'adjacent slots'), ('apart', 'slots apart'))],
     *[Row(f'semaphore/{slot}', 'locks', f'signal + wait, {slot} slot', ('bare', 'bare semaphore', 3.0))
       for slot in ('first', 'last')],
     Row('trace_off/one', 'trace', 'trace that is off', ('liblog', 'liblog, filtered', 0.6),
@@ -88,7 +88,7 @@ GROWTH = [
 ]
 # An operation in one thread, and in each of two threads at the same time.
 THREADS = [
-    ('mutexes in slots side by side', ('mutex2/neighbours', 'onethread'), ('mutex2/neighbours', 'ours')),
+    ('mutexes in adjacent slots', ('mutex2/neighbours', 'onethread'), ('mutex2/neighbours', 'ours')),
     ('mutexes in slots far apart', ('mutex2/apart', 'onethread'), ('mutex2/apart', 'ours')),
     *[(f'trace that is off, {label}', ('trace_off/one', who), ('trace_off/two', who)) for who, label in
       (('ours', 'ours'), ('limit', 'masked call'), ('liblog', 'liblog'), ('spdlog', 'spdlog'))],
@@ -162,7 +162,7 @@ def lines(figures):
             yield *head, shown(statistics.median(theirs)), f'{ratio:.2f}', wanted, verdict
 
 
-HEAD = ('row', 'ours', 'ours, least to most', 'peer', 'its cost', 'ratio', 'goal', '')
+HEAD = ('row', 'ours', 'ours, range', 'peer', 'its cost', 'ratio', 'goal', '')
 
 
 def named_once(table):
@@ -297,13 +297,13 @@ def section(directory, figures):
            f'Linux {platform.release().split("-")[0]}, {compiler}.')
     yield f'{score(table)}.'
     yield ''
-    yield '| row | ours | least to most | peer | its cost | ratio | goal | |'
+    yield '| row | ours | range | peer | its cost | ratio | goal | |'
     yield '|---|---|---|---|---|---|---|---|'
     for fields in named_once(table):
         fields[-1] = {'MISSED': '**missed**'}.get(fields[-1], fields[-1])
         yield '| ' + ' | '.join(field.replace('<= ', '≤ ') for field in fields) + ' |'
     yield ''
-    yield '| an operation of two threads at once | one thread alone | each of two |'
+    yield '| operation | time in one thread alone | time in each of two threads at once |'
     yield '|---|---|---|'
     for label, *names in THREADS:
         pair = [figures.of(*name, False) for name in names]
@@ -315,10 +315,10 @@ def section(directory, figures):
         speed = {who: size / statistics.median(figures.wall['receiver', who]) * 1e3
                  for who in ('ours', 'ffprobe', 'read') if ('receiver', who) in figures.wall}
         yield ''
-        yield ('The receiver reads ' + ', '.join(
-            f'{value:.0f} MB/s ({label})' for who, label, value in
-            ((who, {'ours': 'ours', 'ffprobe': 'ffprobe, all packets', 'read': 'plain reading'}[who], speed[who])
-             for who in speed)) + f'; that is {100 * speed["ours"] / speed["read"]:.1f} % of plain reading.')
+        labels = {'ours': 'the receiver', 'ffprobe': 'ffprobe (all packets)', 'read': 'plain reading'}
+        yield ('Speeds of reading the stream: ' +
+               ', '.join(f'{labels[who]} {value:.0f} MB/s' for who, value in speed.items()) +
+               f'. The receiver reaches {100 * speed["ours"] / speed["read"]:.1f} % of plain reading.')
 
 
 def record(directory, docs):

@@ -1,4 +1,5 @@
-// A ring of bytes between one writer and one reader. Each ring is guarded by a named mutex.
+// A ring of bytes between one writer and one reader. A ring is guarded by a named mutex, if
+// it has one.
 #ifndef VARNEK_CRINGBUFFER_H
 #define VARNEK_CRINGBUFFER_H
 
@@ -27,7 +28,8 @@
 // A ring whose size is invalid or whose storage cannot be allocated has size 0. Its writes, reads
 // and seeks fail until a Reset succeeds. Each failure is traced.
 //
-// Thread-safe: in a ring that has its mutex, the operations from Reset to Read run one at a time.
+// Thread-safe: in a ring that has its mutex, Reset, Flush, Seek, the three queries, Write and Read
+// run one at a time.
 // One case is not atomic: an operation that finds the ring in an inconsistent state releases the
 // mutex briefly before it empties the ring. Construction, destruction and assignment (on either
 // side) are not guarded. A copy has no mutex and is not thread-safe.
@@ -55,7 +57,8 @@ class VARNEK_API VarnekCRingBuffer {
     // the whole size leaves nothing to read. With origin 0, an index equal to the size is accepted,
     // but then the caller must read, or seek forward by 0, before the next write. Returns 0;
     // VARNEK_RING_NO_SPACE for an offset that is negative, larger than the size or, with origin 1,
-    // larger than the number of readable bytes; VARNEK_RING_INVALID for another origin.
+    // larger than the number of readable bytes, and in a ring without storage or, with origin 1, in
+    // an inconsistent state; VARNEK_RING_INVALID for another origin.
     int Seek(int aOffset, int origin);
 
     // Return the number of bytes that can be read and written now; in an inconsistent state,
@@ -67,10 +70,10 @@ class VARNEK_API VarnekCRingBuffer {
     int GetDistance() const;
 
     // Copy `writelen` bytes in or `readLen` bytes out. Return 0; VARNEK_RING_INVALID for a length
-    // below 0 or above the size, and for a null pointer (after a panic report);
-    // VARNEK_RING_NO_SPACE when there is too little room; VARNEK_RING_NO_DATA when there are too
-    // few bytes, and when 0 bytes are read from an empty ring. In an inconsistent state, a write or
-    // read empties the ring and returns VARNEK_RING_NO_SPACE for an overflow and
+    // below 0 or above the size, and for a null pointer with a length above 0 (after a panic
+    // report); VARNEK_RING_NO_SPACE when there is too little room; VARNEK_RING_NO_DATA when there
+    // are too few bytes, and when 0 bytes are read from an empty ring. In an inconsistent state, a
+    // write or read empties the ring and returns VARNEK_RING_NO_SPACE for an overflow and
     // VARNEK_RING_NO_DATA for an underflow. There are two exceptions. A write that finds WL = RL
     // and W < R returns VARNEK_RING_NO_DATA but leaves the ring unchanged. With W <= R and WL > RL
     // + 1, writes and reads treat the writer as one lap ahead.

@@ -13,10 +13,10 @@ extern "C" {
 #endif
 
 // The source file and line of the code that traces next. Every caller stores both before a trace or
-// a panic report; VARNEK_TRACE does so. When two threads trace at the same time, a line may show
-// the other thread's file and line. So the path must stay readable as long as the process lives,
-// and a module that traces must never be unloaded: link it with -Wl,-z,nodelete, as this library
-// is.
+// a panic report; VARNEK_TRACE does so. When two threads trace at the same time, one may read what
+// the other stored, so its line shows the other's file and line. Therefore the path must stay
+// readable as long as the process lives, and a module that traces must never be unloaded: link it
+// with -Wl,-z,nodelete, as this library is.
 extern VARNEK_API const char *gszVarnekDbgFilePath;
 extern VARNEK_API int32_t gVarnekDbgLineNum;
 
@@ -40,8 +40,8 @@ static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
 
 // Writes one line to the Android log if the configuration enables it. Preserves errno.
 //   mask     level and module; a mask without a module writes nothing
-//   format   printf format; null shows "(null)". The text is truncated to 2017 characters, and to
-//            2047 with the prefix
+//   format   printf format; null shows "(null)". The text is truncated to 2017 bytes, and to 2047
+//            with the prefix
 //   threads  Thread-safe without a lock; lines never mix.
 VARNEK_API void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...)
     __attribute__((format(printf, 2, 3)));
@@ -52,7 +52,7 @@ VARNEK_API void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...)
 //   threads  Thread-safe; concurrent loads run one after the other.
 VARNEK_API void VarnekPGL_InitializeDebug(void);
 
-// Loads the debug configuration unless a load was tried before, even one that failed.
+// Loads the debug configuration if no load has been tried yet. A failed load counts as tried.
 VARNEK_API void VarnekPGL_CheckAndInitDebug(void);
 
 // Writes the assertion report at fatal priority under the tag "Varnek", whatever the configuration

@@ -25,12 +25,14 @@ extern "C" {
 
 // Streams ----------------------------------------------------------------------------------------
 // Offsets and sizes are signed 32-bit numbers, which cannot express the size of a file of 2 GiB or
-// more. A handle of 0 or -1 is not a stream; its use is logged and fails.
+// more. A handle of 0 or -1 is not a stream. Its use is logged and has the result that is given for
+// "no stream".
 
 // Opens a stream.
 //   path     at most 255 characters
-//   flags    PGL_FILE_MODE_ bits, of which only the strongest counts: APPEND, then CREATE_RW, then
-//            WRITE, then READ. So READ | WRITE truncates. Other bits alone open nothing
+//   flags    PGL_FILE_MODE_ bits, of which only the first of APPEND, CREATE_RW, WRITE and READ that
+//   is
+//            set counts. So READ | WRITE truncates. Other bits alone open nothing
 //   returns  the handle, which the caller closes; -1 on failure
 VARNEK_API PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags);
 
@@ -114,9 +116,9 @@ VARNEK_API int32_t VarnekPGL_CloseFile64Bits(int32_t hFile);
 VARNEK_API int32_t VarnekPGL_ReadFileByHandle64Bits(int32_t hFile, void *buffer, uint32_t length);
 
 // Writes with one call and does not retry.
-//   returns  `length` on success; VARNEK_FILE_MEDIUM_FULL, VARNEK_FILE_TOO_LARGE or
-//            VARNEK_FILE_DEVICE_FAILURE; otherwise the short count or -1. 0 for a negative
-//            descriptor
+//   returns  `length` on success; on failure VARNEK_FILE_MEDIUM_FULL, VARNEK_FILE_TOO_LARGE or
+//            VARNEK_FILE_DEVICE_FAILURE, or else the number of bytes written or -1; 0 for a
+//            negative descriptor
 VARNEK_API int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer,
                                                      uint32_t length);
 

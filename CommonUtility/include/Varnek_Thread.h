@@ -35,8 +35,9 @@ VARNEK_API int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t prio
                                           void *argument);
 
 // Removes a thread's record and frees its unread messages, but not the memory that they point to.
-// Unread messages are traced at Error. This takes 0.26 s for ten million messages on a PC; no other
-// operation waits for it. The thread runs on; if it waits in a receive, the receive returns FALSE.
+// If there are any, an Error line gives their number. This takes 0.26 s for ten million messages on
+// a PC; no other operation waits for it. The thread runs on; if it waits in a receive, the receive
+// returns FALSE.
 //   returns  TRUE, or FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 
@@ -74,14 +75,15 @@ VARNEK_API BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *m
 //   timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
 //   message  out: the message
 //   count    out: the number of messages left
-//   returns  TRUE; FALSE, with nothing written, on a time-out or an interrupted wait, when the
-//            thread has no record or the record is removed during the wait, once for each message
-//            that was peeked, and for null pointers
+//   returns  TRUE; FALSE, after an Error line and with `message` and `count` unchanged, on a
+//            time-out or an interrupted wait, when the thread has no record or the record is
+//            removed during the wait, once for each message that was peeked, and for null pointers
 VARNEK_API BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *count);
 
 // Takes the first message without waiting. The message is removed from the queue but stays counted,
 // so for each message that was peeked, one later receive returns FALSE at once.
-//   returns  TRUE; FALSE, and nothing written, when there is none
+//   returns  TRUE; FALSE, after an Error line and with `message` and `count` unchanged, when there
+//            is none, when the thread has no record, and for null pointers
 VARNEK_API BOOL VarnekPGL_PeekMessage(THREAD_MSG *message, int32_t *count);
 
 #ifdef __cplusplus

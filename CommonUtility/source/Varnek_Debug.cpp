@@ -1,6 +1,7 @@
 // The masked trace, the debug configuration that masks it, and the assertion report.
 //
-// One atomic word says what is enabled, so a trace that is off costs one load. Each call composes
+// One atomic word says what is enabled, so for a trace that is off, the library
+// only loads and tests that word. Each call composes
 // its line in a buffer on its stack, and holds no lock while it formats and writes the line. The
 // only lock here lets one thread at a time load the configuration.
 #include "Varnek_Debug.h"
@@ -22,13 +23,13 @@
 #include "Varnek_Trace.h"
 #include "varnek_platform.h"
 
-// Every trace stores the first two words and reads the third. In a section of their own they share
-// a line of the cache with nothing else, so threads that trace on two cores pass no more of them to
-// and fro than they have to.
+// Every trace stores the first two words and reads the third. The section and the alignment place
+// the first two in one cache line, so that only one line moves between the cores when two threads
+// trace. g++ emits the variables last to first, and clang first to last; both orders do.
 #define VARNEK_TRACE_WORD __attribute__((section(".data.trace")))
-alignas(64) VARNEK_TRACE_WORD const char *gszVarnekDbgFilePath = "";
+VARNEK_TRACE_WORD const char *gszVarnekDbgFilePath = "";
 VARNEK_TRACE_WORD int32_t gVarnekDbgLineNum = 0;
-VARNEK_TRACE_WORD std::atomic<uint32_t> gDebugState{~0u};
+alignas(64) VARNEK_TRACE_WORD std::atomic<uint32_t> gDebugState{~0u};
 
 namespace {
 
@@ -266,7 +267,7 @@ uint32_t StateOf(uint32_t enabled) {
     return (enabled & kOwnLow) == kOwnLow ? enabled | kOwnLowOn : enabled;
 }
 
-// Loads the configuration once. During the load nothing is traced, even if an earlier configuration
+// Runs one load. During the load nothing is traced, even if an earlier configuration
 // enabled traces.
 void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     if (IsLoaded()) {
@@ -355,8 +356,8 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
 }  // namespace
 
 void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...) {
-    // The bits of the levels are above kNotLoaded, and all others are below it. So this returns
-    // when the configuration is loaded and the level is off, or the mask has no level.
+    // The bits of the levels are above kNotLoaded, and all others are below it. So once
+    // the configuration is loaded, this returns if the level is off or the mask has no level.
     const uint32_t state = gDebugState.load(std::memory_order_relaxed);
     if ((state & (mask | kNotLoaded)) < kNotLoaded) {
         return;

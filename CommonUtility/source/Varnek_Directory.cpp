@@ -35,7 +35,7 @@ DIR *DirOf(void *hDir) {
     return hDir != PGL_INVALID_DIR_HANDLE ? static_cast<DIR *>(hDir) : nullptr;
 }
 
-// Reads the first argument of the process's command line; it is empty when it cannot be read.
+// Reads the name by which the process was started (argv[0]); it is empty when it cannot be read.
 template <size_t size>
 void ReadProcessName(char (&name)[size]) {
     char path[32];
@@ -400,8 +400,9 @@ class ShellCommand {
     bool fits_ = true;
 };
 
-// Whether two paths may name the same file. It does not need stat: if they do, a lock through one
-// path prevents a lock through the other. Also true when a lock cannot be taken for another reason.
+// Returns whether two paths may name the same file, without stat. If they name the same file, a
+// lock through one path prevents a lock through the other. It also returns true if a lock cannot be
+// taken for another reason.
 bool ShareALock(const char *a, const char *b) {
     const int first = open(a, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
     const int second = open(b, O_RDONLY | O_NONBLOCK | O_CLOEXEC);

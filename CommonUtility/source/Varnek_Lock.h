@@ -54,19 +54,19 @@ class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
 };
 
 // The table of the named mutexes, for the two operations below. Varnek_Semaphore.cpp owns it and
-// writes the lines of their failures.
+// logs their failures.
 constexpr int MAX_MUTEX_MGR_INFO_ARR_SIZE = 40;
 struct MUTEX_MGR_INFO {
     pthread_mutex_t linuxMutex;
 };
 extern __attribute__((visibility("hidden"))) SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE>
     gMutexArr;
-pthread_mutex_t *LockFailed(const void *slot, int32_t hMutex, int error);  // null
-BOOL UnlockFailed(int error);                                              // FALSE
+pthread_mutex_t *LockFailed(const void *slot, int32_t hMutex, int error);  // always returns null
+BOOL UnlockFailed(int error);                                              // always returns FALSE
 
-// LockMutex does what VarnekPGL_AcquireMutex does, but returns the mutex, or null on failure. A
-// held mutex cannot be deleted, so UnlockMutex does what VarnekPGL_ReleaseMutex does without
-// another lookup.
+// LockMutex does what VarnekPGL_AcquireMutex does, but returns the mutex, or null on failure.
+// UnlockMutex does what VarnekPGL_ReleaseMutex does. It needs no second lookup, because a held
+// mutex cannot be deleted.
 inline pthread_mutex_t *LockMutex(int32_t hMutex) {
     auto *const slot = gMutexArr.Find(hMutex);
     const int error = slot != nullptr ? pthread_mutex_lock(&slot->info.linuxMutex) : 0;

@@ -1,11 +1,12 @@
 // The table of named objects. It manages slots, handles and names, and nothing else. Private.
 //
-// A handle is published once in the life of the process, and it publishes its slot: the name and
-// the Info of the slot are complete before the handle is stored, and the name does not change until
-// the handle is withdrawn. Lookups take no lock. A lookup by handle reads the handle with acquire.
+// Each handle is given to one object only and is never given out again. A creation completes the
+// name of its slot and the Info, which is the data of the object, and then stores the handle, which
+// makes the slot visible. The name does not change until the handle is cleared. Lookups take no
+// lock. A lookup by handle reads the handle with acquire.
 // A lookup by name reads the handle, the words of the name, and the handle again. If both reads
 // return the same handle, the words in between belong to that handle, because no handle is
-// published twice. This is a sequence lock whose sequence number cannot repeat. Each name has a
+// given out twice. This is a sequence lock whose sequence number cannot repeat. Each name has a
 // digest. A lookup by name compares the digests first, so that it executes barriers only where the
 // name probably matches.
 //
@@ -15,8 +16,8 @@
 // compares the handle in that slot. If it is another one, the lookup scans all slots and corrects a
 // stale hint.
 //
-// A thread that changes the table holds the family's guard. The table is zero when the library is
-// loaded, which is its empty state.
+// A thread that changes the table holds the lock that guards it. A table of zero bytes is empty, so
+// it needs no initialisation.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 
@@ -48,7 +49,8 @@ class SlotTable {
 
     // Returns the slot of a live handle, null for none. It reads one slot if the hint is right, and
     // scans all slots if not. The handle is read with `order`. A relaxed read does not make the
-    // Info visible, so it is only for a caller that sees the Info for another reason.
+    // Info visible, so it is only for a caller to which the Info is visible already, for example
+    // because it was complete before the calling thread started.
     Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
         if (handle <= kFree) {
             return nullptr;
@@ -168,9 +170,9 @@ class SlotTable {
     }
 
     // Returns the handle of a slot if this is its name, kFree otherwise. The words are not older
-    // than the handle, because the first read of the handle acquires. A newer word was stored after
-    // the fence in StoreName, which pairs with the fence here, so the second read does not find the
-    // handle any more.
+    // than the handle, because the first read of the handle acquires. If a word is newer, it was
+    // stored after the fence in StoreName. That fence pairs with the fence here, so the second read
+    // does not find the handle any more.
     int32_t HandleOfName(ptrdiff_t slot, const PackedName &wanted) const {
         const int32_t handle = slots_[slot].handle.load(std::memory_order_acquire);
         for (size_t i = 0; i < wanted.used; i++) {
@@ -200,7 +202,7 @@ class SlotTable {
     std::atomic<uint32_t> digests_[kSlots];  // of the names; 0 in a free slot
     std::atomic<uint32_t> names_[kSlots][kNameWords];
     std::atomic<int32_t> count_;
-    int32_t given_;  // handles given out so far, 1 to this one; used under the guard only
+    int32_t given_;  // the last handle given out; the first is 1; used under the guard only
 };
 
 #endif

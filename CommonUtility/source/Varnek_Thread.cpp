@@ -1,11 +1,11 @@
 // The thread registry and the message queues.
 //
-// The registry's guard is held while a record is created or made invisible. Each queue has a lock
-// of its own. A thread that holds this lock can check whether the record is still there; if it is,
-// the record's semaphore stays alive until the lock is released. A thread that uses the semaphore
-// without the lock, to wait or to wake the owner, counts as a user of the record. The last user of
-// a removed record disposes of it. So no thread holds a lock while it waits for a message, or while
-// it takes another of these locks.
+// The registry's guard, the mutex "VarnekThreadMutex", is held while a record is created or made
+// invisible. Each queue has a lock of its own. A thread that holds this lock can check whether the
+// record is still there; if it is, the record's semaphore stays alive until the lock is released. A
+// thread that uses the semaphore without the lock, to wait or to wake the owner, counts as a user
+// of the record. The last user of a removed record disposes of it. So no thread holds a lock while
+// it waits for a message. No thread takes one of these locks while it holds another.
 //
 // A thread starts in ThreadEntry, which waits until the record is visible. Only then does it call
 // the function that the creator passed. The entry stores the handle under a thread-specific key,
@@ -39,7 +39,8 @@ constexpr size_t kSystemNameSize = 16;  // of a thread's name in the system, wit
 struct THREAD_MGR_INFO {
     Lock queueLock;
     list_t MsgQ VARNEK_GUARDED_BY(queueLock);  // empty while the record is free
-    // Each message that is sent adds one unit. If the owner waits, the sender posts the unit to the
+    // A unit is one count of the queue's semaphore, the permission to take one message. Each
+    // message that is sent adds one unit. If the owner waits, the sender posts the unit to the
     // semaphore. If not, it adds the unit to `units`, which is faster.
     sem_t msgQSem;
     int32_t units VARNEK_GUARDED_BY(queueLock);
@@ -76,7 +77,7 @@ constexpr int32_t kGuardInTheMaking = -2;
 std::atomic<int32_t> gThreadMutex{kNoGuard};
 std::atomic<pthread_t> gGuardMaker{};  // the thread that is creating it
 
-// The key under which a registered thread finds its handle, plus one; 0 until the guard exists.
+// The key under which a registered thread finds its handle, plus one; 0 until the key exists.
 std::atomic<uint32_t> gSelfKey{0};
 
 int32_t Guard() {
@@ -112,8 +113,8 @@ bool MakeSelfKey() {
 // Creates the guard and the key on first use. One thread creates them while others wait, since a
 // second mutex of the guard's name would destroy the first. Returns false if they cannot be
 // created. It also returns false if the calling thread is already creating them, which happens when
-// the log function creates a thread during the lines of the guard's creation: that call would wait
-// for itself.
+// the log function creates a thread while it writes a line of the guard's creation. Such a call
+// would wait for itself.
 bool EnsureGuard() {
     for (;;) {
         int32_t guard = gThreadMutex.load(std::memory_order_acquire);
@@ -460,9 +461,9 @@ inline bool TakeUnit(THREAD_MGR_INFO &info) VARNEK_REQUIRES(info.queueLock) {
     return sem_trywait(&info.msgQSem) == 0;
 }
 
-// How a message was sent. The errors are error numbers, 0 for none.
+// The result of a send. The errors are error numbers, 0 for none.
 struct Sent {
-    bool found;  // the record
+    bool found;  // whether the record still exists
     int postError;
     int valueError;
     int semCount;  // the units after the send, -1 on failure; not read for an urgent message
@@ -491,7 +492,7 @@ inline __attribute__((always_inline)) Sent Enqueue(Threads::Slot *slot, int32_t 
         info.users--;
         sent.postError = error;
         if (error != 0 && info.units > 0 && sem_post(&info.msgQSem) == 0) {
-            info.units--;  // the unit of a message whose sender relied on this post
+            info.units--;  // another sender counted it, and expected this post to wake the owner
         } else if (error != 0) {
             info.mustWake = true;
         }
@@ -530,8 +531,8 @@ inline void HandOut(Queued *queued, THREAD_MSG *message) {
 
 // What the owner finds at its queue.
 struct Receipt {
-    bool found;      // the record
-    bool counted;    // a unit, which is now taken
+    bool found;      // whether the record still exists
+    bool counted;    // whether there was a unit; it has been taken
     Queued *queued;  // the message, null for none
     int32_t left;    // messages behind it
     int valueError;  // the result of sem_getvalue
