@@ -3,9 +3,10 @@
 //
 // Most failures are logged at error priority under the tag "SBTVD_File", whatever the debug
 // configuration says, and never through the trace. A stream's read or write that moves too few
-// bytes is not logged. For large files, only failing opens and writes and negative descriptors are
-// logged. Thread-safe, except that one thread at a time may use a handle. A null path fails like a
-// path that does not exist; with a null buffer no bytes are moved.
+// bytes is not logged. For large files, only failing opens and writes, negative descriptors and
+// invalid seek bases are logged; the size queries log nothing. Thread-safe, except that one thread
+// at a time may use a handle. A null path fails like a path that does not exist; with a null buffer
+// no bytes are moved.
 #ifndef VARNEK_FILE_H
 #define VARNEK_FILE_H
 

@@ -24,12 +24,12 @@ typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 //   returns  the handle; -1 for null, a name that is too long or in use, or a full table
 VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 
-// Arms the timer for one expiry. If the start succeeds, and the timer is neither cancelled nor
-// deleted before the expiry, the start calls back exactly once, with its own `callback` and
-// `userData`. The callback may come late but never early. It is not lost when the timer is started
-// again before the system delivers the expiry. In two cases the callback is delayed until the
-// timer's next expiry: when the system cannot create a thread for the expiry, which writes no log
-// line, and when a later start fails and thereby discards the expiry.
+// Arms the timer for one expiry. If the start succeeds, and the timer is neither cancelled before
+// the expiry nor deleted before the callback begins, the start calls back exactly once, with its
+// own `callback` and `userData`. The callback may come late but never early. It is not lost when
+// the timer is started again before the system delivers the expiry. In two cases the callback is
+// delayed until the timer's next expiry: when the system cannot create a thread for the expiry,
+// which writes no log line, and when a later start fails and thereby discards the expiry.
 //   timer     handle from VarnekPGL_CreateTimer
 //   timeout   milliseconds from now, 1 or more; setting the wall clock does not change it
 //   callback  called once at the expiry

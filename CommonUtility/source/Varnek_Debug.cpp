@@ -25,7 +25,7 @@
 
 // Every trace stores the first two words and reads the third. The section and the alignment place
 // the first two in one cache line, so that only one line moves between the cores when two threads
-// trace. g++ emits the variables last to first, and clang first to last; both orders do.
+// trace. g++ emits the variables last to first, and clang first to last; either order works.
 #define VARNEK_TRACE_WORD __attribute__((section(".data.trace")))
 VARNEK_TRACE_WORD const char *gszVarnekDbgFilePath = "";
 VARNEK_TRACE_WORD int32_t gVarnekDbgLineNum = 0;

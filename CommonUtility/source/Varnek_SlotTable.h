@@ -3,9 +3,9 @@
 // Each handle is given to one object only and is never given out again. A creation completes the
 // name of its slot and the Info, which is the data of the object, and then stores the handle, which
 // makes the slot visible. The name does not change until the handle is cleared. Lookups take no
-// lock. A lookup by handle reads the handle with acquire.
-// A lookup by name reads the handle, the words of the name, and the handle again. If both reads
-// return the same handle, the words in between belong to that handle, because no handle is
+// lock. A lookup by handle reads the handle with acquire, unless its caller asks for a relaxed
+// read. A lookup by name reads the handle, the words of the name, and the handle again. If both
+// reads return the same handle, the words in between belong to that handle, because no handle is
 // given out twice. This is a sequence lock whose sequence number cannot repeat. Each name has a
 // digest. A lookup by name compares the digests first, so that it executes barriers only where the
 // name probably matches.
@@ -16,8 +16,8 @@
 // compares the handle in that slot. If it is another one, the lookup scans all slots and corrects a
 // stale hint.
 //
-// A thread that changes the table holds the lock that guards it. A table of zero bytes is empty, so
-// it needs no initialisation.
+// A thread that changes the table holds the lock that guards it. Only hints are corrected without
+// the lock. A table of zero bytes is empty, so it needs no initialisation.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 

@@ -39,9 +39,9 @@ constexpr size_t kSystemNameSize = 16;  // of a thread's name in the system, wit
 struct THREAD_MGR_INFO {
     Lock queueLock;
     list_t MsgQ VARNEK_GUARDED_BY(queueLock);  // empty while the record is free
-    // A unit is one count of the queue's semaphore, the permission to take one message. Each
-    // message that is sent adds one unit. If the owner waits, the sender posts the unit to the
-    // semaphore. If not, it adds the unit to `units`, which is faster.
+    // A unit is the permission to take one message. Each message that is sent adds one unit. If the
+    // owner waits, the sender posts the unit to the semaphore. If not, it adds the unit to `units`,
+    // which is faster.
     sem_t msgQSem;
     int32_t units VARNEK_GUARDED_BY(queueLock);
     bool mustWake VARNEK_GUARDED_BY(queueLock);   // the owner waits, and no unit was posted for it
@@ -77,7 +77,7 @@ constexpr int32_t kGuardInTheMaking = -2;
 std::atomic<int32_t> gThreadMutex{kNoGuard};
 std::atomic<pthread_t> gGuardMaker{};  // the thread that is creating it
 
-// The key under which a registered thread finds its handle, plus one; 0 until the key exists.
+// One more than the key under which a registered thread finds its handle; 0 until the key exists.
 std::atomic<uint32_t> gSelfKey{0};
 
 int32_t Guard() {
