@@ -44,7 +44,8 @@ struct THREAD_MGR_INFO {
     // which is faster.
     sem_t msgQSem;
     int32_t units VARNEK_GUARDED_BY(queueLock);
-    bool mustWake VARNEK_GUARDED_BY(queueLock);   // the owner waits, and no unit was posted for it
+    uint32_t waits VARNEK_GUARDED_BY(queueLock);  // of the owner so far
+    bool mustWake VARNEK_GUARDED_BY(queueLock);   // the owner waits, and no post has succeeded yet
     uint32_t users VARNEK_GUARDED_BY(queueLock);  // threads that use msgQSem without the lock
     // The name of the operation that removed the record, for the last user; null before that.
     const char *removedBy VARNEK_GUARDED_BY(queueLock);
@@ -131,7 +132,7 @@ bool EnsureGuard() {
         if (pthread_equal(gGuardMaker.load(std::memory_order_relaxed), pthread_self())) {
             return false;
         }
-        sched_yield();
+        VarnekPGL_MSleep(1);  // a yield would not let a creator of lower priority run
     }
 }
 
@@ -484,17 +485,14 @@ inline __attribute__((always_inline)) Sent Enqueue(Threads::Slot *slot, int32_t 
     LinkBefore(&info.MsgQ, urgent ? info.MsgQ.head : nullptr, &queued->node, &queued->message);
     const char *lastUse = nullptr;
     if (info.mustWake) {
-        info.mustWake = false;
+        const uint32_t wait = info.waits;
         info.users++;
         hold.Release();  // the owner takes the lock as soon as it wakes
-        const int error = sem_post(&info.msgQSem) == 0 ? 0 : VarnekPGL_SysGetLastErro();
+        sent.postError = sem_post(&info.msgQSem) == 0 ? 0 : VarnekPGL_SysGetLastErro();
         hold.Acquire();
         info.users--;
-        sent.postError = error;
-        if (error != 0 && info.units > 0 && sem_post(&info.msgQSem) == 0) {
-            info.units--;  // another sender counted it, and expected this post to wake the owner
-        } else if (error != 0) {
-            info.mustWake = true;
+        if (sent.postError == 0 && info.waits == wait) {
+            info.mustWake = false;
         }
         lastUse = LastUseOf(info);
     } else if (info.units < kMostUnits) {
@@ -580,6 +578,7 @@ int WaitAndTake(Threads::Slot *self, int32_t hThread, uint32_t timeout, Receipt 
     receipt->found = self->Has(hThread, std::memory_order_relaxed);
     if (receipt->found && !TakeUnit(info)) {
         info.mustWake = true;
+        info.waits++;
         info.users++;
         hold.Release();
         error = WaitForMessage(&info.msgQSem, timeout) == 0 ? 0 : VarnekPGL_SysGetLastErro();

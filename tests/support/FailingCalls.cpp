@@ -11,7 +11,6 @@
 #include <time.h>
 #include <unistd.h>
 
-#include <atomic>
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
@@ -58,6 +57,17 @@ sigevent *Droppable(sigevent *event) {
     return event;
 }
 
+std::atomic<const std::atomic<bool> *> gPostMayGo{nullptr};
+
+sem_t *HeldUp(sem_t *s) {
+    if (const std::atomic<bool> *go = gPostMayGo.exchange(nullptr)) {
+        while (!*go) {
+            usleep(100);
+        }
+    }
+    return s;
+}
+
 }  // namespace
 
 // The library's call goes to __wrap_NAME, which hands it on to __real_NAME.
@@ -78,7 +88,7 @@ sigevent *Droppable(sigevent *event) {
 WRAP(void *, nullptr, malloc, (size_t size), size)
 WRAP_POSIX(sem_init, (sem_t * s, int shared, unsigned value), s, shared, value)
 WRAP_POSIX(sem_destroy, (sem_t * s), s)
-WRAP_POSIX(sem_post, (sem_t * s), s)
+WRAP_POSIX(sem_post, (sem_t * s), HeldUp(s))
 WRAP_POSIX(sem_getvalue, (sem_t * s, int *value), s, value)
 WRAP_POSIX(sem_wait, (sem_t * s), s)
 WRAP_POSIX(sem_timedwait, (sem_t * s, const timespec *time), s, time)
@@ -150,6 +160,10 @@ void FailCall(const char *function, int nth, int error) {
     call.error = error;
     call.left = nth;
 }
+
+void HoldPost(const std::atomic<bool> *go) { gPostMayGo = go; }
+
+bool IsPostHeld() { return gPostMayGo == nullptr; }
 
 void DropDelivery() { gDrops = 1; }
 
