@@ -313,6 +313,7 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         VarnekCfg_SetStandard(VarnekCfg_GetConfigInfo()->standardType + 1);
         VarnekCfg_GetConfigInfo()->cprmPlayerDelay = 7;  // kept when the load fails
         VarnekCfg_LoadConfigFile();
+        EXPECT_FALSE(std::filesystem::exists(VARNEK_DATA_DIR "Varnek_Config.new"));
         return VarnekCfg_GetConfigInfo()->cprmPlayerDelay;
     });
     Force("debug configuration", [] { return VarnekPGL_InitializeDebug(), 0; });
