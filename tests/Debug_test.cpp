@@ -157,9 +157,11 @@ TEST_F(Trace, LinesAreCutToTheirBuffer) {
         EXPECT_EQ(log[0].text.rfind("[E][" + file.substr(0, 2000), 0), 0u);
     }
     gszVarnekDbgFilePath = nullptr;
-    gVarnekDbgLineNum = INT32_MIN;
-    VarnekPGL_TraceOut(0x80000001, nullptr);
-    EXPECT_EQ(TakeLog()[0].text, "[E][--2147483648] (null)");
+    for (const auto &[number, prefix] : {std::pair(INT32_MIN, "[E][--2147483648]"), std::pair(0, "[E][-   0]")}) {
+        gVarnekDbgLineNum = number;
+        VarnekPGL_TraceOut(0x80000001, nullptr);
+        EXPECT_EQ(TakeLog()[0].text, prefix + std::string(" (null)"));
+    }
 }
 
 TEST_F(Trace, LeavesErrnoAloneAndReportsIt) {

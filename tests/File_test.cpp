@@ -281,6 +281,22 @@ TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
     EXPECT_EQ(memcmp(&attributes, &expected, sizeof expected), 0);
 }
 
+TEST_F(Directory, AListingEndsAtANameOfMoreThan236Bytes) {
+    for (const size_t length : {236u, 237u}) {
+        const std::string sub = Path(std::to_string(length));
+        fs::create_directory(sub);
+        WriteAll(sub + "/" + std::string(length, 'n'), "");
+        void *dir = VarnekPGL_OpenDir(sub.c_str());
+        PglDirEntryInfo info;
+        bool listed = false;
+        while (VarnekPGL_ReadDir(dir, &info)) {
+            listed |= info.name == std::string(length, 'n');
+        }
+        VarnekPGL_CloseDir(dir);
+        EXPECT_EQ(listed, length == 236) << length;
+    }
+}
+
 TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
     const std::string outside = Path("outside");
     fs::create_directory(outside);
