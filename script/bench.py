@@ -162,7 +162,7 @@ def lines(figures):
             yield *head, shown(statistics.median(theirs)), f'{ratio:.2f}', wanted, verdict
 
 
-HEAD = ('row', 'ours', 'ours, range', 'peer', 'its cost', 'ratio', 'goal', '')
+HEAD = ('row', 'ours', 'range', 'peer', 'its cost', 'ratio', 'goal', '')
 
 
 def named_once(table):
@@ -297,7 +297,7 @@ def section(directory, figures):
            f'Linux {platform.release().split("-")[0]}, {compiler}.')
     yield f'{score(table)}.'
     yield ''
-    yield '| row | ours | range | peer | its cost | ratio | goal | |'
+    yield '| ' + ' | '.join(HEAD) + ' |'
     yield '|---|---|---|---|---|---|---|---|'
     for fields in named_once(table):
         fields[-1] = {'MISSED': '**missed**'}.get(fields[-1], fields[-1])
@@ -312,10 +312,10 @@ def section(directory, figures):
     path = Path(directory, 'receiver.json')
     if path.exists():
         size = json.loads(path.read_text())['bytes']
-        speed = {who: size / statistics.median(figures.wall['receiver', who]) * 1e3
-                 for who in ('ours', 'ffprobe', 'read') if ('receiver', who) in figures.wall}
-        yield ''
         labels = {'ours': 'the receiver', 'ffprobe': 'ffprobe (all packets)', 'read': 'plain reading'}
+        speed = {who: size / statistics.median(figures.wall['receiver', who]) * 1e3
+                 for who in labels if ('receiver', who) in figures.wall}
+        yield ''
         yield ('Speeds of reading the stream: ' +
                ', '.join(f'{labels[who]} {value:.0f} MB/s' for who, value in speed.items()) +
                f'. The receiver reaches {100 * speed["ours"] / speed["read"]:.1f} % of plain reading.')

@@ -1,5 +1,5 @@
-// A ring of bytes between one writer and one reader. A ring is guarded by a named mutex, if
-// it has one.
+// A ring of bytes between one writer and one reader. A ring is guarded by a named mutex, if it has
+// one.
 #ifndef VARNEK_CRINGBUFFER_H
 #define VARNEK_CRINGBUFFER_H
 
@@ -29,10 +29,9 @@
 // and seeks fail until a Reset succeeds. Each failure is traced.
 //
 // Thread-safe: in a ring that has its mutex, Reset, Flush, Seek, the three queries, Write and Read
-// run one at a time.
-// One case is not atomic: an operation that finds the ring in an inconsistent state releases the
-// mutex briefly before it empties the ring. Construction, destruction and assignment (on either
-// side) are not guarded. A copy has no mutex and is not thread-safe.
+// run one at a time. One case is not atomic: an operation that finds the ring in an inconsistent
+// state releases the mutex briefly before it empties the ring. Construction, destruction and
+// assignment (on either side) are not guarded. A copy has no mutex and is not thread-safe.
 class VARNEK_API VarnekCRingBuffer {
   public:
     // Creates an empty ring of `size` bytes. When all 40 mutexes are in use, the ring works without

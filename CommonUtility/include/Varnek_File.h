@@ -31,9 +31,8 @@ extern "C" {
 
 // Opens a stream.
 //   path     at most 255 characters
-//   flags    PGL_FILE_MODE_ bits, of which only the first of APPEND, CREATE_RW, WRITE and READ that
-//   is
-//            set counts. So READ | WRITE truncates. Other bits alone open nothing
+//   flags    PGL_FILE_MODE_ bits. Only the first of APPEND, CREATE_RW, WRITE and READ that is set
+//            counts, so READ | WRITE truncates. Other bits alone open nothing
 //   returns  the handle, which the caller closes; -1 on failure
 VARNEK_API PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags);
 

@@ -1,9 +1,8 @@
 // The masked trace, the debug configuration that masks it, and the assertion report.
 //
-// One atomic word says what is enabled, so for a trace that is off, the library
-// only loads and tests that word. Each call composes
-// its line in a buffer on its stack, and holds no lock while it formats and writes the line. The
-// only lock here lets one thread at a time load the configuration.
+// One atomic word says what is enabled, so for a trace that is off, the library only loads and
+// tests that word. Each call composes its line in a buffer on its stack, and holds no lock while it
+// formats and writes the line. The only lock here lets one thread at a time load the configuration.
 #include "Varnek_Debug.h"
 
 #include <errno.h>
@@ -267,8 +266,8 @@ uint32_t StateOf(uint32_t enabled) {
     return (enabled & kOwnLow) == kOwnLow ? enabled | kOwnLowOn : enabled;
 }
 
-// Runs one load. During the load nothing is traced, even if an earlier configuration
-// enabled traces.
+// Runs one load. During the load nothing is traced, even if an earlier configuration enabled
+// traces.
 void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     if (IsLoaded()) {
         gDebugState.store(0, std::memory_order_relaxed);
@@ -356,8 +355,8 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
 }  // namespace
 
 void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...) {
-    // The bits of the levels are above kNotLoaded, and all others are below it. So once
-    // the configuration is loaded, this returns if the level is off or the mask has no level.
+    // The bits of the levels are above kNotLoaded, and all others are below it. So once the
+    // configuration is loaded, this returns if the level is off or the mask has no level.
     const uint32_t state = gDebugState.load(std::memory_order_relaxed);
     if ((state & (mask | kNotLoaded)) < kNotLoaded) {
         return;
