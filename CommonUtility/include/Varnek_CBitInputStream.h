@@ -40,8 +40,8 @@ class VARNEK_API VarnekCBitInputStream {
 
     // Reads the next bit, 0 or 1.
     unsigned int ReadBit(unsigned char &success);
-    // Reads 0 to 8 bits, which must all be in the current byte; otherwise nothing is read. Of the
-    // reads, only this one traces its failures.
+    // Reads 0 to 8 bits, which must all be in the current byte; otherwise nothing is read. It
+    // traces its failures. The other reads trace only the pieces that lie beyond the end.
     unsigned int GetBits(int aNum, unsigned char &success);
     // Read `count` bits: at most 8, 16 and 32. A count out of range reads nothing. When the stream
     // ends inside the field, the missing bits read as 0.
@@ -72,7 +72,9 @@ class VARNEK_API VarnekCBitInputStream {
     int iCurByteIdx = 0;
     unsigned char *pBuffer = nullptr;
     unsigned int uiBufLen = 0;
-    unsigned char ucCurByte = 0;  // the current byte, its consumed bits shifted out at the top
+    // The current byte, its consumed bits shifted out at the top. Its low bits may be those of the
+    // next byte; they are never read.
+    unsigned char ucCurByte = 0;
     int iBitIdxInCurByte = 0;
 };
 
