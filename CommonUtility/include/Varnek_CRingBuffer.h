@@ -80,7 +80,7 @@ class VARNEK_API VarnekCRingBuffer {
     int Read(unsigned char *dest, int readLen);
 
   private:
-    friend struct VarnekRingState;  // private to the library
+    friend struct VarnekRingSteps;  // private to the library
 
     unsigned char *pRingBuf = nullptr;
     int iRingSize = 0;
