@@ -214,7 +214,7 @@ void RemoveDeadDrafts(DIR *directory) {
     while (const struct dirent64 *entry = readdir64(directory)) {
         constexpr size_t kLength = sizeof kDraftPrefix - 1;
         if (strncmp(entry->d_name, kDraftPrefix, kLength) == 0 &&
-            kill(static_cast<pid_t>(strtol(entry->d_name + kLength, nullptr, 10)), 0) != 0 &&
+            kill(static_cast<pid_t>(strtoll(entry->d_name + kLength, nullptr, 10)), 0) != 0 &&
             errno == ESRCH) {
             unlinkat(dirfd(directory), entry->d_name, 0);
         }
