@@ -34,7 +34,7 @@ class VARNEK_API VarnekCBitInputStream {
     /// Copies the position and a private copy; a borrowed array is shared. Without memory for the
     /// copy, the new stream has no source and is at its end.
     VarnekCBitInputStream(const VarnekCBitInputStream &other);
-    VarnekCBitInputStream &operator=(const VarnekCBitInputStream &other);
+    VarnekCBitInputStream &operator=(const VarnekCBitInputStream &other);  ///< copies likewise
 
     /// Frees a private copy.
     ~VarnekCBitInputStream();
@@ -47,8 +47,8 @@ class VARNEK_API VarnekCBitInputStream {
     /// Read `count` bits: at most 8, 16 and 32. A count out of range reads nothing. When the stream
     /// ends inside the field, the missing bits read as 0.
     unsigned char ReadByte(int count, unsigned char &success);
-    unsigned short ReadShort(int count, unsigned char &success);
-    unsigned int ReadInt(int count, unsigned char &success);
+    unsigned short ReadShort(int count, unsigned char &success);  ///< at most 16
+    unsigned int ReadInt(int count, unsigned char &success);      ///< at most 32
 
     /// Copies `count` bytes from a byte boundary. Returns 0; VARNEK_BITS_END at the end of the
     /// stream; VARNEK_BITS_NOT_ALIGNED inside a byte; VARNEK_BITS_TOO_FEW when fewer bytes remain,

@@ -29,10 +29,12 @@
 /// A ring whose size is invalid or whose storage cannot be allocated has size 0. Its writes, reads
 /// and seeks fail until a Reset succeeds. Each failure is traced.
 ///
-/// Thread-safe: in a ring that has its mutex, Reset, Flush, Seek, the three queries, Write and Read
-/// run one at a time. One case is not atomic: an operation that finds the ring in an inconsistent
-/// state releases the mutex briefly before it empties the ring. Construction, destruction and
-/// assignment (on either side) are not guarded. A copy has no mutex and is not thread-safe.
+/// Several threads may write one ring, or read it: no two writes mix, but the room that a query
+/// reported may be gone, so check the result. In a ring that has its mutex, Reset, Flush, Seek, the
+/// three queries, Write and Read run one at a time. One case is not atomic: an operation that finds
+/// the ring in an inconsistent state releases the mutex briefly before it empties the ring.
+/// Construction, destruction and assignment (on either side) are not guarded. A copy has no mutex
+/// and is not thread-safe.
 class VARNEK_API VarnekCRingBuffer {
   public:
     /// Creates an empty ring of `size` bytes. When all 40 mutexes are in use, the ring works
@@ -41,7 +43,7 @@ class VARNEK_API VarnekCRingBuffer {
     /// Copy the state and the bytes, not the mutex. The target of an assignment keeps its own
     /// mutex.
     VarnekCRingBuffer(const VarnekCRingBuffer &other);
-    VarnekCRingBuffer &operator=(const VarnekCRingBuffer &other);
+    VarnekCRingBuffer &operator=(const VarnekCRingBuffer &other);  ///< copies likewise
 
     /// Frees the storage and deletes the mutex. No other thread may be inside the ring.
     ~VarnekCRingBuffer();
@@ -65,7 +67,7 @@ class VARNEK_API VarnekCRingBuffer {
     /// Return the number of bytes that can be read and written now; in an inconsistent state,
     /// VARNEK_RING_OVERFLOW or VARNEK_RING_UNDERFLOW.
     int GetSpaceReading() const;
-    int GetSpaceWriting() const;
+    int GetSpaceWriting() const;  ///< the bytes that fit
     /// Returns the readable bytes in per cent of the size. In an inconsistent state the result may
     /// lie outside 0 to 100.
     int GetDistance() const;
@@ -79,7 +81,7 @@ class VARNEK_API VarnekCRingBuffer {
     /// and W < R returns VARNEK_RING_NO_DATA but leaves the ring unchanged. With W <= R and WL > RL
     /// + 1, writes and reads treat the writer as one lap ahead.
     int Write(const unsigned char *data, int writelen);
-    int Read(unsigned char *dest, int readLen);
+    int Read(unsigned char *dest, int readLen);  ///< copies out
 
   private:
     friend struct VarnekRingState;  // private to the library

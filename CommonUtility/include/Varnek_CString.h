@@ -15,7 +15,7 @@ class VARNEK_API VarnekCString {
   public:
     /// Copies `text`; null gives a null string.
     VarnekCString(char const *text);
-    VarnekCString(const VarnekCString &other);
+    VarnekCString(const VarnekCString &other);  ///< copies its text
 
     /// Frees the text.
     ~VarnekCString();
@@ -29,22 +29,22 @@ class VARNEK_API VarnekCString {
 
     /// Copy the other text; null makes this a null string.
     VarnekCString &operator=(const VarnekCString &other);
-    VarnekCString &operator=(char const *text);
+    VarnekCString &operator=(char const *text);  ///< copies likewise
 
     /// Append. A string object without bytes and a null text are errors; an empty text turns a null
     /// string into an empty one.
     VarnekCString &operator+=(const VarnekCString &other);
-    VarnekCString &operator+=(char const *text);
-    VarnekCString operator+(const VarnekCString &other) const;
-    VarnekCString operator+(char const *text) const;
+    VarnekCString &operator+=(char const *text);                ///< appends
+    VarnekCString operator+(const VarnekCString &other) const;  ///< a new string
+    VarnekCString operator+(char const *text) const;            ///< a new string
 
     /// Compare as strcmp does, and return 1 or 0. Two null strings are equal; every other
     /// comparison with a null string returns 0. Null strings are traced.
     int operator==(const VarnekCString &other) const;
-    int operator>(const VarnekCString &other) const;
-    int operator>=(const VarnekCString &other) const;
-    int operator<(const VarnekCString &other) const;
-    int operator<=(const VarnekCString &other) const;
+    int operator>(const VarnekCString &other) const;   ///< compares
+    int operator>=(const VarnekCString &other) const;  ///< compares
+    int operator<(const VarnekCString &other) const;   ///< compares
+    int operator<=(const VarnekCString &other) const;  ///< compares
 
   private:
     char *pszString = nullptr;

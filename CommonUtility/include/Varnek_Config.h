@@ -50,8 +50,8 @@ VARNEK_API void VarnekCfg_SetStandard(int32_t std);
 
 /// Read a field. These three load the file first while `standardType` is 0.
 VARNEK_API int32_t VarnekCfg_GetStandard(void);
-VARNEK_API uint8_t VarnekCfg_GetTSCaptueEnable(void);
-VARNEK_API uint8_t VarnekCfg_GetTSFileSimulEnable(void);
+VARNEK_API uint8_t VarnekCfg_GetTSCaptueEnable(void);     ///< as VarnekCfg_GetStandard
+VARNEK_API uint8_t VarnekCfg_GetTSFileSimulEnable(void);  ///< as VarnekCfg_GetStandard
 
 /// Returns the record's nation. When the record has none, it first sets the nation from the feature
 /// store.

@@ -19,7 +19,7 @@ extern "C" {
 /// readable as long as the process lives, and a module that traces must never be unloaded: link it
 /// with -Wl,-z,nodelete, as this library is.
 extern VARNEK_API const char *gszVarnekDbgFilePath;
-extern VARNEK_API int32_t gVarnekDbgLineNum;
+extern VARNEK_API int32_t gVarnekDbgLineNum;  ///< the line in that file
 
 /// Stores file and line.
 static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {

@@ -13,13 +13,15 @@
 
 #include "Varnek_Common.h"
 
-/// Failures with a special result. Every other failure returns -1 or the value that the operation's
-/// comment gives.
-#define VARNEK_FILE_DEVICE_FAILURE (-5)
-#define VARNEK_FILE_INVALID_BASE (-8)  ///< of a seek
-#define VARNEK_FILE_NOT_OPENED (-18)
-#define VARNEK_FILE_TOO_LARGE (-27)  ///< for the file size limit
-#define VARNEK_FILE_MEDIUM_FULL (-28)
+/// @name Failures with a special result
+/// Every other failure returns -1 or the value that the operation's comment gives.
+/// @{
+#define VARNEK_FILE_DEVICE_FAILURE (-5)  ///< the device failed
+#define VARNEK_FILE_INVALID_BASE (-8)    ///< invalid base of a seek
+#define VARNEK_FILE_NOT_OPENED (-18)     ///< the file cannot be opened
+#define VARNEK_FILE_TOO_LARGE (-27)      ///< over the file size limit
+#define VARNEK_FILE_MEDIUM_FULL (-28)    ///< no room on the medium
+/// @}
 
 #ifdef __cplusplus
 extern "C" {
@@ -193,7 +195,7 @@ VARNEK_API int32_t VarnekPGL_MakeDir(const char *path);
 /// @param path  one final slash or backslash is ignored
 /// @return 0 when the directory and its contents are gone, -1 otherwise
 VARNEK_API int32_t VarnekPGL_DeleteDirEx(const char *path);
-VARNEK_API int32_t VarnekPGL_DeleteDir(const char *path);
+VARNEK_API int32_t VarnekPGL_DeleteDir(const char *path);  ///< as VarnekPGL_DeleteDirEx
 
 /// Deletes a directory tree and creates the directory again. A link to a directory is replaced by a
 /// new directory; the directory that it pointed to stays unchanged. A directory that does not exist
@@ -214,7 +216,7 @@ VARNEK_API BOOL VarnekPGL_CloseDir(void *hDir);
 /// whose record is longer than 256 bytes, that is, at a name of more than 236 bytes.
 /// @return TRUE with an entry; FALSE, and type 0, at the end or on failure
 VARNEK_API BOOL __VarnekPGL_ReadDir(void *hDir, PglDirEntry *entry);
-VARNEK_API BOOL VarnekPGL_ReadDir(void *hDir, PglDirEntryInfo *info);
+VARNEK_API BOOL VarnekPGL_ReadDir(void *hDir, PglDirEntryInfo *info);  ///< as `__VarnekPGL_ReadDir`
 
 /// Checks whether a directory can be opened.
 /// @return TRUE when it can
@@ -237,7 +239,8 @@ VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttribu
 /// @return 0, or -1
 VARNEK_API int32_t VarnekPGL_CopyFile(const char *source, const char *destination);
 
-/// Moves or renames a file. An existing destination file is replaced. If the destination is a
+/// Moves or renames a file. Within one file system the move is atomic. It runs a shell, which
+/// `rename` does not need. An existing destination file is replaced. If the destination is a
 /// directory, the file is moved into it under its own name.
 /// @return 0, or -1
 VARNEK_API int32_t VarnekPGL_MoveFile(const char *source, const char *destination);

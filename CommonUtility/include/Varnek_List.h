@@ -36,7 +36,7 @@ VARNEK_API void list_initialize(list_t *list);
 VARNEK_API void list_insertHead(list_t *list, void *data);
 /// Insert data at the tail; both names do the same.
 VARNEK_API void list_insertTail(list_t *list, void *data);
-VARNEK_API void list_insert(list_t *list, void *data);
+VARNEK_API void list_insert(list_t *list, void *data);  ///< as list_insertTail
 /// Inserts data at a position. A position at or beyond the count appends; a negative one changes
 /// nothing.
 VARNEK_API void list_insertAt(list_t *list, int32_t position, void *data);
@@ -46,20 +46,20 @@ VARNEK_API void *list_element(list_t *list, int32_t position);
 
 /// Remove a node and return its data, which the caller owns.
 VARNEK_API void *list_removeHead(list_t *list);
-VARNEK_API void *list_removeTail(list_t *list);
-VARNEK_API void *list_remove(list_t *list, int32_t position);
+VARNEK_API void *list_removeTail(list_t *list);                ///< as list_removeHead
+VARNEK_API void *list_remove(list_t *list, int32_t position);  ///< as list_removeHead
 
 /// Remove nodes and free their data, which must come from malloc: all nodes, or one that is in this
 /// list.
 VARNEK_API void list_removeAll(list_t *list);
-VARNEK_API void list_remove_node(list_t *list, list_node_t *node);
+VARNEK_API void list_remove_node(list_t *list, list_node_t *node);  ///< removes and frees one
 
 /// Iterate over the list: start with list_head, read each node with list_data, and go on with
 /// list_next until it returns null.
 VARNEK_API list_node_t *list_head(list_t *list);
-VARNEK_API list_node_t *list_tail(list_t *list);
-VARNEK_API list_node_t *list_next(list_node_t *node);
-VARNEK_API void *list_data(list_node_t *node);
+VARNEK_API list_node_t *list_tail(list_t *list);       ///< the last node
+VARNEK_API list_node_t *list_next(list_node_t *node);  ///< the next node
+VARNEK_API void *list_data(list_node_t *node);         ///< a node's data
 
 #ifdef __cplusplus
 }

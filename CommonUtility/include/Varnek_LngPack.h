@@ -71,7 +71,9 @@ VARNEK_API int __WmLngUTF2Unicode(unsigned short *des, const char *src, int leng
 
 /// Decode a character of one, two or three bytes. The bytes must be well-formed.
 VARNEK_API unsigned short __WmLngConvert1ByteChar(unsigned char first);
+/// As `__WmLngConvert1ByteChar`
 VARNEK_API unsigned short __WmLngConvert2ByteChar(unsigned char first, unsigned char second);
+/// As `__WmLngConvert1ByteChar`
 VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned char second,
                                                   unsigned char third);
 

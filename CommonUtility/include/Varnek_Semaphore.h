@@ -17,8 +17,9 @@ extern "C" {
 #endif
 
 /// @name Mutexes
-/// Mutexes are not recursive. Delete a mutex only when no thread can still acquire or release it.
-/// The names "VarnekThreadMutex" and "VarnekRingBuf" with a number are reserved for the library.
+/// Mutexes are not recursive. Whoever acquires one sees all that its last holder did. Delete a
+/// mutex only when no thread can still acquire or release it. The names "VarnekThreadMutex" and
+/// "VarnekRingBuf" with a number are reserved for the library.
 /// @{
 
 /// Creates a mutex. A live mutex of this name is deleted first. If a thread holds that mutex, it
@@ -44,7 +45,8 @@ VARNEK_API int32_t VarnekPGL_GetMutexByName(const char *szMutexName);
 
 /// @}
 /// @name Semaphores
-/// Delete a semaphore only when no thread waits on it or can still use it.
+/// Whoever takes a unit sees all that its signaller did before. Delete a semaphore only when no
+/// thread waits on it or can still use it.
 /// @{
 
 /// Creates a semaphore. A live semaphore of this name is deleted first, even when `count` is

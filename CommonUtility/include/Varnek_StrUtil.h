@@ -56,11 +56,11 @@ VARNEK_API char *VarnekPGL_Strmcpy(char *destination, const char *source, int32_
 /// Convert to upper and to lower case in place.
 /// @return `text`
 VARNEK_API char *VarnekPGL_Strupr(char *text);
-VARNEK_API char *VarnekPGL_Strlwr(char *text);
+VARNEK_API char *VarnekPGL_Strlwr(char *text);  ///< to lower case
 
 /// Remove whitespace in place: from both ends, and from the right end.
 VARNEK_API void VarnekPGL_Strtrim(char *text);
-VARNEK_API void VarnekPGL_Strrtrim(char *text);
+VARNEK_API void VarnekPGL_Strrtrim(char *text);  ///< from the right end only
 
 #ifdef __cplusplus
 }

@@ -1,5 +1,6 @@
 /// @file
-/// Named threads, each with a message queue: see docs/guide/threads-and-messages.md.
+/// Named threads, each with a message queue: see [threads and
+/// messages](docs/guide/threads-and-messages.md).
 ///
 /// The registry keeps a record of each thread so that others can find it and send it messages. It
 /// has room for 20 records. The threads are detached; the registry never stops, joins or cancels

@@ -8,6 +8,8 @@
 
 #include "Varnek_Common.h"
 
+typedef struct VarnekCDateTime VarnekCDateTime;  ///< in C too
+
 /// A date with a time of day, or a span of time.
 ///
 ///     iYear            the record is
@@ -20,7 +22,6 @@
 ///
 /// The results of the arithmetic are points: 90 seconds become 1970-01-01 00:01:30, which counts as
 /// 90 seconds again. Comparisons use the fields only, from the year down.
-typedef struct VarnekCDateTime VarnekCDateTime;
 #ifdef __cplusplus
 struct VARNEK_API VarnekCDateTime
 #else
@@ -43,15 +44,15 @@ struct VarnekCDateTime
     /// Add or subtract the seconds of the other record, modulo 2^32. A subtraction whose result
     /// would be negative is traced and changes nothing.
     VarnekCDateTime &operator+=(const VarnekCDateTime &other);
-    VarnekCDateTime &operator-=(const VarnekCDateTime &other);
-    VarnekCDateTime operator+(const VarnekCDateTime &other) const;
+    VarnekCDateTime &operator-=(const VarnekCDateTime &other);      ///< subtracts
+    VarnekCDateTime operator+(const VarnekCDateTime &other) const;  ///< adds
 
     /// Compare the fields, and return TRUE or FALSE.
     BOOL operator==(const VarnekCDateTime &other) const;
-    BOOL operator>(const VarnekCDateTime &other) const;
-    BOOL operator>=(const VarnekCDateTime &other) const;
-    BOOL operator<(const VarnekCDateTime &other) const;
-    BOOL operator<=(const VarnekCDateTime &other) const;
+    BOOL operator>(const VarnekCDateTime &other) const;   ///< compares
+    BOOL operator>=(const VarnekCDateTime &other) const;  ///< compares
+    BOOL operator<(const VarnekCDateTime &other) const;   ///< compares
+    BOOL operator<=(const VarnekCDateTime &other) const;  ///< compares
 #endif
 };
 
