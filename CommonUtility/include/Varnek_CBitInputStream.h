@@ -1,5 +1,6 @@
 /// @file
 /// Reads unsigned fields of 0 to 32 bits out of a byte array, most significant bit first.
+/// @see [Guide: bits and ring](docs/guide/bits-and-ring.md)
 #ifndef VARNEK_CBITINPUTSTREAM_H
 #define VARNEK_CBITINPUTSTREAM_H
 

@@ -1,6 +1,7 @@
 /// @file
 /// A ring of bytes between one writer and one reader. A ring is guarded by a named mutex, if it has
 /// one.
+/// @see [Guide: bits and ring](docs/guide/bits-and-ring.md)
 #ifndef VARNEK_CRINGBUFFER_H
 #define VARNEK_CRINGBUFFER_H
 

@@ -1,5 +1,6 @@
 /// @file
 /// A string of bytes that owns its text.
+/// @see [Guide: strings](docs/guide/strings.md)
 #ifndef VARNEK_CSTRING_H
 #define VARNEK_CSTRING_H
 

@@ -6,6 +6,7 @@
 /// file does not set becomes 0 or empty, and a missing nation comes from the platform's feature
 /// store. Three getters load the file first while `standardType` is 0. Not thread-safe: a thread
 /// that loads, sets or saves must exclude all other users of the record.
+/// @see [Guide: configuration](docs/guide/configuration.md)
 #ifndef VARNEK_CONFIG_H
 #define VARNEK_CONFIG_H
 
@@ -37,12 +38,12 @@ VARNEK_API VarnekConfigInfo *VarnekCfg_GetConfigInfo(void);
 VARNEK_API void VarnekCfg_LoadConfigFile(void);
 
 /// Saves the record; the data directory must exist. A failure is traced. The new text is written to
-/// "Varnek_Config.new", flushed to the medium and renamed over the file, with the group and the
-/// mode of the old file. So a reader finds either the old text or the new one, even if the process
-/// is killed during the save. The file is emptied and written in place instead when there is no
-/// room or permission for a second file, when the save of another process takes longer than a
-/// second, or when the existing file is a symbolic link, has a second name (hard link), belongs to
-/// another user or is not a regular file.
+/// a draft beside the file ("Varnek_Config.new." and a number), flushed to the medium and renamed
+/// over it. So a reader finds either the old text or the new one, even if the process is killed
+/// meanwhile. The mode and the group of the old file are kept; access control lists and other
+/// attributes are lost. The text is written over the old one in place when there is no room or
+/// permission for a draft, or when the file is a symbolic link, has a second name (hard link),
+/// belongs to another user or is not a regular file.
 VARNEK_API void VarnekCfg_SaveConfigFile(void);
 
 /// Sets the standard type, and saves the record when the type changes.

@@ -4,6 +4,7 @@
 /// A trace line reaches the Android log only when the debug configuration ("debug_ltn.ini" in the
 /// data directory) enables the output, the line's level and its module. The first trace loads that
 /// file. Failures of file access, the summary of a load and assertion reports are always written.
+/// @see [Guide: trace](docs/guide/trace.md)
 #ifndef VARNEK_DEBUG_H
 #define VARNEK_DEBUG_H
 

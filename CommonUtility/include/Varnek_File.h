@@ -8,6 +8,7 @@
 /// invalid seek bases are logged; the size queries log nothing. Thread-safe, except that one thread
 /// at a time may use a handle. A null path fails like a path that does not exist; with a null
 /// buffer no bytes are moved.
+/// @see [Guide: files](docs/guide/files.md)
 #ifndef VARNEK_FILE_H
 #define VARNEK_FILE_H
 

@@ -6,6 +6,7 @@
 /// at the head. Null data is never stored, so a null result of a removal means that nothing was
 /// removed. When a node cannot be allocated, an insertion leaves the list unchanged. Nothing is
 /// traced.
+/// @see [Guide: lists](docs/guide/lists.md)
 #ifndef VARNEK_LIST_H
 #define VARNEK_LIST_H
 

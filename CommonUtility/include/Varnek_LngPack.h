@@ -6,6 +6,7 @@
 /// surrogates are not paired. The caller provides the output buffers. Thread-safe; the operations
 /// keep no state. A failure may be traced more than once, by the function that fails and by its
 /// callers.
+/// @see [Guide: text](docs/guide/text.md)
 #ifndef VARNEK_LNGPACK_H
 #define VARNEK_LNGPACK_H
 

@@ -7,6 +7,7 @@
 /// the tables. A failure is traced at Error. A time-out, and a lookup that does not find its name,
 /// are not failures and are not traced. Mutexes and semaphores have 2147483647 handles each; when
 /// these are used up, every creation fails.
+/// @see [Guide: mutexes and semaphores](docs/guide/mutexes-and-semaphores.md)
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H
 

@@ -5,6 +5,7 @@
 /// Only the ASCII letters have upper and lower case. Whitespace is tab, line feed, vertical tab,
 /// form feed, carriage return and space. The caller provides all buffers. Thread-safe. A null text
 /// counts as an empty one; nothing is written to a null buffer.
+/// @see [Guide: strings](docs/guide/strings.md)
 #ifndef VARNEK_STRUTIL_H
 #define VARNEK_STRUTIL_H
 

@@ -8,6 +8,7 @@
 /// compare exactly and are unique, unless two threads create threads of one name at the same time.
 /// All calls are thread-safe. Failures are traced at Error, but a lookup that finds nothing is not
 /// one. The named mutex "VarnekThreadMutex" is reserved for the registry.
+/// @see [Guide: threads and messages](docs/guide/threads-and-messages.md)
 #ifndef VARNEK_THREAD_H
 #define VARNEK_THREAD_H
 

@@ -3,6 +3,7 @@
 ///
 /// Seconds count from 1970-01-01 00:00:00. Calendar records have no time zone: the conversions
 /// treat them as UTC. Thread-safe; the operations keep no state.
+/// @see [Guide: time](docs/guide/time.md)
 #ifndef VARNEK_TIME_H
 #define VARNEK_TIME_H
 

@@ -5,6 +5,7 @@
 /// deletion. Names have 0 to 40 characters, compare exactly and are unique. A timer is created,
 /// then started and cancelled any number of times, then deleted. Thread-safe, also for calls from a
 /// callback. A failure is traced at Error; a lookup that does not find its name is not a failure.
+/// @see [Guide: timers](docs/guide/timers.md)
 #ifndef VARNEK_TIMER_H
 #define VARNEK_TIMER_H
 

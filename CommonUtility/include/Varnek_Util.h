@@ -4,6 +4,7 @@
 /// The algorithm is the one of ISO/IEC 13818-1 sections (CRC-32/MPEG-2): polynomial 0x04C11DB7,
 /// most significant bit first, initial register 0xFFFFFFFF, no final exclusive-or. Thread-safe; the
 /// operations keep no state.
+/// @see [Guide: CRC](docs/guide/crc.md)
 #ifndef VARNEK_UTIL_H
 #define VARNEK_UTIL_H
 
