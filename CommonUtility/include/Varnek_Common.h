@@ -31,7 +31,6 @@ typedef int32_t BOOL;  ///< a truth value of 32 bits
 /// A mask is one level or-ed with one module, which has its own tag in the log. A trace with none
 /// of these module bits is not written.
 /// @{
-
 #define VARNEK_LEVEL_ERROR 0x80000000u  ///< a failure, or misuse by a caller
 #define VARNEK_LEVEL_HIGH 0x40000000u   ///< an important event
 #define VARNEK_LEVEL_MID 0x20000000u    ///< the end of an operation, a reset
@@ -49,7 +48,6 @@ typedef int32_t BOOL;  ///< a truth value of 32 bits
 #define VARNEK_MODULE_CPRM 0x200u             ///< CPRM player
 #define VARNEK_MODULE_GINGA 0x400u            ///< Ginga application manager
 #define VARNEK_MODULE_SM_PLAYER 0x800u        ///< SM player
-
 /// @}
 
 /// An open stream as a pointer-sized integer. An open that fails returns -1.

@@ -33,7 +33,6 @@ extern "C" {
 /// more. A handle of 0 or -1 is not a stream. Its use is logged and has the result that is given
 /// for "no stream".
 /// @{
-
 /// Opens a stream.
 /// @param path   at most 255 characters
 /// @param flags  PGL_FILE_MODE_ bits. Only the first of APPEND, CREATE_RW, WRITE and READ that is
@@ -69,7 +68,7 @@ VARNEK_API uint32_t VarnekPGL_ReadFileByHandle(PglFileHandle hFile, void *buffer
 VARNEK_API uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer,
                                                 uint32_t length);
 
-/// Returns the size of an open stream; the position does not move.
+/// Returns the size of an open stream. The position does not move, but the end-of-file state ends.
 /// @return the size in bytes, -1 when it cannot be determined
 VARNEK_API int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile);
 
@@ -98,13 +97,11 @@ VARNEK_API BOOL VarnekPGL_CheckFile(const char *path);
 /// Removes a file, a link or an empty directory.
 /// @return 0, or -1
 VARNEK_API int32_t VarnekPGL_DeleteFile(const char *path);
-
 /// @}
 /// @name Large files
 /// The handle is the system's file descriptor; offsets and sizes are signed 64-bit. Each read or
 /// write is one unbuffered system call. A negative descriptor is logged, and the call fails.
 /// @{
-
 /// Opens a descriptor. No flag truncates the file.
 /// @param path   of any length that the system accepts
 /// @param flags  READ; WRITE (write-only); APPEND (with WRITE or CREATE_RW); READ | WRITE
@@ -152,11 +149,9 @@ VARNEK_API int64_t VarnekPGL_GetFileSize64Bits(const char *path);
 /// Returns the size of an open file; the position does not move. Logs nothing.
 /// @return the size in bytes, -1 when it cannot be determined
 VARNEK_API int64_t VarnekPGL_GetFileSizeByHandle64Bits(int32_t hFile);
-
 /// @}
 /// @name Directories
 /// @{
-
 #define PGL_ENTRY_FILE 1  ///< anything that is not a directory, or whose kind is not known
 #define PGL_ENTRY_DIR 2   ///< a directory
 
@@ -226,7 +221,6 @@ VARNEK_API BOOL VarnekPGL_CheckDir(const char *path);
 /// Gets a file's size.
 /// @return TRUE with the record filled; FALSE when there is no such file or no record
 VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttributes *attr);
-
 /// @}
 /// @name Commands
 /// These run a shell command; the shell finds cat, mv and chmod through PATH. Any path is safe: a
@@ -234,7 +228,6 @@ VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttribu
 /// is not run. When the process ignores SIGCHLD, or another thread waits for any child, the status
 /// of the command is lost: the command runs, but the result is -1.
 /// @{
-
 /// Replaces a file's content with that of another file. If the source cannot be read, or is the
 /// destination itself, the call fails, and the destination keeps its content.
 /// @return 0, or -1
@@ -252,7 +245,6 @@ VARNEK_API int32_t VarnekPGL_MoveFile(const char *source, const char *destinatio
 /// @return 0; when the command fails, its status as system() returns it; -1 for another mode or a
 ///         command that is too long
 VARNEK_API int32_t VarnekPGL_Chmod(const char *path, int32_t mode);
-
 /// @}
 
 #ifdef __cplusplus

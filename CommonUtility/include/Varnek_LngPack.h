@@ -84,7 +84,7 @@ VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned 
 ///                     text is empty
 /// @param szInput      the Latin-15 text
 /// @param szInputSize  length of the input in bytes; a text of up to three times this length plus
-///                     one byte is accepted and converted to its end
+///                     one byte is accepted and converted up to its NUL, so a slice needs a copy
 /// @return TRUE; FALSE for a null pointer, a text that is longer still or too little memory
 VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
                                                unsigned int szInputSize);

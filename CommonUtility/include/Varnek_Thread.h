@@ -20,7 +20,6 @@ extern "C" {
 
 /// @name Threads
 /// @{
-
 /// Starts a thread; its record is visible before `function` runs. A record that already has this
 /// name is removed first, as VarnekPGL_DeleteThread does, even if the other arguments are invalid.
 /// @param szThreadName  1 to 31 characters; the system shows the first 15
@@ -51,14 +50,12 @@ VARNEK_API int32_t VarnekPGL_GetThreadByName(const char *szThreadName);
 ///         callback), its record has been removed, or it has reached a late round of destructors
 ///         of thread-specific data
 VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
-
 /// @}
 /// @name Messages
 /// Messages are copied in and out. Only memory limits the length of a queue. What one thread sends
 /// with VarnekPGL_SendMessage arrives in that order, and whoever takes a message sees all that its
 /// sender did before sending it.
 /// @{
-
 /// A message of 40 bytes, whose content the modules agree on. The alignment lets them overlay it
 /// with a struct of their own; the library copies it as bytes, from and to any address.
 typedef struct THREAD_MSG {
@@ -94,7 +91,6 @@ VARNEK_API BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, 
 /// no
 ///         message, the thread has no record or a pointer is null
 VARNEK_API BOOL VarnekPGL_PeekMessage(THREAD_MSG *message, int32_t *count);
-
 /// @}
 
 #ifdef __cplusplus
