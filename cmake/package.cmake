@@ -29,7 +29,8 @@ install(DIRECTORY docs examples DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT de
 install(FILES CONTRIBUTING.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
 install(DIRECTORY CommonUtility/include DESTINATION ${CMAKE_INSTALL_DOCDIR}/CommonUtility COMPONENT dev)
 install(DIRECTORY defaults DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
-install(FILES platform/README.md DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform COMPONENT dev)
+install(FILES platform/README.md platform/varnek_platform.h DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform COMPONENT dev)
+install(FILES platform/host/features.txt DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform/host COMPONENT dev)
 
 # Debian packages; script/package builds them with the preset package.
 if(VARNEK_DEBIAN)

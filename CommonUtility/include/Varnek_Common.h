@@ -31,6 +31,7 @@ typedef int32_t BOOL;  ///< a truth value of 32 bits
 /// A mask is one level or-ed with one module, which has its own tag in the log. A trace with none
 /// of these module bits is not written.
 /// @{
+
 #define VARNEK_LEVEL_ERROR 0x80000000u  ///< a failure, or misuse by a caller
 #define VARNEK_LEVEL_HIGH 0x40000000u   ///< an important event
 #define VARNEK_LEVEL_MID 0x20000000u    ///< the end of an operation, a reset
@@ -55,6 +56,7 @@ typedef intptr_t PglFileHandle;
 
 /// @name Open flags, for both streams and large files
 /// @{
+
 #define PGL_FILE_MODE_CREATE_RW 1  ///< reads and writes, and creates the file
 #define PGL_FILE_MODE_READ 2       ///< reads
 #define PGL_FILE_MODE_WRITE 4      ///< writes

@@ -17,6 +17,7 @@
 /// @name Failures with a special result
 /// Every other failure returns -1 or the value that the operation's comment gives.
 /// @{
+
 #define VARNEK_FILE_DEVICE_FAILURE (-5)  ///< the device failed
 #define VARNEK_FILE_INVALID_BASE (-8)    ///< invalid base of a seek
 #define VARNEK_FILE_NOT_OPENED (-18)     ///< the file cannot be opened
@@ -33,6 +34,7 @@ extern "C" {
 /// more. A handle of 0 or -1 is not a stream. Its use is logged and has the result that is given
 /// for "no stream".
 /// @{
+
 /// Opens a stream.
 /// @param path   at most 255 characters
 /// @param flags  PGL_FILE_MODE_ bits. Only the first of APPEND, CREATE_RW, WRITE and READ that is
@@ -102,6 +104,7 @@ VARNEK_API int32_t VarnekPGL_DeleteFile(const char *path);
 /// The handle is the system's file descriptor; offsets and sizes are signed 64-bit. Each read or
 /// write is one unbuffered system call. A negative descriptor is logged, and the call fails.
 /// @{
+
 /// Opens a descriptor. No flag truncates the file.
 /// @param path   of any length that the system accepts
 /// @param flags  READ; WRITE (write-only); APPEND (with WRITE or CREATE_RW); READ | WRITE
@@ -152,6 +155,7 @@ VARNEK_API int64_t VarnekPGL_GetFileSizeByHandle64Bits(int32_t hFile);
 /// @}
 /// @name Directories
 /// @{
+
 #define PGL_ENTRY_FILE 1  ///< anything that is not a directory, or whose kind is not known
 #define PGL_ENTRY_DIR 2   ///< a directory
 
@@ -228,6 +232,7 @@ VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttribu
 /// is not run. When the process ignores SIGCHLD, or another thread waits for any child, the status
 /// of the command is lost: the command runs, but the result is -1.
 /// @{
+
 /// Replaces a file's content with that of another file. If the source cannot be read, or is the
 /// destination itself, the call fails, and the destination keeps its content.
 /// @return 0, or -1

@@ -22,6 +22,7 @@ extern "C" {
 /// mutex only when no thread can still acquire or release it. The names "VarnekThreadMutex" and
 /// "VarnekRingBuf" with a number are reserved for the library.
 /// @{
+
 /// Creates a mutex. A live mutex of this name is deleted first. If a thread holds that mutex, it
 /// stays, and the creation fails.
 /// @return the handle; -1 for a bad name, a full table or a failing OS call
@@ -47,6 +48,7 @@ VARNEK_API int32_t VarnekPGL_GetMutexByName(const char *szMutexName);
 /// Whoever takes a unit sees all that its signaller did before. Delete a semaphore only when no
 /// thread waits on it or can still use it.
 /// @{
+
 /// Creates a semaphore. A live semaphore of this name is deleted first, even when `count` is
 /// invalid.
 /// @param szSemName  1 to 31 characters

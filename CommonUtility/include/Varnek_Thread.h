@@ -20,6 +20,7 @@ extern "C" {
 
 /// @name Threads
 /// @{
+
 /// Starts a thread; its record is visible before `function` runs. A record that already has this
 /// name is removed first, as VarnekPGL_DeleteThread does, even if the other arguments are invalid.
 /// @param szThreadName  1 to 31 characters; the system shows the first 15
@@ -56,6 +57,7 @@ VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 /// with VarnekPGL_SendMessage arrives in that order, and whoever takes a message sees all that its
 /// sender did before sending it.
 /// @{
+
 /// A message of 40 bytes, whose content the modules agree on. The alignment lets them overlay it
 /// with a struct of their own; the library copies it as bytes, from and to any address.
 typedef struct THREAD_MSG {
