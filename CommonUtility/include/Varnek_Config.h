@@ -43,7 +43,8 @@ VARNEK_API void VarnekCfg_LoadConfigFile(void);
 /// meanwhile. The mode and the group of the old file are kept; access control lists and other
 /// attributes are lost. The text is written over the old one in place when there is no room or
 /// permission for a draft, or when the file is a symbolic link, has a second name (hard link),
-/// belongs to another user or is not a regular file.
+/// belongs to another user or is not a regular file. A file that its owner protected stays as it
+/// is.
 VARNEK_API void VarnekCfg_SaveConfigFile(void);
 
 /// Sets the standard type, and saves the record when the type changes.
