@@ -27,15 +27,11 @@
 #define CTRL_HIGH(...) VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
 #define CTRL_MID(...) VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
 
-static_assert(sizeof(VarnekConfigInfo) == 212, "callers and library agree on this record");
-static_assert(offsetof(VarnekConfigInfo, standardType) == 100,
-              "callers and library agree on this record");
-static_assert(offsetof(VarnekConfigInfo, tsFileSimulEnable) == 105,
-              "callers and library agree on this record");
-static_assert(offsetof(VarnekConfigInfo, cprmPlayerDelay) == 108,
-              "callers and library agree on this record");
-static_assert(offsetof(VarnekConfigInfo, supportNation) == 112,
-              "callers and library agree on this record");
+// Callers and library agree on this record.
+static_assert(sizeof(VarnekConfigInfo) == 212 && offsetof(VarnekConfigInfo, standardType) == 100 &&
+              offsetof(VarnekConfigInfo, tsFileSimulEnable) == 105 &&
+              offsetof(VarnekConfigInfo, cprmPlayerDelay) == 108 &&
+              offsetof(VarnekConfigInfo, supportNation) == 112);
 
 namespace {
 
