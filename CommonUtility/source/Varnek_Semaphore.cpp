@@ -119,33 +119,40 @@ BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
     return TRUE;
 }
 
+namespace {
+
+// Failures of acquiring and releasing. Out of line, so that a success, which every ring operation
+// waits for, pays nothing for them.
+__attribute__((noinline, cold)) BOOL NoSuchMutex(const char *operation, int32_t hMutex) {
+    return VARNEK_FAIL(FALSE, "***** %s : Can't find mutex info. mutex handle = [%d]", operation,
+                       hMutex);
+}
+
+__attribute__((noinline, cold)) BOOL MutexFails(const char *operation, const char *step,
+                                                int error) {
+    SetErrno(error);
+    return VARNEK_FAIL(FALSE, "***** %s : Mutex %s FAIL! errCode = [%d]", operation, step,
+                       VarnekPGL_SysGetLastErro());
+}
+
+}  // namespace
+
 BOOL VarnekPGL_AcquireMutex(int32_t hMutex) {
     auto *const slot = gMutexArr.Find(hMutex);
     if (slot == nullptr) {
-        return VARNEK_FAIL(
-            FALSE, "***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [%d]",
-            hMutex);
+        return NoSuchMutex(__func__, hMutex);
     }
-    if (SetErrno(pthread_mutex_lock(&slot->info.linuxMutex)) != 0) {
-        return VARNEK_FAIL(FALSE, "***** VarnekPGL_AcquireMutex : Mutex Lock FAIL! errCode = [%d]",
-                           VarnekPGL_SysGetLastErro());
-    }
-    return TRUE;
+    const int error = pthread_mutex_lock(&slot->info.linuxMutex);
+    return error == 0 ? TRUE : MutexFails(__func__, "Lock", error);
 }
 
 BOOL VarnekPGL_ReleaseMutex(int32_t hMutex) {
     auto *const slot = gMutexArr.Find(hMutex);
     if (slot == nullptr) {
-        return VARNEK_FAIL(
-            FALSE, "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [%d]",
-            hMutex);
+        return NoSuchMutex(__func__, hMutex);
     }
-    if (SetErrno(pthread_mutex_unlock(&slot->info.linuxMutex)) != 0) {
-        return VARNEK_FAIL(FALSE,
-                           "***** VarnekPGL_ReleaseMutex : Mutex Unlock FAIL! errCode = [%d]",
-                           VarnekPGL_SysGetLastErro());
-    }
-    return TRUE;
+    const int error = pthread_mutex_unlock(&slot->info.linuxMutex);
+    return error == 0 ? TRUE : MutexFails(__func__, "Unlock", error);
 }
 
 int32_t VarnekPGL_GetMutexByName(const char *szMutexName) {

@@ -50,11 +50,15 @@ class SlotTable {
         if (length == kNameSize) {
             return kInvalidHandle;
         }
+        // The last word is compared here, because there names that belong together usually differ.
         const PackedName wanted(name, length);
+        const size_t last = wanted.used - 1;
         for (size_t slot = 0; slot < kSlots; slot++) {
-            const int32_t handle = HandleOfName(slot, wanted);
-            if (handle != kFree) {
-                return handle;
+            if (names_[slot][last].load(std::memory_order_relaxed) == wanted.words[last]) {
+                const int32_t handle = HandleOfName(slot, wanted);
+                if (handle != kFree) {
+                    return handle;
+                }
             }
         }
         return kInvalidHandle;
@@ -141,10 +145,9 @@ class SlotTable {
         return nullptr;
     }
 
-    // Whether the words of a slot's name are these. It begins at the end, where names that belong
-    // together usually differ.
+    // Whether the words of a slot's name are these.
     bool HasWords(size_t slot, const PackedName &wanted) const {
-        for (size_t i = wanted.used; i-- > 0;) {
+        for (size_t i = 0; i < wanted.used; i++) {
             if (names_[slot][i].load(std::memory_order_relaxed) != wanted.words[i]) {
                 return false;
             }
@@ -152,10 +155,11 @@ class SlotTable {
         return true;
     }
 
-    // Returns the handle of a slot if this is its name, kFree if not. The first comparison is only
-    // a filter, which saves the barriers below where nothing matches. It cannot miss a name whose
-    // creation happened before the lookup, because it reads the words of that creation or, if the
-    // object is being replaced meanwhile, later ones.
+    // Returns the handle of a slot if this is its name, kFree if not. The comparison before
+    // the first read of the handle, like that of the last word in FindByName, is only a filter,
+    // which saves the barriers below where nothing matches. It cannot miss a name whose creation
+    // happened before the lookup, because it reads the words of that creation or, if the object is
+    // being replaced meanwhile, later ones.
     //
     // The rest is a sequence lock whose sequence number, the handle, cannot repeat. If both reads
     // return the same handle, the words in between belong to it:
@@ -164,7 +168,7 @@ class SlotTable {
     // - They are not newer. A newer word was stored after the release fence in StoreName, and so
     //   after the handle was withdrawn. If this reads such a word, its acquire fence synchronises
     //   with that fence, and the second read does not find the handle any more.
-    int32_t HandleOfName(size_t slot, const PackedName &wanted) const {
+    __attribute__((noinline)) int32_t HandleOfName(size_t slot, const PackedName &wanted) const {
         if (!HasWords(slot, wanted)) {
             return kFree;
         }

@@ -41,7 +41,7 @@ class ErrnoKeeper {
 // Stores the error that a pthread call returns in errno, because the traces read it there. Returns
 // the error, 0 for none.
 inline int SetErrno(int error) {
-    if (error != 0) {
+    if (__builtin_expect(error != 0, 0)) {
         errno = error;
     }
     return error;
