@@ -8,7 +8,7 @@
 
 #include <new>
 
-#include "Varnek_Support.h"
+#include "Varnek_Bytes.h"
 #include "Varnek_Trace.h"
 
 // Values of bEndOfStream. A rewind inside a byte loads the whole target byte into ucCurByte but

@@ -8,7 +8,7 @@
 
 #include <atomic>
 
-#include "Varnek_Lock.h"
+#include "Varnek_HoldMutex.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Trace.h"
 

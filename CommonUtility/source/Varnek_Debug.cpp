@@ -2,7 +2,7 @@
 //
 // One atomic word says what is enabled, so for a trace that is off, the library only loads and
 // tests that word. Each call composes its line in a buffer on its stack, and holds no lock while it
-// formats and writes the line. The only lock here lets one thread at a time load the configuration.
+// formats and writes the line.
 #include "Varnek_Debug.h"
 
 #include <errno.h>
@@ -36,11 +36,7 @@ namespace {
 constexpr uint32_t kLevelBits = 0xF0000000u;
 constexpr uint32_t kModuleBits = 0x00000FFFu;
 
-// Serialises loads. gDebugLoader is the thread that holds the lock. A load calls the log function,
-// which may trace. With gDebugLoader such a trace recognises that its own thread is loading, and
-// returns instead of waiting for itself.
-Lock gDebugLoadLock;
-std::atomic<pthread_t> gDebugLoader{};
+OneAtATime gDebugLoad;
 
 constexpr size_t kTraceLineSize = 2048;
 constexpr size_t kTraceTextSize = 2018;  // the caller's text with its terminator
@@ -240,7 +236,7 @@ uint32_t StateOf(uint32_t enabled) {
 
 // Runs one load. During the load nothing is traced, even if an earlier configuration enabled
 // traces.
-void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
+void LoadConfig() {
     if (IsLoaded()) {
         gDebugState.store(0, std::memory_order_relaxed);
     }
@@ -249,19 +245,16 @@ void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     gDebugState.store(StateOf(enabled), std::memory_order_relaxed);
 }
 
-// Loads under the lock. Without `again`, it loads only if no other thread finished a load while
-// this one waited for the lock.
+// Loads the configuration, once if several threads find at once that it is not loaded, and always
+// with `again`. A load calls the log function, which may trace: such a trace, in the thread that
+// loads, does nothing.
 void LoadConfigOnce(bool again) {
     const ErrnoKeeper keeper;
-    if (pthread_equal(gDebugLoader.load(std::memory_order_relaxed), pthread_self())) {
-        return;
-    }
-    const Hold hold(gDebugLoadLock);
-    if (again || !IsLoaded()) {
-        gDebugLoader.store(pthread_self(), std::memory_order_relaxed);
-        LoadConfig();
-        gDebugLoader.store(pthread_t{}, std::memory_order_relaxed);
-    }
+    gDebugLoad.Do([again] {
+        if (again || !IsLoaded()) {
+            LoadConfig();
+        }
+    });
 }
 
 // Writes "[L][File.cpp- 442] ", as far as it fits, without a terminator, and returns its length. It

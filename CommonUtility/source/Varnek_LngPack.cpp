@@ -9,6 +9,7 @@
 #include <stdlib.h>
 #include <string.h>
 
+#include "Varnek_Bytes.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 

@@ -6,6 +6,7 @@
 
 #include <stdlib.h>
 
+#include "Varnek_Bytes.h"
 #include "Varnek_File.h"
 #include "Varnek_Storage.h"
 #include "Varnek_Support.h"
