@@ -12,12 +12,12 @@
 #include "BroadcastText.h"
 #include "CommandLine.h"
 #include "JsonReport.h"
+#include "Names.h"
 #include "Paragraphs.h"
 #include "Pipeline.h"
 #include "StreamFile.h"
 #include "Summary.h"
 #include "Varnek_Config.h"
-#include "Words.h"
 
 namespace receiver {
 namespace {
@@ -58,6 +58,7 @@ Settings LoadSettings(const Options &options) {
     settings.nation = ToUtf8(VarnekCfg_GetSupportNation());
     settings.bml = VarnekCfg_IsSupportBML() != FALSE;
     settings.region = options.region;
+    settings.all = options.all;
     return settings;
 }
 
@@ -116,11 +117,13 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     }
     if (options.help) {
         WriteHelp(out, TerminalWidth(out));
-        return 0;
     }
     if (options.version) {
         std::fputs("receiver " RECEIVER_VERSION "\n", out);
-        return 0;
+    }
+    if (options.help || options.version) {
+        const bool written = std::fflush(out) == 0 && std::ferror(out) == 0;
+        return written ? 0 : Fail(err, "standard output", "could not be written");
     }
     if (surroundings.log_path != nullptr && !options.log) {
         DivertLog(surroundings.log_path);

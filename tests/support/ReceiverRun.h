@@ -13,7 +13,7 @@
 #include "StreamWriter.h"
 #include "Summary.h"
 #include "Tables.h"
-#include "Words.h"
+#include "Names.h"
 
 namespace receiver {
 
