@@ -311,6 +311,8 @@ TEST_F(Receiver, KeepsTheCurrentTables) {
     pmt_overrun[4] = 200;
     const Bytes pat = MakePat(7, {{1, 0x101}}), tot_time = MakeDateTime(0xC079, 18 * 3600 + 1800);
     const Bytes german = MakeShortEvent("deu", "Ja", ""), english = MakeShortEvent("eng", "Yes", "");
+    const Bytes captions = MakeComponent(0x06, 0x130, Descriptor(0x52, U8(0x30)) + Descriptor(0xFD, U16(8))) +
+                           MakeComponent(0x06, 0x138, Descriptor(0xFD, U16(8)) + Descriptor(0x52, U8(0x38)));
     const Bytes ratings = Raw("ARG") + U8(9) + Raw("BRA") + U8(0x75);
     const auto extended = [](const std::string &language, const std::string &text) {
         return Descriptor(0x4E, U8(0) + Raw(language) + U8(0) + Counted(text));
@@ -369,7 +371,7 @@ TEST_F(Receiver, KeepsTheCurrentTables) {
         {"no offsets, and nothing that speaks against Brazil",
          {{0, pat}, {0x10, MakeNit(9, 7, {}, Descriptor(0xFA, U16(0xFFFC)))}, {0x14, MakeTot(tot_time, {})}}},
         {"times after 2030",
-         {{0x14, MakeTot(MakeDateTime(62502, 86399), MakeLocalOffset("BRA", 3, 0))},
+         {{0x14, MakeTot(MakeDateTime(62866, 86399), MakeLocalOffset("BRA", 3, 0))},
           {0x12, MakeEit(0x4E, 1, 1, MakeEvent(1, MakeDateTime(65535, 86399), Bcd(3600), {}))}}},
         {"events that a new section moves, drops or empties",
          {{0x12, MakeEit(0x50, 1, 1, At(1, 18, {}) + At(2, 19, {}), {0, 9})},
@@ -385,15 +387,12 @@ TEST_F(Receiver, KeepsTheCurrentTables) {
           {0x12, MakeEit(0x4E, 1, 1, At(2, 21, {}), {1, 1})}}},
         {"PMTs before the PAT, an AIT, and what components are for",
          {{0x1FC8, MakePmt(2, 0x1FFF, MakeComponent(0x0F, 0x181, Descriptor(0x0A, Raw("por") + U8(3))))},
-          {0x101, MakePmt(1, 0x100,
-                          MakeComponent(0x06, 0x130, Descriptor(0x52, U8(0x30)) + Descriptor(0xFD, U16(8))) +
-                              MakeComponent(0x06, 0x138, Descriptor(0xFD, U16(8)) + Descriptor(0x52, U8(0x38))) +
-                              MakeComponent(0x05, 0x141, Descriptor(0xFD, U16(0xA3))))},
+          {0x101, MakePmt(1, 0x100, captions + MakeComponent(0x05, 0x141, Descriptor(0xFD, U16(0xA3))))},
           {0x102, MakePmt(9, 0x100, {})},
           {0, MakePat(7, {{1, 0x101}, {2, 0x1FC8}})},
           {0x102, MakePmt(9, 0x100, {})},
           {0x141, MakeSection(0x74, 1, U16(0xF000) + U16(0xF000))},
-          {0x101, MakePmt(1, 0x100, {})},
+          {0x101, MakePmt(1, 0x100, captions)},
           {0x141, MakeSection(0x74, 1, U16(0xF000) + U16(0xF000))}}},
         {"one-seg reception, without a PAT",
          {{0x1FC9, MakePmt(5, 0x181, MakeComponent(0x1B, 0x181))},

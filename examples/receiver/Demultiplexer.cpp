@@ -2,6 +2,7 @@
 // the PAT here rather than in the table parser, so that no packet in between is missed.
 #include "Demultiplexer.h"
 
+#include <cstring>
 #include <iterator>
 #include <utility>
 
@@ -180,34 +181,38 @@ void Demultiplexer::OnSection(uint16_t pid, bool claimed, const unsigned char *s
 // A PID that is no longer named may carry anything, so its unfinished section is dropped. New uses
 // are added before old ones are removed, so that a PID that stays named keeps it.
 void Demultiplexer::FollowNames(const unsigned char *section, size_t size) {
-    FieldReader fields(section, size);
-    SectionHeader header{};
-    FieldReader end = fields;
-    end.Skip(static_cast<int>(size - 4) * 8);
-    const uint32_t crc = end.U32();
-    if (!ReadHeader(fields, header)) {
+    constexpr size_t kHeaderAndCrc = 12;
+    if (size < kHeaderAndCrc) {
         return;
     }
     const bool is_pat = section[0] == kTablePat;
-    const uint32_t key = is_pat ? header.number : kPmtKey + header.extension;
+    const uint32_t key = is_pat ? section[6] : kPmtKey + (section[3] << 8u | section[4]);
+    uint32_t crc = 0;
+    std::memcpy(&crc, section + size - sizeof crc, sizeof crc);
     const auto known = namings_.find(key);
-    if (known == namings_.end() || known->second.crc != crc) {
-        Naming naming{crc, {}};
-        if (is_pat) {
-            ParsePat(section, size, header, naming.programs);
-        } else {
-            for (const Component &component : ParsePmt(fields).components) {
-                if (component.IsAit()) {
-                    naming.programs.push_back({header.extension, component.pid});
-                }
+    if (known != namings_.end() && known->second.crc == crc) {
+        return;
+    }
+    FieldReader fields(section, size);
+    SectionHeader header{};
+    if (!ReadHeader(fields, header)) {
+        return;
+    }
+    Naming naming{crc, {}};
+    if (is_pat) {
+        ParsePat(section, size, header, naming.programs);
+    } else {
+        for (const Component &component : ParsePmt(fields).components) {
+            if (component.IsAit()) {
+                naming.programs.push_back({header.extension, component.pid});
             }
         }
-        for (const Program &program : naming.programs) {
-            AddUse(program.pmt_pid);
-        }
-        Forget(key);
-        namings_[key] = std::move(naming);
     }
+    for (const Program &program : naming.programs) {
+        AddUse(program.pmt_pid);
+    }
+    Forget(key);
+    namings_[key] = std::move(naming);
     if (!is_pat) {
         return;
     }
