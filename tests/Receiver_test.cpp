@@ -32,6 +32,8 @@ struct Result {
 };
 
 Result RunProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
+    std::setlocale(LC_CTYPE, "C.UTF-8");
+    setenv("COLUMNS", "80", 1);
     Result result;
     result.out = Written([&](std::FILE *out) {
         result.err = Written([&](std::FILE *err) { result.status = RunReceiver(arguments, {out, err, stop}); });
@@ -448,6 +450,7 @@ TEST_F(Receiver, ReadsTheSample) {
 }
 
 TEST_F(Receiver, BreaksLines) {
+    std::setlocale(LC_CTYPE, "C.UTF-8");
     const std::pair<std::string, std::string> cases[] = {
         {"", "lead\n"},
         {"one\ntwo", "lead  one two\n"},
@@ -458,6 +461,8 @@ TEST_F(Receiver, BreaksLines) {
     for (const auto &c : cases) {
         EXPECT_EQ(Written([&](std::FILE *file) { Paragraphs(file, 1).Add("lead  ", c.first); }), c.second);
     }
+    std::setlocale(LC_CTYPE, "C");
+    EXPECT_EQ(Written([&](std::FILE *file) { Paragraphs(file, 1).Add("", "maçã, 5 €"); }), "ma??, 5 ?\n");
 }
 
 TEST_F(Receiver, AnswersEveryInput) {
@@ -472,6 +477,7 @@ TEST_F(Receiver, AnswersEveryInput) {
     const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, Fill(4, 0)) + Fill(9000, 0x11);
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
     Show("receiver " + std::to_string(VARNEK_VERSION_MAJOR), "receiver MAJOR");
+    Show(VARNEK_SAMPLE, "SAMPLE");
     const std::vector<std::string> cases[] = {
         {},
         {"--nonsense", Path("text")},
@@ -488,6 +494,7 @@ TEST_F(Receiver, AnswersEveryInput) {
         {Path("accident")},
         {Path("cut.ts"), "--json"},
         {"--", Path("-dash")},
+        {"--all", "--region", "5", VARNEK_SAMPLE},
     };
     for (const std::vector<std::string> &arguments : cases) {
         NoteProgram(arguments);
@@ -495,6 +502,8 @@ TEST_F(Receiver, AnswersEveryInput) {
     std::FILE *full = std::fopen("/dev/full", "w");
     ASSERT_NE(full, nullptr);
     EXPECT_EQ(RunReceiver({VARNEK_SAMPLE}, {full, stderr}), 1);
+    EXPECT_EQ(RunReceiver({"--help"}, {full, stderr}), 1);
+    EXPECT_EQ(RunReceiver({"--version"}, {full, stderr}), 1);
     std::fclose(full);
 }
 
@@ -512,18 +521,16 @@ TEST_F(Receiver, ReportsAReadError) {
     NoteProgram({"-"});
 }
 
-// The other end of the pipe writes nothing.
+// No program writes to the pipe, and the user gives up half a second later.
 TEST_F(Receiver, StopsWhileItWaits) {
     ASSERT_EQ(mkfifo(Path("pipe").c_str(), 0600), 0);
-    const int other_end = open(Path("pipe").c_str(), O_RDWR);
     std::atomic<bool> stop{false};
     std::thread user([&] {
-        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        std::this_thread::sleep_for(std::chrono::milliseconds(500));
         stop = true;
     });
     NoteProgram({Path("pipe")}, &stop);
     user.join();
-    close(other_end);
 }
 
 // Fills the registry of a family, and frees a place for each run until a run has all that it needs.
