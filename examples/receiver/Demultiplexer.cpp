@@ -186,7 +186,8 @@ void Demultiplexer::FollowNames(const unsigned char *section, size_t size) {
         return;
     }
     const bool is_pat = section[0] == kTablePat;
-    const uint32_t key = is_pat ? section[6] : kPmtKey + (section[3] << 8u | section[4]);
+    const uint32_t key =
+        is_pat ? section[6] : kPmtKey | uint32_t{section[3]} << 8 | uint32_t{section[4]};
     uint32_t crc = 0;
     std::memcpy(&crc, section + size - sizeof crc, sizeof crc);
     const auto known = namings_.find(key);
