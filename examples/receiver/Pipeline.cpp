@@ -211,6 +211,8 @@ void DeleteObjects(const Pipeline &pipeline) {
 
 std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report &report) {
     Pipeline pipeline{file, options, report};
+    // The size is asked before the reader exists, because only one thread may use the file.
+    ProgressLine line(options.progress, file.Size());
     std::string missing = CreateObjects(pipeline);
     int started = 0;
     while (missing.empty() && started < Pipeline::kThreadCount) {
@@ -227,7 +229,6 @@ std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report
         // The reader, which would send the end down the chain, does not exist.
         Send(pipeline.threads[started - 1], {});
     }
-    ProgressLine line(options.progress, file.Size());
     for (int ended = 0; ended < started;) {
         if (VarnekPGL_WaitSemaphore(pipeline.ended, kTickTime) != FALSE) {
             ++ended;
