@@ -1,8 +1,6 @@
-// The masked trace, the debug configuration that masks it, and the assertion report.
-//
-// One atomic word says what is enabled, so for a trace that is off, the library only loads and
-// tests that word. Each call composes its line in a buffer on its stack, and holds no lock while it
-// formats and writes the line.
+// The masked trace, the debug configuration that masks it, and the assertion report. One atomic
+// word says what is enabled, so a trace that is off only loads and tests that word. Each call
+// composes its line on its stack and holds no lock meanwhile.
 #include "Varnek_Debug.h"
 
 #include <errno.h>
@@ -234,8 +232,7 @@ uint32_t StateOf(uint32_t enabled) {
     return (enabled & kOwnLow) == kOwnLow ? enabled | kOwnLowOn : enabled;
 }
 
-// Runs one load. During the load nothing is traced, even if an earlier configuration enabled
-// traces.
+// Loads; nothing is traced meanwhile, even if an earlier configuration enabled traces.
 void LoadConfig() {
     if (IsLoaded()) {
         gDebugState.store(0, std::memory_order_relaxed);
@@ -245,9 +242,8 @@ void LoadConfig() {
     gDebugState.store(StateOf(enabled), std::memory_order_relaxed);
 }
 
-// Loads the configuration, once if several threads find at once that it is not loaded, and always
-// with `again`. A load calls the log function, which may trace: such a trace, in the thread that
-// loads, does nothing.
+// Loads the configuration, once if several threads find it missing at the same time, and always
+// with `again`. Loading calls the log function; if that traces, in this thread, nothing happens.
 void LoadConfigOnce(bool again) {
     const ErrnoKeeper keeper;
     gDebugLoad.Do([again] {
@@ -290,8 +286,8 @@ size_t PutPrefix(char (&line)[kTraceLineSize], char label, const char *file, int
     return length;
 }
 
-// Composes and writes a line that may be enabled. Loads the configuration first if that has not
-// happened. Not inlined, so that its buffer costs nothing in a trace that is off.
+// Writes a line that may be enabled, after loading the configuration if that has not happened. Not
+// inlined, so that its buffer costs nothing in a trace that is off.
 __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, const char *format,
                                                                 va_list args) {
     if (!IsLoaded()) {

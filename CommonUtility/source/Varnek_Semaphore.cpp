@@ -1,6 +1,5 @@
-// Named mutexes and named semaphores. Both families use the slot table in the same way. But they
-// have different messages, trace at different points, and a deletion refuses different things, so
-// they do not share code here.
+// Named mutexes and named semaphores. They share no code because their messages, trace points and
+// deletion rules differ.
 #include "Varnek_Semaphore.h"
 
 #include <pthread.h>

@@ -10,11 +10,6 @@ inline const char *Shown(const char *text) {
     return text != nullptr ? text : "(null)";
 }
 
-// Whether a character ends a line of the two configuration files.
-inline bool IsLineEnd(char c) {
-    return c == '\r' || c == '\n';
-}
-
 // Returns the same as strnlen. It uses memchr, which C libraries optimise more often than strnlen.
 inline size_t LengthWithin(const char *text, size_t most) {
     const void *end = memchr(text, '\0', most);

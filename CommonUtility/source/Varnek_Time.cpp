@@ -8,6 +8,8 @@
 #include <sys/time.h>
 #include <time.h>
 
+#include <tuple>
+
 #include "Varnek_Trace.h"
 
 // Callers and library agree on these records.
@@ -32,18 +34,9 @@ constexpr int64_t kLastDay = kEndOfRange - kDay;
 constexpr int32_t kCommonMonths[] = {-1, 30, 58, 89, 119, 150, 180, 211, 242, 272, 303, 333, 364};
 constexpr int32_t kLeapMonths[] = {-1, 30, 59, 90, 120, 151, 181, 212, 243, 273, 304, 334, 365};
 
-// Compares the fields from the year down. Returns a negative number, 0 or a positive number.
-int Compare(const VarnekCDateTime &a, const VarnekCDateTime &b) {
-    constexpr int32_t VarnekCDateTime::*kFields[] = {
-        &VarnekCDateTime::iYear, &VarnekCDateTime::iMonth,  &VarnekCDateTime::iDay,
-        &VarnekCDateTime::iHour, &VarnekCDateTime::iMinute, &VarnekCDateTime::iSecond,
-    };
-    for (const auto field : kFields) {
-        if (a.*field != b.*field) {
-            return a.*field < b.*field ? -1 : 1;
-        }
-    }
-    return 0;
+// The fields in the order in which they are compared.
+auto Fields(const VarnekCDateTime &dt) {
+    return std::tie(dt.iYear, dt.iMonth, dt.iDay, dt.iHour, dt.iMinute, dt.iSecond);
 }
 
 // Whether `days` whole days fill the month with this number; a month outside 1 to 12 is never full.
@@ -84,10 +77,6 @@ BOOL VarnekPGL_GetMilliseconds(PglMilliTime *out) {
 }
 
 BOOL VarnekPGL_GetSystemTime(VarnekCDateTime *dt) {
-    if (dt == nullptr) {
-        VARNEK_PANIC();
-        return FALSE;
-    }
     return VarnekPGL_SecondsToDataTime(static_cast<uint32_t>(time(nullptr)), dt);
 }
 
@@ -218,21 +207,21 @@ VarnekCDateTime VarnekCDateTime::operator+(const VarnekCDateTime &other) const {
 }
 
 BOOL VarnekCDateTime::operator==(const VarnekCDateTime &other) const {
-    return Compare(*this, other) == 0 ? TRUE : FALSE;
+    return Fields(*this) == Fields(other) ? TRUE : FALSE;
 }
 
 BOOL VarnekCDateTime::operator>(const VarnekCDateTime &other) const {
-    return Compare(*this, other) > 0 ? TRUE : FALSE;
+    return Fields(*this) > Fields(other) ? TRUE : FALSE;
 }
 
 BOOL VarnekCDateTime::operator>=(const VarnekCDateTime &other) const {
-    return Compare(*this, other) >= 0 ? TRUE : FALSE;
+    return Fields(*this) >= Fields(other) ? TRUE : FALSE;
 }
 
 BOOL VarnekCDateTime::operator<(const VarnekCDateTime &other) const {
-    return Compare(*this, other) < 0 ? TRUE : FALSE;
+    return Fields(*this) < Fields(other) ? TRUE : FALSE;
 }
 
 BOOL VarnekCDateTime::operator<=(const VarnekCDateTime &other) const {
-    return Compare(*this, other) <= 0 ? TRUE : FALSE;
+    return Fields(*this) <= Fields(other) ? TRUE : FALSE;
 }
