@@ -26,7 +26,11 @@ install(FILES LICENSE DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT license)
 install(FILES README.md CHANGELOG.md SECURITY.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
 install(DIRECTORY docs examples DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev
         FILES_MATCHING PATTERN *.md PATTERN *.svg PATTERN *.cpp PATTERN *.h)
-install(FILES platform/README.md DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform COMPONENT dev)
+install(FILES CONTRIBUTING.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
+install(DIRECTORY CommonUtility/include DESTINATION ${CMAKE_INSTALL_DOCDIR}/CommonUtility COMPONENT dev)
+install(DIRECTORY defaults DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
+install(FILES platform/README.md platform/varnek_platform.h DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform COMPONENT dev)
+install(FILES platform/host/features.txt DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform/host COMPONENT dev)
 
 # Debian packages; script/package builds them with the preset package.
 if(VARNEK_DEBIAN)

@@ -1,9 +1,8 @@
 // The configuration file: loads of well-formed and of hostile files, saves, and the source of the nation.
 #include "Varnek_Config.h"
 
-#include <fcntl.h>
 #include <signal.h>
-#include <sys/file.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -124,13 +123,6 @@ TEST_F(ConfigAlone, ASaveKeepsTheModeAndTheLinks) {
         VarnekCfg_SaveConfigFile();
         EXPECT_EQ(ReadAll(other), File("", 2, 0, 0, 68, "")) << "the save did not write to the linked file";
     }
-    // A process that hangs in a save does not block this one.
-    std::filesystem::remove(kPath);
-    const int directory = open(VARNEK_DATA_DIR, O_RDONLY | O_CLOEXEC);
-    EXPECT_EQ(flock(directory, LOCK_EX), 0);
-    VarnekCfg_SaveConfigFile();
-    EXPECT_EQ(ReadAll(kPath), File("", 2, 0, 0, 68, ""));
-    close(directory);
 }
 
 TEST_F(ConfigAlone, TheNationComesFromFileThenPlatformThenDefault) {
@@ -156,6 +148,10 @@ TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
     NOTE(save());
     std::filesystem::create_directory(kPath);
     NOTE(save());
+    WriteAll(kPath, "protected");
+    chmod(kPath.c_str(), 0444);
+    NOTE((VarnekCfg_SaveConfigFile(), ReadAll(kPath) == "protected"));
+    std::filesystem::remove(kPath);
     const std::string data = std::filesystem::path(VARNEK_DATA_DIR).parent_path();
     std::filesystem::rename(data, Path("aside"));
     NOTE(save());
@@ -163,30 +159,97 @@ TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
     std::filesystem::rename(Path("aside"), data);
 }
 
-TEST_F(ConfigAlone, SavesThatAreKilledLeaveEitherText) {
+TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
+    signal(SIGXFSZ, SIG_IGN);
+    rlimit old = {};
+    getrlimit(RLIMIT_FSIZE, &old);
+    const auto area = [this](char letter, size_t length) {
+        memset(info_.currentAreaName, 0, sizeof info_.currentAreaName);
+        memset(info_.currentAreaName, letter, length);
+    };
+    for (const bool inPlace : {false, true}) {
+        for (const size_t oldLength : {1u, 20u, 99u}) {
+            for (rlim_t limit = 0; limit < 260; limit += 13) {
+                std::filesystem::remove(kPath);
+                std::filesystem::remove(Path("second name"));
+                area('a', oldLength);
+                VarnekCfg_SaveConfigFile();
+                const std::string before = ReadAll(kPath);
+                if (inPlace) {
+                    std::filesystem::create_hard_link(kPath, Path("second name"));
+                }
+                area('b', 50);
+                const rlimit small = {limit, old.rlim_max};
+                setrlimit(RLIMIT_FSIZE, &small);
+                VarnekCfg_SaveConfigFile();
+                setrlimit(RLIMIT_FSIZE, &old);
+                const std::string after = File(std::string(50, 'b'), 2, 0, 0, 68, "");
+                EXPECT_EQ(ReadAll(kPath), limit < after.size() ? before : after) << limit;
+            }
+        }
+    }
+    // Where there was no file, none is left that a load would take for empty settings.
+    std::filesystem::remove(kPath);
+    const rlimit none = {0, old.rlim_max};
+    setrlimit(RLIMIT_FSIZE, &none);
+    VarnekCfg_SaveConfigFile();
+    setrlimit(RLIMIT_FSIZE, &old);
+    EXPECT_FALSE(std::filesystem::exists(kPath));
+}
+
+TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
     WriteAll(VARNEK_DATA_DIR "debug_ltn.ini", "# off");
     VarnekPGL_InitializeDebug();
     const auto save = [this](char letter) {
-        memset(info_.currentAreaName, letter, sizeof info_.currentAreaName - 1);
+        memset(info_.currentAreaName, 0, sizeof info_.currentAreaName);
+        memset(info_.currentAreaName, letter, static_cast<size_t>(letter - 'a' + 1) * 10);
         VarnekCfg_SaveConfigFile();
+    };
+    const auto isWhole = [](const std::string &text) {
+        const char letter = text[strlen("CONFIG_CURRENTAREANAME=")];
+        return text == File(std::string(static_cast<size_t>(letter - 'a' + 1) * 10, letter), 2, 0, 0, 68, "");
     };
     save('a');
     for (int round = 0; round < 100 && !HasFailure(); ++round) {
-        const pid_t child = fork();  // of this process's only thread
-        if (child == 0) {
-            for (;;) {
+        pid_t children[2];
+        for (pid_t &child : children) {
+            child = fork();  // of this process's only thread
+            while (child == 0) {
                 save('a');
-                save('b');
+                save('i');
             }
         }
         for (int left = round % 20; left >= 0; --left) {
             if (left == 0) {
-                kill(child, SIGKILL);
-                waitpid(child, nullptr, 0);
+                for (const pid_t child : children) {
+                    kill(child, SIGKILL);
+                    waitpid(child, nullptr, 0);
+                }
             }
-            const std::string text = ReadAll(kPath);
-            EXPECT_EQ(text, File(std::string(99, text[strlen("CONFIG_CURRENTAREANAME=")]), 2, 0, 0, 68, ""));
+            EXPECT_TRUE(isWhole(ReadAll(kPath)));
         }
+    }
+    save('a');
+    for (const auto &entry : std::filesystem::directory_iterator(VARNEK_DATA_DIR)) {
+        EXPECT_EQ(entry.path().filename().string().rfind("Varnek_Config.new", 0), std::string::npos);
+    }
+    // Savers that write in place check each other's text.
+    std::filesystem::create_hard_link(kPath, Path("second name"));
+    for (int round = 0; round < 50; ++round) {
+        pid_t children[2];
+        for (pid_t &child : children) {
+            child = fork();
+            if (child == 0) {
+                for (int i = 0; i < 20; ++i) {
+                    save(static_cast<char>('a' + (i + (&child - children)) % 9));
+                }
+                _exit(0);
+            }
+        }
+        for (const pid_t child : children) {
+            waitpid(child, nullptr, 0);
+        }
+        ASSERT_TRUE(isWhole(ReadAll(kPath))) << ReadAll(kPath);
     }
 }
 

@@ -1,4 +1,5 @@
 // Failing calls of the C library: each has its result and its lines, and leaves nothing behind.
+#include <fcntl.h>
 #include <unistd.h>
 
 #include <atomic>
@@ -160,6 +161,36 @@ TEST_F(FaultAlone, OnlyAMissingDebugConfigurationIsSeeded) {
     EXPECT_EQ(ReadAll(working), own);
 }
 
+TEST_F(FaultAlone, ASaveReplacesAFileThatAnotherHasJustReplacedAndFollowsNoPlantedLink) {
+    const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg";
+    const std::string draft = VARNEK_DATA_DIR "Varnek_Config.new." + std::to_string(getpid()) + ".";
+    WriteAll(settings, "old");
+    std::filesystem::create_hard_link(settings, Path("second name"));
+    FailCall("lstat64", 1, 0);  // a link count of 0 ...
+    VarnekCfg_SaveConfigFile();
+    EXPECT_NE(ReadAll(settings), "old") << "two names are written in place";
+    std::filesystem::remove(Path("second name"));
+    std::filesystem::create_hard_link(settings, Path("open"));
+    std::filesystem::remove(settings);
+    WriteAll(settings, "old");
+    const int reader = open(settings.c_str(), O_RDONLY);
+    FailCall("lstat64", 1, 0);  // ... is no second name
+    VarnekCfg_SaveConfigFile();
+    char text[3] = {};
+    EXPECT_EQ(read(reader, text, sizeof text), 3);
+    close(reader);
+    EXPECT_EQ(std::string(text, 3), "old") << "a reader met the save in place";
+
+    const std::string victim = std::filesystem::absolute(Path("victim"));
+    for (int number = 0; number < 4; ++number) {
+        WriteAll(victim, "kept");
+        std::filesystem::create_symlink(victim, draft + std::to_string(number));
+    }
+    FailCall("unlinkat", 1, EPERM);
+    VarnekCfg_SaveConfigFile();
+    EXPECT_EQ(ReadAll(victim), "kept");
+}
+
 TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
     const std::string file = Path("file"), target = Path("target"), directory = Path("directory");
     const int32_t sink = VarnekPGL_CreateThread("sink", 1, 0, Nothing, nullptr);
@@ -308,21 +339,28 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
     const auto populate = [&] { std::filesystem::create_directory(directory), WriteAll(directory + "/file", "text"); };
     Force(
         "directory", [&] { return populate(), removal(); }, false);
-    Force("settings", [&] {
+    const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg", draft = VARNEK_DATA_DIR "Varnek_Config.new.";
+    const auto saveAndLoad = [&] {
+        WriteAll(draft + "999999999.0", "of no process");
         *VarnekCfg_GetConfigInfo() = initial;
         VarnekCfg_SetStandard(VarnekCfg_GetConfigInfo()->standardType + 1);
         VarnekCfg_GetConfigInfo()->cprmPlayerDelay = 7;  // kept when the load fails
         VarnekCfg_LoadConfigFile();
-        EXPECT_FALSE(std::filesystem::exists(VARNEK_DATA_DIR "Varnek_Config.new"));
+        for (const auto &entry : std::filesystem::directory_iterator(VARNEK_DATA_DIR)) {
+            EXPECT_NE(entry.path().string().rfind(draft + std::to_string(getpid()), 0), 0u) << "a draft is left";
+        }
         return VarnekCfg_GetConfigInfo()->cprmPlayerDelay;
-    });
+    };
+    Force("settings", saveAndLoad);
+    std::filesystem::create_hard_link(settings, Path("second name"));
+    Force("settings in place", [&] { return WriteAll(settings, std::string(400, '\n')), saveAndLoad(); });
     Force("debug configuration", [] { return VarnekPGL_InitializeDebug(), 0; });
     EXPECT_TRUE(VarnekPGL_DeleteThread(sink));
     FAULT("malloc", ENOMEM, (VarnekCfg_LoadConfigFile(), 0));
     content();
     const PglFileHandle handle = VarnekPGL_OpenFile(file.c_str(), PGL_FILE_MODE_READ);
     FailCall("ftell", 1, EOVERFLOW);
-    FAULT("fflush", EBADF, VarnekPGL_GetFileSizeByHandle(handle));
+    FAULT("fseek", EBADF, VarnekPGL_GetFileSizeByHandle(handle));
     VarnekPGL_CloseFile(handle);
     // No failure took a handle.
     NOTE(VarnekPGL_CreateMutex("last"));

@@ -106,6 +106,9 @@ TEST_F(File, SizesAndPositions) {
     char buffer[16];
     EXPECT_EQ(VarnekPGL_SeekFile(file, -3, SEEK_END), 0);
     EXPECT_EQ(VarnekPGL_ReadFileByHandle(file, buffer, 16), 3u);
+    EXPECT_EQ(VarnekPGL_AppendFile(path.c_str(), "more", 4), 0);
+    EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(file), 14);
+    EXPECT_EQ(VarnekPGL_ReadFileByHandle(file, buffer, 16), 4u) << "a reader cannot follow a file that grows";
     VarnekPGL_CloseFile(file);
     EXPECT_EQ(VarnekPGL_ReadFile(path.c_str(), buffer, 5), 5);
     EXPECT_THAT(TakeLog(), IsEmpty());
@@ -311,8 +314,6 @@ TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
         }
         fs::create_directory_symlink("../outside", tree + "/link");
         fs::create_symlink("nowhere", tree + "/dangling");
-        // A 32-bit system cannot stat a file with such times.
-        ASSERT_EQ(system(("touch -h -d @4102444800 " + tree + "/link").c_str()), 0);
         EXPECT_EQ(VarnekPGL_DeleteDir((tree + suffix).c_str()), 0) << suffix;
         EXPECT_FALSE(fs::exists(tree));
         EXPECT_EQ(ReadAll(outside + "/kept"), "kept");
@@ -367,20 +368,6 @@ TEST_F(Directory, AFileThatCannotBeDeletedStaysAndIsReported) {
 }
 
 class Command : public VarnekTest {};
-
-TEST_F(Command, TimesBeyond2038DoNoHarm) {
-    const std::string source = Path("source"), copy = Path("copy");
-    WriteAll(source, "content");
-    ASSERT_EQ(system(("touch -d @4102444800 " + source).c_str()), 0);
-    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), copy.c_str()), 0);
-    EXPECT_EQ(ReadAll(copy), "content");
-    ASSERT_EQ(link(source.c_str(), Path("same").c_str()), 0);
-    EXPECT_EQ(VarnekPGL_CopyFile(source.c_str(), Path("same").c_str()), -1) << "a file was copied onto itself";
-    EXPECT_EQ(ReadAll(source), "content");
-    PglFmFileAttributes attributes;
-    EXPECT_TRUE(VarnekPGL_FmGetFileAttributes(source.c_str(), &attributes));
-    EXPECT_EQ(attributes.size, 7u);
-}
 
 TEST_F(Command, AnyPathIsOneWord) {
     const fs::path home = fs::current_path();

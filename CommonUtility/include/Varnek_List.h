@@ -1,10 +1,11 @@
-// A doubly linked list of untyped data pointers. The list owns its nodes but not the data, unless
-// an operation says otherwise. Not thread-safe: callers that share a list must guard it.
-//
-// Every operation accepts a null list, does nothing and returns 0 or null. Positions count from 0
-// at the head. Null data is never stored, so a null result of a removal means that nothing was
-// removed. When a node cannot be allocated, an insertion leaves the list unchanged. Nothing is
-// traced.
+/// @file
+/// A doubly linked list of untyped data pointers. The list owns its nodes but not the data, unless
+/// a call says otherwise. Not thread-safe: callers that share a list must guard it.
+///
+/// With a null list every call does nothing and returns 0 or null. Positions count from 0 at the
+/// head. Null is never stored, so removing returns null only if nothing was removed. Without memory
+/// for a node, inserting leaves the list unchanged. Nothing is traced.
+/// @see [Guide: lists](docs/guide/lists.md)
 #ifndef VARNEK_LIST_H
 #define VARNEK_LIST_H
 
@@ -14,51 +15,48 @@
 extern "C" {
 #endif
 
-// A node, allocated with malloc; it belongs to the list until it is removed.
+/// A node, allocated with malloc; it belongs to the list until it is removed.
 typedef struct list_node_t {
-    void *data;                // owned by the caller, never null
-    struct list_node_t *prev;  // null at the head
-    struct list_node_t *next;  // null at the tail
+    void *data;                ///< owned by the caller, never null
+    struct list_node_t *prev;  ///< null at the head
+    struct list_node_t *next;  ///< null at the tail
 } list_node_t;
 
-// A list. A list whose bytes are all zero is empty.
+/// A list. A list whose bytes are all zero is empty.
 typedef struct list_t {
-    int32_t count;      // number of nodes
-    list_node_t *head;  // null when empty
-    list_node_t *tail;  // null when empty
+    int32_t count;      ///< number of nodes
+    list_node_t *head;  ///< null when empty
+    list_node_t *tail;  ///< null when empty
 } list_t;
 
-// Makes the list empty. Nodes that it had are not freed.
+/// Makes the list empty without freeing its nodes.
 VARNEK_API void list_initialize(list_t *list);
 
-// Inserts data at the head.
+/// Inserts data at the head.
 VARNEK_API void list_insertHead(list_t *list, void *data);
-// Insert data at the tail; both names do the same.
+/// Inserts data at the tail.
 VARNEK_API void list_insertTail(list_t *list, void *data);
-VARNEK_API void list_insert(list_t *list, void *data);
-// Inserts data at a position. A position at or beyond the count appends; a negative one changes
-// nothing.
+VARNEK_API void list_insert(list_t *list, void *data);  ///< as list_insertTail
+/// Inserts data at a position: at the tail from the count on, nowhere if it is negative.
 VARNEK_API void list_insertAt(list_t *list, int32_t position, void *data);
 
-// Returns the data at a position; null outside the list.
+/// Returns the data at a position; null outside the list.
 VARNEK_API void *list_element(list_t *list, int32_t position);
 
-// Remove a node and return its data, which the caller owns.
+/// Removes the first node and returns its data, which the caller owns.
 VARNEK_API void *list_removeHead(list_t *list);
-VARNEK_API void *list_removeTail(list_t *list);
-VARNEK_API void *list_remove(list_t *list, int32_t position);
+VARNEK_API void *list_removeTail(list_t *list);                ///< likewise, the last node
+VARNEK_API void *list_remove(list_t *list, int32_t position);  ///< likewise, at a position
 
-// Remove nodes and free their data, which must come from malloc: all nodes, or one that is in this
-// list.
+/// Removes all nodes and frees their data, which must come from malloc.
 VARNEK_API void list_removeAll(list_t *list);
-VARNEK_API void list_remove_node(list_t *list, list_node_t *node);
+VARNEK_API void list_remove_node(list_t *list, list_node_t *node);  ///< likewise, one of this list
 
-// Iterate over the list: start with list_head, read each node with list_data, and go on with
-// list_next until it returns null.
+/// Starts a walk: read each node with list_data, and go on with list_next until it returns null.
 VARNEK_API list_node_t *list_head(list_t *list);
-VARNEK_API list_node_t *list_tail(list_t *list);
-VARNEK_API list_node_t *list_next(list_node_t *node);
-VARNEK_API void *list_data(list_node_t *node);
+VARNEK_API list_node_t *list_tail(list_t *list);       ///< the last node
+VARNEK_API list_node_t *list_next(list_node_t *node);  ///< the next node
+VARNEK_API void *list_data(list_node_t *node);         ///< a node's data
 
 #ifdef __cplusplus
 }

@@ -1,11 +1,12 @@
-// The registry of named threads. Each thread has a message queue.
-//
-// Each thread is a detached OS thread. The registry keeps a record of it, so that other threads can
-// find it and send messages to it. The registry never stops, joins or cancels a thread. A thread
-// must not be cancelled inside a call of this library. The registry has room for 20 records. Names
-// have 1 to 31 characters and compare exactly. They are unique, unless two threads create threads
-// of one name at the same time. Thread-safe. A failure is traced at Error; a lookup that does not
-// find its name is not a failure. The named mutex "VarnekThreadMutex" is reserved for the registry.
+/// @file
+/// Named threads, at most 20 in a process, each with a message queue.
+///
+/// The registry keeps a record of each thread so that others can find it and send it messages. The
+/// threads are detached; the registry never stops, joins or cancels one, and none may be cancelled
+/// inside a call of this library. Names have 1 to 31 characters, compare exactly and are unique,
+/// unless two threads create threads of one name at the same time. All calls are thread-safe.
+/// Failures are traced at Error; a lookup that finds nothing is none.
+/// @see [Guide: threads and messages](docs/guide/threads-and-messages.md)
 #ifndef VARNEK_THREAD_H
 #define VARNEK_THREAD_H
 
@@ -15,76 +16,81 @@
 extern "C" {
 #endif
 
-// Threads ----------------------------------------------------------------------------------------
+/// @name Threads
+/// @{
 
-// Starts a thread. Its record is visible before `function` runs. The first 15 characters of its
-// name are the thread's name in the system. An existing record of this name is removed first, even
-// when the other arguments are invalid, and its unread messages are freed; the thread of that
-// record runs on without one.
-//   szThreadName  1 to 31 characters
-//   priority      1 to 99; it has no effect, since threads use the ordinary scheduling policy
-//   stackSize     bytes; a size that the system refuses is replaced by the default size. A thread
-//                 that calls this library needs at least 12 KiB, of which some systems use one page
-//                 as a guard
-//   function      runs in the new thread; its result is ignored
-//   argument      passed to `function` unchanged
-//   returns       the handle, which is never reused; -1 on failure, and always after 2147483647
-//                 creations
+/// Starts a thread; its record is visible before `function` runs. A record that already has this
+/// name is removed first, as VarnekPGL_DeleteThread does, even if the other arguments are invalid.
+/// @param szThreadName  1 to 31 characters; the system shows the first 15
+/// @param priority      1 to 99; has no effect, because threads use the ordinary scheduling policy
+/// @param stackSize     bytes; the default replaces a size that the system refuses. A thread that
+///                      calls this library needs at least 12 KiB, of which some systems take one
+///                      page as a guard
+/// @param function      runs in the new thread, and sees all that the caller did before; its result
+///                      is ignored
+/// @param argument      passed to `function` unchanged
+/// @return the handle, which is never reused; -1 on failure, and always after 2147483647 creations
 VARNEK_API int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t priority,
                                           uint32_t stackSize, void *(*function)(void *),
                                           void *argument);
 
-// Removes a thread's record and frees its unread messages, but not the memory that they point to.
-// If there are any, an Error line gives their number. This takes 0.26 s for ten million messages on
-// a PC; no other operation waits for it. The thread runs on; if it waits in a receive, the receive
-// returns FALSE.
-//   returns  TRUE, or FALSE for an unknown handle
+/// Removes a thread's record and frees its unread messages, but not the memory they point to; if
+/// there are any, an Error line counts them. Freeing ten million takes 0.26 s on a PC, during which
+/// no other operation waits. The thread runs on; if it is waiting to receive, it gets FALSE.
+/// @return TRUE, or FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 
-// Finds a thread.
-//   returns  the handle of the thread of this name; -1 for none and for null
+/// Finds a thread.
+/// @return the handle of the thread of this name; -1 if there is none, and for null
 VARNEK_API int32_t VarnekPGL_GetThreadByName(const char *szThreadName);
 
-// Returns the handle of the calling thread.
-//   returns  the calling thread's handle; -1, after an Error line, in a thread that the registry
-//            has not started (such as main or a timer callback) or whose record has been removed
+/// Finds the calling thread.
+/// @return its handle; -1, after an Error line, if the registry did not start it (main, a timer
+///         callback), its record has been removed, or it has reached a late round of destructors
+///         of thread-specific data
 VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
+/// @}
+/// @name Messages
+/// Messages are copied in and out. Only memory limits the length of a queue. What one thread sends
+/// with VarnekPGL_SendMessage arrives in that order, and whoever takes a message sees all that its
+/// sender did before sending it.
+/// @{
 
-// Messages ---------------------------------------------------------------------------------------
-// A message is copied in and copied out. Only memory limits the length of a queue. Messages that
-// one thread sends with VarnekPGL_SendMessage are received in the order of sending.
-
-// One message of 40 bytes. It is aligned to 8 bytes, so that modules may overlay it with their own
-// struct. The modules that communicate define its content; the library copies it as bytes, from and
-// to any address.
+/// A message of 40 bytes, whose content the modules agree on. The alignment lets them overlay it
+/// with a struct of their own; the library copies it as bytes, from and to any address.
 typedef struct THREAD_MSG {
-    unsigned char data[40];  // defined by the modules
+    unsigned char data[40];  ///< defined by the modules
 } __attribute__((aligned(8))) THREAD_MSG;
 
-// Appends a message to a thread's queue.
-//   returns  TRUE when the message is queued and its reader signalled; FALSE for an unknown handle,
-//            a null message or too little memory, and when the reader cannot be signalled (then the
-//            message stays queued)
+/// Appends a message to a thread's queue. This also succeeds after the thread's function has
+/// returned: its queue then grows without end until the record is deleted.
+/// @return TRUE once the message is queued and its reader signalled; FALSE for an unknown handle, a
+///         null message or too little memory, and if the reader cannot be signalled (the message
+///         then stays queued)
 VARNEK_API BOOL VarnekPGL_SendMessage(int32_t hThread, const THREAD_MSG *message);
 
-// Puts a message in front of all queued messages, earlier urgent messages included.
-//   returns  TRUE or FALSE, as VarnekPGL_SendMessage does
+/// Puts a message in front of all queued ones, earlier urgent messages included.
+/// @return as VarnekPGL_SendMessage
 VARNEK_API BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *message);
 
-// Takes the first message of the calling thread's queue, waiting up to `timeout` for one.
-//   timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
-//   message  out: the message
-//   count    out: the number of messages left
-//   returns  TRUE; FALSE, after an Error line and with `message` and `count` unchanged, on a
-//            time-out or an interrupted wait, when the thread has no record or the record is
-//            removed during the wait, once for each message that was peeked, and for null pointers
+/// Takes the first message of the calling thread's queue, waiting for one if need be.
+/// @param timeout       milliseconds by the wall clock, or WAIT_FOREVER; 0 does not wait
+/// @param[out] message  the message
+/// @param[out] count    the number of messages left
+/// @return TRUE; FALSE, after an Error line and with `message` and `count` unchanged, if time ran
+///         out, a signal interrupted the wait, the thread has no record or lost it while waiting,
+///         or a pointer is null, and once for each message that was peeked
+/// @par Traces
+/// The message is taken before the second and third Low line are written, so a log function that
+/// receives while it writes them gets the next message.
 VARNEK_API BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *count);
 
-// Takes the first message without waiting. The message is removed from the queue but stays counted,
-// so for each message that was peeked, one later receive returns FALSE at once.
-//   returns  TRUE; FALSE, after an Error line and with `message` and `count` unchanged, when there
-//            is none, when the thread has no record, and for null pointers
+/// Takes the first message without waiting. The message leaves the queue but stays counted, so each
+/// peek makes one later receive return FALSE at once.
+/// @return TRUE; FALSE, after an Error line and with `message` and `count` unchanged, if there is
+///         no message, the thread has no record or a pointer is null
 VARNEK_API BOOL VarnekPGL_PeekMessage(THREAD_MSG *message, int32_t *count);
+/// @}
 
 #ifdef __cplusplus
 }

@@ -13,7 +13,7 @@
 #include "Varnek_Trace.h"
 
 // Steps that several operations share. The caller holds the ring's mutex, if it has one.
-struct VarnekRingState {
+struct VarnekRingSteps {
     enum Order {
         kInOrder,
         kOverflow,   // the writer has lapped the reader
@@ -73,7 +73,7 @@ struct VarnekRingState {
 
 namespace {
 
-using State = VarnekRingState;
+using Steps = VarnekRingSteps;
 
 // Numbers the names of the rings' mutexes. If two rings used the same name, the second would delete
 // the mutex of the first.
@@ -87,7 +87,7 @@ void Advance(int *pos, int *laps, int length, int size) {
         return;
     }
     *pos = length - tail;
-    *laps = State::AddLaps(*laps, 1);
+    *laps = Steps::AddLaps(*laps, 1);
 }
 
 inline void Copy(unsigned char *to, const unsigned char *from, int count) {
@@ -107,7 +107,7 @@ unsigned char *AllocateStorage(int size) {
 
 }  // namespace
 
-int VarnekRingState::Check(const VarnekCRingBuffer &ring) {
+int VarnekRingSteps::Check(const VarnekCRingBuffer &ring) {
     const int ahead = Ahead(ring);
     if (OrderOf(ring) == kInOrder && ahead <= 1) {
         return 0;
@@ -120,7 +120,7 @@ int VarnekRingState::Check(const VarnekCRingBuffer &ring) {
 }
 
 // Inlined, so that `hold` needs no address and can stay in registers.
-inline __attribute__((always_inline)) void VarnekRingState::Recover(VarnekCRingBuffer *ring,
+inline __attribute__((always_inline)) void VarnekRingSteps::Recover(VarnekCRingBuffer *ring,
                                                                     HoldMutex *hold) {
     hold->Release();
     TRACE_MID("Ring Buffer will be reset!!!\n");
@@ -165,7 +165,7 @@ VarnekCRingBuffer &VarnekCRingBuffer::operator=(const VarnekCRingBuffer &other) 
     }
     pRingBuf = AllocateStorage(iRingSize);
     if (pRingBuf == nullptr) {
-        State::Empty(this);
+        Steps::Empty(this);
         iRingSize = 0;
         return *this;
     }
@@ -188,7 +188,7 @@ int VarnekCRingBuffer::Reset(int size) {
     }
     TRACE_MID("Ring Buffer will be reset!!!\n");
     const HoldMutex hold(hRingMutex);
-    State::Empty(this);
+    Steps::Empty(this);
     if (size == iRingSize) {
         return 0;
     }
@@ -201,7 +201,7 @@ int VarnekCRingBuffer::Reset(int size) {
 int VarnekCRingBuffer::Flush() {
     TRACE_MID("Ring Buffer will be flushed!!!\n");
     const HoldMutex hold(hRingMutex);
-    State::Empty(this);
+    Steps::Empty(this);
     return 0;
 }
 
@@ -214,10 +214,10 @@ int VarnekCRingBuffer::Seek(int aOffset, int origin) {
                 TRACE_HIGH("[SEEK_SET] Too long offset. aOffset=[%d]\n", aOffset);
                 return VARNEK_RING_NO_SPACE;
             }
-            State::SetReader(this, aOffset);
+            Steps::SetReader(this, aOffset);
             return 0;
         case SEEK_CUR:
-            if (State::Check(*this) != 0 || !possible || aOffset > State::Used(*this)) {
+            if (Steps::Check(*this) != 0 || !possible || aOffset > Steps::Used(*this)) {
                 TRACE_HIGH("[SEEK_CUR] Too long offset. aOffset=[%d]\n", aOffset);
                 return VARNEK_RING_NO_SPACE;
             }
@@ -228,7 +228,7 @@ int VarnekCRingBuffer::Seek(int aOffset, int origin) {
                 TRACE_HIGH("[SEEK_END] Too long offset. aOffset=[%d]\n", aOffset);
                 return VARNEK_RING_NO_SPACE;
             }
-            State::SetReader(this, iWritePos - aOffset + (aOffset > iWritePos ? iRingSize : 0));
+            Steps::SetReader(this, iWritePos - aOffset + (aOffset > iWritePos ? iRingSize : 0));
             return 0;
         default:
             return VARNEK_FAIL(VARNEK_RING_INVALID, "Invalid origin value=[%d]\n", origin);
@@ -237,14 +237,14 @@ int VarnekCRingBuffer::Seek(int aOffset, int origin) {
 
 int VarnekCRingBuffer::GetSpaceReading() const {
     const HoldMutex hold(hRingMutex);
-    const int abnormal = State::Check(*this);
-    return abnormal != 0 ? abnormal : State::Used(*this);
+    const int abnormal = Steps::Check(*this);
+    return abnormal != 0 ? abnormal : Steps::Used(*this);
 }
 
 int VarnekCRingBuffer::GetSpaceWriting() const {
     const HoldMutex hold(hRingMutex);
-    const int abnormal = State::Check(*this);
-    return abnormal != 0 ? abnormal : iRingSize - State::Used(*this);
+    const int abnormal = Steps::Check(*this);
+    return abnormal != 0 ? abnormal : iRingSize - Steps::Used(*this);
 }
 
 int VarnekCRingBuffer::GetDistance() const {
@@ -255,7 +255,7 @@ int VarnekCRingBuffer::GetDistance() const {
     // Computed in 64 bits, because a hundred times the fill level of a large ring overflows 32
     // bits. Unlike Used, this counts every lap.
     const int64_t distance =
-        static_cast<int64_t>(State::Ahead(*this)) * iRingSize + iWritePos - iReadPos;
+        static_cast<int64_t>(Steps::Ahead(*this)) * iRingSize + iWritePos - iReadPos;
     const int64_t percent = distance * 100 / iRingSize;
     return static_cast<int>(distance < 0 ? percent - 1 : percent);
 }
@@ -270,27 +270,27 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
         VARNEK_PANIC();
         return VARNEK_RING_INVALID;
     }
-    switch (State::OrderOf(*this)) {
-        case State::kInOrder:
+    switch (Steps::OrderOf(*this)) {
+        case Steps::kInOrder:
             break;
-        case State::kOverflow:
+        case Steps::kOverflow:
             TRACE_ERROR(
                 "[Abnormal Sate] Ring Buffer is already overflowed! This data will be discarded\n");
-            State::Recover(this, &hold);
+            Steps::Recover(this, &hold);
             return VARNEK_RING_NO_SPACE;
-        case State::kUnderflow:
+        case Steps::kUnderflow:
             TRACE_ERROR(
                 "[Abnormal State] Invalid Ring Buffer State! Underflow! This data will be "
                 "discarded!\n");
-            State::Recover(this, &hold);
+            Steps::Recover(this, &hold);
             return VARNEK_RING_NO_DATA;
-        case State::kOvertaken:
+        case Steps::kOvertaken:
             // The ring stays unchanged; the next read empties it.
             return VARNEK_FAIL(
                 VARNEK_RING_NO_DATA,
                 "Invalid Ring Buffer State! Underflow! This data will be discarded!\n");
     }
-    const int space = iRingSize - State::Used(*this);
+    const int space = iRingSize - Steps::Used(*this);
     if (space < writelen) {
         return VARNEK_FAIL(
             VARNEK_RING_NO_SPACE,
@@ -306,7 +306,7 @@ int VarnekCRingBuffer::Write(const unsigned char *data, int writelen) {
     Copy(pRingBuf + iWritePos, data, tail);
     Copy(pRingBuf, data + tail, writelen - tail);
     iWritePos = writelen - tail;
-    iWriteLoopCnt = State::AddLaps(iWriteLoopCnt, 1);
+    iWriteLoopCnt = Steps::AddLaps(iWriteLoopCnt, 1);
     return 0;
 }
 
@@ -320,26 +320,26 @@ int VarnekCRingBuffer::Read(unsigned char *dest, int readLen) {
         VARNEK_PANIC();
         return VARNEK_RING_INVALID;
     }
-    switch (State::OrderOf(*this)) {
-        case State::kInOrder:
+    switch (Steps::OrderOf(*this)) {
+        case Steps::kInOrder:
             break;
-        case State::kOverflow:
+        case Steps::kOverflow:
             TRACE_ERROR("Abnormal Sate!! Buffer Already Overflow!\n");
-            State::Recover(this, &hold);
+            Steps::Recover(this, &hold);
             return VARNEK_RING_NO_SPACE;
-        case State::kUnderflow:
+        case Steps::kUnderflow:
             TRACE_ERROR("Abnormal Sate!! Buffer Already Overflow!\n");
-            State::Recover(this, &hold);
+            Steps::Recover(this, &hold);
             return VARNEK_RING_NO_DATA;
-        case State::kOvertaken:
+        case Steps::kOvertaken:
             TRACE_ERROR("Abnormal Sate!! Buffer Already Underflow!\n");
-            State::Recover(this, &hold);
+            Steps::Recover(this, &hold);
             return VARNEK_RING_NO_DATA;
     }
     if (iReadPos == iWritePos && iReadLoopCnt == iWriteLoopCnt) {
         return VARNEK_FAIL(VARNEK_RING_NO_DATA, "No reading data!\n");
     }
-    const int available = State::Used(*this);
+    const int available = Steps::Used(*this);
     if (available < readLen) {
         return VARNEK_FAIL(VARNEK_RING_NO_DATA,
                            "Not enough reading buffer space. readLen=[%d], readiing buf=[%d]!\n",
@@ -354,6 +354,6 @@ int VarnekCRingBuffer::Read(unsigned char *dest, int readLen) {
     Copy(dest, pRingBuf + iReadPos, tail);
     Copy(dest + tail, pRingBuf, readLen - tail);
     iReadPos = readLen - tail;
-    iReadLoopCnt = State::AddLaps(iReadLoopCnt, 1);
+    iReadLoopCnt = Steps::AddLaps(iReadLoopCnt, 1);
     return 0;
 }

@@ -2,21 +2,25 @@
 // of keys, in the order of the fields.
 #include "Varnek_Config.h"
 
+#include <dirent.h>
 #include <errno.h>
 #include <fcntl.h>
+#include <signal.h>
 #include <stddef.h>
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <atomic>
+
+#include "Varnek_ConfigFile.h"
 #include "Varnek_File.h"
 #include "Varnek_Storage.h"
 #include "Varnek_StrUtil.h"
 #include "Varnek_Support.h"
-#include "Varnek_Timer.h"
 #include "Varnek_Trace.h"
 #include "varnek_platform.h"
 
@@ -38,11 +42,8 @@ namespace {
 constexpr size_t kLineSize = 255;  // a line that is read, with its terminator
 constexpr size_t kFileSize = 900;  // the text that is written, with its terminator
 
-constexpr char kConfigPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
-constexpr char kNewPath[] = VARNEK_DATA_DIR "Varnek_Config.new";  // before it is renamed
-static_assert(sizeof kConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
-constexpr int kLockTries = 1000;  // one per millisecond
-constexpr int32_t kSaveFlags = PGL_FILE_MODE_CREATE_RW | PGL_FILE_MODE_WRITE;
+// A save writes a draft first. Its name ends in the saver's process id and a number.
+constexpr char kDraftPrefix[] = "Varnek_Config.new.";
 
 enum ConfigField {
     AREA_NAME,
@@ -134,18 +135,11 @@ void ReadLine(const char *line) {
 }
 
 void ReadLines(const char *text) {
-    for (;;) {
-        while (IsLineEnd(*text)) {
-            ++text;
-        }
-        if (*text == '\0') {
-            return;
-        }
-        const size_t length = strcspn(text, "\r\n");
-        char line[kLineSize];
-        CopyText(line, text, length);
+    text += strspn(text, "\r\n");
+    const char *const end = text + strlen(text);
+    char line[kLineSize];
+    while (TakeLine(&text, end, line)) {
         ReadLine(line);
-        text += length;
     }
 }
 
@@ -159,101 +153,146 @@ void FormatFile(char (&text)[kFileSize]) {
              kKeys[PLAYER_DELAY], info.cprmPlayerDelay, kKeys[NATION], info.supportNation);
 }
 
-// Reads the whole text of the open file. The data is null, after a trace, if it cannot be read.
-FileText ReadFromStart(PglFileHandle file) {
-    VarnekPGL_SeekFile(file, 0, SEEK_END);
+// Reads the whole text of the open file, into a block that the caller frees. Returns null, after a
+// trace, when it cannot be read.
+char *ReadSettings(PglFileHandle file) {
+    const bool atEnd = VarnekPGL_SeekFile(file, 0, SEEK_END) == 0;
     const int32_t length = VarnekPGL_TellFile(file);
-    VarnekPGL_SeekFile(file, 0, SEEK_SET);
     CTRL_HIGH("  VarnekCfg_LoadConfigFile : readlen = %d", length);
-    const uint32_t size = length > 0 ? static_cast<uint32_t>(length) : 0;
-    const FileText text = ReadText(file, size);
-    if (text.data == nullptr) {
-        CTRL_HIGH("  VarnekCfg_LoadConfigFile : Out of memory!");
-        return text;
-    }
-    if (length < 0 || (size > 0 && text.count == 0) || ferror(StreamOf(file)) != 0) {
+    if (!atEnd || length < 0 || length > kMaxConfigSize ||
+        VarnekPGL_SeekFile(file, 0, SEEK_SET) != 0) {
         CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Read Config File!");
-        free(text.data);
-        return {};
+        return nullptr;
+    }
+    uint32_t count = 0;
+    char *text = ReadText(file, static_cast<uint32_t>(length), &count);
+    if (text == nullptr) {
+        CTRL_HIGH("  VarnekCfg_LoadConfigFile : Out of memory!");
+    } else if ((length > 0 && count == 0) || ferror(StreamOf(file)) != 0) {
+        CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Read Config File!");
+        free(text);
+        return nullptr;
     }
     return text;
 }
 
-// Whether a new file may replace the existing one. It may if there is none, or if it is a regular
-// file of this user that has no second name (hard link). Fills `*old`, with zeros if there is none.
+bool IsOwnFile(const struct stat64 &entry) {
+    return S_ISREG(entry.st_mode) && entry.st_uid == geteuid();
+}
+
+// Whether the owner has protected the file against writing. That counts for root too, although the
+// system would let it write.
+bool IsProtected(const struct stat64 &entry) {
+    return IsOwnFile(entry) && (entry.st_mode & S_IWUSR) == 0;
+}
+
+// Whether a new file may replace the entry at the path of the settings: if there is none, or if it
+// is a file of this user that may be written and has no second name (hard link). A file that
+// another save is just replacing has no name at all. Fills `*old`, with zeros if there is no entry.
 bool MayReplace(struct stat64 *old) {
     *old = {};
-    if (lstat64(kConfigPath, old) != 0) {
+    if (lstat64(kSettingsPath, old) != 0) {
         return errno == ENOENT;
     }
-    return S_ISREG(old->st_mode) && old->st_nlink == 1 && old->st_uid == geteuid();
+    return IsOwnFile(*old) && !IsProtected(*old) && old->st_nlink <= 1;
 }
 
-// Gives the new file the group and the mode of the old one, as late as possible, because another
-// process may change them during the save. Returns false if that fails or the old file may no
-// longer be replaced.
-bool TakeOver(int fd) {
+// Gives the draft the group and the mode of the file that it will replace, as late as possible,
+// because another process may change them during the save. Returns false if that fails or the file
+// may no longer be replaced.
+bool ImitateOld(int draft) {
     struct stat64 old = {};
-    if (!MayReplace(&old)) {
-        return false;
-    }
-    return old.st_mode == 0 || (fchown(fd, static_cast<uid_t>(-1), old.st_gid) == 0 &&
-                                fchmod(fd, old.st_mode & 07777) == 0);
+    return MayReplace(&old) &&
+           (old.st_mode == 0 || (fchown(draft, static_cast<uid_t>(-1), old.st_gid) == 0 &&
+                                 fchmod(draft, old.st_mode & 07777) == 0));
 }
 
-// Writes the text to a second file, flushes that to the disk, and renames it over the settings
-// file. So a reader finds either the old text or the new one, whatever happens to this process.
-// Returns false on failure; the settings file is unchanged then.
-bool ReplaceFile(const char *text) {
-    remove(kNewPath);
-    const PglFileHandle file = VarnekPGL_OpenFile(kNewPath, kSaveFlags);
-    if (file == -1) {
-        return false;
-    }
-    const int fd = fileno(StreamOf(file));
-    const uint32_t length = static_cast<uint32_t>(strlen(text));
-    const bool stored = VarnekPGL_WriteFileByHandle(file, text, length) == length &&
-                        VarnekPGL_FlushFile(file) == 0 && fsync(fd) == 0 && TakeOver(fd);
-    const bool closed = VarnekPGL_CloseFile(file) == 0;
-    if (stored && closed && rename(kNewPath, kConfigPath) == 0) {
-        return true;
-    }
-    remove(kNewPath);
-    return false;
-}
-
-// Takes the lock that keeps other processes from writing the second file. The system releases it
-// when its holder ends. But the holder may be stopped, or a child of the holder may keep the lock,
-// so the wait is limited.
-bool LockDirectory(int directory) {
-    for (int i = 0; i < kLockTries; i++) {
-        if (flock(directory, LOCK_EX | LOCK_NB) == 0) {
-            return true;
+// Removes the drafts of processes that ended during a save. A process that does not exist is told
+// from a live one without any permission. When an id is in use again, the draft stays until a save
+// after the end of that process.
+void RemoveDeadDrafts(DIR *directory) {
+    while (const struct dirent64 *entry = readdir64(directory)) {
+        constexpr size_t kLength = sizeof kDraftPrefix - 1;
+        if (strncmp(entry->d_name, kDraftPrefix, kLength) == 0 &&
+            kill(static_cast<pid_t>(strtoll(entry->d_name + kLength, nullptr, 10)), 0) != 0 &&
+            errno == ESRCH) {
+            unlinkat(dirfd(directory), entry->d_name, 0);
         }
-        VarnekPGL_MSleep(1);
+    }
+}
+
+// Writes the text to a draft, flushes it to the medium, and renames it over the settings file. So a
+// reader finds either the old text or the new one, whatever happens to this process. No lock is
+// needed: each save has a draft of its own. Returns false on failure, without a line in the log;
+// the file then has its old text, or the new one that may not be on the medium yet.
+bool Replace(DIR *directory, const char *text, size_t length) {
+    static std::atomic<unsigned int> saves{0};
+    const int in = dirfd(directory);
+    char draft[48];
+    snprintf(draft, sizeof draft, "%s%d.%u", kDraftPrefix, static_cast<int>(getpid()),
+             saves.fetch_add(1, std::memory_order_relaxed));
+    unlinkat(in, draft, 0);  // of an earlier process with this id
+    const int fd = openat(in, draft, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0666);
+    if (fd < 0) {
+        return false;
+    }
+    const bool stored =
+        write(fd, text, length) == static_cast<ssize_t>(length) && fsync(fd) == 0 && ImitateOld(fd);
+    const bool closed = close(fd) == 0;
+    if (!stored || !closed || renameat(in, draft, AT_FDCWD, kSettingsPath) != 0) {
+        unlinkat(in, draft, 0);
+        return false;
+    }
+    return fsync(in) == 0;
+}
+
+// Whether these bytes are the text of a save: six lines, and nothing behind the last one. The rest
+// of a longer text would have a line end too many, and a text that was cut would have one too few.
+bool IsWhole(const char *text, ssize_t size) {
+    return size > 0 && text[size - 1] == '\n' &&
+           std::count(text, text + size, '\n') == CONFIG_FIELD_COUNT;
+}
+
+// Writes the text over the old one and cuts the file to length afterwards. When the medium refuses,
+// it puts the old text back. Another process may do the same at the same time and cut this text, so
+// the file is read again until its text is whole: whoever changes it last also reads it last.
+bool WriteOver(int fd, const char *text, size_t length) {
+    constexpr int kTries = 100;
+    for (int i = 0; i < kTries; ++i) {
+        char old[kFileSize];
+        const ssize_t size = pread(fd, old, sizeof old, 0);
+        const bool same = size == static_cast<ssize_t>(length) && memcmp(old, text, length) == 0;
+        if (same || (i > 0 && IsWhole(old, size))) {
+            return fsync(fd) == 0;
+        }
+        const ssize_t written = size >= 0 ? pwrite(fd, text, length, 0) : 0;
+        if (written != static_cast<ssize_t>(length) || ftruncate(fd, written) != 0) {
+            const ssize_t kept = size < written ? size : written;
+            [[maybe_unused]] const bool restored =
+                kept >= 0 && pwrite(fd, old, static_cast<size_t>(kept), 0) == kept &&
+                (written <= size || ftruncate(fd, size) == 0);
+            return false;
+        }
     }
     return false;
 }
 
-// Calls ReplaceFile under the lock, if the directory and the file allow it.
-bool SaveBeside(const char *text) {
-    struct stat64 old = {};
-    if (access(VARNEK_DATA_DIR, W_OK) != 0 || !MayReplace(&old)) {
-        return false;
+// Saves in place, where the file cannot be replaced. Nothing is created, except behind a link:
+// where a new file could not be stored, an empty one would only cost the settings at the next load.
+void SaveInPlace(const struct stat64 &old, const char *text) {
+    const int flags = O_RDWR | O_CLOEXEC | (S_ISLNK(old.st_mode) ? O_CREAT : 0);
+    const int fd = IsProtected(old) ? -1 : open(kSettingsPath, flags, 0666);
+    if (fd < 0) {
+        __VarnekPGL_FileLog("VarnekPGL_OpenFile : NULL file pointer. szFilePath=[%s]",
+                            kSettingsPath);
+        CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_OpenFile() fail.!");
+        return;
     }
-    const int directory = open(VARNEK_DATA_DIR, O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (directory < 0) {
-        return false;
+    const bool written = WriteOver(fd, text, strlen(text));
+    if (close(fd) != 0 || !written) {
+        __VarnekPGL_FileLog("VarnekCfg_SaveConfigFile : fail %s", kSettingsPath);
+        CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_WriteFileByHandle() fail.!");
     }
-    bool replaced = false;
-    if (LockDirectory(directory)) {
-        replaced = ReplaceFile(text);
-        // A child that was forked during the save has the descriptor too, so the close below would
-        // not release the lock.
-        flock(directory, LOCK_UN);
-    }
-    close(directory);
-    return replaced;
 }
 
 void LoadUnlessLoaded() {
@@ -270,52 +309,45 @@ VarnekConfigInfo *VarnekCfg_GetConfigInfo() {
 
 void VarnekCfg_LoadConfigFile() {
     CTRL_HIGH("  VarnekCfg_LoadConfigFile : called!");
-    const FileKind kind = KindOfConfigFile(kConfigPath);
-    if (kind == FileKind::kOdd || kind == FileKind::kTooLarge) {
+    if (!MayOpen(kSettingsPath)) {
         CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Read Config File!");
         return;
     }
-    const PglFileHandle file = VarnekPGL_OpenFile(kConfigPath, PGL_FILE_MODE_READ);
+    const PglFileHandle file = VarnekPGL_OpenFile(kSettingsPath, PGL_FILE_MODE_READ);
     if (file == -1) {
         CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Open Config File!");
         return;
     }
     // The record is cleared only after the text has been read. Otherwise a file that cannot be read
     // would cost the settings, and the next save would write empty ones.
-    const FileText text = ReadFromStart(file);
+    char *text = ReadSettings(file);
     VarnekPGL_CloseFile(file);
-    if (text.data == nullptr) {
+    if (text == nullptr) {
         return;
     }
     gpVarnekConfigInfo = {};
-    ReadLines(text.data);
-    free(text.data);
+    ReadLines(text);
+    free(text);
     CTRL_HIGH(" __VarnekCfg_GetTempBuffer: End of Configuration\n");
     VarnekCfg_GetSupportNation();
 }
 
 void VarnekCfg_SaveConfigFile() {
-    if (VarnekPGL_CheckDir(VARNEK_DATA_DIR) != TRUE) {
+    void *directory = VarnekPGL_OpenDir(VARNEK_DATA_DIR);
+    if (directory == PGL_INVALID_DIR_HANDLE) {
         VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_ESG,
                      "VarnekCfg_SaveConfigFile: Root_Path(%s) is not Exist\n", VARNEK_DATA_DIR);
         return;
     }
-    // Opening the file below empties it, so the text is composed first.
     char text[kFileSize];
     FormatFile(text);
-    if (SaveBeside(text)) {
-        return;
-    }
-    const PglFileHandle file = VarnekPGL_OpenFile(kConfigPath, kSaveFlags);
-    if (file == -1) {
-        CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_OpenFile() fail.!");
-        return;
-    }
-    const uint32_t length = static_cast<uint32_t>(strlen(text));
-    const uint32_t written = VarnekPGL_WriteFileByHandle(file, text, length);
-    // On a full disk, the error may not appear until the stream is closed.
-    if (VarnekPGL_CloseFile(file) != 0 || written != length) {
-        CTRL_HIGH("VarnekCfg_SaveConfigFile() :  VarnekPGL_WriteFileByHandle() fail.!");
+    RemoveDeadDrafts(static_cast<DIR *>(directory));
+    struct stat64 old = {};
+    const bool replaced =
+        MayReplace(&old) && Replace(static_cast<DIR *>(directory), text, strlen(text));
+    VarnekPGL_CloseDir(directory);
+    if (!replaced) {
+        SaveInPlace(old, text);
     }
 }
 

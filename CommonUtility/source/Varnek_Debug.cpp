@@ -15,6 +15,7 @@
 #include <atomic>
 #include <initializer_list>
 
+#include "Varnek_ConfigFile.h"
 #include "Varnek_File.h"
 #include "Varnek_Lock.h"
 #include "Varnek_Storage.h"
@@ -44,12 +45,6 @@ std::atomic<pthread_t> gDebugLoader{};
 constexpr size_t kTraceLineSize = 2048;
 constexpr size_t kTraceTextSize = 2018;  // the caller's text with its terminator
 constexpr size_t kConfigLineSize = 52;
-
-constexpr char kConfigPath[] = VARNEK_DATA_DIR "debug_ltn.ini";
-constexpr char kDefaultConfigPath[] = VARNEK_SYSTEM_DIR "debug_ltn.ini";
-constexpr char kSettingsPath[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
-static_assert(sizeof kSettingsPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_DATA_DIR is too long");
-static_assert(sizeof kDefaultConfigPath <= MAX_PGL_FILE_PATH_LEN, "VARNEK_SYSTEM_DIR is too long");
 
 bool IsLoaded() {
     return (gDebugState.load(std::memory_order_relaxed) & kNotLoaded) == 0;
@@ -151,28 +146,12 @@ uint32_t BitOfLine(const char *line) {
     return 0;
 }
 
-// Returns all bits that the text enables. A line that is too long for the buffer is truncated. A
-// text that begins with a line end enables nothing.
-uint32_t ParseConfig(const char *data, size_t size) {
+// Returns all bits that the text enables. A text that begins with a line end enables nothing.
+uint32_t ParseConfig(const char *text, const char *end) {
     uint32_t enabled = 0;
-    size_t position = 0;
-    while (position < size) {
-        size_t end = position;
-        while (end < size && !IsLineEnd(data[end])) {
-            end++;
-        }
-        if (end == position) {
-            break;
-        }
-        char line[kConfigLineSize];
-        const size_t length = end - position < sizeof line ? end - position : sizeof line - 1;
-        memcpy(line, data + position, length);
-        line[length] = '\0';
+    char line[kConfigLineSize];
+    while (TakeLine(&text, end, line)) {
         enabled |= BitOfLine(line);
-        while (end < size && IsLineEnd(data[end])) {
-            end++;
-        }
-        position = end;
     }
     return enabled;
 }
@@ -221,38 +200,31 @@ void LogSummary(uint32_t enabled) {
     }
 }
 
-// Copies the shipped configuration to the data directory.
-void SeedConfig() {
-    const FileKind kind = KindOfConfigFile(kDefaultConfigPath);
-    if (kind != FileKind::kOdd && VarnekPGL_CheckFile(kDefaultConfigPath)) {
-        (void)VarnekPGL_CopyFile(kDefaultConfigPath, kConfigPath);
-        return;
+// Copies the shipped configuration to the data directory. Returns whether that can be read now.
+bool SeedConfig() {
+    if (!IsReadable(kShippedDebugPath)) {
+        LogFailure("Default Log Configuration file doesn't exit! File Path=[" VARNEK_SYSTEM_DIR
+                   "debug_ltn.ini]\n");
+        return false;
     }
-    LogFailure("Default Log Configuration file doesn't exit! File Path=[" VARNEK_SYSTEM_DIR
-               "debug_ltn.ini]\n");
+    return VarnekPGL_CopyFile(kShippedDebugPath, kDebugPath) == 0 && IsReadable(kDebugPath);
 }
 
 // Returns all bits that the configuration file enables. 0, after a line in the log, when it cannot
 // be read.
 uint32_t ReadConfig() {
-    FileKind kind = KindOfConfigFile(kConfigPath);
-    bool exists = kind != FileKind::kOdd && VarnekPGL_CheckFile(kConfigPath);
-    if (kind == FileKind::kMissing) {
-        SeedConfig();
-        kind = KindOfConfigFile(kConfigPath);
-        exists = kind == FileKind::kReadable && VarnekPGL_CheckFile(kConfigPath);
-    }
-    const int32_t size = exists ? VarnekPGL_GetFileSize(kConfigPath) : 0;
+    const bool exists = IsReadable(kDebugPath) || (IsMissing(kDebugPath) && SeedConfig());
+    const int32_t size = exists ? VarnekPGL_GetFileSize(kDebugPath) : 0;
     if (size < 1) {
         LogFailure("Debug Configuration File Doesn't exist!\n");
         return 0;
     }
-    char *data = kind == FileKind::kReadable ? ReadWholeFile(kConfigPath, size) : nullptr;
+    char *data = size <= kMaxConfigSize ? ReadWholeFile(kDebugPath, size) : nullptr;
     if (data == nullptr) {
         LogFailure("Debug Configuration File reading fail!\n");
         return 0;
     }
-    const uint32_t enabled = ParseConfig(data, static_cast<size_t>(size));
+    const uint32_t enabled = ParseConfig(data, data + size);
     free(data);
     return enabled;
 }
@@ -355,10 +327,9 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
 }  // namespace
 
 void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...) {
-    // The bits of the levels are above kNotLoaded, and all others are below it. So once the
-    // configuration is loaded, this returns if the level is off or the mask has no level.
-    const uint32_t state = gDebugState.load(std::memory_order_relaxed);
-    if ((state & (mask | kNotLoaded)) < kNotLoaded) {
+    // The level and kNotLoaded are in the top byte, the module below it.
+    const uint32_t enabled = gDebugState.load(std::memory_order_relaxed) & (mask | kNotLoaded);
+    if (enabled >> 24 == 0) {
         return;
     }
     va_list args;
@@ -391,8 +362,8 @@ int32_t VarnekPGL_SysGetLastErro() {
 
 void VarnekPGL_changeModeForDebug() {
     VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, " VarnekCfg_changeDebugMode\n");
-    for (const char *path : {kConfigPath, kSettingsPath}) {
-        if (KindOfConfigFile(path) != FileKind::kOdd && VarnekPGL_CheckFile(path)) {
+    for (const char *path : {kDebugPath, kSettingsPath}) {
+        if (IsReadable(path)) {
             (void)VarnekPGL_Chmod(path, 666);
         }
     }

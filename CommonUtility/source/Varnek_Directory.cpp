@@ -6,11 +6,8 @@
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
-
-#include <initializer_list>
 
 #include "Varnek_File.h"
 #include "Varnek_Storage.h"
@@ -49,8 +46,6 @@ void ReadProcessName(char (&name)[size]) {
     }
 }
 
-// Whether a path is a link. It does not use stat, which fails on a 32-bit system when the file has
-// times after 2038.
 bool IsLink(int dir, const char *name) {
     char target = '\0';
     return readlinkat(dir, name, &target, sizeof target) >= 0;
@@ -74,129 +69,106 @@ bool RemoveAt(int dir, const char *name) {
     return false;
 }
 
-// An open directory between the root of a tree deletion and its current position.
+// The deletion of a directory tree works on descriptors that are opened without following links, so
+// it does not enter a link that replaces a directory during the deletion.
+
+// An open directory between the root of a deletion and its current position. The levels are on the
+// heap, so that a deep tree needs no more stack.
 struct TreeLevel {
     TreeLevel *parent;  // null for the root
     DIR *dir;
-    size_t pathLength;  // of the directory's path
+    const char *path;  // from the caller's root, for the log; stored behind the level
+    const char *name;  // the end of the path, as its parent knows the directory
+
+    int Container() const { return parent != nullptr ? dirfd(parent->dir) : AT_FDCWD; }
 };
 
-// The deletion of a directory tree, for VarnekPGL_DeleteDirEx. It works on descriptors that are
-// opened without following links, so it does not enter a link that replaces a directory during the
-// deletion. The levels are on the heap, so that a deep tree needs no more stack.
-class TreeDeletion {
-  public:
-    // `path` is the path of the root, in a block with room for the path of a child.
-    explicit TreeDeletion(char *path) : path_(path) {}
+constexpr char kDeletion[] = "VarnekPGL_DeleteDirEx";
 
-    int32_t Run() {
-        // With a final slash or "/." the system would follow a link, so they are cut off here.
-        size_t bare = strlen(path_);
-        while (bare > 1 &&
-               (path_[bare - 1] == '/' || (path_[bare - 1] == '.' && path_[bare - 2] == '/'))) {
-            bare--;
+int OpenWithoutFollowing(int dir, const char *name) {
+    return openat(dir, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+}
+
+// Returns the level of a directory, and owns its descriptor. Returns null, after log lines, when
+// the directory cannot be read.
+TreeLevel *Enter(TreeLevel *parent, int fd, const char *path, size_t nameLength) {
+    DIR *dir = fd >= 0 ? fdopendir(fd) : nullptr;
+    if (dir == nullptr) {
+        __VarnekPGL_FileLog("%s : pDir(%s) = NULL", "VarnekPGL_OpenDir", path);
+        if (fd >= 0) {
+            close(fd);
         }
-        const char cut = path_[bare];
-        path_[bare] = '\0';
-        if (IsLink(AT_FDCWD, path_) && IsDirectory(path_)) {
-            return RemoveAt(AT_FDCWD, path_) ? 0 : -1;
-        }
-        const int fd = OpenWithoutFollowing(AT_FDCWD, path_);
-        path_[bare] = cut;
-        if (!Enter(fd)) {
-            return -1;
-        }
-        int32_t result = 0;
-        while (level_ != nullptr) {
-            if (!__VarnekPGL_ReadDir(level_->dir, &entry_)) {
-                result = RemoveLevel();
-            } else if (strcmp(entry_.name, ".") != 0 && strcmp(entry_.name, "..") != 0) {
-                DeleteChild();
-            }
-        }
-        return result;
     }
-
-  private:
-    static constexpr const char *kOperation = "VarnekPGL_DeleteDirEx";
-
-    static int OpenWithoutFollowing(int dir, const char *name) {
-        return openat(dir, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
-    }
-
-    // Makes the directory at path_ the current level, and owns its descriptor. Returns false, after
-    // log lines, when the directory cannot be read.
-    bool Enter(int fd) {
-        DIR *dir = fd >= 0 ? fdopendir(fd) : nullptr;
-        TreeLevel *level =
-            dir != nullptr ? static_cast<TreeLevel *>(malloc(sizeof(TreeLevel))) : nullptr;
-        if (level != nullptr) {
-            *level = {level_, dir, strlen(path_)};
-            level_ = level;
-            return true;
-        }
+    const size_t length = strlen(path);
+    TreeLevel *level =
+        dir != nullptr ? static_cast<TreeLevel *>(malloc(sizeof(TreeLevel) + length + 1)) : nullptr;
+    if (level == nullptr) {
+        __VarnekPGL_FileLog("%s : No Eixst Dir! [%s]", kDeletion, path);
         if (dir != nullptr) {
             closedir(dir);
-        } else {
-            __VarnekPGL_FileLog("%s : pDir(%s) = NULL", "VarnekPGL_OpenDir", path_);
-            if (fd >= 0) {
-                close(fd);
-            }
         }
-        __VarnekPGL_FileLog("%s : No Eixst Dir! [%s]", kOperation, path_);
-        return false;
+        return nullptr;
     }
+    char *const copy = reinterpret_cast<char *>(level + 1);
+    memcpy(copy, path, length + 1);
+    *level = {parent, dir, copy, copy + length - nameLength};
+    return level;
+}
 
-    // Deletes the current entry, or enters it if it is a directory. An entry whose path does not
-    // fit is left, because the truncated path could name another file.
-    void DeleteChild() {
-        const char *name = entry_.name;
-        const size_t length = level_->pathLength;
-        const char *slash = name[0] == '/' || (length > 0 && path_[length - 1] == '/') ? "" : "/";
-        if (length + strlen(slash) + strlen(name) >= kChildPathSize) {
-            __VarnekPGL_FileLog("%s : exceed max file path length : %s/%s", kOperation, path_,
-                                name);
-            return;
-        }
-        if (entry_.type != PGL_ENTRY_DIR) {
-            RemoveAt(dirfd(level_->dir), name);
-            return;
-        }
-        snprintf(path_ + length, kChildPathSize - length, "%s%s", slash, name);
-        const int fd = OpenWithoutFollowing(dirfd(level_->dir), name);
-        if (fd < 0 && IsLink(dirfd(level_->dir), name)) {
-            RemoveAt(dirfd(level_->dir), name);
-        } else if (Enter(fd)) {
-            return;
-        }
-        path_[length] = '\0';
+// Deletes an entry, or enters it if it is a directory. Returns the level to go on with. An entry
+// whose path does not fit is left, because a truncated path would name another file in the log.
+TreeLevel *DeleteChild(TreeLevel *level, const PglDirEntry &entry) {
+    const int dir = dirfd(level->dir);
+    const char *name = entry.name;
+    const size_t length = strlen(level->path);
+    const char *slash = length > 0 && level->path[length - 1] == '/' ? "" : "/";
+    char path[kChildPathSize];
+    if (length + strlen(slash) + strlen(name) >= sizeof path) {
+        __VarnekPGL_FileLog("%s : exceed max file path length : %s/%s", kDeletion, level->path,
+                            name);
+        return level;
     }
-
-    // Leaves the current directory and removes it. Returns 0; -1, after a log line, on failure.
-    int32_t RemoveLevel() {
-        TreeLevel *level = level_;
-        level_ = level->parent;
-        VarnekPGL_CloseDir(level->dir);
-        free(level);
-        const size_t parentLength = level_ != nullptr ? level_->pathLength : 0;
-        const char *name = path_ + parentLength;
-        const bool removed =
-            level_ != nullptr
-                ? unlinkat(dirfd(level_->dir), *name == '/' ? name + 1 : name, AT_REMOVEDIR) == 0
-                : rmdir(path_) == 0;
-        if (!removed) {
-            __VarnekPGL_FileLog("%s : rmdir[%s] Fail. return FALSE", kOperation, path_);
-        }
-        if (level_ != nullptr) {
-            path_[parentLength] = '\0';
-        }
-        return removed ? 0 : -1;
+    if (entry.type != PGL_ENTRY_DIR) {
+        RemoveAt(dir, name);
+        return level;
     }
+    const int fd = OpenWithoutFollowing(dir, name);
+    if (fd < 0 && IsLink(dir, name)) {
+        RemoveAt(dir, name);
+        return level;
+    }
+    snprintf(path, sizeof path, "%s%s%s", level->path, slash, name);
+    TreeLevel *child = Enter(level, fd, path, strlen(name));
+    return child != nullptr ? child : level;
+}
 
-    char *const path_;
-    TreeLevel *level_ = nullptr;
-    PglDirEntry entry_ = {};
-};
+// Closes and removes an emptied directory. Returns 0; -1, after a log line, on failure.
+int32_t RemoveLevel(TreeLevel *level) {
+    VarnekPGL_CloseDir(level->dir);
+    const bool removed = unlinkat(level->Container(), level->name, AT_REMOVEDIR) == 0;
+    if (!removed) {
+        __VarnekPGL_FileLog("%s : rmdir[%s] Fail. return FALSE", kDeletion, level->path);
+    }
+    free(level);
+    return removed ? 0 : -1;
+}
+
+// Deletes the tree under the open directory at `path`.
+int32_t DeleteTree(const char *path, int fd) {
+    int32_t result = -1;
+    PglDirEntry entry = {};
+    TreeLevel *level = Enter(nullptr, fd, path, strlen(path));
+    while (level != nullptr) {
+        if (!__VarnekPGL_ReadDir(level->dir, &entry)) {
+            TreeLevel *parent = level->parent;
+            result = RemoveLevel(level);
+            level = parent;
+        } else if (strcmp(entry.name, ".") != 0 && strcmp(entry.name, "..") != 0) {
+            level = DeleteChild(level, entry);
+        }
+    }
+    return result;
+}
 
 }  // namespace
 
@@ -222,19 +194,28 @@ int32_t VarnekPGL_DeleteDir(const char *path) {
 }
 
 int32_t VarnekPGL_DeleteDirEx(const char *path) {
-    const size_t length = path != nullptr ? strlen(path) : 0;
-    const size_t room = length < kChildPathSize ? kChildPathSize : length + 1;
-    char *copy = path != nullptr ? static_cast<char *>(malloc(room)) : nullptr;
-    if (copy == nullptr) {
-        __VarnekPGL_FileLog("%s : No Eixst Dir! [%s]", __func__, Shown(path));
-        return -1;
-    }
-    memcpy(copy, path, length + 1);
+    size_t length = path != nullptr ? strlen(path) : 0;
     if (length > 0 && (path[length - 1] == '/' || path[length - 1] == '\\')) {
-        copy[length - 1] = '\0';
+        length--;
     }
-    const int32_t result = TreeDeletion(copy).Run();
-    free(copy);
+    // With a final slash or "/." the system would follow a link.
+    size_t bare = length;
+    while (bare > 1 &&
+           (path[bare - 1] == '/' || (path[bare - 1] == '.' && path[bare - 2] == '/'))) {
+        bare--;
+    }
+    char *root = path != nullptr ? strndup(path, length) : nullptr;
+    char *entry = root != nullptr ? strndup(root, bare) : nullptr;
+    int32_t result = -1;
+    if (entry == nullptr) {
+        __VarnekPGL_FileLog("%s : No Eixst Dir! [%s]", __func__, Shown(path));
+    } else if (IsLink(AT_FDCWD, entry) && IsDirectory(entry)) {
+        result = RemoveAt(AT_FDCWD, entry) ? 0 : -1;
+    } else {
+        result = DeleteTree(root, OpenWithoutFollowing(AT_FDCWD, entry));
+    }
+    free(root);
+    free(entry);
     return result;
 }
 
@@ -320,18 +301,12 @@ BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttributes *attr) 
         return FALSE;
     }
     struct stat64 status = {};
-    int64_t size = 0;
-    if (path != nullptr && stat64(path, &status) == 0) {
-        size = status.st_size;
-    } else if (path != nullptr && errno == EOVERFLOW) {
-        // The file exists, but its times after 2038 do not fit the record of a 32-bit system.
-        size = VarnekPGL_GetFileSize64Bits(path);
-    } else {
+    if (path == nullptr || stat64(path, &status) != 0) {
         __VarnekPGL_FileLog("%s : failed...%s", __func__, Shown(path));
         return FALSE;
     }
     *attr = {};
-    attr->size = static_cast<uint32_t>(size);
+    attr->size = static_cast<uint32_t>(status.st_size);
     return TRUE;
 }
 
@@ -400,40 +375,15 @@ class ShellCommand {
     bool fits_ = true;
 };
 
-// Returns whether two paths may name the same file, without stat. If they name the same file, a
-// lock through one path prevents a lock through the other. It also returns true if a lock cannot be
-// taken for another reason.
-bool ShareALock(const char *a, const char *b) {
-    const int first = open(a, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
-    const int second = open(b, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
-    const bool apart = first >= 0 && second >= 0 && flock(first, LOCK_EX | LOCK_NB) == 0 &&
-                       flock(second, LOCK_EX | LOCK_NB) == 0;
-    for (const int fd : {first, second}) {
-        if (fd >= 0) {
-            close(fd);
-        }
-    }
-    return !apart;
-}
-
-// Whether two paths name the same file. On a 32-bit system stat fails when times after 2038 do not
-// fit its record. If the paths name the same file, it fails for both.
-bool IsSameFile(const char *a, const char *b) {
-    struct stat64 first = {};
-    struct stat64 second = {};
-    const int firstError = stat64(a, &first) == 0 ? 0 : errno;
-    const int secondError = stat64(b, &second) == 0 ? 0 : errno;
-    if (firstError == EOVERFLOW && secondError == EOVERFLOW) {
-        return ShareALock(a, b);
-    }
-    return firstError == 0 && secondError == 0 && first.st_dev == second.st_dev &&
-           first.st_ino == second.st_ino;
-}
-
 // Whether a copy may run. The shell empties the destination before it reads the source. So if the
 // source could not be read, or were the destination itself, the destination would lose its content.
 bool MayCopy(const char *source, const char *destination) {
-    return access(source, R_OK) == 0 && !IsDirectory(source) && !IsSameFile(source, destination);
+    struct stat64 from = {};
+    struct stat64 to = {};
+    if (access(source, R_OK) != 0 || stat64(source, &from) != 0 || S_ISDIR(from.st_mode)) {
+        return false;
+    }
+    return stat64(destination, &to) != 0 || from.st_dev != to.st_dev || from.st_ino != to.st_ino;
 }
 
 }  // namespace

@@ -1,7 +1,6 @@
 // Streams, and the log function of all file operations. No state is kept between calls.
 #include "Varnek_File.h"
 
-#include <errno.h>
 #include <limits.h>
 #include <stdarg.h>
 #include <stdio.h>
@@ -71,7 +70,8 @@ PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags) {
     return reinterpret_cast<PglFileHandle>(stream);
 }
 
-int32_t VarnekPGL_CloseFile(PglFileHandle hFile) {
+// Not inlined: g++ would warn that the number in the line is a pointer to a closed stream.
+__attribute__((noinline)) int32_t VarnekPGL_CloseFile(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
     if (stream == nullptr) {
         __VarnekPGL_FileLog("%s : NULL file pointer", __func__);
@@ -154,7 +154,9 @@ uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer, ui
 int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
     if (stream != nullptr) {
-        fflush(stream);  // ignored, because some systems refuse it for a read-only stream
+        // Makes the bytes written so far count, and ends the end-of-file state, so that a reader
+        // can follow a file that grows. A stream without a position refuses it.
+        (void)fseek(stream, 0, SEEK_CUR);
         const int64_t size = SizeOfRegularFile(stream);
         if (size >= 0) {
             return size <= INT32_MAX ? static_cast<int32_t>(size) : -1;
@@ -270,26 +272,13 @@ int32_t VarnekPGL_DeleteFile(const char *path) {
 
 // Whole files in memory --------------------------------------------------------------------------
 
-FileKind KindOfConfigFile(const char *path) {
-    struct stat64 status = {};
-    if (stat64(path, &status) != 0) {
-        // For any other error, the open will tell whether the file can be read. It can if the error
-        // is only that times after 2038 do not fit the record of a 32-bit system.
-        return errno == ENOENT ? FileKind::kMissing : FileKind::kReadable;
+char *ReadText(PglFileHandle file, uint32_t size, uint32_t *count) {
+    char *data = static_cast<char *>(malloc(size_t{size} + 1));
+    if (data != nullptr) {
+        *count = VarnekPGL_ReadFileByHandle(file, data, size);
+        data[*count] = '\0';
     }
-    if (!S_ISREG(status.st_mode)) {
-        return FileKind::kOdd;
-    }
-    return status.st_size <= kMaxConfigSize ? FileKind::kReadable : FileKind::kTooLarge;
-}
-
-FileText ReadText(PglFileHandle file, uint32_t size) {
-    FileText text = {static_cast<char *>(malloc(size_t{size} + 1)), 0};
-    if (text.data != nullptr) {
-        text.count = VarnekPGL_ReadFileByHandle(file, text.data, size);
-        text.data[text.count] = '\0';
-    }
-    return text;
+    return data;
 }
 
 char *ReadWholeFile(const char *path, int32_t size) {
@@ -297,11 +286,12 @@ char *ReadWholeFile(const char *path, int32_t size) {
     if (file == -1) {
         return nullptr;
     }
-    const FileText text = ReadText(file, static_cast<uint32_t>(size));
+    uint32_t count = 0;
+    char *data = ReadText(file, static_cast<uint32_t>(size), &count);
     VarnekPGL_CloseFile(file);
-    if (text.data != nullptr && text.count == static_cast<uint32_t>(size)) {
-        return text.data;
+    if (count == static_cast<uint32_t>(size)) {
+        return data;
     }
-    free(text.data);
+    free(data);
     return nullptr;
 }

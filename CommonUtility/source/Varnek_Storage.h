@@ -31,26 +31,9 @@ inline unsigned ShownHandle(intptr_t handle) {
     return static_cast<unsigned>(handle);
 }
 
-// The kind of file at the path of a configuration file. Only a readable one is opened: any other
-// could block its reader or use up the memory.
-enum class FileKind {
-    kMissing,
-    kReadable,  // probably; only an open can tell
-    kOdd,       // not a regular file
-    kTooLarge,  // more than kMaxConfigSize bytes
-};
-constexpr int64_t kMaxConfigSize = 1048576;
-FileKind KindOfConfigFile(const char *path);
-
-// The result of reading a whole file: `count` bytes and a NUL, in a block from malloc, which the
-// owner frees. `data` is null when there was no memory.
-struct FileText {
-    char *data;
-    uint32_t count;
-};
-
-// Reads up to `size` bytes from the stream's position.
-FileText ReadText(PglFileHandle file, uint32_t size);
+// Reads up to `size` bytes from the stream's position. Returns a block that the caller frees, with
+// a NUL after the `*count` bytes that were read; null when there is no memory.
+char *ReadText(PglFileHandle file, uint32_t size, uint32_t *count);
 
 // Reads a file of `size` bytes. Returns a block that the caller frees; null when there is no
 // memory, or the file has become shorter.

@@ -5,7 +5,6 @@
 #include <pthread.h>
 #include <semaphore.h>
 #include <signal.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 #include <sys/time.h>
 #include <time.h>
@@ -68,6 +67,11 @@ sem_t *HeldUp(sem_t *s) {
     return s;
 }
 
+int Nameless(int result, struct stat64 *file) {
+    file->st_nlink = 0;
+    return result;
+}
+
 }  // namespace
 
 // The library's call goes to __wrap_NAME, which hands it on to __real_NAME.
@@ -117,16 +121,21 @@ WRAP(ssize_t, -1, read, (int fd, void *to, size_t count), fd, to, count)
 WRAP(ssize_t, -1, write, (int fd, const void *from, size_t count), fd, from, count)
 WRAP(off64_t, -1, lseek64, (int fd, off64_t offset, int base), fd, offset, base)
 WRAP_POSIX(remove, (const char *path), path)
-WRAP_POSIX(rmdir, (const char *path), path)
+WRAP(char *, nullptr, strndup, (const char *text, size_t length), text, length)
 WRAP_POSIX(mkdir, (const char *path, mode_t mode), path, mode)
 WRAP(DIR *, nullptr, opendir, (const char *path), path)
 WRAP_POSIX(stat64, (const char *path, struct stat64 *info), path, info)
-WRAP_POSIX(lstat64, (const char *path, struct stat64 *info), path, info)
-WRAP_POSIX(openat, (int directory, const char *path, int flags), directory, path, flags)
+// With the error 0 it succeeds, and the file has lost its name since.
+WRAP(int, errno != 0 ? -1 : Nameless(__real_lstat64(p, s), s), lstat64, (const char *p, struct stat64 *s), p, s)
+WRAP_POSIX(openat, (int directory, const char *path, int flags, mode_t mode), directory, path, flags, mode)
 WRAP(DIR *, nullptr, fdopendir, (int fd), fd)
 WRAP_POSIX(unlinkat, (int directory, const char *path, int flags), directory, path, flags)
-WRAP_POSIX(rename, (const char *from, const char *to), from, to)
-WRAP_POSIX(flock, (int fd, int operation), fd, operation)
+WRAP_POSIX(renameat, (int fromDir, const char *from, int toDir, const char *to), fromDir, from, toDir, to)
+WRAP(ssize_t, -1, pread, (int fd, void *to, size_t count, off_t offset), fd, to, count, offset)
+WRAP(ssize_t, -1, pwrite, (int fd, const void *from, size_t count, off_t offset), fd, from, count, offset)
+WRAP_POSIX(ftruncate, (int fd, off_t size), fd, size)
+WRAP_POSIX(kill, (pid_t process, int number), process, number)
+WRAP_POSIX(fchown, (int fd, uid_t user, gid_t group), fd, user, group)
 WRAP_POSIX(fchmod, (int fd, mode_t mode), fd, mode)
 WRAP_POSIX(access, (const char *path, int mode), path, mode)
 WRAP_POSIX(fsync, (int fd), fd)
