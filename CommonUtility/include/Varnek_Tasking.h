@@ -43,8 +43,9 @@ class Limit {
     constexpr Limit(std::chrono::duration<Rep, Period> time) {
         const double exact = std::chrono::duration<double, std::milli>(time).count();
         if (exact < milliseconds_) {
-            const auto rounded = std::chrono::ceil<std::chrono::milliseconds>(time).count();
-            milliseconds_ = exact > 0 ? static_cast<uint32_t>(rounded) : 0;
+            const auto waited = exact > 0 ? time : time.zero();
+            const auto rounded = std::chrono::ceil<std::chrono::milliseconds>(waited);
+            milliseconds_ = static_cast<uint32_t>(rounded.count());
         }
     }
     static constexpr Limit None() { return {}; }
@@ -62,8 +63,7 @@ inline std::string Name(std::string_view text) {
     return text.find('\0') == text.npos ? std::string(text) : std::string(99, '?');
 }
 
-// What the threads and timers of a program or shared library have in common. It is never destroyed,
-// because timers may expire while the process exits.
+// Common to the objects of a program or shared library; never destroyed, as timers outlive main.
 struct Shared {
     struct Call {
         std::function<void()> function;
