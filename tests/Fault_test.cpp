@@ -8,6 +8,7 @@
 #include <cstring>
 #include <filesystem>
 #include <functional>
+#include <future>
 #include <memory>
 
 #include "Varnek_CBitInputStream.h"
@@ -18,12 +19,12 @@
 #include "Varnek_File.h"
 #include "Varnek_List.h"
 #include "Varnek_LngPack.h"
+#include "Varnek_Tasking.h"
 #include "Varnek_Time.h"
 #include "Varnek_Util.h"
 #include "support/FailingCalls.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"
-#include "support/Worker.h"
 
 namespace {
 
@@ -91,7 +92,9 @@ TEST_F(Fault, Messages) {
         FAULT("sem_wait", EINTR, receive(WAIT_FOREVER));
         FAULT("clock_gettime", EFAULT, receive(7));
     };
-    Worker(useOwnQueue).Wait();
+    std::atomic<bool> ended{false};
+    const varnek::Thread worker("worker", 256 * 1024, [&] { useOwnQueue(), ended = true; });
+    EXPECT_TRUE(Eventually([&ended] { return ended.load(); }));
     NOTE(VarnekPGL_DeleteThread(1));
 }
 

@@ -9,9 +9,9 @@
 #include <thread>
 
 #include "../CommonUtility/source/Varnek_SlotTable.h"
+#include "Varnek_Tasking.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"
-#include "support/Worker.h"
 
 namespace {
 
@@ -24,16 +24,17 @@ THREAD_MSG Message(char text) {
     return message;
 }
 
+constexpr uint32_t kStack = 256 * 1024;
+
 class Thread : public VarnekTest {};
 class MessageQueue : public VarnekTest {};
 
 TEST_F(Thread, HandlesNamesAndTheThreadsOwnView) {
     std::atomic<int32_t> seen{0};
     const std::string k31 = "a name of thirty-one characters";
-    Worker first([&seen] { seen = VarnekPGL_GetCurrentThread(); }, k31.c_str());
+    const varnek::Thread first(k31, kStack, [&seen] { seen = VarnekPGL_GetCurrentThread(); });
     EXPECT_EQ(first.Handle(), 1);
-    first.Wait();
-    EXPECT_EQ(seen, 1);
+    EXPECT_TRUE(Eventually([&seen] { return seen == 1; }));
     EXPECT_EQ(VarnekPGL_CreateThread("second", 1, 0, Nothing, nullptr), 2);
     for (const char *name : {k31.c_str(), "First", static_cast<const char *>(nullptr)}) {
         NOTE(VarnekPGL_GetThreadByName(name));
@@ -88,18 +89,21 @@ TEST_F(Thread, AWaitersRecordIsReplacedInAFullTable) {
 TEST_F(Thread, AThreadFindsItselfFirstOfAll) {
     std::atomic<int> missed{0};
     for (int i = 0; i < 2000; i++) {
-        Worker worker([&missed, i] {
+        varnek::Thread worker("worker", kStack, [&missed, i] {
             const THREAD_MSG message = {};
             const int32_t byName = VarnekPGL_GetThreadByName("worker");
             missed += byName == -1 || byName != VarnekPGL_GetCurrentThread() || !VarnekPGL_SendMessage(i + 1, &message);
         });
+        worker.Join();
     }
     EXPECT_EQ(missed, 0);
 }
 
 TEST_F(Thread, AThreadWithAnEndedThreadsSystemIdIsUnknown) {
     pthread_t ended{};
-    Worker([&ended] { ended = pthread_self(); }).Wait();
+    std::promise<void> known;
+    const varnek::Thread worker("worker", kStack, [&] { ended = pthread_self(), known.set_value(); });
+    known.get_future().wait();
     bool same = false;
     for (int i = 0; i < 100 && !same; i++) {
         std::thread([&same, ended] {
@@ -114,14 +118,14 @@ TEST_F(Thread, AThreadKnowsItselfToItsEnd) {
     static std::promise<int32_t> last;
     static pthread_key_t key;
     pthread_key_create(&key, [](void *) { last.set_value(VarnekPGL_GetCurrentThread()); });
-    Worker worker([] { pthread_setspecific(key, &key); });
-    const int32_t handle = worker.Handle();
-    EXPECT_EQ(last.get_future().get(), handle);
+    const varnek::Thread worker("worker", kStack, [] { pthread_setspecific(key, &key); });
+    EXPECT_EQ(last.get_future().get(), worker.Handle());
 }
 
 TEST_F(Thread, TheSystemKnowsTheNamesBeginning) {
     char name[32] = "";
-    Worker([&name] { pthread_getname_np(pthread_self(), name, sizeof name); }, "a name of more than 15").Wait();
+    const auto ask = [&name] { pthread_getname_np(pthread_self(), name, sizeof name); };
+    varnek::Thread("a name of more than 15", kStack, ask).Join();
     EXPECT_STREQ(name, "a name of more ");
 }
 
@@ -234,7 +238,7 @@ TEST_F(Thread, CallsFitASmallStack) {
 TEST_F(MessageQueue, UrgentMessagesOvertake) {
     std::string received;
     std::promise<void> sent;
-    Worker worker([&] {
+    varnek::Thread worker("worker", kStack, [&] {
         sent.get_future().wait();
         THREAD_MSG message;
         int32_t count = -1;
@@ -253,13 +257,13 @@ TEST_F(MessageQueue, UrgentMessagesOvertake) {
     }
     TakeLog();
     sent.set_value();
-    worker.Wait();
+    worker.Join();
     EXPECT_EQ(received, std::string(40, '2') + std::string(40, '1') + std::string(40, 'a') + std::string(40, 'b'));
     EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [110]"));
 }
 
 TEST_F(MessageQueue, APeekLeavesASignalBehind) {
-    Worker worker([] {
+    varnek::Thread worker("worker", kStack, [] {
         const THREAD_MSG sent = Message('m');
         THREAD_MSG message;
         int32_t count = -1;
@@ -273,6 +277,7 @@ TEST_F(MessageQueue, APeekLeavesASignalBehind) {
         EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_ReceiveMessage: Msg is NULL"));
         EXPECT_FALSE(VarnekPGL_ReceiveMessage(20, &message, &count));
     });
+    worker.Join();
 }
 
 TEST_F(MessageQueue, FailuresHaveTheirLineAndResult) {
@@ -292,7 +297,7 @@ TEST_F(MessageQueue, FailuresHaveTheirLineAndResult) {
 TEST_F(MessageQueue, ARemovalWakesTheWaiterAndNothingIsDestroyedUnderIt) {
     for (uint32_t timeout : {WAIT_FOREVER, 20000u}) {
         std::promise<void> waiting;
-        Worker worker([&] {
+        varnek::Thread worker("worker", kStack, [&] {
             THREAD_MSG message;
             int32_t count = 77;
             waiting.set_value();
@@ -306,7 +311,7 @@ TEST_F(MessageQueue, ARemovalWakesTheWaiterAndNothingIsDestroyedUnderIt) {
         EXPECT_EQ(next, handle + 1);
         const THREAD_MSG message = Message('n');
         EXPECT_TRUE(VarnekPGL_SendMessage(next, &message)) << "the next record gets no message";
-        worker.Wait();
+        worker.Join();
         TakeLog();
         VarnekPGL_DeleteThread(next);
         EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_DeleteThread : MsgQ is not empty!!size = [1]"));
@@ -329,17 +334,17 @@ TEST_F(MessageQueue, ALogFunctionMaySendAndReceiveBeforeTheWait) {
         EXPECT_TRUE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &received, &count));
         inside = false;
     };
-    Worker([] {
+    varnek::Thread("worker", kStack, [] {
         THREAD_MSG message = Message('m');
         int32_t count = -1;
         EXPECT_TRUE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count));
         EXPECT_EQ(message.data[0], 's');
-    }).Wait();
+    }).Join();
     gLogHook = nullptr;
 }
 
 TEST_F(MessageQueue, AMessageEndsATimedWait) {
-    Worker worker([] {
+    varnek::Thread worker("worker", kStack, [] {
         THREAD_MSG message;
         int32_t count = -1;
         const auto start = std::chrono::steady_clock::now();
@@ -351,6 +356,7 @@ TEST_F(MessageQueue, AMessageEndsATimedWait) {
     const THREAD_MSG message = Message('m');
     std::this_thread::sleep_for(std::chrono::milliseconds(100));
     EXPECT_TRUE(VarnekPGL_SendMessage(worker.Handle(), &message));
+    worker.Join();
 }
 
 }  // namespace

@@ -4,120 +4,77 @@
 //   counter    counts ticks, sends Show to the display, waits for Shown, and starts the timer again
 //   display    prints, and answers with Shown; a Quit ends it
 //
-// The threads find each other by name. All waits have a time-out, so the program ends whatever goes
+// The threads find each other by name. All waits have a limit, so the program ends whatever goes
 // wrong.
 #include <cstdio>
-#include <cstring>
 
-#include "Varnek_Semaphore.h"
-#include "Varnek_Thread.h"
-#include "Varnek_Timer.h"
+#include "Varnek_Tasking.h"
 
 namespace {
 
-enum Kind : int32_t { kTick, kShow, kShown, kQuit };
+using namespace std::chrono_literals;
+using varnek::Outcome;
 
 // The content of a message between these threads.
 struct Content {
-    Kind kind;
+    enum { kTick, kShow, kShown, kQuit } kind;
     int32_t round;
 };
-static_assert(sizeof(Content) <= sizeof(THREAD_MSG::data), "it has to fit");
 
 constexpr char kCounter[] = "counter";
 constexpr char kDisplay[] = "display";
 constexpr int32_t kRounds = 5;
-constexpr uint32_t kPace = 20;        // milliseconds
-constexpr uint32_t kPatience = 5000;  // milliseconds
-constexpr int32_t kPriority = 50;
+constexpr auto kPace = 20ms;
+constexpr auto kPatience = 5s;
 constexpr uint32_t kStackSize = 256 * 1024;
 
-int32_t hEnded = -1;  // one unit from each thread that ends
-bool gAllShown = false;
-
-bool Send(const char *szThreadName, Kind kind, int32_t round) {
-    const Content content = {kind, round};
-    THREAD_MSG message = {};
-    std::memcpy(message.data, &content, sizeof content);
-    return VarnekPGL_SendMessage(VarnekPGL_GetThreadByName(szThreadName), &message) != FALSE;
+bool SendTo(const char *szThreadName, const Content &content) {
+    return varnek::Send(VarnekPGL_GetThreadByName(szThreadName), content);
 }
 
-bool Receive(Content *content) {
-    THREAD_MSG message;
-    int32_t left = 0;
-    if (!VarnekPGL_ReceiveMessage(kPatience, &message, &left)) {
-        return false;
-    }
-    std::memcpy(content, message.data, sizeof *content);
-    return true;
-}
-
-// The callback only sends a message. It must not keep the timer service waiting, and a message
-// needs no lock.
-void OnTimer(uint32_t, void *) {
-    Send(kCounter, kTick, 0);
-}
-
-void *Count(void *argument) {
-    const uint32_t hTimer = *static_cast<const uint32_t *>(argument);
+// Sets `isComplete` after the last round.
+void Count(varnek::Timer *pace, bool *isComplete) {
+    // The callable only sends a message. It must not keep the timer service waiting, and a message
+    // needs no lock.
+    const auto tick = [] { SendTo(kCounter, {Content::kTick, 0}); };
+    Content content = {Content::kShown, 0};
     int32_t round = 0;
-    Content content = {kShown, 0};
     do {
-        const bool going = content.kind == kTick
-                               ? Send(kDisplay, kShow, ++round)
-                               : VarnekPGL_StartTimer(hTimer, kPace, OnTimer, nullptr) != FALSE;
-        if (!going || !Receive(&content)) {
+        const bool isGoing = content.kind == Content::kTick
+                                 ? SendTo(kDisplay, {Content::kShow, ++round})
+                                 : pace->Start(kPace, tick);
+        if (!isGoing || varnek::Receive(content, kPatience) != Outcome::kSuccess) {
             break;
         }
-    } while (content.kind != kShown || round < kRounds);
-    gAllShown = content.kind == kShown && round == kRounds;
-    Send(kDisplay, kQuit, round);
-    VarnekPGL_SignalSemaphore(hEnded);
-    return nullptr;
+    } while (content.kind != Content::kShown || round < kRounds);
+    *isComplete = content.kind == Content::kShown && round == kRounds;
+    SendTo(kDisplay, {Content::kQuit, round});
 }
 
-void *Display(void *) {
+void Display() {
     Content content = {};
-    while (Receive(&content) && content.kind == kShow) {
+    while (varnek::Receive(content, kPatience) == Outcome::kSuccess &&
+           content.kind == Content::kShow) {
         std::printf("round %d\n", static_cast<int>(content.round));
-        Send(kCounter, kShown, content.round);
+        SendTo(kCounter, {Content::kShown, content.round});
     }
-    VarnekPGL_SignalSemaphore(hEnded);
-    return nullptr;
 }
 
 }  // namespace
 
 int main() {
-    hEnded = VarnekPGL_CreateSemaphore("ended", 0);
-    const int32_t created = VarnekPGL_CreateTimer("pace");
-    static uint32_t hTimer;  // outlives the thread that reads it, however main ends
-    hTimer = static_cast<uint32_t>(created);
-    if (hEnded == -1 || created == -1) {
-        std::fputs("exchange: no semaphore or timer\n", stderr);
+    varnek::Timer pace("pace");
+    bool isComplete = false;
+    varnek::Thread display(kDisplay, kStackSize, Display);
+    varnek::Thread counter(kCounter, kStackSize, Count, &pace, &isComplete);
+    if (!pace || !display || !counter) {
+        std::fputs("exchange: no timer or thread\n", stderr);
         return 1;
     }
-    const int32_t hDisplay =
-        VarnekPGL_CreateThread(kDisplay, kPriority, kStackSize, Display, nullptr);
-    const int32_t hCounter =
-        VarnekPGL_CreateThread(kCounter, kPriority, kStackSize, Count, &hTimer);
-    if (hDisplay == -1 || hCounter == -1) {
-        std::fputs("exchange: no thread\n", stderr);
-        return 1;
-    }
-    bool ended = true;
-    for (int thread = 0; thread < 2; ++thread) {
-        ended = VarnekPGL_WaitSemaphore(hEnded, 2 * kPatience) != FALSE && ended;
-    }
-    if (!ended || !gAllShown) {
+    if (!counter.Join(2 * kPatience) || !display.Join(2 * kPatience) || !isComplete) {
         std::fputs("exchange: a message went missing\n", stderr);
         return 1;
     }
-    // The semaphore is not deleted, because a thread that has signalled may still be inside that
-    // call.
-    VarnekPGL_DeleteThread(hCounter);
-    VarnekPGL_DeleteThread(hDisplay);
-    VarnekPGL_DeleteTimer(hTimer);
     std::printf("%d rounds\n", static_cast<int>(kRounds));
     return 0;
 }
