@@ -1,0 +1,22 @@
+// The array operators of the device's library. The NDK's static C++ runtime keeps them in one object with the operators
+// that throw, and would bring its unwinder and demangler into the library, which needs neither.
+#include <stdlib.h>
+
+#include <new>
+
+namespace std {
+const nothrow_t nothrow{};
+}  // namespace std
+
+void *operator new[](size_t size, const std::nothrow_t &) noexcept {
+    return malloc(size);
+}
+
+void operator delete[](void *block) noexcept {
+    free(block);
+}
+
+// What the compiler calls where it knows the size.
+void operator delete[](void *block, size_t) noexcept {
+    free(block);
+}
