@@ -63,8 +63,6 @@ ROWS = [
     Row('calendar/from', 'time', 'calendar to seconds', (Peer('chrono', 'std::chrono', 1.3),), (45, 0)),
     Row('timer', 'timer', 'timer start + cancel',
         (Peer('raw', 'timer_settime twice', 1.1), Peer('bare', 'asks first', 1.1))),
-    Row('file/188', 'files', 'stream read, 188 bytes', (Peer('libc', 'fread', 1.05),)),
-    Row('file/64k', 'files', 'large-file read, 64 KiB', (Peer('libc', 'read', 1.05),)),
     *(Row(f'lateness/{state}_p{p}', 'lateness', f'lateness, {state}, p{p}',
           (Peer('raw', 'raw timer', 1.1), Peer('timerfd', 'timerfd')), wall=True)
       for state in ('idle', 'busy') for p in (50, 99)),

@@ -1,5 +1,5 @@
-// The array operators of the device's library. The NDK's static C++ runtime keeps them in one object with the operators
-// that throw, and would bring its unwinder and demangler into the library, which needs neither.
+// The array operators of the device's library. The NDK's static C++ runtime keeps them in one
+// object with the operators that throw, and would bring its unwinder and demangler along.
 #include <stdlib.h>
 
 #include <new>
