@@ -310,7 +310,7 @@ def count_ours(rows, library=ARM):
 
 
 def check():
-    version = output_of(ARM_COMPILER, '-dumpversion').split('.')[0]
+    version = output_of(ARM_COMPILER, '-dumpversion').split('.')[0].strip()
     recorded = {}
     for line in RECORD.read_text().splitlines():
         name, *numbers = line.split()
@@ -372,7 +372,7 @@ def record_counts():
     RECORD.write_text('\n'.join([
         '# What the ARM build executes for an operation: instructions, barriers, exclusive loads.',
         '# script/bench --record writes this file, script/bench --check compares.',
-        f'g++ {output_of(ARM_COMPILER, "-dumpversion").split(".")[0]}',
+        f'g++ {output_of(ARM_COMPILER, "-dumpversion").split(".")[0].strip()}',
         *(f'{name:<16}{numbers[0]:>7}{numbers[1]:>4}{numbers[2]:>4}' for name, numbers in ours.items()), '']))
     versions = [output_of(tool, '--version').splitlines()[0] for tool in (ARM_COMPILER, 'clang++', 'qemu-arm')]
     into_page('counts', [f'Counted on {datetime.date.today().isoformat()}: {"; ".join(versions)}.', '',

@@ -12,6 +12,8 @@ void *operator new[](size_t size, const std::nothrow_t &) noexcept {
     return malloc(size);
 }
 
+// The library calls no other form of new[].
+// NOLINTNEXTLINE(misc-new-delete-overloads)
 void operator delete[](void *block) noexcept {
     free(block);
 }
