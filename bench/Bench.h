@@ -1,5 +1,5 @@
 // Functions that the benchmarks share. Each program measures one area. A benchmark has the name
-// ROW:CONTENDER, and script/bench.py compares the contenders of a row. Times are wall-clock times.
+// ROW:CONTENDER, and script/bench compares the contenders of a row. Times are wall-clock times.
 #ifndef VARNEK_BENCH_H
 #define VARNEK_BENCH_H
 

@@ -1,5 +1,5 @@
-// Uses mutexes and semaphores by handle, in the first and the last slot of a full table. One thread
-// does so, or two threads at the same time with unrelated objects.
+// Uses mutexes and semaphores of a full table by handle, in one thread, and in two threads at the
+// same time with unrelated objects.
 #include <pthread.h>
 #include <semaphore.h>
 
@@ -7,7 +7,6 @@
 
 #include "Bench.h"
 #include "Varnek_Semaphore.h"
-#include "limit.h"
 
 namespace {
 
@@ -90,14 +89,6 @@ void BareMutex(benchmark::State &state) {
     }
 }
 
-void LibraryMutex(benchmark::State &state) {
-    pthread_mutex_t mutex = PTHREAD_MUTEX_INITIALIZER;
-    for (auto _ : state) {
-        benchmark::DoNotOptimize(LimitLock(&mutex));
-        benchmark::DoNotOptimize(LimitUnlock(&mutex));
-    }
-}
-
 void BareSemaphore(benchmark::State &state) {
     sem_t semaphore;
     sem_init(&semaphore, 0, 1);
@@ -122,21 +113,12 @@ void RegisterByName(const std::string &name, int fill, int slot) {
 void RegisterAll() {
     // The thread registry's mutex is in the first slot.
     RegisterByName("byname:ours", kSlots, 29);
-    for (const auto &[slot, place] : {std::pair{0, "first"}, std::pair{kSlots - 1, "last"}}) {
-        const std::string mutex = std::string("mutex/") + place + ":";
-        RegisterSlot(mutex + "ours", false, kSlots, slot);
-        bench::Add(mutex + "bare", BareMutex);
-        bench::Add(mutex + "limit", LibraryMutex);
-        const std::string semaphore = std::string("semaphore/") + place + ":";
-        RegisterSlot(semaphore + "ours", true, kSlots, slot);
-        bench::Add(semaphore + "bare", BareSemaphore);
-    }
-    const std::pair<int, const char *> pairs[] = {{1, "neighbours"}, {kSlots - 1, "apart"}};
-    for (const auto &[slot, place] : pairs) {
-        const std::string row = std::string("mutex2/") + place + ":";
-        RegisterTwo(row + "ours", 0, slot);
-        RegisterSlot(row + "onethread", false, kSlots, 0);
-    }
+    RegisterSlot("mutex/last:ours", false, kSlots, kSlots - 1);
+    bench::Add("mutex/last:bare", BareMutex);
+    RegisterSlot("semaphore/last:ours", true, kSlots, kSlots - 1);
+    bench::Add("semaphore/last:bare", BareSemaphore);
+    RegisterTwo("mutex/two:ours", 0, 1);
+    RegisterSlot("mutex/two:onethread", false, kSlots, 0);
     for (const int fill : {1, 10, kSlots}) {
         const std::string count = std::to_string(fill);
         RegisterSlot("grow_mutex/" + count + ":ours", false, fill, fill - 1);

@@ -1,11 +1,8 @@
 // Messages of 40 bytes, copied in and out: within a thread, one way between two threads, and back
 // and forth.
-#include <fcntl.h>
-#include <mqueue.h>
 #include <pthread.h>
 #include <semaphore.h>
 #include <string.h>
-#include <unistd.h>
 
 #include <memory>
 #include <thread>
@@ -40,12 +37,12 @@ class Ours {
 };
 
 // A block and a node for each message, a list, a mutex and a semaphore.
-class Limit {
+class Bare {
   public:
-    Limit() { sem_init(&count_, 0, 0); }
-    ~Limit() { sem_destroy(&count_); }
-    Limit(const Limit &) = delete;
-    Limit &operator=(const Limit &) = delete;
+    Bare() { sem_init(&count_, 0, 0); }
+    ~Bare() { sem_destroy(&count_); }
+    Bare(const Bare &) = delete;
+    Bare &operator=(const Bare &) = delete;
 
     void Own() {}
     bool Send(const THREAD_MSG &message) {
@@ -118,34 +115,6 @@ class GLib {
     GAsyncQueue *queue_ = g_async_queue_new();
 };
 #endif
-
-class PosixQueue {
-  public:
-    PosixQueue() {
-        // The length that the system allows by default.
-        mq_attr attributes = {};
-        attributes.mq_maxmsg = 10;
-        attributes.mq_msgsize = sizeof(THREAD_MSG);
-        const std::string name = "/varnek-bench-" + std::to_string(getpid());
-        queue_ = mq_open(name.c_str(), O_RDWR | O_CREAT, 0600, &attributes);
-        mq_unlink(name.c_str());
-    }
-    ~PosixQueue() { mq_close(queue_); }
-    PosixQueue(const PosixQueue &) = delete;
-    PosixQueue &operator=(const PosixQueue &) = delete;
-
-    void Own() {}
-    bool Send(const THREAD_MSG &message) {
-        return mq_send(queue_, reinterpret_cast<const char *>(&message), sizeof message, 0) == 0;
-    }
-    bool Receive(THREAD_MSG *message) {
-        return mq_receive(queue_, reinterpret_cast<char *>(message), sizeof *message, nullptr) ==
-               sizeof *message;
-    }
-
-  private:
-    mqd_t queue_;
-};
 
 template <typename Queue>
 void SameThread(benchmark::State &state) {
@@ -258,8 +227,7 @@ void Register(const std::string &contender) {
 
 void RegisterAll() {
     Register<Ours>("ours");
-    Register<Limit>("limit");
-    Register<PosixQueue>("mq");
+    Register<Bare>("bare");
 #ifdef HAVE_GLIB
     Register<GLib>("gasync");
 #else
@@ -268,9 +236,7 @@ void RegisterAll() {
     }
 #endif
     for (const int64_t length : {1, 10000, 1000000}) {
-        const std::string row = "grow_queue/" + std::to_string(length) + ":";
-        bench::Add(row + "ours", SameThread<Ours>)->Arg(length);
-        bench::Add(row + "limit", SameThread<Limit>)->Arg(length);
+        bench::Add("grow_queue/" + std::to_string(length) + ":ours", SameThread<Ours>)->Arg(length);
     }
 }
 

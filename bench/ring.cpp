@@ -11,9 +11,6 @@
 #include "Bench.h"
 #include "Varnek_CRingBuffer.h"
 
-#ifdef HAVE_BOOST
-#include <boost/circular_buffer.hpp>
-#endif
 #ifdef HAVE_JACK
 #include <jack/ringbuffer.h>
 #endif
@@ -47,7 +44,7 @@ class Lock {
 };
 
 // Two copies and a mutex.
-class Limit {
+class Bare {
   public:
     bool Write(const Packet &packet) {
         const Lock lock(&mutex_);
@@ -79,33 +76,6 @@ class Limit {
     std::vector<unsigned char> bytes_ = std::vector<unsigned char>(kSize);
     size_t write_ = 0, read_ = 0, used_ = 0;
 };
-
-#ifdef HAVE_BOOST
-class Boost {
-  public:
-    bool Write(const Packet &packet) {
-        const Lock lock(&mutex_);
-        if (ring_.reserve() < packet.size()) {
-            return false;
-        }
-        ring_.insert(ring_.end(), packet.begin(), packet.end());
-        return true;
-    }
-    bool Read(Packet *packet) {
-        const Lock lock(&mutex_);
-        if (ring_.size() < packet->size()) {
-            return false;
-        }
-        std::copy_n(ring_.begin(), packet->size(), packet->begin());
-        ring_.erase_begin(packet->size());
-        return true;
-    }
-
-  private:
-    pthread_mutex_t mutex_ = PTHREAD_MUTEX_INITIALIZER;
-    boost::circular_buffer<unsigned char> ring_{kSize};
-};
-#endif
 
 #ifdef HAVE_JACK
 class Jack {
@@ -205,23 +175,14 @@ void Register(const std::string &contender) {
     bench::Add("ring/two:" + contender, TwoThreads<Ring>);
 }
 
-[[maybe_unused]] void RegisterMissing(const std::string &contender) {
-    bench::AddMissing("ring/one:" + contender);
-    bench::AddMissing("ring/two:" + contender);
-}
-
 void RegisterAll() {
     Register<Ours>("ours");
-    Register<Limit>("limit");
-#ifdef HAVE_BOOST
-    Register<Boost>("boost");
-#else
-    RegisterMissing("boost");
-#endif
+    Register<Bare>("bare");
 #ifdef HAVE_JACK
     Register<Jack>("jack");
 #else
-    RegisterMissing("jack");
+    bench::AddMissing("ring/one:jack");
+    bench::AddMissing("ring/two:jack");
 #endif
 }
 

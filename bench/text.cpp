@@ -7,10 +7,6 @@
 #include "Bench.h"
 #include "Varnek_LngPack.h"
 
-#ifdef HAVE_ICU
-#include <unicode/ucnv.h>
-#endif
-
 namespace {
 
 std::string Text(size_t length) {
@@ -62,30 +58,6 @@ void Iconv(benchmark::State &state, const std::string &text) {
     bench::Require(state, SameAsOurs(text, buffer.data(), buffer.size() - room), "another text");
 }
 
-#ifdef HAVE_ICU
-void Icu(benchmark::State &state, const std::string &text) {
-    UErrorCode status = U_ZERO_ERROR;
-    UConverter *from = ucnv_open("ISO-8859-15", &status);
-    UConverter *to = ucnv_open("UTF-8", &status);
-    std::vector<char> buffer(text.size() * 3 + 1);
-    char *target = buffer.data();
-    for (auto _ : state) {
-        const char *source = text.data();
-        target = buffer.data();
-        ucnv_convertEx(to, from, &target, buffer.data() + buffer.size(), &source,
-                       text.data() + text.size(), nullptr, nullptr, nullptr, nullptr,
-                       /*reset*/ 1, /*flush*/ 1, &status);
-        benchmark::ClobberMemory();
-    }
-    ucnv_close(from);
-    ucnv_close(to);
-    bench::Require(state,
-                   U_SUCCESS(status) != 0 &&
-                       SameAsOurs(text, buffer.data(), static_cast<size_t>(target - buffer.data())),
-                   "another text");
-}
-#endif
-
 void Add(const std::string &name, size_t length,
          void (*run)(benchmark::State &, const std::string &)) {
     bench::Add(name, [length, run](benchmark::State &state) { run(state, Text(length)); });
@@ -96,15 +68,9 @@ void RegisterAll() {
         const std::string row = "text/" + std::to_string(length) + ":";
         Add(row + "ours", length, Ours);
         Add(row + "iconv", length, Iconv);
-#ifdef HAVE_ICU
-        Add(row + "icu", length, Icu);
-#else
-        bench::AddMissing(row + "icu");
-#endif
     }
-    for (const size_t length : {32u, 256u, 2048u, 16384u, 131072u}) {
+    for (const size_t length : {32u, 2048u, 131072u}) {
         Add("grow_text/" + std::to_string(length) + ":ours", length, Ours);
-        Add("grow_text/" + std::to_string(length) + ":iconv", length, Iconv);
     }
 }
 

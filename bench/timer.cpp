@@ -52,7 +52,7 @@ void Raw(benchmark::State &state) {
 void RegisterAll() {
     bench::Add("timer:ours", Ours);
     bench::Add("timer:raw", Raw<false>);
-    bench::Add("timer:limit", Raw<true>);
+    bench::Add("timer:bare", Raw<true>);
 }
 
 }  // namespace

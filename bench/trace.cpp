@@ -5,11 +5,10 @@
 
 #include "Bench.h"
 #include "Varnek_Debug.h"
-#include "limit.h"
+#include "bare.h"
 #include "varnek_platform.h"
 
 #ifdef HAVE_SPDLOG
-#include <spdlog/sinks/base_sink.h>
 #include <spdlog/sinks/null_sink.h>
 #include <spdlog/spdlog.h>
 #endif
@@ -40,10 +39,10 @@ void OursOn(benchmark::State &state) {
     }
 }
 
-void LimitOff(benchmark::State &state) {
+void BareOff(benchmark::State &state) {
     int i = 0;
     for (auto _ : state) {
-        LimitTrace(kOff, "section of table %d on pid %d", ++i, 18);
+        BareTrace(kOff, "section of table %d on pid %d", ++i, 18);
     }
 }
 
@@ -56,7 +55,7 @@ __attribute__((noinline, format(printf, 1, 2))) void Format(const char *format, 
     benchmark::DoNotOptimize(line);
 }
 
-void LimitOn(benchmark::State &state) {
+void BareOn(benchmark::State &state) {
     int i = 0;
     for (auto _ : state) {
         Format("[%c][%s-%4d] section of table %d on pid %d", 'E', "trace.cpp", __LINE__, ++i, 18);
@@ -107,15 +106,6 @@ spdlog::logger &Spdlog() {
     return *logger;
 }
 
-void SpdlogOff(benchmark::State &state) {
-    spdlog::logger &logger = Spdlog();
-    int i = 0;
-    for (auto _ : state) {
-        logger.debug("section of table {} on pid {}", ++i, 18);
-        benchmark::ClobberMemory();
-    }
-}
-
 // The null sink drops the message before a line is composed, so only the text is formatted.
 void SpdlogOn(benchmark::State &state) {
     spdlog::logger &logger = Spdlog();
@@ -125,26 +115,6 @@ void SpdlogOn(benchmark::State &state) {
     }
 }
 
-// Composes the line and then drops it, as the log function that the library calls does.
-class DiscardingSink final : public spdlog::sinks::base_sink<spdlog::details::null_mutex> {
-  protected:
-    void sink_it_(const spdlog::details::log_msg &message) override {
-        spdlog::memory_buf_t line;
-        formatter_->format(message, line);
-        benchmark::DoNotOptimize(line.data());
-    }
-    void flush_() override {}
-};
-
-void SpdlogLine(benchmark::State &state) {
-    spdlog::logger logger("SBTVD_COM", std::make_shared<DiscardingSink>());
-    logger.set_pattern("[%L][%s-%#] %v", spdlog::pattern_time_type::utc);
-    int i = 0;
-    for (auto _ : state) {
-        logger.log(spdlog::source_loc{__FILE__, __LINE__, ""}, spdlog::level::err,
-                   "section of table {} on pid {}", ++i, 18);
-    }
-}
 #endif
 
 void RegisterAll() {
@@ -157,26 +127,19 @@ void RegisterAll() {
             })->Threads(threads);
         };
         add("ours", OursOff);
-        add("limit", LimitOff);
+        add("bare", BareOff);
 #ifdef HAVE_ANDROID_LOG
         add("liblog", AndroidOff);
 #else
         bench::AddMissing(row + "liblog");
 #endif
-#ifdef HAVE_SPDLOG
-        add("spdlog", SpdlogOff);
-#else
-        bench::AddMissing(row + "spdlog");
-#endif
     }
     bench::Add("trace_on:ours", OursOn);
-    bench::Add("trace_on:limit", LimitOn);
+    bench::Add("trace_on:bare", BareOn);
 #ifdef HAVE_SPDLOG
     bench::Add("trace_on:spdlog", SpdlogOn);
-    bench::Add("trace_on:spdlog_line", SpdlogLine);
 #else
     bench::AddMissing("trace_on:spdlog");
-    bench::AddMissing("trace_on:spdlog_line");
 #endif
 }
 

@@ -1,13 +1,5 @@
-#!/usr/bin/env python3
-"""Defines the rows of script/bench with their peers and goals, and creates its table and charts.
-
-  bench.py list                       lists the names of the rows
-  bench.py areas [ROW...]             prints the programs that measure these rows, each with a filter
-  bench.py receiver TOP MIB RUNS OUT  measures the receiver of the build tree TOP, and ffprobe
-  bench.py table DIR [ROW...]         prints the results in DIR; fails when a row has no figure of ours
-  bench.py growth DIR                 prints how the cost grows
-  bench.py record DIR DOCS            writes the results to DOCS/performance.md and draws the charts next to it
-"""
+"""Defines what is measured, with the peers and the goals, and measures it: times on a PC, counts of what the ARM build
+executes under the emulator. script/bench builds the programs and describes the options."""
 import datetime
 import json
 import os
@@ -18,98 +10,135 @@ import subprocess
 import sys
 import time
 from pathlib import Path
+from typing import NamedTuple
 
 
-class Row:
-    """A row. Goals are (contender, label, highest ratio or None). `wall` measures wall-clock time."""
+class Peer(NamedTuple):
+    """What a row is compared with. The peer named 'bare' is no product but the least code that does the same work."""
+    name: str
+    title: str
+    goal: float | None = None  # our time on a PC divided by the peer's, at most
 
-    def __init__(self, name, area, title, *goals, wall=False):
-        self.name, self.area, self.title, self.goals, self.wall = name, area, title, goals, wall
+
+class Row(NamedTuple):
+    name: str
+    area: str  # the program bench_AREA measures it
+    title: str
+    peers: tuple = ()
+    device: tuple | None = None  # instructions and barriers of an operation on ARM, at most; without it only timed
+    turns: int = 4096  # operations of which a count is the average
+    wall: bool = False  # it waits for another thread or a timer, so that wall-clock time counts
 
 
+MESSAGE_LIST = 'mallocs, list, locks'
 ROWS = [
-    Row('crc/12', 'crc', 'CRC-32, 12 bytes', ('av_crc', 'av_crc', 1.1), ('dvbpsi', 'libdvbpsi', None),
-        ('boost', 'boost::crc', None), ('limit', 'limit: 16 tables inlined', 1.1)),
-    *[Row(f'crc/{n}', 'crc', f'CRC-32, {n} bytes', ('av_crc', 'av_crc', 0.55), ('dvbpsi', 'libdvbpsi', 0.2),
-          ('boost', 'boost::crc', 0.2), ('limit', 'limit: 16 tables inlined', 1.1)) for n in (184, 1024, 4096)],
-    Row('bits', 'bits', '1200 bit fields of PSI', ('gstreamer', 'gst_bit_reader', 0.8),
-        ('limit', 'limit: checked reader', 1.5)),
-    Row('ring/one', 'ring', 'ring, 188 bytes in and out', ('boost', 'circular_buffer', 0.5),
-        ('jack', 'JACK, no lock', None), ('limit', 'limit: memcpy, mutex', 1.8)),
-    Row('ring/two', 'ring', 'ring, 188 bytes, two threads', ('boost', 'circular_buffer', 0.85),
-        ('jack', 'JACK, no lock', None), ('limit', 'limit: memcpy, mutex', None), wall=True),
-    Row('message/same', 'messages', 'message, same thread', ('gasync', 'GAsyncQueue', 1.3),
-        ('mq', 'POSIX mq', 0.06), ('limit', 'limit: mallocs, list, locks', 2.0)),
-    Row('message/oneway', 'messages', 'message, one way', ('gasync', 'GAsyncQueue', 1.0),
-        ('mq', 'POSIX mq', None), ('limit', 'limit: mallocs, list, locks', 2.0), wall=True),
-    Row('message/pingpong1', 'messages', 'ping-pong on one core', ('gasync', 'GAsyncQueue', None),
-        ('mq', 'POSIX mq', 0.7), ('limit', 'limit: mallocs, list, locks', 2.0), wall=True),
-    Row('message/pingpong2', 'messages', 'ping-pong on two cores', ('gasync', 'GAsyncQueue', None),
-        ('mq', 'POSIX mq', 1.05), ('limit', 'limit: mallocs, list, locks', 2.0), wall=True),
-    *[Row(f'mutex/{slot}', 'locks', f'acquire + release, {slot} slot', ('bare', 'pthread mutex', 1.6),
-          ('limit', 'limit: library call', 1.3)) for slot in ('first', 'last')],
-    *[Row(f'mutex2/{where}', 'locks', f'two threads, {text}', ('onethread', 'one thread', 1.5))
-      for where, text in (('neighbours', 'adjacent slots'), ('apart', 'slots apart'))],
-    *[Row(f'semaphore/{slot}', 'locks', f'signal + wait, {slot} slot', ('bare', 'bare semaphore', 3.0))
-      for slot in ('first', 'last')],
-    Row('trace_off/one', 'trace', 'trace that is off', ('liblog', 'liblog, filtered', 0.6),
-        ('spdlog', 'spdlog, below level', None), ('limit', 'limit: masked call', 1.6)),
-    Row('trace_off/two', 'trace', 'trace that is off, two threads', ('liblog', 'liblog, filtered', None),
-        ('spdlog', 'spdlog, below level', None), ('limit', 'limit: masked call', None)),
-    Row('trace_on', 'trace', 'trace into nothing', ('spdlog', 'spdlog, null sink', 1.0),
-        ('spdlog_line', 'spdlog, whole line', None),
-        ('limit', 'limit: vsnprintf', None)),
-    Row('text/32', 'text', 'Latin-15 to UTF-8, 32 bytes', ('iconv', 'iconv', 0.7), ('icu', 'ICU', 0.7)),
-    Row('text/4096', 'text', 'Latin-15 to UTF-8, 4 KiB', ('iconv', 'iconv', 0.5), ('icu', 'ICU', 0.5)),
-    Row('calendar/to', 'time', 'seconds to calendar', ('libc', 'gmtime_r', 0.5), ('limit', 'limit: chrono', 1.3)),
-    Row('calendar/from', 'time', 'calendar to seconds', ('libc', 'timegm', 0.2), ('limit', 'limit: chrono', 1.3)),
-    Row('timer', 'timer', 'timer start + cancel', ('raw', 'timer_settime twice', 1.1),
-        ('limit', 'limit: asks first', 1.1)),
-    Row('file/188', 'files', 'stream read, 188 bytes', ('libc', 'fread', 1.05)),
-    Row('file/64k', 'files', 'large-file read, 64 KiB', ('libc', 'read', 1.05)),
-    *[Row(f'lateness/{state}_p{p}', 'lateness', f'lateness, {state}, p{p}', ('raw', 'raw timer', 1.1),
-          ('timerfd', 'timerfd', None), wall=True) for state in ('idle', 'busy') for p in (50, 99)],
-    *[Row(f'string/{what}', 'strings', f'string {what}', ('std', 'std::string', None))
-      for what in ('append', 'copy', 'compare')],
-    Row('receiver', 'receiver', 'receiver, 512 MiB', ('ffprobe', 'ffprobe, all packets', 1.0),
-        ('programs', 'ffprobe, first programs', 1.0), ('read', 'plain reading', None), wall=True),
+    Row('trace_off/one', 'trace', 'trace that is off',
+        (Peer('liblog', 'liblog, filtered', 0.6), Peer('bare', 'masked call', 1.6)), (26, 0)),
+    Row('trace_off/two', 'trace', 'trace that is off, two threads',
+        (Peer('liblog', 'liblog, filtered'), Peer('bare', 'masked call'))),
+    Row('trace_on', 'trace', 'trace into nothing', (Peer('spdlog', 'spdlog, null sink', 1.0), Peer('bare', 'vsnprintf'))),
+    Row('mutex/last', 'locks', 'mutex acquire + release by handle', (Peer('bare', 'pthread mutex', 1.6),), (140, 4)),
+    Row('mutex/two', 'locks', 'the same, two threads, adjacent slots', (Peer('onethread', 'one thread', 1.5),)),
+    Row('semaphore/last', 'locks', 'semaphore signal + wait', (Peer('bare', 'sem_post, sem_wait', 3.0),), (170, 4)),
+    Row('byname', 'locks', 'mutex by name, 31st of 40', (), (350, 4)),
+    Row('message/same', 'messages', 'send + receive, same thread',
+        (Peer('gasync', 'GAsyncQueue', 1.1), Peer('bare', MESSAGE_LIST, 2.0)), (900, 20)),
+    Row('message/oneway', 'messages', 'message, one way',
+        (Peer('gasync', 'GAsyncQueue', 0.9), Peer('bare', MESSAGE_LIST, 2.0)), wall=True),
+    Row('message/pingpong1', 'messages', 'ping-pong on one core',
+        (Peer('gasync', 'GAsyncQueue', 0.52), Peer('bare', MESSAGE_LIST, 2.0)), wall=True),
+    Row('message/pingpong2', 'messages', 'ping-pong on two cores',
+        (Peer('gasync', 'GAsyncQueue'), Peer('bare', MESSAGE_LIST, 2.0)), wall=True),
+    Row('crc/12', 'crc', 'CRC-32, 12 bytes', (Peer('av_crc', 'av_crc', 1.1),), (100, 0)),
+    Row('crc/184', 'crc', 'CRC-32, 184 bytes', (Peer('av_crc', 'av_crc', 0.55),), (930, 0)),
+    Row('crc/4096', 'crc', 'CRC-32, 4096 bytes', (Peer('av_crc', 'av_crc', 0.55),), (19400, 0), turns=512),
+    Row('ring/one', 'ring', 'ring, 188 bytes in and out',
+        (Peer('jack', 'JACK, no lock'), Peer('bare', 'memcpy, mutex', 1.8)), (520, 8)),
+    Row('ring/two', 'ring', 'ring, 188 bytes, two threads',
+        (Peer('jack', 'JACK, no lock'), Peer('bare', 'memcpy, mutex')), wall=True),
+    Row('bits', 'bits', '1200 bit fields of PSI', (Peer('gstreamer', 'gst_bit_reader', 0.8),), (38000, 0), turns=512),
+    Row('text/32', 'text', 'Latin-15 to UTF-8, 32 bytes', (Peer('iconv', 'iconv', 0.7),), (800, 0)),
+    Row('text/4096', 'text', 'Latin-15 to UTF-8, 4096 bytes', (Peer('iconv', 'iconv', 0.5),), (33000, 8), turns=512),
+    Row('calendar/to', 'time', 'seconds to calendar', (Peer('chrono', 'std::chrono', 1.3),), (200, 0)),
+    Row('calendar/from', 'time', 'calendar to seconds', (Peer('chrono', 'std::chrono', 1.3),), (45, 0)),
+    Row('timer', 'timer', 'timer start + cancel',
+        (Peer('raw', 'timer_settime twice', 1.1), Peer('bare', 'asks first', 1.1))),
+    *(Row(f'lateness/{state}_p{p}', 'lateness', f'lateness, {state}, p{p}',
+          (Peer('raw', 'raw timer', 1.1), Peer('timerfd', 'timerfd')), wall=True)
+      for state in ('idle', 'busy') for p in (50, 99)),
+    Row('receiver', 'receiver', 'receiver, 512 MiB',
+        (Peer('ffprobe', 'ffprobe, all packets', 1.0), Peer('programs', 'ffprobe, first programs', 1.0),
+         Peer('bare', 'plain reading')), wall=True),
 ]
 
-# The charts of growth. Each curve is (name, contender, label). `per` divides the time by the value on the x axis.
+# How the cost grows: what is counted, the rows NAME/SIZE, the contender, and whether the time is divided by the size.
 GROWTH = [
-    ('fill', 'locks', 'Objects in the table', 'ns an operation', False,
-     (('grow_mutex', 'ours', 'mutex acquire + release'), ('grow_semaphore', 'ours', 'semaphore signal + wait'),
-      ('grow_byname', 'ours', 'mutex by name, the last one'))),
-    ('queue', 'messages', 'Messages in the queue', 'ns a message', False,
-     (('grow_queue', 'ours', 'send + receive'), ('grow_queue', 'limit', 'limit: mallocs, list, locks'))),
-    ('length', 'text crc bits', 'Bytes', 'ns a byte', True,
-     (('grow_text', 'ours', 'Latin-15 to UTF-8'), ('grow_text', 'iconv', 'the same, by iconv'),
-      ('grow_crc', 'ours', 'CRC-32'), ('grow_bits', 'ours', 'bit fields'))),
+    ('mutex acquire + release, by objects in the table', 'grow_mutex', 'ours', False),
+    ('semaphore signal + wait', 'grow_semaphore', 'ours', False),
+    ('mutex by name, the last one', 'grow_byname', 'ours', False),
+    ('send + receive, by messages in the queue', 'grow_queue', 'ours', False),
+    ('a byte of Latin-15 to UTF-8, by bytes', 'grow_text', 'ours', True),
+    ('a byte of CRC-32', 'grow_crc', 'ours', True),
+    ('a byte of bit fields', 'grow_bits', 'ours', True),
 ]
-# An operation in one thread, and in each of two threads at the same time.
-THREADS = [
-    ('mutexes in adjacent slots', ('mutex2/neighbours', 'onethread'), ('mutex2/neighbours', 'ours')),
-    ('mutexes in slots far apart', ('mutex2/apart', 'onethread'), ('mutex2/apart', 'ours')),
-    *[(f'trace that is off, {label}', ('trace_off/one', who), ('trace_off/two', who)) for who, label in
-      (('ours', 'ours'), ('limit', 'masked call'), ('liblog', 'liblog'), ('spdlog', 'spdlog'))],
-]
-AREAS = list(dict.fromkeys(row.area for row in ROWS))
+
+PC, ARM, CLANG = Path('build/release'), Path('build/arm'), Path('build/arm-clang')
+RESULTS, TOP, PAGE = Path('build/bench'), Path('build/device'), Path('docs/performance.md')
+PEERS, RECORD = Path('build/device/root').absolute(), Path('bench/device/counts.txt')
+ARM_COMPILER = 'arm-linux-gnueabihf-g++'
 
 
 def chosen(prefixes):
-    rows = [row for row in ROWS if not prefixes or any(row.name.startswith(prefix) for prefix in prefixes)]
+    rows = [row for row in ROWS if not prefixes or row.name.startswith(tuple(prefixes))]
     return rows or sys.exit(f'no such row: {" ".join(prefixes)}')
 
 
-# What was measured ----------------------------------------------------------------------------------
+def output_of(*command):
+    return subprocess.run(command, check=True, capture_output=True, text=True).stdout
+
+
+# Tables ---------------------------------------------------------------------------------------------
+
+
+def compared(peer, cost, ratio):
+    """Returns the cells of a comparison. Bare code is a limit only where it is faster than the library."""
+    kind = '' if peer.name != 'bare' or ratio is None else 'limit: ' if ratio >= 1 else 'baseline: '
+    return kind + peer.title, cost, '' if ratio is None else f'{ratio:.2f}'
+
+
+def blocks(table):
+    """Yields the lines of a table of (leading cells, lines of a row); only the first line shows the leading cells."""
+    for leading, lines in table:
+        for number, line in enumerate(lines):
+            yield (*(leading if number == 0 else [''] * len(leading)), *line)
+
+
+def printed(table):
+    widths = [max(map(len, column)) for column in zip(*table)]
+    for line in table:
+        print('  '.join(f'{cell:<{width}}' for cell, width in zip(line, widths)).rstrip())
+
+
+def marked_down(head, *rest):
+    for line in (head, ['---'] * len(head), *rest):
+        yield '| ' + ' | '.join({'MISSED': '**missed**'}.get(cell, cell).replace('<= ', '≤ ') for cell in line) + ' |'
+
+
+def into_page(name, lines):
+    begin, end = f'<!-- {name}: script/bench --record -->', f'<!-- end of {name} -->'
+    head, rest = PAGE.read_text().split(begin, 1)
+    PAGE.write_text('\n'.join([head + begin, *lines, end + rest.split(end, 1)[1]]))
+
+
+# Times ----------------------------------------------------------------------------------------------
 
 
 class Figures:
     """Nanoseconds of each repetition, by row and contender."""
 
-    def __init__(self, directory):
+    def __init__(self):
         self.wall, self.cpu, self.errors = {}, {}, {}
-        for path in sorted(Path(directory).glob('*.json')):
+        for path in sorted(RESULTS.glob('*.json')):
             for run in json.loads(path.read_text())['benchmarks']:
                 if run['run_type'] == 'iteration':
                     self.add(run)
@@ -128,98 +157,26 @@ class Figures:
         self.wall.setdefault(key, []).append(wall * run.get('threads', 1))
         self.cpu.setdefault(key, []).append(run.get('cpu_time', wall) * scale)
 
-    def of(self, row, contender, wall):
-        return (self.wall if wall else self.cpu).get((row, contender), [])
+    def of(self, row, contender):
+        return (self.wall if row.wall else self.cpu).get((row.name, contender), [])
 
 
 def shown(ns):
-    for unit, factor in (('ns', 1), ('µs', 1e3), ('ms', 1e6), ('s', 1e9)):
-        if abs(ns) < 1000 * factor or unit == 's':
-            value = ns / factor
-            return f'{value:.{2 if value < 10 else 1 if value < 100 else 0}f} {unit}'
-    return ''
+    unit, factor = next((pair for pair in (('ns', 1), ('µs', 1e3), ('ms', 1e6)) if ns < 1000 * pair[1]), ('s', 1e9))
+    value = ns / factor
+    return f'{value:.{2 if value < 10 else 1 if value < 100 else 0}f} {unit}'
 
 
-def spread(samples):
-    return f'{shown(min(samples))} to {shown(max(samples))}'
-
-
-def lines(figures):
-    """Yields (row, ours, spread, peer, time, ratio, goal, verdict) for each pair that was measured."""
-    for row in ROWS:
-        ours = figures.of(row.name, 'ours', row.wall)
-        if not ours:
-            continue
-        for contender, label, goal in row.goals:
-            theirs = figures.of(row.name, contender, row.wall)
-            head = row.title, shown(statistics.median(ours)), spread(ours), label
-            wanted = f'<= {goal}' if goal else ''
-            if not theirs:
-                yield *head, figures.errors.get((row.name, contender), 'not measured'), '', wanted, ''
-                continue
-            ratio = statistics.median(ours) / statistics.median(theirs)
-            verdict = '' if not goal else 'met' if round(ratio, 2) <= goal else 'MISSED'
-            yield *head, shown(statistics.median(theirs)), f'{ratio:.2f}', wanted, verdict
-
-
-HEAD = ('row', 'ours', 'range', 'peer', 'its cost', 'ratio', 'goal', '')
-
-
-def named_once(table):
-    """Yields the lines of a table, with the title and our time only in the first line of each row."""
-    last = None
-    for line in table:
-        yield ['', '', '', *line[3:]] if line[0] == last else list(line)
-        last = line[0]
-
-
-def score(table):
-    verdicts = [line[-1] for line in table]
-    return f'{verdicts.count("met")} goals met, {verdicts.count("MISSED")} missed'
-
-
-def print_table(figures, prefixes):
-    table = [HEAD, *lines(figures)]
-    widths = [max(len(line[i]) for line in table) for i in range(len(HEAD))]
-    for fields in named_once(table):
-        print('  '.join(f'{field:<{width}}' for field, width in zip(fields, widths)).rstrip())
-    print(score(table))
-    absent = [row.name for row in chosen(prefixes) if not figures.of(row.name, 'ours', row.wall)]
-    if absent:
-        sys.exit(f'rows without a figure of ours: {", ".join(absent)}')
-
-
-def curves(figures, chart):
-    _, _, _, _, per, names = chart
-    for name, contender, label in names:
-        points = {}
-        for (row, who), samples in figures.cpu.items():
-            if who == contender and row.startswith(name + '/'):
-                x = int(row.split('/')[1])
-                points[x] = statistics.median(samples) / (x if per else 1)
-        if points:
-            yield label, sorted(points.items())
-
-
-def print_growth(figures):
-    for chart in GROWTH:
-        for label, points in curves(figures, chart):
-            print(f'{label}, {chart[3]}: ' + ', '.join(f'{y:.3g} at {x}' for x, y in points))
-
-
-# The receiver ---------------------------------------------------------------------------------------
-
-
-def measure_receiver(top, megabytes, runs, out):
-    sample = Path(top, 'samples/sample.ts').read_bytes()
-    directory = '/dev/shm' if os.access('/dev/shm', os.W_OK) else str(Path(out).parent)
-    stream = Path(directory, f'varnek-bench-{os.getpid()}.ts')
+def measure_receiver(megabytes, runs):
+    sample = (PC / 'samples/sample.ts').read_bytes()
+    directory = Path('/dev/shm') if os.access('/dev/shm', os.W_OK) else RESULTS
+    stream = directory / f'varnek-bench-{os.getpid()}.ts'
     probe = ['ffprobe', '-v', 'quiet', '-show_programs']
     contenders = {
-        'ours': [f'{top}/bin/receiver', '--quiet', '--json', str(stream)],
-        'ffprobe': [*probe, '-count_packets', str(stream)],
-        'programs': [*probe, str(stream)],
-        'read': ['dd', f'if={stream}', 'of=/dev/null', 'bs=64K', 'status=none'],
+        'ours': [PC / 'bin/receiver', '--quiet', '--json', stream],
+        'ffprobe': [*probe, '-count_packets', stream],
+        'programs': [*probe, stream],
+        'bare': ['dd', f'if={stream}', 'of=/dev/null', 'bs=64K', 'status=none'],
     }
     results = []
     try:
@@ -229,134 +186,216 @@ def measure_receiver(top, megabytes, runs, out):
         for _ in range(runs):
             for contender, command in contenders.items():
                 result = {'run_type': 'iteration', 'name': f'receiver:{contender}', 'time_unit': 's'}
-                before = resource.getrusage(resource.RUSAGE_CHILDREN)
                 start = time.monotonic()
                 try:
                     subprocess.run(command, check=True, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
                                    stderr=subprocess.DEVNULL)
+                    result['real_time'] = time.monotonic() - start
                 except FileNotFoundError:
                     result |= {'error_occurred': True, 'error_message': 'not installed'}
-                else:
-                    result['real_time'] = time.monotonic() - start
-                    after = resource.getrusage(resource.RUSAGE_CHILDREN)
-                    result['cpu_time'] = (after.ru_utime + after.ru_stime - before.ru_utime - before.ru_stime)
                 results.append(result)
-        size = stream.stat().st_size
     finally:
         stream.unlink(missing_ok=True)
-    Path(out).write_text(json.dumps({'benchmarks': results, 'bytes': size}, indent=1))
+    (RESULTS / 'receiver.json').write_text(json.dumps({'benchmarks': results}))
 
 
-# Charts ---------------------------------------------------------------------------------------------
+def run_programs(prefixes, brief):
+    """Leaves the figures of the rows in build/bench/, in Google Benchmark's format."""
+    for path in RESULTS.glob('*.json'):
+        path.unlink()
+    RESULTS.mkdir(parents=True, exist_ok=True)
+    for area in dict.fromkeys(row.area for row in chosen(prefixes)):
+        print(f'==> Measuring {area}', flush=True)
+        out, program = RESULTS / f'{area}.json', PC / f'bin/bench_{area}'
+        if area == 'receiver':
+            measure_receiver(*((1, 1) if brief else (512, 7)))
+        elif area == 'lateness':
+            out.write_text(output_of(program, *(('1', '5') if brief else ('5', '200'))))
+        else:
+            names = '|'.join(row.name for row in chosen(prefixes) if row.area == area)
+            subprocess.run([program, '--benchmark_filter=' + (f'^({names}):' if prefixes else '.'),
+                            f'--benchmark_min_time={0.001 if brief else 0.06}',
+                            f'--benchmark_repetitions={1 if brief else 9}',
+                            '--benchmark_enable_random_interleaving=true',
+                            f'--benchmark_out={out}', '--benchmark_out_format=json'],
+                           check=True, stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
 
 
-def growth_chart(figures, chart, path):
-    name, _, xlabel, ylabel, per, _ = chart
-    drawn = list(curves(figures, chart))
-    if not drawn:
-        return
-    import matplotlib  # only a recording needs it
-    matplotlib.use('svg')
-    from matplotlib import pyplot, ticker
-    # Makes the file the same for the same figures.
-    pyplot.rcParams.update({'svg.fonttype': 'none', 'svg.hashsalt': name, 'font.family': 'sans-serif'})
-    figure, axes = pyplot.subplots(figsize=(7.2, 3.6), layout='constrained')
-    for label, points in drawn:
-        axes.plot(*zip(*points), marker='o', markersize=4, label=label)
-    axes.set_xscale('log')
-    axes.set_xticks([x for x, _ in drawn[0][1]])
-    axes.xaxis.set_major_formatter('{x:.0f}')
-    if per:  # the prices for a byte differ a lot
-        axes.set_yscale('log')
-        axes.yaxis.set_major_locator(ticker.LogLocator(subs=(1, 2, 5)))
-        axes.yaxis.set_major_formatter('{x:g}')
-    else:
-        axes.set_ylim(bottom=0)
-    axes.minorticks_off()
-    axes.set_xlabel(f'{xlabel} (logarithmic)')
-    axes.set_ylabel(ylabel + (' (logarithmic)' if per else ''))
-    axes.grid(alpha=0.4)
-    axes.legend()
-    figure.savefig(path, metadata={'Date': None, 'Title': f'{ylabel} against {xlabel.lower()}'})
+TIME_HEAD = ('operation', 'ours', 'range', 'peer', 'its cost', 'ratio', 'goal', '')
 
 
-# The document ---------------------------------------------------------------------------------------
+def time_table(figures, rows):
+    for row in rows:
+        ours = figures.of(row, 'ours')
+        if not ours:
+            sys.exit(f'no time of ours for {row.name}: {figures.errors.get((row.name, "ours"), "not measured")}')
+        lines = []
+        for peer in row.peers:
+            theirs = figures.of(row, peer.name)
+            ratio = statistics.median(ours) / statistics.median(theirs) if theirs else None
+            cost = shown(statistics.median(theirs)) if theirs else figures.errors.get((row.name, peer.name), 'not measured')
+            judged = peer.goal is not None and ratio is not None
+            lines.append((*compared(peer, cost, ratio), f'<= {peer.goal}' if peer.goal else '',
+                          ('met' if round(ratio, 2) <= peer.goal else 'MISSED') if judged else ''))
+        yield ((row.title, shown(statistics.median(ours)), f'{shown(min(ours))} to {shown(max(ours))}'),
+               lines or [[''] * 5])
 
 
-def processor():
-    for line in Path('/proc/cpuinfo').read_text().splitlines():
-        if line.startswith('model name'):
-            return line.split(':', 1)[1].strip()
-    return platform.machine()
+def score(table):
+    verdicts = [line[-1] for line in table]
+    return f'{verdicts.count("met")} goals met, {verdicts.count("MISSED")} missed'
 
 
-def section(directory, figures):
-    table = list(lines(figures))
-    compiler = subprocess.run(['g++', '--version'], capture_output=True, text=True, check=True).stdout.splitlines()[0]
-    yield (f'Measured on {datetime.date.today().isoformat()}: {processor()}, {os.cpu_count()} cores, '
-           f'Linux {platform.release().split("-")[0]}, {compiler}.')
-    yield f'{score(table)}.'
-    yield ''
-    yield '| ' + ' | '.join(HEAD) + ' |'
-    yield '|---|---|---|---|---|---|---|---|'
-    for fields in named_once(table):
-        fields[-1] = {'MISSED': '**missed**'}.get(fields[-1], fields[-1])
-        yield '| ' + ' | '.join(field.replace('<= ', '≤ ') for field in fields) + ' |'
-    yield ''
-    yield '| operation | time in one thread alone | time in each of two threads at once |'
-    yield '|---|---|---|'
-    for label, *names in THREADS:
-        pair = [figures.of(*name, False) for name in names]
-        if all(pair):
-            yield '| ' + ' | '.join([label, *(shown(statistics.median(samples)) for samples in pair)]) + ' |'
-    path = Path(directory, 'receiver.json')
-    if path.exists():
-        size = json.loads(path.read_text())['bytes']
-        labels = {'ours': 'the receiver', 'ffprobe': 'ffprobe (all packets)', 'read': 'plain reading'}
-        speed = {who: size / statistics.median(figures.wall['receiver', who]) * 1e3
-                 for who in labels if ('receiver', who) in figures.wall}
-        yield ''
-        yield ('Speeds of reading the stream: ' +
-               ', '.join(f'{labels[who]} {value:.0f} MB/s' for who, value in speed.items()) +
-               f'. The receiver reaches {100 * speed["ours"] / speed["read"]:.1f} % of plain reading.')
+def growth(figures):
+    for title, name, contender, per in GROWTH:
+        points = {}
+        for (row, who), samples in figures.cpu.items():
+            if who == contender and row.startswith(name + '/'):
+                size = int(row.split('/')[1])
+                points[size] = statistics.median(samples) / (size if per else 1)
+        yield title, ', '.join(f'{shown(ns)} at {size}' for size, ns in sorted(points.items()))
 
 
-def record(directory, docs):
-    figures = Figures(directory)
-    for chart in GROWTH:
-        growth_chart(figures, chart, Path(docs, f'performance-{chart[0]}.svg'))
-    page = Path(docs, 'performance.md')
-    begin, end = '<!-- results: script/bench --record -->', '<!-- end of results -->'
-    text = page.read_text()
-    head, rest = text.split(begin, 1)
-    page.write_text(head + begin + '\n' + '\n'.join(section(directory, figures)) + '\n' + end + rest.split(end, 1)[1])
+def print_times(prefixes, brief=False):
+    run_programs(prefixes, brief)
+    figures = Figures()
+    table = list(blocks(time_table(figures, chosen(prefixes))))
+    printed([TIME_HEAD, *table])
+    print(score(table))
+    if not prefixes:
+        printed(list(growth(figures)))
 
 
-def print_areas(prefixes):
-    for area in AREAS:
-        names = [row.name for row in chosen(prefixes) if row.area == area]
-        if names:
-            # Google Benchmark expects an extended regular expression.
-            print(area, '.' if not prefixes else '^(' + '|'.join(names) + '):')
+def record_times():
+    run_programs([], brief=False)
+    figures = Figures()
+    table = list(blocks(time_table(figures, ROWS)))
+    models = (line.split(':', 1)[1].strip() for line in Path('/proc/cpuinfo').read_text().splitlines()
+              if line.startswith('model name'))
+    into_page('times', [
+        f'Measured on {datetime.date.today().isoformat()}: {next(models, platform.machine())}, {os.cpu_count()} cores, '
+        f'Linux {platform.release().split("-")[0]}, {output_of("g++", "--version").splitlines()[0]}.',
+        f'{score(table)}.', '', *marked_down(TIME_HEAD, *table)])
+    into_page('growth', marked_down(('operation', 'median time'), *growth(figures)))
 
 
-def main(arguments):
-    match arguments:
-        case ['list']:
-            for row in ROWS:
-                print(f'{row.name:<20}{row.title}')
-        case ['areas', *prefixes]:
-            print_areas(prefixes)
-        case ['receiver', top, megabytes, runs, out]:
-            measure_receiver(top, int(megabytes), int(runs), out)
-        case ['table', directory, *prefixes]:
-            print_table(Figures(directory), prefixes)
-        case ['growth', directory]:
-            print_growth(Figures(directory))
-        case ['record', directory, docs]:
-            record(directory, docs)
-        case _:
-            sys.exit(__doc__)
+# Counts ---------------------------------------------------------------------------------------------
 
 
-main(sys.argv[1:])
+def build_plugin():
+    TOP.mkdir(parents=True, exist_ok=True)
+    subprocess.run(['gcc', '-O2', '-Wall', '-Wextra', '-Wpedantic', '-Werror', '-shared', '-fPIC', '-fvisibility=hidden',
+                    '-o', TOP / 'count.so', 'bench/device/count.c'], check=True)
+
+
+def count(row, contender, library=ARM):
+    """Returns what an operation executes on average between the marks of a run, or why there is no count."""
+    out = TOP / 'count.txt'
+    out.unlink(missing_ok=True)
+    paths = [library.absolute() / 'lib', *(PEERS / top / 'lib/arm-linux-gnueabihf' for top in ('usr', '.'))]
+    run = subprocess.run(
+        ['setarch', '-R', 'qemu-arm', '-plugin', f'{TOP}/count.so,out={out}', '-L', '/usr/arm-linux-gnueabihf',
+         ARM / 'bin' / f'bench_{row.area}', f'{row.name}:{contender}', str(row.turns)],
+        env={'PATH': os.environ['PATH'], 'LD_LIBRARY_PATH': ':'.join(map(str, paths))},
+        stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True, check=False)
+    if run.returncode == 0 and out.exists():
+        return tuple(round(int(executed) / row.turns) for executed in out.read_text().split())
+    if contender == 'ours':
+        sys.exit(f'{row.name} could not be counted: {run.stderr}')
+    return run.stderr.strip()
+
+
+def count_ours(rows, library=ARM):
+    return {row.name: count(row, 'ours', library) for row in rows if row.device}
+
+
+def check():
+    version = output_of(ARM_COMPILER, '-dumpversion').split('.')[0].strip()
+    recorded = {}
+    for line in RECORD.read_text().splitlines():
+        name, *numbers = line.split()
+        if name == 'g++' and numbers != [version]:
+            print(f'==> Nothing to compare: this is g++ {version}, and the record was made with g++ {numbers[0]}')
+            return
+        if name not in ('#', 'g++'):
+            recorded[name] = tuple(map(int, numbers))
+    counted = count_ours(ROWS)
+    renew = 'script/bench --record updates the record'
+    if recorded.keys() != counted.keys():
+        sys.exit(f'{RECORD} has other rows: {" ".join(recorded.keys() ^ counted.keys())}; {renew}')
+    worse = [f'{name}: {kind} {now}, recorded {then}'
+             for name in counted
+             for kind, now, then, leave in zip(('instructions', 'barriers', 'exclusive loads'), counted[name],
+                                               recorded[name], (1.02, 1, 1))
+             if now > then * leave]
+    if worse:
+        sys.exit('\n'.join([*worse, f'The device would execute more than before. If that is intended, {renew}.']))
+    print(f'{len(counted)} rows, none above {RECORD}')
+
+
+def spaced(number):
+    return f'{number:,}'.replace(',', ' ')
+
+
+def executed(numbers):
+    return f'{spaced(numbers[0])} / {numbers[1]}'
+
+
+COUNT_HEAD = ('operation', 'g++', 'clang', 'goal', '', 'peer', 'its cost', 'ratio')
+
+
+def count_table(ours, clang, prefixes):
+    for row in chosen(prefixes):
+        if not row.device:
+            continue
+        now = ours[row.name]
+        met = all(count <= most for count, most in zip(now, row.device))
+        costs = {peer: count(row, peer.name) for peer in row.peers}
+        yield ((row.title, executed(now), executed(clang[row.name]), f'<= {executed(row.device)}',
+                'met' if met else 'MISSED'),
+               [compared(peer, executed(cost), now[0] / cost[0])
+                for peer, cost in costs.items() if isinstance(cost, tuple)] or [[''] * 3])
+    if not prefixes:
+        sizes = [tuple(map(int, output_of('script/check-library', '--size', path / 'lib/libvarnekutils_ltn.so').split()))
+                 for path in (ARM, CLANG)]
+        yield (('text and data', *(f'{spaced(size)} bytes' for size, _ in sizes), f'<= {spaced(sizes[0][1])}',
+                'met' if all(size <= most for size, most in sizes) else 'MISSED'), [[''] * 3])
+
+
+def print_counts(prefixes):
+    ours, clang = (count_ours(chosen(prefixes), library) for library in (ARM, CLANG))
+    printed([COUNT_HEAD, *blocks(count_table(ours, clang, prefixes))])
+
+
+def record_counts():
+    ours, clang = (count_ours(ROWS, library) for library in (ARM, CLANG))
+    RECORD.write_text('\n'.join([
+        '# What the ARM build executes for an operation: instructions, barriers, exclusive loads.',
+        '# script/bench --record writes this file, script/bench --check compares.',
+        f'g++ {output_of(ARM_COMPILER, "-dumpversion").split(".")[0].strip()}',
+        *(f'{name:<16}{numbers[0]:>7}{numbers[1]:>4}{numbers[2]:>4}' for name, numbers in ours.items()), '']))
+    versions = [output_of(tool, '--version').splitlines()[0] for tool in (ARM_COMPILER, 'clang++', 'qemu-arm')]
+    into_page('counts', [f'Counted on {datetime.date.today().isoformat()}: {"; ".join(versions)}.', '',
+                         *marked_down(COUNT_HEAD, *blocks(count_table(ours, clang, [])))])
+
+
+def main(option, *prefixes):
+    if option in ('--count', '--check', '--record'):
+        build_plugin()
+    match option:
+        case '--list':
+            printed([(row.name, row.title) for row in ROWS])
+        case '--time':
+            print_times(prefixes)
+        case '--brief':
+            print_times(prefixes, brief=True)
+        case '--count':
+            print_counts(prefixes)
+        case '--check':
+            check()
+        case '--record':
+            record_counts()
+            record_times()
+
+
+main(*sys.argv[1:])
