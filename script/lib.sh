@@ -36,6 +36,16 @@ build() {
     quietly "build-$preset" cmake --build --preset "$preset" -j "$(nproc)" --target "$@"
 }
 
+# judges TOOL VERSION: whether this system has the version whose findings count, Debian 12's; says so if it does not.
+judges() {
+    local version
+    version=$("$1" --version | sed -nE '/version/ { s/.*version:? ([0-9.]+).*/\1/p; q }')
+    [[ $version. == "$2".* ]] || {
+        say "$1 $version does not judge here: only $2 does, so the code is not checked with it"
+        return 1
+    }
+}
+
 # find_code PATTERN...: lists our files that match, each followed by a NUL.
 find_code() {
     local names=(-name "$1")
