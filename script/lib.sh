@@ -67,5 +67,8 @@ readme() {
     printf '%s\n' "$block"
 }
 
+# block PAGE HEAD: prints the page's blocks whose opening fence has this text.
+block() { awk -v head="\`\`\`$2" '$0 == "```" { inside = 0 } inside; $0 == head { inside = 1 }' "$1"; }
+
 # log_of FILE: prints a log in logcat's format without dates, times, processes and threads.
 log_of() { sed -E 's/^[0-9-]+ [0-9:.]+ +[0-9]+ +[0-9]+ //' "$1"; }

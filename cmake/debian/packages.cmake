@@ -67,6 +67,10 @@ install(CODE [[
 
 # The reference, which script/docs has built before.
 install(DIRECTORY build/docs/html DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
+install(CODE "
+    file(CREATE_LINK ../../common-licenses/Apache-2.0
+         \"\$ENV{DESTDIR}/usr/${CMAKE_INSTALL_DOCDIR}/LICENSE\" SYMBOLIC)"
+    COMPONENT dev)
 # Android loads libraries without a version, so lintian is told that ours has none on purpose.
 install(FILES cmake/debian/lintian-overrides DESTINATION ${CMAKE_INSTALL_DATADIR}/lintian/overrides
         RENAME libvarnekutils-ltn COMPONENT library)
