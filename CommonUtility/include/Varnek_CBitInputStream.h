@@ -13,12 +13,12 @@
 
 #ifdef __cplusplus
 
-/// A read position in a byte array. The stream either copies the array or borrows it. The owner of
-/// a borrowed array must keep it alive and unchanged.
+/// A read position in a byte array, which the stream copies or borrows; a borrowed one has to stay
+/// alive and unchanged.
 ///
-/// A read that fails clears its success flag, and no read sets it: set the flag to 1 before a
-/// series of reads and test it once afterwards. At the end of the stream every read fails. Fields
-/// are returned right-aligned and unsigned. Not thread-safe: one thread at a time may use a stream.
+/// A read that fails clears its success flag and none sets it, so set the flag to 1, read many
+/// fields, then test it once. At the end of the stream every read fails. Fields come right-aligned
+/// and unsigned. Not thread-safe: one thread at a time may use a stream.
 ///
 ///     state            iCurByteIdx        iBitIdxInCurByte   bEndOfStream
 ///     reading          current byte       0 to 7             0
@@ -28,11 +28,11 @@
 ///     no source        0                  0                  1
 class VARNEK_API VarnekCBitInputStream {
   public:
-    /// Starts at the first bit of `length` bytes. With a `copyMode` of 1 the stream keeps a private
-    /// copy; with any other value it reads the caller's array. When the source is null or empty, or
-    /// there is no memory for the copy, the stream is at its end. Bytes beyond 2 GiB are not read.
+    /// Starts at the first bit of `length` bytes: of a private copy if `copyMode` is 1, else of the
+    /// caller's array. The stream is at its end if the source is null or empty, or there is no
+    /// memory for the copy. Bytes beyond 2 GiB are not read.
     VarnekCBitInputStream(unsigned char *source, unsigned int length, unsigned char copyMode);
-    /// Copies the position and a private copy; a borrowed array is shared. Without memory for the
+    /// Copies the position and a private copy, or shares a borrowed array. Without memory for the
     /// copy, the new stream has no source and is at its end.
     VarnekCBitInputStream(const VarnekCBitInputStream &other);
     VarnekCBitInputStream &operator=(const VarnekCBitInputStream &other);  ///< copies likewise
@@ -42,25 +42,24 @@ class VARNEK_API VarnekCBitInputStream {
 
     /// Reads the next bit, 0 or 1.
     unsigned int ReadBit(unsigned char &success);
-    /// Reads 0 to 8 bits, which must all be in the current byte; otherwise nothing is read. It
-    /// traces its failures. The other reads trace only the pieces that lie beyond the end.
+    /// Reads 0 to 8 bits that are all in the current byte, else nothing. Traces its failures; the
+    /// other reads trace only the pieces beyond the end.
     unsigned int GetBits(int aNum, unsigned char &success);
-    /// Read `count` bits: at most 8, 16 and 32. A count out of range reads nothing. When the stream
-    /// ends inside the field, the missing bits read as 0.
+    /// Reads at most 8 bits, and nothing if `count` is out of range. If the stream ends inside the
+    /// field, the missing bits read as 0. The next two differ only in their most bits.
     unsigned char ReadByte(int count, unsigned char &success);
     unsigned short ReadShort(int count, unsigned char &success);  ///< at most 16
     unsigned int ReadInt(int count, unsigned char &success);      ///< at most 32
 
-    /// Copies `count` bytes from a byte boundary. Returns 0; VARNEK_BITS_END at the end of the
-    /// stream; VARNEK_BITS_NOT_ALIGNED inside a byte; VARNEK_BITS_TOO_FEW when fewer bytes remain,
-    /// for a negative count and for a null destination. On failure the position does not move.
+    /// Copies `count` bytes from a byte boundary. Returns 0 or, without moving, VARNEK_BITS_END at
+    /// the end of the stream, VARNEK_BITS_NOT_ALIGNED inside a byte, and VARNEK_BITS_TOO_FEW if
+    /// fewer bytes remain, for a negative count and for a null destination.
     int GetByteArray(unsigned char *dest, int count);
-    /// Skips `count` bits, and stops at the end of the stream. Each byte's worth beyond the end
-    /// writes one trace.
+    /// Skips `count` bits, at most to the end. Each byte's worth beyond it writes one trace.
     void Skip(int count);
-    /// Moves back by `count` bytes. Call it on a byte boundary: when called inside a byte, the next
-    /// reads take the top bits of the byte that it moved to. A step that would leave the buffer
-    /// moves nothing. Returns 0.
+    /// Moves back by `count` bytes, or not at all if that would leave the buffer. Call it on a byte
+    /// boundary: inside a byte, the next reads take the top bits of the byte it moved to. Returns
+    /// 0.
     int RewindBytes(int count);
     /// Moves to the first bit if the stream has a source. Returns 0.
     int RwindToFirst();

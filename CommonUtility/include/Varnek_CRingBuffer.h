@@ -1,6 +1,5 @@
 /// @file
-/// A ring of bytes between one writer and one reader. A ring is guarded by a named mutex, if it has
-/// one.
+/// A ring of bytes, guarded by a named mutex.
 /// @see [Guide: bits and ring](docs/guide/bits-and-ring.md)
 #ifndef VARNEK_CRINGBUFFER_H
 #define VARNEK_CRINGBUFFER_H
@@ -16,10 +15,9 @@
 
 #ifdef __cplusplus
 
-/// Writes and reads move all of their bytes or none, and never wait. Each side has a position and a
-/// loop count, which is the number of laps it has completed. Together they distinguish a full ring
-/// from an empty one, and both from a ring in an inconsistent state. With W and R as the positions
-/// and WL and RL as the loop counts:
+/// Writing and reading move all of the bytes or none, and never wait. Each side has a position and
+/// counts its laps, which tells a full ring from an empty one, and both from an inconsistent state.
+/// With W and R as the positions and WL and RL as the laps completed:
 ///
 ///     state                    condition                        readable       writable
 ///     same lap                 WL = RL, R <= W                  W - R          size - (W - R)
@@ -27,60 +25,56 @@
 ///     underflow                WL = RL, W < R; RL > WL          none           none
 ///     overflow                 WL = RL + 1, W > R; WL > RL + 1  none           none
 ///
-/// A ring whose size is invalid or whose storage cannot be allocated has size 0. Its writes, reads
-/// and seeks fail until a Reset succeeds. Each failure is traced.
+/// A ring whose size is invalid or whose storage cannot be allocated has size 0 and refuses
+/// everything until a Reset succeeds. Failures are traced.
 ///
-/// Several threads may write one ring, or read it: no two writes mix, but the room that a query
-/// reported may be gone, so check the result. In a ring that has its mutex, Reset, Flush, Seek, the
-/// three queries, Write and Read run one at a time. One case is not atomic: an operation that finds
-/// the ring in an inconsistent state releases the mutex briefly before it empties the ring.
-/// Construction, destruction and assignment (on either side) are not guarded. A copy has no mutex
-/// and is not thread-safe.
+/// Any number of threads may write and read one ring that has its mutex: no two writes mix, but the
+/// room that a query reported may be gone, so check the result. Reset, Flush, Seek, the queries,
+/// Write and Read run one at a time, although one that finds the ring inconsistent releases the
+/// mutex for a moment before it empties the ring. Constructing, destroying and assigning (on either
+/// side) are not guarded. A copy has no mutex, so it is not thread-safe.
 class VARNEK_API VarnekCRingBuffer {
   public:
-    /// Creates an empty ring of `size` bytes. When all 40 mutexes are in use, the ring works
-    /// without one.
+    /// Creates an empty ring of `size` bytes, without a mutex if all of them are in use.
     explicit VarnekCRingBuffer(int size);
-    /// Copy the state and the bytes, not the mutex. The target of an assignment keeps its own
-    /// mutex.
+    /// Copies the state and the bytes, not the mutex; an assigned ring keeps its own.
     VarnekCRingBuffer(const VarnekCRingBuffer &other);
     VarnekCRingBuffer &operator=(const VarnekCRingBuffer &other);  ///< copies likewise
 
     /// Frees the storage and deletes the mutex. No other thread may be inside the ring.
     ~VarnekCRingBuffer();
 
-    /// Empties the ring, and reallocates its storage when the size changes. Returns 0;
-    /// VARNEK_RING_INVALID for a size below 1, which changes nothing, and when there is no memory.
+    /// Empties the ring, reallocating its storage if the size changes. Returns 0;
+    /// VARNEK_RING_INVALID for a size below 1, which changes nothing, and if there is no memory.
     int Reset(int size);
     /// Empties the ring. Returns 0.
     int Flush();
 
-    /// Moves the reader: to the index `aOffset` (origin 0), forward by `aOffset` bytes (origin 1),
-    /// or to the start of the last `aOffset` bytes written (origin 2). With origins 0 and 2 it does
-    /// not check whether those bytes are unread, or were ever written. With origin 2, an offset of
-    /// the whole size leaves nothing to read. With origin 0, an index equal to the size is
-    /// accepted, but then the caller must read, or seek forward by 0, before the next write.
-    /// Returns 0; VARNEK_RING_NO_SPACE for an offset that is negative, larger than the size or,
-    /// with origin 1, larger than the number of readable bytes, and in a ring without storage or,
-    /// with origin 1, in an inconsistent state; VARNEK_RING_INVALID for another origin.
+    /// Moves the reader to the index `aOffset` (origin 0), forward by `aOffset` bytes (1), or to
+    /// the start of the last `aOffset` bytes written (2). Origins 0 and 2 do not ask whether those
+    /// bytes are unread or were ever written; with 2, an offset of the whole size leaves nothing to
+    /// read; with 0, an index equal to the size is accepted, but then read, or seek forward by 0,
+    /// before the next write. Returns 0; VARNEK_RING_NO_SPACE for an offset that is negative,
+    /// beyond the size or, with origin 1, beyond the readable bytes, for a ring without storage
+    /// and, with origin 1, for an inconsistent one; VARNEK_RING_INVALID for another origin.
     int Seek(int aOffset, int origin);
 
-    /// Return the number of bytes that can be read and written now; in an inconsistent state,
-    /// VARNEK_RING_OVERFLOW or VARNEK_RING_UNDERFLOW.
+    /// Tells how many bytes can be read now, and the next one how many can be written;
+    /// VARNEK_RING_OVERFLOW or VARNEK_RING_UNDERFLOW in an inconsistent state.
     int GetSpaceReading() const;
     int GetSpaceWriting() const;  ///< the bytes that fit
-    /// Returns the readable bytes in per cent of the size. In an inconsistent state the result may
-    /// lie outside 0 to 100.
+    /// Tells the readable bytes in per cent of the size; in an inconsistent state, maybe a number
+    /// outside 0 to 100.
     int GetDistance() const;
 
-    /// Copy `writelen` bytes in or `readLen` bytes out. Return 0; VARNEK_RING_INVALID for a length
-    /// below 0 or above the size, and for a null pointer with a length above 0 (after a panic
-    /// report); VARNEK_RING_NO_SPACE when there is too little room; VARNEK_RING_NO_DATA when there
-    /// are too few bytes, and when 0 bytes are read from an empty ring. In an inconsistent state, a
-    /// write or read empties the ring and returns VARNEK_RING_NO_SPACE for an overflow and
-    /// VARNEK_RING_NO_DATA for an underflow. There are two exceptions. A write that finds WL = RL
-    /// and W < R returns VARNEK_RING_NO_DATA but leaves the ring unchanged. With W <= R and WL > RL
-    /// + 1, writes and reads treat the writer as one lap ahead.
+    /// Copies `writelen` bytes in; Read copies `readLen` bytes out and returns the same. Returns 0;
+    /// VARNEK_RING_INVALID for a length below 0 or above the size and, after a panic report, for a
+    /// null pointer with a length above 0; VARNEK_RING_NO_SPACE if there is too little room;
+    /// VARNEK_RING_NO_DATA if there are too few bytes, or 0 bytes are read from an empty ring. In
+    /// an inconsistent state both empty the ring and return VARNEK_RING_NO_SPACE for an overflow
+    /// and VARNEK_RING_NO_DATA for an underflow, with two exceptions: a write that finds WL = RL
+    /// and W < R leaves the ring as it is, and with W <= R and WL > RL + 1 both take the writer as
+    /// one lap ahead.
     int Write(const unsigned char *data, int writelen);
     int Read(unsigned char *dest, int readLen);  ///< copies out
 

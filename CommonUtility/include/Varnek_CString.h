@@ -8,10 +8,9 @@
 
 #ifdef __cplusplus
 
-/// Owns a copy of a NUL-terminated text. A string without a text is a null string, which differs
-/// from an empty one. Misuse is traced and changes nothing. When memory runs out, construction,
-/// assignment and a sum give a null string, and appending changes nothing. Not thread-safe: one
-/// thread at a time may use a string.
+/// Owns a copy of a NUL-terminated text, or none: a null string, which differs from an empty one.
+/// Misuse is traced and changes nothing. Out of memory, constructing, assigning and summing give a
+/// null string, and appending changes nothing. Not thread-safe.
 class VARNEK_API VarnekCString {
   public:
     /// Copies `text`; null gives a null string.
@@ -21,26 +20,25 @@ class VARNEK_API VarnekCString {
     /// Frees the text.
     ~VarnekCString();
 
-    /// Returns a new copy of the text, which the caller frees with delete[]; null for a null string
-    /// and when memory runs out.
+    /// Returns a new copy, which the caller frees with delete[]; null for a null string and without
+    /// memory.
     char *String() const;
-    /// Takes ownership of a text in an array from new[]; the caller must not use it afterwards.
-    /// Null is an error.
+    /// Takes over a text in an array from new[]. Null is an error.
     void SetMemAllocedString(char *text);
 
-    /// Copy the other text; null makes this a null string.
+    /// Copies the other text; null makes this a null string.
     VarnekCString &operator=(const VarnekCString &other);
     VarnekCString &operator=(char const *text);  ///< copies likewise
 
-    /// Append. A string object without bytes and a null text are errors; an empty text turns a null
-    /// string into an empty one.
+    /// Appends. A string object without bytes and a null text are errors; an empty text makes a
+    /// null string an empty one.
     VarnekCString &operator+=(const VarnekCString &other);
     VarnekCString &operator+=(char const *text);                ///< appends
     VarnekCString operator+(const VarnekCString &other) const;  ///< a new string
     VarnekCString operator+(char const *text) const;            ///< a new string
 
-    /// Compare as strcmp does, and return 1 or 0. Two null strings are equal; every other
-    /// comparison with a null string returns 0. Null strings are traced.
+    /// Compares as strcmp does and returns 1 or 0. Two null strings are equal; any other comparison
+    /// with one gives 0. Null strings are traced.
     int operator==(const VarnekCString &other) const;
     int operator>(const VarnekCString &other) const;   ///< compares
     int operator>=(const VarnekCString &other) const;  ///< compares

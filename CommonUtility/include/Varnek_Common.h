@@ -1,10 +1,10 @@
 /// @file
 /// Types and constants that every module of the stack shares, in C11 and C++17.
 ///
-/// Stack use on 32-bit ARM with all traces enabled is at most 3.9 KiB for trace, assertion and
-/// tasking, 2.1 KiB for a load of the debug configuration, 3.4 KiB for files, 3.3 KiB for the
-/// deletion of a tree of any depth, and 4.1 KiB for the settings. The platform's log function needs
-/// its own stack in addition.
+/// On 32-bit ARM, with all traces enabled, the library uses at most this much stack: 3.9 KiB to
+/// trace, report assertions and for tasking, 2.1 KiB to load the debug configuration, 3.4 KiB for
+/// files, 3.3 KiB to delete a tree of any depth, 4.1 KiB for the settings. The platform's log
+/// function comes on top.
 #ifndef VARNEK_COMMON_H
 #define VARNEK_COMMON_H
 
@@ -21,15 +21,14 @@ typedef int32_t BOOL;  ///< a truth value of 32 bits
 #define FALSE 0  ///< of a BOOL
 #endif
 
-/// Waits without limit. Other time-outs are milliseconds by the wall clock, which a receiver sets
-/// from the broadcast: setting it forward ends waits early, setting it back prolongs them. A module
-/// that must not depend on it waits without limit, and has a timer (Varnek_Timer.h) signal or send
-/// to it.
+/// Waits without limit. Every other time-out is milliseconds by the wall clock, which a receiver
+/// sets from the broadcast: setting it forward ends waits early, setting it back prolongs them. If
+/// that matters, wait without limit and let a timer (Varnek_Timer.h), which does not follow the
+/// clock, signal or send.
 #define WAIT_FOREVER 0xFFFFFFFFu
 
 /// @name Levels and modules of a trace
-/// A mask is one level or-ed with one module, which has its own tag in the log. A trace with none
-/// of these module bits is not written.
+/// A mask is one level or-ed with one module, which has its own tag in the log.
 /// @{
 
 #define VARNEK_LEVEL_ERROR 0x80000000u  ///< a failure, or misuse by a caller
@@ -51,7 +50,7 @@ typedef int32_t BOOL;  ///< a truth value of 32 bits
 #define VARNEK_MODULE_SM_PLAYER 0x800u        ///< SM player
 /// @}
 
-/// An open stream as a pointer-sized integer. An open that fails returns -1.
+/// An open stream as a pointer-sized integer; -1 if it could not be opened.
 typedef intptr_t PglFileHandle;
 
 /// @name Open flags, for both streams and large files
@@ -63,7 +62,7 @@ typedef intptr_t PglFileHandle;
 #define PGL_FILE_MODE_APPEND 8     ///< writes at the end
 /// @}
 
-/// Paths must be shorter than this; the longest one has 255 characters.
+/// One more than the longest path, which has 255 characters.
 #define MAX_PGL_FILE_PATH_LEN 256
 
 #endif

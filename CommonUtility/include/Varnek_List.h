@@ -1,11 +1,10 @@
 /// @file
 /// A doubly linked list of untyped data pointers. The list owns its nodes but not the data, unless
-/// an operation says otherwise. Not thread-safe: callers that share a list must guard it.
+/// a call says otherwise. Not thread-safe: callers that share a list must guard it.
 ///
-/// Every operation accepts a null list, does nothing and returns 0 or null. Positions count from 0
-/// at the head. Null data is never stored, so a null result of a removal means that nothing was
-/// removed. When a node cannot be allocated, an insertion leaves the list unchanged. Nothing is
-/// traced.
+/// With a null list every call does nothing and returns 0 or null. Positions count from 0 at the
+/// head. Null is never stored, so removing returns null only if nothing was removed. Without memory
+/// for a node, inserting leaves the list unchanged. Nothing is traced.
 /// @see [Guide: lists](docs/guide/lists.md)
 #ifndef VARNEK_LIST_H
 #define VARNEK_LIST_H
@@ -30,33 +29,30 @@ typedef struct list_t {
     list_node_t *tail;  ///< null when empty
 } list_t;
 
-/// Makes the list empty. Nodes that it had are not freed.
+/// Makes the list empty without freeing its nodes.
 VARNEK_API void list_initialize(list_t *list);
 
 /// Inserts data at the head.
 VARNEK_API void list_insertHead(list_t *list, void *data);
-/// Insert data at the tail; both names do the same.
+/// Inserts data at the tail.
 VARNEK_API void list_insertTail(list_t *list, void *data);
 VARNEK_API void list_insert(list_t *list, void *data);  ///< as list_insertTail
-/// Inserts data at a position. A position at or beyond the count appends; a negative one changes
-/// nothing.
+/// Inserts data at a position: at the tail from the count on, nowhere if it is negative.
 VARNEK_API void list_insertAt(list_t *list, int32_t position, void *data);
 
 /// Returns the data at a position; null outside the list.
 VARNEK_API void *list_element(list_t *list, int32_t position);
 
-/// Remove a node and return its data, which the caller owns.
+/// Removes the first node and returns its data, which the caller owns.
 VARNEK_API void *list_removeHead(list_t *list);
-VARNEK_API void *list_removeTail(list_t *list);                ///< as list_removeHead
-VARNEK_API void *list_remove(list_t *list, int32_t position);  ///< as list_removeHead
+VARNEK_API void *list_removeTail(list_t *list);                ///< likewise, the last node
+VARNEK_API void *list_remove(list_t *list, int32_t position);  ///< likewise, at a position
 
-/// Remove nodes and free their data, which must come from malloc: all nodes, or one that is in this
-/// list.
+/// Removes all nodes and frees their data, which must come from malloc.
 VARNEK_API void list_removeAll(list_t *list);
-VARNEK_API void list_remove_node(list_t *list, list_node_t *node);  ///< removes and frees one
+VARNEK_API void list_remove_node(list_t *list, list_node_t *node);  ///< likewise, one of this list
 
-/// Iterate over the list: start with list_head, read each node with list_data, and go on with
-/// list_next until it returns null.
+/// Starts a walk: read each node with list_data, and go on with list_next until it returns null.
 VARNEK_API list_node_t *list_head(list_t *list);
 VARNEK_API list_node_t *list_tail(list_t *list);       ///< the last node
 VARNEK_API list_node_t *list_next(list_node_t *node);  ///< the next node

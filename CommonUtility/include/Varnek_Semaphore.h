@@ -1,12 +1,10 @@
 /// @file
-/// Named mutexes and named counting semaphores. A process has at most 40 of each.
+/// Named mutexes and named counting semaphores, at most 40 of each in a process.
 ///
-/// Handles start at 1, rise by one with every creation and are never reused; mutexes and semaphores
-/// count separately. Names have 1 to 31 characters and compare exactly. They are unique, unless two
-/// threads create objects of one name at the same time. Thread-safe; no call is needed to set up
-/// the tables. A failure is traced at Error. A time-out, and a lookup that does not find its name,
-/// are not failures and are not traced. Mutexes and semaphores have 2147483647 handles each; when
-/// these are used up, every creation fails.
+/// Each family hands out the handles 1 to 2147483647 in order, never one twice, and creates nothing
+/// after the last. Names have 1 to 31 characters, compare exactly and are unique, unless two
+/// threads create objects of one name at the same time. All calls are thread-safe. Failures are
+/// traced at Error; a time-out, and a lookup that finds nothing, are no failures and not traced.
 /// @see [Guide: mutexes and semaphores](docs/guide/mutexes-and-semaphores.md)
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H
@@ -18,18 +16,18 @@ extern "C" {
 #endif
 
 /// @name Mutexes
-/// Mutexes are not recursive. Whoever acquires one sees all that its last holder did. Delete a
-/// mutex only when no thread can still acquire or release it. The names "VarnekThreadMutex" and
-/// "VarnekRingBuf" with a number are reserved for the library.
+/// Mutexes are not recursive. Whoever acquires one sees all that its last holder did. Delete one
+/// only when no thread can still acquire or release it. The names "VarnekThreadMutex" and
+/// "VarnekRingBuf" with a number are the library's own.
 /// @{
 
-/// Creates a mutex. A live mutex of this name is deleted first. If a thread holds that mutex, it
-/// stays, and the creation fails.
+/// Creates a mutex, deleting a live one of this name first. If a thread holds that one, it stays,
+/// and nothing is created.
 /// @return the handle; -1 for a bad name, a full table or a failing OS call
 VARNEK_API int32_t VarnekPGL_CreateMutex(const char *szMutexName);
 
-/// Deletes a mutex that no thread holds.
-/// @return TRUE when the mutex is deleted; FALSE for an unknown handle or a mutex that is held
+/// Deletes a mutex.
+/// @return TRUE; FALSE for an unknown handle or a mutex that some thread holds
 VARNEK_API BOOL VarnekPGL_DeleteMutex(int32_t hMutex);
 
 /// Waits without limit until the calling thread holds the mutex. Traces nothing on success.
@@ -40,8 +38,7 @@ VARNEK_API BOOL VarnekPGL_AcquireMutex(int32_t hMutex);
 /// @return TRUE; FALSE for an unknown handle or a failing OS call
 VARNEK_API BOOL VarnekPGL_ReleaseMutex(int32_t hMutex);
 
-/// Finds a mutex. Traces nothing.
-/// @return the handle of the live mutex of this name; -1 for none and for null
+/// Finds the live mutex of this name; -1 if there is none, and for null.
 VARNEK_API int32_t VarnekPGL_GetMutexByName(const char *szMutexName);
 /// @}
 /// @name Semaphores
@@ -49,33 +46,29 @@ VARNEK_API int32_t VarnekPGL_GetMutexByName(const char *szMutexName);
 /// thread waits on it or can still use it.
 /// @{
 
-/// Creates a semaphore. A live semaphore of this name is deleted first, even when `count` is
-/// invalid.
+/// Creates a semaphore, deleting a live one of this name first, even if `count` is invalid.
 /// @param szSemName  1 to 31 characters
 /// @param count      initial units, at most the maximum of the system's semaphores
 /// @return the handle; -1 for a bad name, a full table or a failing OS call
 VARNEK_API int32_t VarnekPGL_CreateSemaphore(const char *szSemName, uint32_t count);
 
 /// Deletes a semaphore.
-/// @return TRUE, even when the OS call fails; FALSE for an unknown handle
+/// @return TRUE, even if the OS call fails; FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteSemaphore(int32_t hSem);
 
-/// Takes one unit, waiting up to `timeout`.
-/// @param hSem     handle of a live semaphore
-/// @param timeout  milliseconds on the wall clock, or WAIT_FOREVER; 0 does not wait
-/// @return TRUE when a unit was taken; FALSE on a time-out and on a failure. A wait that a POSIX
-///         signal interrupts fails and is not resumed
+/// Takes one unit, waiting for it if need be. A POSIX signal ends the wait.
+/// @param hSem     a live semaphore
+/// @param timeout  milliseconds by the wall clock, or WAIT_FOREVER; 0 does not wait
+/// @return TRUE if a unit was taken; FALSE if time ran out or the wait failed
 /// @par Traces
-/// Low on entry, and after an unlimited wait; Error for an unknown handle or a failing OS wait; a
-/// time-out adds no line
+/// Low on entry and after waiting without limit; Error for an unknown handle or a failing wait.
 VARNEK_API BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout);
 
 /// Adds one unit, which wakes one waiter.
 /// @return TRUE; FALSE for an unknown handle or a failing OS call
 VARNEK_API BOOL VarnekPGL_SignalSemaphore(int32_t hSem);
 
-/// Finds a semaphore. Traces nothing.
-/// @return the handle of the live semaphore of this name; -1 for none and for null
+/// Finds the live semaphore of this name; -1 if there is none, and for null.
 VARNEK_API int32_t VarnekPGL_SemaphoreByName(const char *szSemName);
 /// @}
 

@@ -1,13 +1,11 @@
 /// @file
-/// Named threads, each with a message queue: see [threads and
-/// messages](docs/guide/threads-and-messages.md).
+/// Named threads, at most 20 in a process, each with a message queue.
 ///
-/// The registry keeps a record of each thread so that others can find it and send it messages. It
-/// has room for 20 records. The threads are detached; the registry never stops, joins or cancels
-/// one, and none may be cancelled inside a call of this library. Names have 1 to 31 characters,
-/// compare exactly and are unique, unless two threads create threads of one name at the same time.
-/// All calls are thread-safe. Failures are traced at Error, but a lookup that finds nothing is not
-/// one. The named mutex "VarnekThreadMutex" is reserved for the registry.
+/// The registry keeps a record of each thread so that others can find it and send it messages. The
+/// threads are detached; the registry never stops, joins or cancels one, and none may be cancelled
+/// inside a call of this library. Names have 1 to 31 characters, compare exactly and are unique,
+/// unless two threads create threads of one name at the same time. All calls are thread-safe.
+/// Failures are traced at Error; a lookup that finds nothing is none.
 /// @see [Guide: threads and messages](docs/guide/threads-and-messages.md)
 #ifndef VARNEK_THREAD_H
 #define VARNEK_THREAD_H
@@ -90,8 +88,7 @@ VARNEK_API BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, 
 /// Takes the first message without waiting. The message leaves the queue but stays counted, so each
 /// peek makes one later receive return FALSE at once.
 /// @return TRUE; FALSE, after an Error line and with `message` and `count` unchanged, if there is
-/// no
-///         message, the thread has no record or a pointer is null
+///         no message, the thread has no record or a pointer is null
 VARNEK_API BOOL VarnekPGL_PeekMessage(THREAD_MSG *message, int32_t *count);
 /// @}
 

@@ -1,8 +1,8 @@
 /// @file
 /// Wall-clock time, and the calendar from 1970 to 2030.
 ///
-/// Seconds count from 1970-01-01 00:00:00. Calendar records have no time zone: the conversions
-/// treat them as UTC. Thread-safe; the operations keep no state.
+/// Seconds count from 1970-01-01 00:00:00. Calendar records have no time zone; the conversions take
+/// them for UTC. Thread-safe.
 /// @see [Guide: time](docs/guide/time.md)
 #ifndef VARNEK_TIME_H
 #define VARNEK_TIME_H
@@ -18,11 +18,9 @@ typedef struct VarnekCDateTime VarnekCDateTime;  ///< in C too
 ///     0 to 99          a span: years, months and days that passed, then hours, minutes, seconds
 ///     anything else    invalid; counts as 0 seconds
 ///
-/// A point after 2030 counts as 0 seconds too, without a trace, and so does a span that would end
-/// after 2030. The arithmetic can produce such points.
-///
-/// The results of the arithmetic are points: 90 seconds become 1970-01-01 00:01:30, which counts as
-/// 90 seconds again. Comparisons use the fields only, from the year down.
+/// A point after 2030, which arithmetic can produce, counts as 0 seconds too, without a trace, and
+/// so does a span that would end after 2030. Arithmetic gives points: 90 seconds become 1970-01-01
+/// 00:01:30, which counts as 90 seconds again.
 #ifdef __cplusplus
 struct VARNEK_API VarnekCDateTime
 #else
@@ -37,18 +35,17 @@ struct VarnekCDateTime
     int32_t iSecond;  ///< 0 to 59
 
 #ifdef __cplusplus
-    /// Returns the seconds of this point or span. In a span, `iDay` days that fill month number
-    /// `iMonth` count as one more month, and 12 months count as one more year. An invalid year is
-    /// traced.
+    /// Returns the seconds of this point or span, tracing an invalid year. In a span, days that
+    /// fill month number `iMonth` count as one more month, and 12 months as one more year.
     uint32_t GetElapsedSeconds() const;
 
-    /// Add or subtract the seconds of the other record, modulo 2^32. A subtraction whose result
-    /// would be negative is traced and changes nothing.
+    /// Adds the seconds of the other record, modulo 2^32. Subtracting more than there is is traced
+    /// and changes nothing.
     VarnekCDateTime &operator+=(const VarnekCDateTime &other);
     VarnekCDateTime &operator-=(const VarnekCDateTime &other);      ///< subtracts
     VarnekCDateTime operator+(const VarnekCDateTime &other) const;  ///< adds
 
-    /// Compare the fields, and return TRUE or FALSE.
+    /// Compares the fields, from the year down.
     BOOL operator==(const VarnekCDateTime &other) const;
     BOOL operator>(const VarnekCDateTime &other) const;   ///< compares
     BOOL operator>=(const VarnekCDateTime &other) const;  ///< compares
@@ -67,40 +64,35 @@ typedef struct PglMilliTime {
 extern "C" {
 #endif
 
-/// Reads the clock.
-/// @return the current time in seconds
+/// Returns the current time in seconds.
 VARNEK_API int32_t VarnekPGL_GetTime(void);
 
-/// Reads the clock to the millisecond. From 2031 on, it returns the current time of day on the last
-/// day of 2030, with 0 milliseconds.
-/// @return TRUE; FALSE when the clock cannot be read, and for null after a panic report
+/// Reads the clock to the millisecond. From 2031 on it gives the time of day on the last day of
+/// 2030, with 0 milliseconds.
+/// @return TRUE; FALSE if the clock cannot be read, and for null after a panic report
 VARNEK_API BOOL VarnekPGL_GetMilliseconds(PglMilliTime *out);
 
 /// Fills the record with the current time in UTC.
 /// @return TRUE; FALSE for null after a panic report
 VARNEK_API BOOL VarnekPGL_GetSystemTime(VarnekCDateTime *dt);
 
-/// Asks the system for its time zone.
-/// @return local time minus UTC in seconds; 0, after a trace, when local time is not known; from
-///         2031 on, the negative of the current time
+/// Returns local time minus UTC in seconds; 0, after a trace, if local time is not known; from 2031
+/// on, the negative of the current time.
 VARNEK_API int32_t VarnekPGL_GetTimezoneOffset(void);
 
-/// Counts the seconds from 1970 to a record. Day, hour, minute and second may be out of range: they
-/// are simply added.
-/// @return the seconds; 0 for null, a year outside 1970 to 2030 and a month outside 1 to 12
+/// Counts the seconds from 1970 to a record, simply adding a day, hour, minute or second that is
+/// out of range; 0 for null, a year outside 1970 to 2030 and a month outside 1 to 12.
 VARNEK_API uint32_t VarnekPGL_DateTimeToSeconds(const VarnekCDateTime *dt);
 
-/// Fills the record with the point that is this many seconds after the start of 1970.
+/// Fills the record with the point this many seconds after the start of 1970.
 /// @return TRUE; FALSE for null after a panic report
 VARNEK_API BOOL VarnekPGL_SecondsToDataTime(uint32_t seconds, VarnekCDateTime *dt);
 
-/// Checks a date, without regard to the length of the month.
-/// @return TRUE for day 1 to 31, month 1 to 12 and a year from 1970 on; FALSE otherwise and for
-///         null
+/// Says whether a date has day 1 to 31, month 1 to 12 and a year from 1970 on; FALSE for null.
 VARNEK_API BOOL __VarnekPGL_ValidateDate(const VarnekCDateTime *dt);
 
-/// Adds two records as seconds. A date that is not valid becomes 1970-01-01 in the caller's record,
-/// so that only its time of day is added. `result` may be one of the two records.
+/// Adds two records as seconds. An invalid date becomes 1970-01-01 in the caller's record, so that
+/// only its time of day is added. `result` may be one of the two.
 /// @return TRUE; FALSE for a null pointer after a panic report
 VARNEK_API BOOL VarnekPGL_AddDateTime(VarnekCDateTime *a, VarnekCDateTime *b,
                                       VarnekCDateTime *result);

@@ -327,8 +327,9 @@ __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, c
 }  // namespace
 
 void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...) {
-    const uint32_t level = mask & kLevelBits;
-    if ((gDebugState.load(std::memory_order_relaxed) & (level | kNotLoaded)) == 0) {
+    // The level and kNotLoaded are in the top byte, the module below it.
+    const uint32_t enabled = gDebugState.load(std::memory_order_relaxed) & (mask | kNotLoaded);
+    if (enabled >> 24 == 0) {
         return;
     }
     va_list args;
