@@ -3,15 +3,23 @@
     (gdb) source share/varnekutils_ltn/gdb.py
     (gdb) varnek
 
-The library must have debug information. The script works on a stopped process and on a core dump."""
+The library must have debug information; the packaged one has it in libvarnekutils-ltn-dbg. The script works on a
+stopped process and on a core dump. It reads structures of glibc and libstdc++, so it works for a PC only."""
 
 import gdb
 
 
+def variable(name):
+    symbol = gdb.lookup_static_symbol(f'(anonymous namespace)::{name}') or gdb.lookup_global_symbol(name)
+    if symbol is None:
+        raise gdb.GdbError('libvarnekutils_ltn.so is not loaded, or its debug information is missing. For the packaged '
+                           'library, install libvarnekutils-ltn-dbg; build any other one with -g and do not strip it.')
+    return symbol.value()
+
+
 def table(name):
     """Yields the handle, name and Info of each used slot of a slot table."""
-    symbol = gdb.lookup_static_symbol(f'(anonymous namespace)::{name}') or gdb.lookup_global_symbol(name)
-    found = symbol.value()
+    found = variable(name)
     base = found['slots_']
     for i in range(base.type.range()[1] + 1):
         handle = int(base[i]['handle']['_M_i'])
@@ -59,7 +67,7 @@ def threads():
 
 
 def timers():
-    timer_table = gdb.lookup_static_symbol('(anonymous namespace)::gTimerArr').value()
+    timer_table = variable('gTimerArr')
     for handle in range(timer_table.type.range()[1] + 1):
         info = timer_table[handle]
         if info['bUsed']:

@@ -36,6 +36,16 @@ build() {
     quietly "build-$preset" cmake --build --preset "$preset" -j "$(nproc)" --target "$@"
 }
 
+# judges TOOL VERSION: whether this system has the version whose findings count, Debian 12's; says so if it does not.
+judges() {
+    local version
+    version=$("$1" --version | sed -nE '/version/ { s/.*version:? ([0-9.]+).*/\1/p; q }')
+    [[ $version. == "$2".* ]] || {
+        say "$1 $version does not judge here: only $2 does, so the code is not checked with it"
+        return 1
+    }
+}
+
 # find_code PATTERN...: lists our files that match, each followed by a NUL.
 find_code() {
     local names=(-name "$1")
@@ -56,6 +66,9 @@ readme() {
     [ -n "$block" ] || die "README.md has no block with '$1'"
     printf '%s\n' "$block"
 }
+
+# block PAGE HEAD: prints the page's blocks whose opening fence has this text.
+block() { awk -v head="\`\`\`$2" '$0 == "```" { inside = 0 } inside; $0 == head { inside = 1 }' "$1"; }
 
 # log_of FILE: prints a log in logcat's format without dates, times, processes and threads.
 log_of() { sed -E 's/^[0-9-]+ [0-9:.]+ +[0-9]+ +[0-9]+ //' "$1"; }

@@ -140,6 +140,15 @@ TEST_F(DebugAlone, MakesTheDebugFilesWritableForEveryUser) {
         ASSERT_EQ(stat(path.c_str(), &status), 0);
         EXPECT_EQ(status.st_mode & 0777u, 0666u) << path;
     }
+    // A link may lead to a file that only the administrator may write.
+    WriteAll(kDefault, "#");
+    chmod(kDefault, 0644);
+    std::filesystem::remove(kWorking);
+    std::filesystem::create_symlink(kDefault, kWorking);
+    VarnekPGL_changeModeForDebug();
+    struct stat status = {};
+    ASSERT_EQ(stat(kDefault, &status), 0);
+    EXPECT_EQ(status.st_mode & 0777u, 0644u);
 }
 
 class Trace : public VarnekTest {};

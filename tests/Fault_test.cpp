@@ -349,8 +349,8 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
     };
     Force("empty directory", [&] { return VarnekPGL_MakeDir(directory.c_str()) + removal(); });
     const auto populate = [&] { std::filesystem::create_directory(directory), WriteAll(directory + "/file", "text"); };
-    Force(
-        "directory", [&] { return populate(), removal(); }, false);
+    const auto removeWithFile = [&] { return populate(), removal(); };
+    Force("directory", removeWithFile, false);
     const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg", draft = VARNEK_DATA_DIR "Varnek_Config.new.";
     const auto saveAndLoad = [&] {
         WriteAll(draft + "999999999.0", "of no process");

@@ -211,8 +211,8 @@ TEST_F(Thread, CallsFitASmallStack) {
         {"timer",
          [] {
              const auto timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("timer"));
-             VarnekPGL_StartTimer(
-                 timer, 60000, [](uint32_t, void *) {}, nullptr);
+             const TimerCallbackFunc ignore = [](uint32_t, void *) {};
+             VarnekPGL_StartTimer(timer, 60000, ignore, nullptr);
              VarnekPGL_DeleteTimer(timer);
          }},
         {"message",

@@ -352,7 +352,7 @@ int32_t VarnekPGL_SysGetLastErro() {
 void VarnekPGL_changeModeForDebug() {
     VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, " VarnekCfg_changeDebugMode\n");
     for (const char *path : {kDebugPath, kSettingsPath}) {
-        if (IsReadable(path)) {
+        if (!IsLink(path) && IsReadable(path)) {
             (void)VarnekPGL_Chmod(path, 666);
         }
     }
