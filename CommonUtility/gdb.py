@@ -53,7 +53,9 @@ def semaphores():
 
 def threads():
     for handle, name, info in table('gThreadInfoArr'):
-        yield f'{handle:6}  {name:31}  messages {int(info["MsgQ"]["count"])}'
+        # The block of an ended thread is idle, or another thread has it.
+        ended = '' if int(info['running']['hHandle']) == handle else ', thread has ended'
+        yield f'{handle:6}  {name:31}  messages {int(info["queue"]["MsgQ_"]["count"])}{ended}'
 
 
 def timers():

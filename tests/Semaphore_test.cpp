@@ -4,7 +4,7 @@
 #include <chrono>
 #include <thread>
 
-#include "../CommonUtility/source/Varnek_Support.h"
+#include "../CommonUtility/source/Varnek_Clock.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"
 

@@ -17,9 +17,9 @@ extern "C" {
 
 /// The callback of a timer. It runs on a thread of the OS timer service, with no lock held and
 /// maybe beside other callbacks, even of the same timer, which it may use and start again. It sees
-/// all that the caller of the start did before. If the timer has expired, it may begin after a
-/// cancellation or deletion, so `pUserData` should be a number, a handle, or memory that outlives
-/// the timer.
+/// all that the caller of the start did before. Once the timer has expired, it may begin after the
+/// timer is cancelled or deleted, so `pUserData` should be a number, a handle, or memory that
+/// outlives the timer.
 typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 
 /// Creates a timer in the lowest free slot. The first start creates the OS timer.
@@ -28,17 +28,16 @@ VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 
 /// Arms the timer for one expiry. Unless it is cancelled before that or deleted before the callback
 /// begins, a successful start calls back exactly once, with its own `callback` and `userData`:
-/// maybe late, never early, and even if the timer is started again before the system delivers the
-/// expiry. Only if the system cannot create a thread for the expiry, which writes no log line, or
-/// if a later start fails and thereby discards it, does the callback wait for the timer's next
-/// expiry.
+/// never early, and as promptly as the system delivers an expiry, even if the timer has been
+/// started again meanwhile. Only if the system cannot create a thread for an expiry, which writes
+/// no log line, does its callback wait for the timer's next one.
 /// @param timer     handle from VarnekPGL_CreateTimer
 /// @param timeout   milliseconds from now, 1 or more; setting the wall clock does not change it
 /// @param callback  called once at the expiry
 /// @param userData  passed to `callback` unchanged
 /// @return TRUE when armed; FALSE for an unknown handle, an armed timer, a null callback, a time of
-///         0, a failing OS call, and when an earlier expiry is not delivered yet and there is no
-///         memory to remember it
+///         0, a failing OS call, and if an earlier start has expired but not called back and there
+///         is no memory or OS timer to let it
 VARNEK_API BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc callback,
                                      void *userData);
 

@@ -1,6 +1,6 @@
-// The bit input stream. A field that ends before the end of the current byte is taken from
-// ucCurByte. Any other field is taken from the buffer, if five bytes are left there. If not,
-// GetBits reads it piece by piece. Of these three ways, only GetBits detects the end of the stream.
+// The bit input stream. Nearly every field comes from the current byte or, if it ends behind that,
+// from a word of the buffer. Near the end, and after a rewind inside a byte, GetBits reads a field
+// piece by piece; only GetBits detects the end of the stream.
 #include "Varnek_CBitInputStream.h"
 
 #include <limits.h>
@@ -8,7 +8,7 @@
 
 #include <new>
 
-#include "Varnek_Support.h"
+#include "Varnek_Bytes.h"
 #include "Varnek_Trace.h"
 
 // Values of bEndOfStream. A rewind inside a byte loads the whole target byte into ucCurByte but
@@ -138,35 +138,33 @@ template <typename Value, unsigned int most>
 __attribute__((always_inline)) inline Value VarnekCBitInputStream::Read(int count,
                                                                         unsigned char &success) {
     const unsigned int width = static_cast<unsigned int>(count);
-    if (__builtin_expect(width > most || bEndOfStream != kReading, 0)) {
-        if (width > most || bEndOfStream == kAtEnd) {
-            success = 0;
-            return 0;
-        }
-        return ReadByPieces<Value>(*this, 8 - iBitIdxInCurByte, count, success);
-    }
     const unsigned int begin = static_cast<unsigned int>(iBitIdxInCurByte);
     const unsigned int end = begin + width;
-    if (end < 8) {
-        const unsigned int current = ucCurByte;
-        ucCurByte = static_cast<unsigned char>(current << width);
-        iBitIdxInCurByte = static_cast<int>(end);
-        return static_cast<Value>(current >> (8 - width));
+    if (__builtin_expect(width <= most && bEndOfStream == kReading, 1)) {
+        if (end < 8) {
+            const unsigned int current = ucCurByte;
+            ucCurByte = static_cast<unsigned char>(current << width);
+            iBitIdxInCurByte = static_cast<int>(end);
+            return static_cast<Value>(current >> (8 - width));
+        }
+        if (__builtin_expect(uiBufLen - static_cast<unsigned int>(iCurByteIdx) > 4, 1)) {
+            const unsigned char *const from = pBuffer + iCurByteIdx;
+            const uint32_t word = BigEndian(from);
+            const uint32_t value = word << begin >> (32 - width);
+            iCurByteIdx += static_cast<int>(end / 8);
+            iBitIdxInCurByte = static_cast<int>(end % 8);
+            if constexpr (most <= 16) {
+                ucCurByte = static_cast<unsigned char>(word << end >> 24);
+                return static_cast<Value>(value);
+            }
+            ucCurByte = static_cast<unsigned char>(from[end / 8] << (end % 8));
+            return static_cast<Value>(end <= 32 ? value : value | from[4] >> (40 - end));
+        }
+    } else if (width > most || bEndOfStream == kAtEnd) {
+        success = 0;
+        return 0;
     }
-    if (__builtin_expect(uiBufLen - static_cast<unsigned int>(iCurByteIdx) <= 4, 0)) {
-        return ReadByPieces<Value>(*this, 8 - iBitIdxInCurByte, count, success);
-    }
-    const unsigned char *const from = pBuffer + iCurByteIdx;
-    const uint32_t word = BigEndian(from);
-    iCurByteIdx += static_cast<int>(end / 8);
-    iBitIdxInCurByte = static_cast<int>(end % 8);
-    const uint32_t value = word << begin >> (32 - width);
-    if constexpr (most <= 16) {
-        ucCurByte = static_cast<unsigned char>(word << end >> 24);
-        return static_cast<Value>(value);
-    }
-    ucCurByte = static_cast<unsigned char>(from[end / 8] << (end % 8));
-    return static_cast<Value>(end <= 32 ? value : value | from[4] >> (40 - end));
+    return ReadByPieces<Value>(*this, 8 - iBitIdxInCurByte, count, success);
 }
 
 unsigned int VarnekCBitInputStream::ReadBit(unsigned char &success) {
@@ -200,7 +198,6 @@ int VarnekCBitInputStream::GetByteArray(unsigned char *dest, int count) {
         memcpy(dest, pBuffer + iCurByteIdx, static_cast<size_t>(count));
     }
     iCurByteIdx += count;
-    iBitIdxInCurByte = 0;
     if (count == remaining) {
         bEndOfStream = kAtEnd;
         return 0;

@@ -8,11 +8,11 @@
 
 #include <atomic>
 
-#include "Varnek_Lock.h"
+#include "Varnek_HoldMutex.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Trace.h"
 
-// Steps that several operations share. The caller holds the ring's mutex, if it has one.
+// Steps that several operations share, under the ring's mutex, if it has one.
 struct VarnekRingSteps {
     enum Order {
         kInOrder,
@@ -21,8 +21,7 @@ struct VarnekRingSteps {
         kOvertaken,  // both are in the same lap, and the reader is ahead of the writer
     };
 
-    // Returns the number of laps by which the writer is ahead. A loop count may wrap around; the
-    // difference is correct nevertheless.
+    // Returns the laps by which the writer is ahead, also when a loop count has wrapped around.
     static int Ahead(const VarnekCRingBuffer &ring) {
         return static_cast<int>(static_cast<unsigned int>(ring.iWriteLoopCnt) -
                                 static_cast<unsigned int>(ring.iReadLoopCnt));
@@ -39,28 +38,41 @@ struct VarnekRingSteps {
         return ring.iReadPos < ring.iWritePos ? kOverflow : kInOrder;
     }
 
-    // Returns the number of bytes that can be read; the ring is kInOrder. A writer that is several
-    // laps ahead counts as one lap ahead.
+    // Returns the bytes that can be read from a ring in order; a writer several laps ahead counts
+    // as one lap ahead.
     static int Used(const VarnekCRingBuffer &ring) {
         return ring.iWritePos - ring.iReadPos + (Ahead(ring) > 0 ? ring.iRingSize : 0);
     }
 
-    // Checks the state for the queries. Unlike OrderOf, it reports a writer that is several laps
-    // ahead. Returns 0 for a consistent state; otherwise it writes two lines and returns the result
-    // of the query.
-    static int Check(const VarnekCRingBuffer &ring);
+    // Checks the state for the queries, to which a writer several laps ahead is an overflow, too.
+    // Returns 0 for a consistent state, else the result of the query, after two lines.
+    static int Check(const VarnekCRingBuffer &ring) {
+        const int ahead = Ahead(ring);
+        if (OrderOf(ring) == kInOrder && ahead <= 1) {
+            return 0;
+        }
+        TRACE_ERROR("[Abnormal State] reading loop count=[%d], writing loop count=[%d]\n",
+                    ring.iReadLoopCnt, ring.iWriteLoopCnt);
+        TRACE_ERROR("[Abnormal State] Reading Position=[%d], Writing Position=[%d]\n",
+                    ring.iReadPos, ring.iWritePos);
+        return ahead > 0 ? VARNEK_RING_OVERFLOW : VARNEK_RING_UNDERFLOW;
+    }
 
     static void Empty(VarnekCRingBuffer *ring) {
         ring->iWritePos = ring->iReadPos = ring->iWriteLoopCnt = ring->iReadLoopCnt = 0;
     }
 
-    // Empties a ring that was found in an inconsistent state, as Reset with the ring's own size
-    // does. It releases the mutex for its trace and acquires it again. If another thread changes
-    // the size meanwhile, the ring keeps that size.
-    static void Recover(VarnekCRingBuffer *ring, HoldMutex *hold);
+    // Empties a ring that was found inconsistent, as Reset with its own size does: the trace is
+    // written without the mutex. Inlined, so that `hold` can stay in registers.
+    inline __attribute__((always_inline)) static void Recover(VarnekCRingBuffer *ring,
+                                                              HoldMutex *hold) {
+        hold->Release();
+        TRACE_MID("Ring Buffer will be reset!!!\n");
+        hold->Acquire();
+        Empty(ring);
+    }
 
-    // Sets the reader to a position in the writer's lap, or in the lap before if the writer has not
-    // reached that position.
+    // Sets the reader to a position in the writer's lap, or in the lap before if that is ahead.
     static void SetReader(VarnekCRingBuffer *ring, int pos) {
         ring->iReadPos = pos;
         ring->iReadLoopCnt = AddLaps(ring->iWriteLoopCnt, ring->iWritePos < pos ? -1 : 0);
@@ -106,27 +118,6 @@ unsigned char *AllocateStorage(int size) {
 }
 
 }  // namespace
-
-int VarnekRingSteps::Check(const VarnekCRingBuffer &ring) {
-    const int ahead = Ahead(ring);
-    if (OrderOf(ring) == kInOrder && ahead <= 1) {
-        return 0;
-    }
-    TRACE_ERROR("[Abnormal State] reading loop count=[%d], writing loop count=[%d]\n",
-                ring.iReadLoopCnt, ring.iWriteLoopCnt);
-    TRACE_ERROR("[Abnormal State] Reading Position=[%d], Writing Position=[%d]\n", ring.iReadPos,
-                ring.iWritePos);
-    return ahead > 0 ? VARNEK_RING_OVERFLOW : VARNEK_RING_UNDERFLOW;
-}
-
-// Inlined, so that `hold` needs no address and can stay in registers.
-inline __attribute__((always_inline)) void VarnekRingSteps::Recover(VarnekCRingBuffer *ring,
-                                                                    HoldMutex *hold) {
-    hold->Release();
-    TRACE_MID("Ring Buffer will be reset!!!\n");
-    hold->Acquire();
-    Empty(ring);
-}
 
 VarnekCRingBuffer::VarnekCRingBuffer(int size) {
     if (size <= 0) {

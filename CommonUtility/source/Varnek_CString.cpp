@@ -145,19 +145,17 @@ int VarnekCString::operator==(const VarnekCString &other) const {
 }
 
 int VarnekCString::operator>(const VarnekCString &other) const {
-    return AreOrdered(pszString, other.pszString) && strcmp(pszString, other.pszString) > 0 ? 1 : 0;
+    return int{AreOrdered(pszString, other.pszString) && strcmp(pszString, other.pszString) > 0};
 }
 
 int VarnekCString::operator>=(const VarnekCString &other) const {
-    return AreOrdered(pszString, other.pszString) && strcmp(pszString, other.pszString) >= 0 ? 1
-                                                                                             : 0;
+    return int{AreOrdered(pszString, other.pszString) && strcmp(pszString, other.pszString) >= 0};
 }
 
 int VarnekCString::operator<(const VarnekCString &other) const {
-    return AreOrdered(pszString, other.pszString) && strcmp(pszString, other.pszString) < 0 ? 1 : 0;
+    return int{AreOrdered(pszString, other.pszString) && strcmp(pszString, other.pszString) < 0};
 }
 
 int VarnekCString::operator<=(const VarnekCString &other) const {
-    return AreOrdered(pszString, other.pszString) && strcmp(pszString, other.pszString) <= 0 ? 1
-                                                                                             : 0;
+    return int{AreOrdered(pszString, other.pszString) && strcmp(pszString, other.pszString) <= 0};
 }

@@ -1,5 +1,4 @@
-// The configuration record and its file. The search for a key, the load and the save use one table
-// of keys, in the order of the fields.
+// The settings and their file. Finding a key, loading and saving share one table of keys.
 #include "Varnek_Config.h"
 
 #include <dirent.h>
@@ -27,15 +26,11 @@
 #define CTRL_HIGH(...) VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
 #define CTRL_MID(...) VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, __VA_ARGS__)
 
-static_assert(sizeof(VarnekConfigInfo) == 212, "callers and library agree on this record");
-static_assert(offsetof(VarnekConfigInfo, standardType) == 100,
-              "callers and library agree on this record");
-static_assert(offsetof(VarnekConfigInfo, tsFileSimulEnable) == 105,
-              "callers and library agree on this record");
-static_assert(offsetof(VarnekConfigInfo, cprmPlayerDelay) == 108,
-              "callers and library agree on this record");
-static_assert(offsetof(VarnekConfigInfo, supportNation) == 112,
-              "callers and library agree on this record");
+// Callers and library agree on this record.
+static_assert(sizeof(VarnekConfigInfo) == 212 && offsetof(VarnekConfigInfo, standardType) == 100 &&
+              offsetof(VarnekConfigInfo, tsFileSimulEnable) == 105 &&
+              offsetof(VarnekConfigInfo, cprmPlayerDelay) == 108 &&
+              offsetof(VarnekConfigInfo, supportNation) == 112);
 
 namespace {
 
@@ -186,9 +181,9 @@ bool IsProtected(const struct stat64 &entry) {
     return IsOwnFile(entry) && (entry.st_mode & S_IWUSR) == 0;
 }
 
-// Whether a new file may replace the entry at the path of the settings: if there is none, or if it
-// is a file of this user that may be written and has no second name (hard link). A file that
-// another save is just replacing has no name at all. Fills `*old`, with zeros if there is no entry.
+// Whether a new file may replace what is at the path of the settings: nothing, or a file of this
+// user that may be written and has no second name. One that is just being replaced has no name at
+// all. Fills `*old`, with zeros if there is nothing.
 bool MayReplace(struct stat64 *old) {
     *old = {};
     if (lstat64(kSettingsPath, old) != 0) {
@@ -197,9 +192,8 @@ bool MayReplace(struct stat64 *old) {
     return IsOwnFile(*old) && !IsProtected(*old) && old->st_nlink <= 1;
 }
 
-// Gives the draft the group and the mode of the file that it will replace, as late as possible,
-// because another process may change them during the save. Returns false if that fails or the file
-// may no longer be replaced.
+// Gives the draft the group and the mode of the file that it will replace, as late as possible, as
+// another process may change them. Returns false if that fails or the file must not be replaced.
 bool ImitateOld(int draft) {
     struct stat64 old = {};
     return MayReplace(&old) &&
@@ -207,9 +201,8 @@ bool ImitateOld(int draft) {
                                  fchmod(draft, old.st_mode & 07777) == 0));
 }
 
-// Removes the drafts of processes that ended during a save. A process that does not exist is told
-// from a live one without any permission. When an id is in use again, the draft stays until a save
-// after the end of that process.
+// Removes the drafts of processes that ended while saving. Whether a process exists can be told
+// without any permission; if its id is in use again, the draft stays until that process has ended.
 void RemoveDeadDrafts(DIR *directory) {
     while (const struct dirent64 *entry = readdir64(directory)) {
         constexpr size_t kLength = sizeof kDraftPrefix - 1;
@@ -221,10 +214,10 @@ void RemoveDeadDrafts(DIR *directory) {
     }
 }
 
-// Writes the text to a draft, flushes it to the medium, and renames it over the settings file. So a
-// reader finds either the old text or the new one, whatever happens to this process. No lock is
-// needed: each save has a draft of its own. Returns false on failure, without a line in the log;
-// the file then has its old text, or the new one that may not be on the medium yet.
+// Writes the text to a draft, flushes it to the medium and renames it over the settings file, so a
+// reader finds the old text or the new one, whatever happens to this process. Each save has a draft
+// of its own and needs no lock. Returns false on failure, without a line; the file then has its old
+// text, or the new one that may not be on the medium yet.
 bool Replace(DIR *directory, const char *text, size_t length) {
     static std::atomic<unsigned int> saves{0};
     const int in = dirfd(directory);
@@ -318,8 +311,7 @@ void VarnekCfg_LoadConfigFile() {
         CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Open Config File!");
         return;
     }
-    // The record is cleared only after the text has been read. Otherwise a file that cannot be read
-    // would cost the settings, and the next save would write empty ones.
+    // Cleared only once there is a text, or an unreadable file would cost the settings.
     char *text = ReadSettings(file);
     VarnekPGL_CloseFile(file);
     if (text == nullptr) {

@@ -1,8 +1,6 @@
-// The masked trace, the debug configuration that masks it, and the assertion report.
-//
-// One atomic word says what is enabled, so for a trace that is off, the library only loads and
-// tests that word. Each call composes its line in a buffer on its stack, and holds no lock while it
-// formats and writes the line. The only lock here lets one thread at a time load the configuration.
+// The masked trace, the debug configuration that masks it, and the assertion report. One atomic
+// word says what is enabled, so a trace that is off only loads and tests that word. Each call
+// composes its line on its stack and holds no lock meanwhile.
 #include "Varnek_Debug.h"
 
 #include <errno.h>
@@ -36,11 +34,7 @@ namespace {
 constexpr uint32_t kLevelBits = 0xF0000000u;
 constexpr uint32_t kModuleBits = 0x00000FFFu;
 
-// Serialises loads. gDebugLoader is the thread that holds the lock. A load calls the log function,
-// which may trace. With gDebugLoader such a trace recognises that its own thread is loading, and
-// returns instead of waiting for itself.
-Lock gDebugLoadLock;
-std::atomic<pthread_t> gDebugLoader{};
+OneAtATime gDebugLoad;
 
 constexpr size_t kTraceLineSize = 2048;
 constexpr size_t kTraceTextSize = 2018;  // the caller's text with its terminator
@@ -238,9 +232,8 @@ uint32_t StateOf(uint32_t enabled) {
     return (enabled & kOwnLow) == kOwnLow ? enabled | kOwnLowOn : enabled;
 }
 
-// Runs one load. During the load nothing is traced, even if an earlier configuration enabled
-// traces.
-void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
+// Loads; nothing is traced meanwhile, even if an earlier configuration enabled traces.
+void LoadConfig() {
     if (IsLoaded()) {
         gDebugState.store(0, std::memory_order_relaxed);
     }
@@ -249,19 +242,15 @@ void LoadConfig() VARNEK_REQUIRES(gDebugLoadLock) {
     gDebugState.store(StateOf(enabled), std::memory_order_relaxed);
 }
 
-// Loads under the lock. Without `again`, it loads only if no other thread finished a load while
-// this one waited for the lock.
+// Loads the configuration, once if several threads find it missing at the same time, and always
+// with `again`. Loading calls the log function; if that traces, in this thread, nothing happens.
 void LoadConfigOnce(bool again) {
     const ErrnoKeeper keeper;
-    if (pthread_equal(gDebugLoader.load(std::memory_order_relaxed), pthread_self())) {
-        return;
-    }
-    const Hold hold(gDebugLoadLock);
-    if (again || !IsLoaded()) {
-        gDebugLoader.store(pthread_self(), std::memory_order_relaxed);
-        LoadConfig();
-        gDebugLoader.store(pthread_t{}, std::memory_order_relaxed);
-    }
+    gDebugLoad.Do([again] {
+        if (again || !IsLoaded()) {
+            LoadConfig();
+        }
+    });
 }
 
 // Writes "[L][File.cpp- 442] ", as far as it fits, without a terminator, and returns its length. It
@@ -297,8 +286,8 @@ size_t PutPrefix(char (&line)[kTraceLineSize], char label, const char *file, int
     return length;
 }
 
-// Composes and writes a line that may be enabled. Loads the configuration first if that has not
-// happened. Not inlined, so that its buffer costs nothing in a trace that is off.
+// Writes a line that may be enabled, after loading the configuration if that has not happened. Not
+// inlined, so that its buffer costs nothing in a trace that is off.
 __attribute__((noinline, format(printf, 2, 0))) void WriteTrace(uint32_t mask, const char *format,
                                                                 va_list args) {
     if (!IsLoaded()) {

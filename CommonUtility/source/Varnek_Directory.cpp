@@ -13,13 +13,10 @@
 #include "Varnek_Storage.h"
 #include "Varnek_Support.h"
 
-static_assert(sizeof(PglDirEntry) == 560, "callers and library agree on this record");
-static_assert(offsetof(PglDirEntry, name) == 296, "callers and library agree on this record");
-static_assert(sizeof(PglDirEntryInfo) == 260, "callers and library agree on this record");
-static_assert(offsetof(PglDirEntryInfo, name) == 4, "callers and library agree on this record");
-static_assert(sizeof(PglFmFileAttributes) == 40, "callers and library agree on this record");
-static_assert(offsetof(PglFmFileAttributes, size) == 32,
-              "callers and library agree on this record");
+// Callers and library agree on these records.
+static_assert(sizeof(PglDirEntry) == 560 && offsetof(PglDirEntry, name) == 296);
+static_assert(sizeof(PglDirEntryInfo) == 260 && offsetof(PglDirEntryInfo, name) == 4);
+static_assert(sizeof(PglFmFileAttributes) == 40 && offsetof(PglFmFileAttributes, size) == 32);
 
 namespace {
 
@@ -375,7 +372,20 @@ class ShellCommand {
     bool fits_ = true;
 };
 
-// Whether a copy may run. The shell empties the destination before it reads the source. So if the
+// Runs "COMMAND source BETWEEN destination". Returns 0; -1, after a line of the operation, on
+// failure and if it may not run.
+int32_t RunOnTwo(const char *operation, bool mayRun, const char *command, const char *source,
+                 const char *between, const char *destination) {
+    ShellCommand<kCopyCommandSize> line;
+    if (mayRun && line.Add(command).AddPath(source).Add(between).AddPath(destination).Run() == 0) {
+        return 0;
+    }
+    __VarnekPGL_FileLog("%s : fail src = %s dest = %s", operation, Shown(source),
+                        Shown(destination));
+    return -1;
+}
+
+// Whether a copy may run. The shell empties the destination before it reads the source, so if the
 // source could not be read, or were the destination itself, the destination would lose its content.
 bool MayCopy(const char *source, const char *destination) {
     struct stat64 from = {};
@@ -389,42 +399,21 @@ bool MayCopy(const char *source, const char *destination) {
 }  // namespace
 
 int32_t VarnekPGL_CopyFile(const char *source, const char *destination) {
-    ShellCommand<kCopyCommandSize> command;
-    if (source == nullptr || destination == nullptr || !MayCopy(source, destination) ||
-        command.Add("cat ").AddPath(source).Add(" > ").AddPath(destination).Run() != 0) {
-        __VarnekPGL_FileLog("%s : fail src = %s dest = %s", __func__, Shown(source),
-                            Shown(destination));
-        return -1;
-    }
-    return 0;
+    const bool mayRun = source != nullptr && destination != nullptr && MayCopy(source, destination);
+    return RunOnTwo(__func__, mayRun, "cat ", source, " > ", destination);
 }
 
 int32_t VarnekPGL_MoveFile(const char *source, const char *destination) {
-    ShellCommand<kCopyCommandSize> command;
-    if (source == nullptr || destination == nullptr ||
-        command.Add("mv ").AddPath(source).Add(" ").AddPath(destination).Run() != 0) {
-        __VarnekPGL_FileLog("%s : fail src = %s dest = %s", __func__, Shown(source),
-                            Shown(destination));
-        return -1;
-    }
-    return 0;
+    const bool mayRun = source != nullptr && destination != nullptr;
+    return RunOnTwo(__func__, mayRun, "mv ", source, " ", destination);
 }
 
 int32_t VarnekPGL_Chmod(const char *path, int32_t mode) {
-    ShellCommand<kChmodCommandSize> command;
-    switch (mode) {
-        case 666:
-            command.Add("chmod 666 ");
-            break;
-        case 755:
-            command.Add("chmod 755 ");
-            break;
-        case 777:
-            command.Add("chmod 777 ");
-            break;
-        default:
-            return -1;
+    if (mode != 666 && mode != 755 && mode != 777) {
+        return -1;
     }
+    ShellCommand<kChmodCommandSize> command;
+    command.Add(mode == 666 ? "chmod 666 " : mode == 755 ? "chmod 755 " : "chmod 777 ");
     const int32_t status = path != nullptr ? command.AddPath(path).Run() : -1;
     if (status != 0) {
         __VarnekPGL_FileLog("%s : Could not change permission [%s]", __func__, command.Text());

@@ -46,19 +46,11 @@ PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags) {
         __VarnekPGL_FileLog("%s : file path(%s) length over max size", __func__, path);
         return -1;
     }
-    const char *mode = nullptr;
-    if ((flags & PGL_FILE_MODE_READ) != 0) {
-        mode = "r";
-    }
-    if ((flags & PGL_FILE_MODE_WRITE) != 0) {
-        mode = "w";
-    }
-    if ((flags & PGL_FILE_MODE_CREATE_RW) != 0) {
-        mode = "w+";
-    }
-    if ((flags & PGL_FILE_MODE_APPEND) != 0) {
-        mode = "a";
-    }
+    const char *const mode = (flags & PGL_FILE_MODE_APPEND) != 0      ? "a"
+                             : (flags & PGL_FILE_MODE_CREATE_RW) != 0 ? "w+"
+                             : (flags & PGL_FILE_MODE_WRITE) != 0     ? "w"
+                             : (flags & PGL_FILE_MODE_READ) != 0      ? "r"
+                                                                      : nullptr;
     if (mode == nullptr) {
         return -1;
     }

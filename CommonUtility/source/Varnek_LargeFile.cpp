@@ -36,10 +36,7 @@ int32_t VarnekPGL_OpenFile64Bits(const char *path, int32_t flags) {
         access = (access & ~O_ACCMODE) | O_RDWR | O_CREAT;
     }
     if ((flags & readWrite) == readWrite) {
-        access = O_RDWR;
-        if ((flags & PGL_FILE_MODE_CREATE_RW) != 0) {
-            access |= O_CREAT;
-        }
+        access = O_RDWR | ((flags & PGL_FILE_MODE_CREATE_RW) != 0 ? O_CREAT : 0);
     }
     // The umask decides who else may use the data; it is never executable.
     const int fd = path != nullptr ? open(path, access | O_LARGEFILE, 0666) : -1;

@@ -1,7 +1,6 @@
-// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. The table of the direct
-// conversion from Latin-15 to UTF-8 is built with UnitOf and PutUtf8, so the result cannot differ
-// from that of the two steps. The decoder and the computation of its output size both use
-// CharLength, so they agree on every text.
+// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. The direct conversion
+// from Latin-15 to UTF-8 cannot differ from the two steps, because its table is built from theirs.
+// The decoder and the computation of its output size agree, because both use CharLength.
 #include "Varnek_LngPack.h"
 
 #include <limits.h>
@@ -9,6 +8,7 @@
 #include <stdlib.h>
 #include <string.h>
 
+#include "Varnek_Bytes.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
@@ -73,11 +73,9 @@ constexpr char *PutUtf8(char *out, unsigned int unit) {
     return out;
 }
 
-// Whether all bytes of a word are plain. A byte is plain if the top bit is clear in the byte
-// itself, in the byte minus 0x20 (where a byte below 0x20 sets it), and in the byte plus 1 (where
-// 0x7F sets it). The arithmetic is done on all bytes at once, so a byte may borrow from the next
-// one or carry into it. This does no harm: the first byte that does so is not plain, and its own
-// top bit is set.
+// Whether all bytes of a word are plain: the top bit is clear in the byte itself, in the byte minus
+// 0x20 (which sets it below 0x20) and in the byte plus 1 (which sets it for 0x7F). A byte that
+// borrows from the next one or carries into it does no harm, because its own top bit is set.
 using Word = uintptr_t;
 constexpr bool ArePlain(Word bytes) {
     constexpr Word kOnes = ~Word{0} / 0xFF;
@@ -362,9 +360,8 @@ BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
         TRACE_HIGH("VarnekPGL_ConvertLatin15toUTF8: outputData or szInput is NULL  !\n");
         return FALSE;
     }
-    // The input may have three times the stated size plus one byte. The limit makes sure that no
-    // size below overflows. The size of the buffer depends on the input itself, not on the stated
-    // size.
+    // The input may have three times the stated size plus one byte, within a limit that keeps the
+    // sizes below from overflowing. The buffer's size follows the input, not the stated size.
     const uint64_t stated = 3 * static_cast<uint64_t>(szInputSize) + 1;
     const int capacity = stated < INT_MAX / 4 ? static_cast<int>(stated) : INT_MAX / 4;
     const size_t length = LengthWithin(szInput, static_cast<size_t>(capacity) + 1);

@@ -1,17 +1,16 @@
-// Named mutexes and named semaphores. Both families use the slot table in the same way. But they
-// have different messages, trace at different points, and a deletion refuses different things, so
-// they do not share code here.
+// Named mutexes and named semaphores. They share no code because their messages, trace points and
+// deletion rules differ.
 #include "Varnek_Semaphore.h"
 
 #include <pthread.h>
 #include <semaphore.h>
 
+#include "Varnek_Clock.h"
 #include "Varnek_Lock.h"
+#include "Varnek_MutexTable.h"
 #include "Varnek_SlotTable.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
-
-SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE> gMutexArr;
 
 namespace {
 
@@ -20,6 +19,15 @@ constexpr int MAX_SEM_MGR_INFO_ARR_SIZE = 40;
 struct SEM_MGR_INFO {
     sem_t linuxSem;
 };
+
+// Returns the first 32-bit word of an OS object. Log lines show it, because it contains the state.
+template <typename OsObject>
+int FirstWord(const OsObject &object) {
+    int32_t word = 0;
+    static_assert(sizeof object >= sizeof word, "an OS object has at least one word");
+    memcpy(&word, &object, sizeof word);
+    return word;
+}
 
 // Each table has a lock that guards every change. Lookups read the table without it.
 Lock gMutexArrLock;
@@ -56,7 +64,7 @@ int32_t __Varnek_create_mutex(const char *szMutexName) {
         return VARNEK_FAIL(-1, "***** __Varnek_create_mutex : Can't find empty index!!!!");
     }
     pthread_mutex_t &linuxMutex = slot->info.linuxMutex;
-    if (!Succeeded(pthread_mutex_init(&linuxMutex, nullptr))) {
+    if (SetErrno(pthread_mutex_init(&linuxMutex, nullptr)) != 0) {
         return VARNEK_FAIL(-1, "***** __Varnek_create_mutex : Mutex creation FAIL!! errCode = [%d]",
                            VarnekPGL_SysGetLastErro());
     }
@@ -72,11 +80,11 @@ int32_t __Varnek_create_mutex(const char *szMutexName) {
 // Destroys a mutex unless a thread holds it. Some systems would destroy a held mutex and some would
 // refuse; with the trylock the result is the same everywhere.
 bool DestroyMutex(pthread_mutex_t *mutex) {
-    if (!Succeeded(pthread_mutex_trylock(mutex))) {
+    if (SetErrno(pthread_mutex_trylock(mutex)) != 0) {
         return false;
     }
     pthread_mutex_unlock(mutex);
-    return Succeeded(pthread_mutex_destroy(mutex));
+    return SetErrno(pthread_mutex_destroy(mutex)) == 0;
 }
 
 }  // namespace
@@ -110,35 +118,40 @@ BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
     return TRUE;
 }
 
-pthread_mutex_t *LockFailed(const void *slot, int32_t hMutex, int error) {
-    if (slot == nullptr) {
-        return VARNEK_FAIL(
-            nullptr, "***** VarnekPGL_AcquireMutex : Can't find mutex info. mutex handle = [%d]",
-            hMutex);
-    }
-    errno = error;
-    return VARNEK_FAIL(nullptr, "***** VarnekPGL_AcquireMutex : Mutex Lock FAIL! errCode = [%d]",
+namespace {
+
+// Failures of acquiring and releasing. Out of line, so that a success, which every ring operation
+// waits for, pays nothing for them.
+__attribute__((noinline, cold)) BOOL NoSuchMutex(const char *operation, int32_t hMutex) {
+    return VARNEK_FAIL(FALSE, "***** %s : Can't find mutex info. mutex handle = [%d]", operation,
+                       hMutex);
+}
+
+__attribute__((noinline, cold)) BOOL MutexFails(const char *operation, const char *step,
+                                                int error) {
+    SetErrno(error);
+    return VARNEK_FAIL(FALSE, "***** %s : Mutex %s FAIL! errCode = [%d]", operation, step,
                        VarnekPGL_SysGetLastErro());
 }
 
-BOOL UnlockFailed(int error) {
-    errno = error;
-    return VARNEK_FAIL(FALSE, "***** VarnekPGL_ReleaseMutex : Mutex Unlock FAIL! errCode = [%d]",
-                       VarnekPGL_SysGetLastErro());
-}
+}  // namespace
 
 BOOL VarnekPGL_AcquireMutex(int32_t hMutex) {
-    return LockMutex(hMutex) != nullptr ? TRUE : FALSE;
+    auto *const slot = gMutexArr.Find(hMutex);
+    if (slot == nullptr) {
+        return NoSuchMutex(__func__, hMutex);
+    }
+    const int error = pthread_mutex_lock(&slot->info.linuxMutex);
+    return error == 0 ? TRUE : MutexFails(__func__, "Lock", error);
 }
 
 BOOL VarnekPGL_ReleaseMutex(int32_t hMutex) {
     auto *const slot = gMutexArr.Find(hMutex);
     if (slot == nullptr) {
-        return VARNEK_FAIL(
-            FALSE, "***** VarnekPGL_ReleaseMutex : Can't find mutex info. mutex handle = [%d]",
-            hMutex);
+        return NoSuchMutex(__func__, hMutex);
     }
-    return UnlockMutex(&slot->info.linuxMutex);
+    const int error = pthread_mutex_unlock(&slot->info.linuxMutex);
+    return error == 0 ? TRUE : MutexFails(__func__, "Unlock", error);
 }
 
 int32_t VarnekPGL_GetMutexByName(const char *szMutexName) {

@@ -1,23 +1,8 @@
-// The table of named objects. It manages slots, handles and names, and nothing else. Private.
-//
-// Each handle is given to one object only and is never given out again. A creation completes the
-// name of its slot and the Info, which is the data of the object, and then stores the handle, which
-// makes the slot visible. The name does not change until the handle is cleared. Lookups take no
-// lock. A lookup by handle reads the handle with acquire, unless its caller asks for a relaxed
-// read. A lookup by name reads the handle, the words of the name, and the handle again. If both
-// reads return the same handle, the words in between belong to that handle, because no handle is
-// given out twice. This is a sequence lock whose sequence number cannot repeat. Each name has a
-// digest. A lookup by name compares the digests first, so that it executes barriers only where the
-// name probably matches.
-//
-// A handle does not contain the index of its slot. So that a lookup by handle rarely has to scan
-// the slots, the table has 256 hints: the hint at handle % 256 is the index of the slot to check
-// first. A hint may be stale, or belong to another handle with the same remainder. So the lookup
-// compares the handle in that slot. If it is another one, the lookup scans all slots and corrects a
-// stale hint.
-//
-// A thread that changes the table holds the lock that guards it. Only hints are corrected without
-// the lock. A table of zero bytes is empty, so it needs no initialisation.
+// The table of named objects: slots, handles and names, and nothing else. A handle is given to one
+// object only and never again. So storing a handle publishes its slot, and a lookup, which takes no
+// lock, trusts what it reads while the handle stays the same. A thread that changes the table holds
+// the lock that guards it; only hints are corrected without it. A table of zero bytes is empty, so
+// it needs no initialisation. Private.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 
@@ -48,9 +33,9 @@ class SlotTable {
     };
 
     // Returns the slot of a live handle, null for none. It reads one slot if the hint is right, and
-    // scans all slots if not. The handle is read with `order`. A relaxed read does not make the
-    // Info visible, so it is only for a caller to which the Info is visible already, for example
-    // because it was complete before the calling thread started.
+    // scans all slots if not. Acquire pairs with the release in Publish, and makes the Info visible
+    // as it was published. A relaxed read does not, so it is for a caller that needs no more than
+    // what it sees already, such as what happened before the calling thread started.
     Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
         if (handle <= kFree) {
             return nullptr;
@@ -65,11 +50,12 @@ class SlotTable {
         if (length == kNameSize) {
             return kInvalidHandle;
         }
+        // The last word is compared here, because there names that belong together usually differ.
         const PackedName wanted(name, length);
-        const uint32_t digest = wanted.Digest();
-        for (const std::atomic<uint32_t> &candidate : digests_) {
-            if (candidate.load(std::memory_order_relaxed) == digest) {
-                const int32_t handle = HandleOfName(&candidate - digests_, wanted);
+        const size_t last = wanted.used - 1;
+        for (size_t slot = 0; slot < kSlots; slot++) {
+            if (names_[slot][last].load(std::memory_order_relaxed) == wanted.words[last]) {
+                const int32_t handle = HandleOfName(slot, wanted);
                 if (handle != kFree) {
                     return handle;
                 }
@@ -87,19 +73,16 @@ class SlotTable {
     // may have changed.
     int32_t Count() const { return count_.load(std::memory_order_relaxed); }
 
-    // Returns the lowest free slot, or with `last` the lowest one after that. Null for none, and
-    // always null once every handle has been given out.
-    Slot *FirstFree(const Slot *last = nullptr) {
-        for (int slot = NumberOf(last) + 1; slot < capacity && HasHandles(); slot++) {
-            if (slots_[slot].Has(kFree, std::memory_order_relaxed)) {
-                return &slots_[slot];
+    // Returns the lowest free slot. Null for none, and always null once every handle has been given
+    // out.
+    Slot *FirstFree() {
+        for (Slot &slot : slots_) {
+            if (given_ < INT32_MAX && slot.Has(kFree, std::memory_order_relaxed)) {
+                return &slot;
             }
         }
         return nullptr;
     }
-
-    // Whether there is a handle left to give out.
-    bool HasHandles() const { return given_ < INT32_MAX; }
 
     // The handle that the next publication gives out.
     int32_t NextHandle() const { return given_ + 1; }
@@ -108,17 +91,18 @@ class SlotTable {
     // complete. Returns its handle.
     int32_t Publish(Slot *slot, const char *name) {
         const int32_t handle = ++given_;
-        StoreName(NumberOf(slot), PackedName(name, LengthWithin(name, kNameSize - 1)));
+        StoreName(static_cast<size_t>(NumberOf(slot)),
+                  PackedName(name, LengthWithin(name, kNameSize - 1)));
         HintOf(handle).store(static_cast<uint32_t>(NumberOf(slot)), std::memory_order_relaxed);
         count_.fetch_add(1, std::memory_order_relaxed);
         slot->handle.store(handle, std::memory_order_release);
         return handle;
     }
 
-    // Makes the slot invisible. Returns the number of slots that remain in use.
+    // Makes the slot invisible; its name stays until the next publication. Returns the number of
+    // slots that remain in use.
     int32_t Withdraw(Slot *slot) {
         slot->handle.store(kFree, std::memory_order_relaxed);
-        digests_[NumberOf(slot)].store(0, std::memory_order_relaxed);
         return count_.fetch_sub(1, std::memory_order_relaxed) - 1;
     }
 
@@ -138,14 +122,6 @@ class SlotTable {
         PackedName(const char *name, size_t length) : used(length / sizeof(uint32_t) + 1) {
             words[used - 1] = 0;
             memcpy(words, name, length);
-        }
-        // Never 0, which stands for no name.
-        uint32_t Digest() const {
-            uint32_t digest = 0;
-            for (size_t i = 0; i < used; i++) {
-                digest = digest * 31 + words[i];
-            }
-            return digest | 1;
         }
         const size_t used;
         uint32_t words[kNameWords];
@@ -169,27 +145,46 @@ class SlotTable {
         return nullptr;
     }
 
-    // Returns the handle of a slot if this is its name, kFree otherwise. The words are not older
-    // than the handle, because the first read of the handle acquires. If a word is newer, it was
-    // stored after the fence in StoreName. That fence pairs with the fence here, so the second read
-    // does not find the handle any more.
-    int32_t HandleOfName(ptrdiff_t slot, const PackedName &wanted) const {
-        const int32_t handle = slots_[slot].handle.load(std::memory_order_acquire);
+    // Whether the words of a slot's name are these.
+    bool HasWords(size_t slot, const PackedName &wanted) const {
         for (size_t i = 0; i < wanted.used; i++) {
             if (names_[slot][i].load(std::memory_order_relaxed) != wanted.words[i]) {
-                return kFree;
+                return false;
             }
+        }
+        return true;
+    }
+
+    // Returns the handle of a slot if this is its name, kFree if not. The comparison before
+    // the first read of the handle, like that of the last word in FindByName, is only a filter,
+    // which saves the barriers below where nothing matches. It cannot miss a name whose creation
+    // happened before the lookup, because it reads the words of that creation or, if the object is
+    // being replaced meanwhile, later ones.
+    //
+    // The rest is a sequence lock whose sequence number, the handle, cannot repeat. If both reads
+    // return the same handle, the words in between belong to it:
+    // - They are not older. The first read acquires what Publish released, and the words were
+    //   stored before that.
+    // - They are not newer. A newer word was stored after the release fence in StoreName, and so
+    //   after the handle was withdrawn. If this reads such a word, its acquire fence synchronises
+    //   with that fence, and the second read does not find the handle any more.
+    __attribute__((noinline)) int32_t HandleOfName(size_t slot, const PackedName &wanted) const {
+        if (!HasWords(slot, wanted)) {
+            return kFree;
+        }
+        const int32_t handle = slots_[slot].handle.load(std::memory_order_acquire);
+        if (!HasWords(slot, wanted)) {
+            return kFree;
         }
         std::atomic_thread_fence(std::memory_order_acquire);
         return slots_[slot].Has(handle, std::memory_order_relaxed) ? handle : kFree;
     }
 
-    void StoreName(int slot, const PackedName &name) {
+    void StoreName(size_t slot, const PackedName &name) {
         std::atomic_thread_fence(std::memory_order_release);
         for (size_t i = 0; i < name.used; i++) {
             names_[slot][i].store(name.words[i], std::memory_order_relaxed);
         }
-        digests_[slot].store(name.Digest(), std::memory_order_relaxed);
     }
 
     std::atomic<uint32_t> &HintOf(int32_t handle) {
@@ -197,9 +192,10 @@ class SlotTable {
     }
 
     Slot slots_[kSlots];
-    // hints_[handle % kHints] is the index of the slot to check first.
+    // hints_[handle % kHints] is the index of the slot that a lookup checks first. It may be stale
+    // or belong to another handle with this remainder. Relaxed, because the handle found in the
+    // slot decides.
     std::atomic<uint32_t> hints_[kHints];
-    std::atomic<uint32_t> digests_[kSlots];  // of the names; 0 in a free slot
     std::atomic<uint32_t> names_[kSlots][kNameWords];
     std::atomic<int32_t> count_;
     int32_t given_;  // the last handle given out; the first is 1; used under the guard only

@@ -8,11 +8,13 @@
 #include <sys/time.h>
 #include <time.h>
 
+#include <tuple>
+
 #include "Varnek_Trace.h"
 
-static_assert(sizeof(VarnekCDateTime) == 24, "callers and library agree on this record");
-static_assert(offsetof(VarnekCDateTime, iSecond) == 20, "callers and library agree on this record");
-static_assert(sizeof(PglMilliTime) == 8, "callers and library agree on this record");
+// Callers and library agree on these records.
+static_assert(sizeof(VarnekCDateTime) == 24 && offsetof(VarnekCDateTime, iSecond) == 20);
+static_assert(sizeof(PglMilliTime) == 8);
 
 namespace {
 
@@ -32,41 +34,14 @@ constexpr int64_t kLastDay = kEndOfRange - kDay;
 constexpr int32_t kCommonMonths[] = {-1, 30, 58, 89, 119, 150, 180, 211, 242, 272, 303, 333, 364};
 constexpr int32_t kLeapMonths[] = {-1, 30, 59, 90, 120, 151, 181, 212, 243, 273, 304, 334, 365};
 
-// Compares the fields from the year down. Returns a negative number, 0 or a positive number.
-int Compare(const VarnekCDateTime &a, const VarnekCDateTime &b) {
-    constexpr int32_t VarnekCDateTime::*kFields[] = {
-        &VarnekCDateTime::iYear, &VarnekCDateTime::iMonth,  &VarnekCDateTime::iDay,
-        &VarnekCDateTime::iHour, &VarnekCDateTime::iMinute, &VarnekCDateTime::iSecond,
-    };
-    for (const auto field : kFields) {
-        if (a.*field != b.*field) {
-            return a.*field < b.*field ? -1 : 1;
-        }
-    }
-    return 0;
+// The fields in the order in which they are compared.
+auto Fields(const VarnekCDateTime &dt) {
+    return std::tie(dt.iYear, dt.iMonth, dt.iDay, dt.iHour, dt.iMinute, dt.iSecond);
 }
 
 // Whether `days` whole days fill the month with this number; a month outside 1 to 12 is never full.
 bool FillsMonth(int32_t month, int32_t days) {
-    switch (month) {
-        case 1:
-        case 3:
-        case 5:
-        case 7:
-        case 8:
-        case 10:
-        case 12:
-            return days >= 31;
-        case 4:
-        case 6:
-        case 9:
-        case 11:
-            return days >= 30;
-        case 2:
-            return days >= 28;
-        default:
-            return false;
-    }
+    return month >= 1 && month <= 12 && days >= kCommonMonths[month] - kCommonMonths[month - 1];
 }
 
 // Replaces an invalid date with 1970-01-01.
@@ -94,22 +69,14 @@ BOOL VarnekPGL_GetMilliseconds(PglMilliTime *out) {
     if (gettimeofday(&now, nullptr) != 0) {
         return FALSE;
     }
-    int64_t sec = now.tv_sec;
-    int32_t msec = static_cast<int32_t>(now.tv_usec / 1000);
-    if (sec >= kEndOfRange) {
-        sec = kLastDay + (sec - kEndOfRange) % kDay;
-        msec = 0;
-    }
-    out->sec = static_cast<int32_t>(sec);
-    out->msec = msec;
+    const int64_t sec = now.tv_sec;
+    const bool isBeyond = sec >= kEndOfRange;
+    out->sec = static_cast<int32_t>(isBeyond ? kLastDay + (sec - kEndOfRange) % kDay : sec);
+    out->msec = isBeyond ? 0 : static_cast<int32_t>(now.tv_usec / 1000);
     return TRUE;
 }
 
 BOOL VarnekPGL_GetSystemTime(VarnekCDateTime *dt) {
-    if (dt == nullptr) {
-        VARNEK_PANIC();
-        return FALSE;
-    }
     return VarnekPGL_SecondsToDataTime(static_cast<uint32_t>(time(nullptr)), dt);
 }
 
@@ -166,7 +133,7 @@ BOOL VarnekPGL_SecondsToDataTime(uint32_t seconds, VarnekCDateTime *dt) {
         rest -= kYear;
     }
     const int32_t day = static_cast<int32_t>(rest / kDay);
-    // Months have at most 31 days, so this estimate is the right month or an earlier one.
+    // No month is longer than 31 days, so this is the right month or an earlier one.
     int32_t month = day / 32 + 1;
     while (months[month] < day) {
         ++month;
@@ -206,23 +173,14 @@ uint32_t VarnekCDateTime::GetElapsedSeconds() const {
     if (iYear < 0 || iYear > kLastSpanYear) {
         return VARNEK_FAIL(0u, "Invalid Year!! iYear=[%d]\n", iYear);
     }
-    // The point this span after 1970-01-01. Days and months of a point count from 1, so they are
-    // one more than the number that has passed.
+    // The point that far after 1970-01-01. A point counts days and months from 1, so it has one
+    // more of each than have passed.
+    const bool isFull = FillsMonth(iMonth, iDay);
+    const int32_t passed = iMonth + (isFull ? 1 : 0);
     VarnekCDateTime point = *this;
-    point.iYear = iYear + kFirstYear;
-    int32_t passed = iMonth;
-    if (FillsMonth(iMonth, iDay)) {
-        ++passed;
-        point.iDay = 1;
-    } else {
-        point.iDay = static_cast<int32_t>(static_cast<uint32_t>(iDay) + 1);
-    }
-    if (passed >= 12) {
-        ++point.iYear;
-        point.iMonth = 1;
-    } else {
-        point.iMonth = passed + 1;
-    }
+    point.iYear = iYear + kFirstYear + (passed >= 12 ? 1 : 0);
+    point.iMonth = passed >= 12 ? 1 : passed + 1;
+    point.iDay = isFull ? 1 : static_cast<int32_t>(static_cast<uint32_t>(iDay) + 1);
     return VarnekPGL_DateTimeToSeconds(&point);
 }
 
@@ -249,21 +207,21 @@ VarnekCDateTime VarnekCDateTime::operator+(const VarnekCDateTime &other) const {
 }
 
 BOOL VarnekCDateTime::operator==(const VarnekCDateTime &other) const {
-    return Compare(*this, other) == 0 ? TRUE : FALSE;
+    return Fields(*this) == Fields(other) ? TRUE : FALSE;
 }
 
 BOOL VarnekCDateTime::operator>(const VarnekCDateTime &other) const {
-    return Compare(*this, other) > 0 ? TRUE : FALSE;
+    return Fields(*this) > Fields(other) ? TRUE : FALSE;
 }
 
 BOOL VarnekCDateTime::operator>=(const VarnekCDateTime &other) const {
-    return Compare(*this, other) >= 0 ? TRUE : FALSE;
+    return Fields(*this) >= Fields(other) ? TRUE : FALSE;
 }
 
 BOOL VarnekCDateTime::operator<(const VarnekCDateTime &other) const {
-    return Compare(*this, other) < 0 ? TRUE : FALSE;
+    return Fields(*this) < Fields(other) ? TRUE : FALSE;
 }
 
 BOOL VarnekCDateTime::operator<=(const VarnekCDateTime &other) const {
-    return Compare(*this, other) <= 0 ? TRUE : FALSE;
+    return Fields(*this) <= Fields(other) ? TRUE : FALSE;
 }

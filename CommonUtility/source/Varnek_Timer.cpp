@@ -1,19 +1,15 @@
-// The timer service. Each slot has one POSIX timer, which the first start creates and the deletion
-// deletes. One lock protects every access to the table, including the OS calls for a slot. It is
-// never held while a callback runs.
-//
-// The system delivers each expiry on a separate thread, so a delivery may be late: the owner may
-// already have seen the timer expire and started it again. The system may even drop the delivery,
-// because arming a timer discards a pending one. So a delivery only means that some start may be
-// due. If a start has expired but not called back when the timer is started again, it becomes an
-// owed start. Each delivery calls back for every start that is due: all owed starts, and the last
-// start if it has expired. docs/locking.md explains why each start calls back exactly once.
+// The timer service. One lock guards the table and every OS call for a slot; it is never held
+// during a callback. The system delivers an expiry on a thread of its own, perhaps late, and drops
+// it if the timer is armed again first. So a start that has expired but not called back becomes an
+// owed start when the next one comes, and a second OS timer, which only delivers what is owed,
+// expires at once. Any delivery calls back for each start that is due.
 #include "Varnek_Timer.h"
 
 #include <signal.h>
 #include <stdlib.h>
 #include <time.h>
 
+#include "Varnek_Clock.h"
 #include "Varnek_Lock.h"
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
@@ -32,13 +28,15 @@ struct OwedStart {
 
 struct TIMER_MGR_INFO {
     bool bUsed;
-    timer_t timerId;  // while bTimerCreated
+    timer_t timerId;      // while bTimerCreated
+    timer_t owedTimerId;  // while isOwedTimerCreated
     char szTmName[kTimerNameSize];
     TimerCallbackFunc pfnCallback;  // of the last start; null until the first
     void *pUserData;
     bool bTimerCreated;
-    bool bAwaited;    // the last start has neither called back nor been cancelled
-    OwedStart *owed;  // oldest first
+    bool bAwaited;  // the last start has neither called back nor been cancelled
+    bool isOwedTimerCreated;
+    OwedStart *owed;  // oldest first; until it is empty, a delivery of the second timer is to come
 };
 
 Lock gTimerArrLock;
@@ -81,40 +79,15 @@ timespec Milliseconds(int64_t milliseconds) {
 int ReadArmed(const TIMER_MGR_INFO &info, bool *armed) {
     itimerspec left = {};
     const int result = timer_gettime(info.timerId, &left);
-    // If no start is awaited, the OS timer runs only because Disarm set it for the owed starts.
-    *armed = info.bAwaited && (left.it_value.tv_sec > 0 || left.it_value.tv_nsec > 0);
+    *armed = left.it_value.tv_sec > 0 || left.it_value.tv_nsec > 0;
     return result;
 }
 
-// Sets the OS timer to expire once; a time of 0 disarms it. Returns the result of the OS call.
-int SetTime(const TIMER_MGR_INFO &info, const timespec &time) {
+// Sets an OS timer to expire once; a time of 0 disarms it. Returns the result of the OS call.
+int SetTime(timer_t timerId, const timespec &time) {
     itimerspec expiry = {};
     expiry.it_value = time;
-    return timer_settime(info.timerId, 0, &expiry, nullptr);
-}
-
-// Cancels the last start. This makes the system drop a pending delivery. So if there are owed
-// starts, the timer is set to deliver again at once. Returns the result of the OS call.
-int Disarm(const TIMER_MGR_INFO &info) {
-    timespec time = {};
-    time.tv_nsec = info.owed != nullptr ? 1 : 0;
-    return SetTime(info, time);
-}
-
-// Makes the last start, which has expired, an owed start. Returns false if there is no memory.
-bool OweLastStart(TIMER_MGR_INFO *info) {
-    OwedStart *start = static_cast<OwedStart *>(malloc(sizeof(OwedStart)));
-    if (start == nullptr) {
-        return false;
-    }
-    *start = {info->pfnCallback, info->pUserData, nullptr};
-    OwedStart **end = &info->owed;
-    while (*end != nullptr) {
-        end = &(*end)->next;
-    }
-    *end = start;
-    info->bAwaited = false;
-    return true;
+    return timer_settime(timerId, 0, &expiry, nullptr);
 }
 
 // Removes the oldest start that is due from the record, and returns it. The callback of the result
@@ -127,7 +100,7 @@ OwedStart TakeDue(TIMER_MGR_INFO *info) {
         return due;
     }
     bool armed = false;
-    if (!info->bAwaited || (info->bTimerCreated && ReadArmed(*info, &armed) == 0 && armed)) {
+    if (!info->bAwaited || (ReadArmed(*info, &armed) == 0 && armed)) {
         return {};
     }
     info->bAwaited = false;
@@ -143,7 +116,7 @@ void Clear(TIMER_MGR_INFO *info) {
     *info = {};
 }
 
-// The OS timer service calls this on one of its threads at each expiry.
+// The OS timer service calls this on one of its threads at each expiry of either timer.
 void TimerCallbackEntry(sigval value) {
     const uint32_t timer = static_cast<uint32_t>(value.sival_int);
     TRACE_MID("Timer Callback: Timer=[%d]", static_cast<int>(timer));
@@ -178,6 +151,41 @@ int MakeTimer(uint32_t timer, timer_t *timerId) {
     event.sigev_value.sival_int = static_cast<int>(timer);
     event.sigev_notify_function = TimerCallbackEntry;
     return timer_create(CLOCK_REALTIME, &event, timerId);
+}
+
+// Makes the last start, which has expired, an owed start, and lets the second timer deliver it. The
+// second timer is not armed again while an earlier delivery of it is to come, since that would drop
+// the delivery. Returns false, after a line, if the system or the memory does not permit it; the
+// last start then keeps its place, and its delivery.
+bool OweLastStart(uint32_t timer, TIMER_MGR_INFO *info) {
+    if (!info->isOwedTimerCreated) {
+        const int result = MakeTimer(timer, &info->owedTimerId);
+        if (result != 0) {
+            return VARNEK_FAIL(
+                false, "VarnekPGL_StartTimer. Linux Timer Creation FAIL. errCode = [%d]!", result);
+        }
+        info->isOwedTimerCreated = true;
+    }
+    OwedStart *const start = static_cast<OwedStart *>(malloc(sizeof(OwedStart)));
+    if (start == nullptr) {
+        return VARNEK_FAIL(false, "VarnekPGL_StartTimer. memalloc failed");
+    }
+    timespec atOnce = {};
+    atOnce.tv_nsec = 1;
+    const int result = info->owed == nullptr ? SetTime(info->owedTimerId, atOnce) : 0;
+    if (result != 0) {
+        free(start);
+        return VARNEK_FAIL(false, "VarnekPGL_StartTimer. Set Timer is FAIL. errCode = [%d]!",
+                           result);
+    }
+    *start = {info->pfnCallback, info->pUserData, nullptr};
+    OwedStart **end = &info->owed;
+    while (*end != nullptr) {
+        end = &(*end)->next;
+    }
+    *end = start;
+    info->bAwaited = false;
+    return true;
 }
 
 }  // namespace
@@ -244,10 +252,10 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
         }
         info->bTimerCreated = true;
     }
-    if (info->bAwaited && !OweLastStart(info)) {
-        return VARNEK_FAIL(FALSE, "VarnekPGL_StartTimer. memalloc failed");
+    if (info->bAwaited && !OweLastStart(timer, info)) {
+        return FALSE;
     }
-    const int result = SetTime(*info, Milliseconds(timeout));
+    const int result = SetTime(info->timerId, Milliseconds(timeout));
     if (result != 0) {
         TRACE_ERROR("VarnekPGL_StartTimer. Set Timer is FAIL. errCode = [%d]!", result);
         timer_delete(info->timerId);
@@ -285,7 +293,7 @@ BOOL VarnekPGL_CancelTimer(uint32_t timer) {
     }
     if (!armed) {
         TRACE_ERROR("VarnekPGL_CancelTimer. This timer(%s) is disarmed currently", info->szTmName);
-    } else if (Disarm(*info) != 0) {
+    } else if (SetTime(info->timerId, timespec{}) != 0) {
         const int error = VarnekPGL_SysGetLastErro();
         return VARNEK_FAIL(FALSE, "VarnekPGL_CancelTimer. Set Timer FAIL. errCode = [%d][%s]",
                            error, ErrorText(error));
@@ -305,11 +313,10 @@ BOOL VarnekPGL_DeleteTimer(uint32_t timer) {
         return VARNEK_FAIL(FALSE, "VarnekPGL_DeleteTimer. Invalid Timer Handle=[%d]!",
                            static_cast<int>(timer));
     }
-    if (info->bTimerCreated) {
-        const int result = timer_delete(info->timerId);
-        if (result != 0) {
-            TRACE_ERROR("VarnekPGL_DeleteTimer. Delete Timer is FAIL. errCode = [%d]!", result);
-        }
+    const int result = (info->bTimerCreated ? timer_delete(info->timerId) : 0) |
+                       (info->isOwedTimerCreated ? timer_delete(info->owedTimerId) : 0);
+    if (result != 0) {
+        TRACE_ERROR("VarnekPGL_DeleteTimer. Delete Timer is FAIL. errCode = [%d]!", result);
     }
     Clear(info);
     gTimerArrSize--;

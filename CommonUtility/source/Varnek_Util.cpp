@@ -1,11 +1,11 @@
-// CRC-32 over memory, sections and stored files. A step processes as many bytes as it uses tables:
-// 16 on 64-bit systems, then 4, then single bytes. The register is stored with its bytes reversed,
-// so that a little-endian machine can combine it with a word of data without swapping. The bytes
-// are combined by value, so neither byte order nor alignment affects the result.
+// CRC-32 over memory, sections and stored files: 16 bytes a step on 64-bit systems, then 4, then
+// one, with as many tables. The register is kept with its bytes reversed, so that a little-endian
+// machine need not swap words of data; byte order and alignment do not affect the result.
 #include "Varnek_Util.h"
 
 #include <stdlib.h>
 
+#include "Varnek_Bytes.h"
 #include "Varnek_File.h"
 #include "Varnek_Storage.h"
 #include "Varnek_Support.h"
@@ -18,8 +18,8 @@ constexpr uint32_t kInitial = 0xFFFFFFFFu;
 constexpr int32_t kTrailer = 4;     // bytes of a stored CRC
 constexpr int32_t kMinPayload = 4;  // minimum of bytes that a stored CRC covers
 
-// A table takes 1 KiB. On the 32-bit target, 16 tables would fill half of the first-level cache.
-// That does not pay for sections of a few hundred bytes at one or two megabytes a second.
+// On the 32-bit target, 16 tables of 1 KiB would fill half of the first-level cache, which does not
+// pay for sections of a few hundred bytes at one or two megabytes a second.
 constexpr bool kWide = sizeof(void *) == 8;
 
 // word[i] is the reversed register after byte i and a number of zero bytes.

@@ -1,9 +1,10 @@
-// The library converts the characters. This file handles the character table selector at the start,
-// line breaks, and characters that the conversions do not support.
+// The library converts the characters. This file handles the selector of the character table, the
+// control functions, and characters that the conversions do not support.
 #include "BroadcastText.h"
 
 #include <algorithm>
 #include <cstdlib>
+#include <cstring>
 #include <vector>
 
 #include "Varnek_LngPack.h"
@@ -13,22 +14,26 @@ namespace {
 
 using Units = std::vector<unsigned short>;
 
-constexpr unsigned char kFirstPrintable = 0x20;  // a lower first byte is a selector
-constexpr unsigned char kSelectNumbered = 0x10;  // the table's number follows in two bytes
+constexpr unsigned char kSelectLatin5 = 0x05;
+constexpr unsigned char kSelectNumbered = 0x10;  // a part of ISO/IEC 8859 follows in two bytes
 constexpr unsigned char kSelectUnicode = 0x11;
 constexpr unsigned char kSelectUtf8 = 0x15;
 constexpr unsigned char kSelectEncoding = 0x1F;  // the encoding's number follows in one byte
 
-size_t SelectorSize(unsigned char first) {
-    if (first >= kFirstPrintable) {
-        return 0;
+// Returns the size of a DVB selector; 0 when the text begins with anything else.
+size_t SelectorSize(const std::string &text) {
+    const unsigned char first = static_cast<unsigned char>(text[0]);
+    if (first == kSelectNumbered || first == kSelectEncoding) {
+        return first == kSelectNumbered ? 3 : 2;
     }
-    return first == kSelectNumbered ? 3 : first == kSelectEncoding ? 2 : 1;
+    const bool part_of_8859 = first >= 0x01 && first <= 0x0B && first != 0x08;
+    return part_of_8859 || (first >= kSelectUnicode && first <= kSelectUtf8) ? 1 : 0;
 }
 
 constexpr unsigned char kCarriageReturn = 0x0D;
 constexpr unsigned char kLineFeed = 0x0A;
-constexpr unsigned char kBreak = 0x8A;  // the line break of broadcasting; U+E08A in Unicode
+constexpr unsigned char kDvbBreak = 0x8A;        // in ISDB the same byte selects the normal size
+constexpr unsigned short kDvbControls = 0xE000;  // plus the byte: a DVB control in wider tables
 constexpr unsigned short kReplacement = 0xFFFD;
 
 std::string ConvertLatin15(const std::string &line) {
@@ -44,34 +49,69 @@ std::string ConvertLatin15(const std::string &line) {
 }
 
 bool IsControl(char c) {
-    return static_cast<unsigned char>(c) < 0x20 || static_cast<unsigned char>(c) == kBreak;
+    return (static_cast<unsigned char>(c) & 0x7F) < 0x20;
 }
 
-// Converts line by line, because the library's conversion drops control characters.
-std::string FromLatin15(const std::string &text) {
-    if (std::none_of(text.begin(), text.end(), IsControl)) {
-        return ConvertLatin15(text);
+// Returns the bytes of a control function of ISDB with its parameters. A parameter ends at the
+// first byte that is outside the range of its intermediate bytes, and is cut short by a byte that
+// cannot belong to it.
+size_t ControlSize(const std::string &text, size_t at) {
+    static const struct {
+        unsigned char control;
+        unsigned char least, most;  // of intermediate bytes; none if the first one is larger
+        int parameters;
+    } kWithParameters[] = {
+        {0x16, 1, 0, 1},       {0x19, 1, 0, 1},       {0x1D, 1, 0, 1},  // PAPF, SS2, SS3
+        {0x1B, 0x20, 0x2F, 1}, {0x1C, 1, 0, 2},                         // ESC, APS
+        {0x8B, 1, 0, 1},       {0x90, 0x20, 0x20, 1}, {0x91, 1, 0, 1},  // SZX, COL, FLC
+        {0x92, 0x20, 0x20, 1}, {0x93, 1, 0, 1},       {0x94, 1, 0, 1},  // CDC, POL, WMM
+        {0x97, 1, 0, 1},       {0x98, 1, 0, 1},                         // HLC, RPC
+        {0x9B, 0x20, 0x3F, 1}, {0x9D, 0x20, 0x3F, 1},                   // CSI, TIME
+    };
+    const auto byte = [&](size_t i) {
+        return i < text.size() ? static_cast<unsigned char>(text[i]) : 0;
+    };
+    if (byte(at) == 0x95) {  // MACRO, whose definition ends with another one
+        const size_t end = text.find("\x95\x4F", at);
+        return end == std::string::npos ? 2 : end + 2 - at;
     }
+    size_t size = 1;
+    for (const auto &row : kWithParameters) {
+        for (int left = row.control == byte(at) ? row.parameters : 0; left > 0; --left) {
+            while (byte(at + size) >= row.least && byte(at + size) <= row.most) {
+                ++size;
+            }
+            size += byte(at + size) >= 0x20 && byte(at + size) < 0x7F ? 1u : 0u;
+        }
+    }
+    return size;
+}
+
+// Converts the text between two control functions at a time, because the library's conversion drops
+// the line breaks too.
+std::string FromLatin15(const std::string &text, bool dvb) {
     std::string result;
-    std::string line;
-    for (size_t i = 0; i < text.size(); ++i) {
-        const unsigned char byte = static_cast<unsigned char>(text[i]);
-        const bool pair = byte == kCarriageReturn && i + 1 < text.size() && text[i + 1] == '\n';
-        if (byte == 0 || pair) {
-            continue;  // skips a zero byte, which would end the text, and the first of CR LF
+    for (size_t at = 0; at < text.size();) {
+        const auto end =
+            std::find_if(text.begin() + static_cast<std::ptrdiff_t>(at), text.end(), IsControl);
+        const size_t next = static_cast<size_t>(end - text.begin());
+        result += ConvertLatin15(text.substr(at, next - at));
+        if (end == text.end()) {
+            break;
         }
-        if (byte == kCarriageReturn || byte == kLineFeed || byte == kBreak) {
-            result += ConvertLatin15(line) + '\n';
-            line.clear();
-        } else {
-            line += text[i];
-        }
+        const unsigned char control = static_cast<unsigned char>(*end);
+        const bool pair =
+            control == kCarriageReturn && next + 1 < text.size() && text[next + 1] == kLineFeed;
+        const bool breaks =
+            control == kCarriageReturn || control == kLineFeed || (dvb && control == kDvbBreak);
+        result += breaks && !pair ? "\n" : "";
+        at = next + (dvb ? 1 : ControlSize(text, next));
     }
-    return result + ConvertLatin15(line);
+    return result;
 }
 
 bool IsBreak(unsigned short unit) {
-    return unit == kCarriageReturn || unit == kLineFeed || unit == kBreak || unit == 0xE08A;
+    return unit == kCarriageReturn || unit == kLineFeed || unit == kDvbControls + kDvbBreak;
 }
 
 // Whether a unit is a control character, also one of those that broadcasting has from U+E080 on.
@@ -105,6 +145,22 @@ std::string FromUnits(const Units &units) {
     kept.push_back(0);
     std::vector<char> text(kept.size() * 3 + 1);
     return WmConvert2LCode(text.data(), kept.data()) == FALSE ? std::string() : text.data();
+}
+
+// ISO/IEC 8859-9 differs from the first characters of Unicode in six letters.
+std::string FromLatin5(const std::string &text) {
+    Units units;
+    for (const char c : text) {
+        const auto byte = static_cast<unsigned char>(c);
+        constexpr char kBytes[] = "\xD0\xDD\xDE\xF0\xFD\xFE";
+        constexpr unsigned short kLetters[] = {0x011E, 0x0130, 0x015E, 0x011F, 0x0131, 0x015F};
+        const char *found = c != 0 ? std::strchr(kBytes, c) : nullptr;
+        const bool control = byte >= 0x80 && byte < 0xA0;
+        units.push_back(found != nullptr
+                            ? kLetters[found - kBytes]
+                            : static_cast<unsigned short>(byte + (control ? kDvbControls : 0)));
+    }
+    return FromUnits(units);
 }
 
 std::string FromUnicode(const std::string &text) {
@@ -173,12 +229,14 @@ std::string ToUtf8(const std::string &bytes) {
     if (bytes.empty()) {
         return {};
     }
-    const unsigned char first = static_cast<unsigned char>(bytes[0]);
-    const std::string text = bytes.substr(std::min(SelectorSize(first), bytes.size()));
-    if (first == kSelectUnicode) {
-        return FromUnicode(text);
-    }
-    return first == kSelectUtf8 ? FromUtf8(text) : FromLatin15(text);
+    const size_t selector = SelectorSize(bytes);
+    const std::string text = bytes.substr(std::min(selector, bytes.size()));
+    const unsigned char first = selector != 0 ? static_cast<unsigned char>(bytes[0]) : 0;
+    const bool latin5 = first == kSelectLatin5 || bytes.compare(0, 3, "\x10\x00\x09", 3) == 0;
+    return first == kSelectUnicode ? FromUnicode(text)
+           : first == kSelectUtf8  ? FromUtf8(text)
+           : latin5                ? FromLatin5(text)
+                                   : FromLatin15(text, selector != 0);
 }
 
 }  // namespace receiver

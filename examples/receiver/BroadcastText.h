@@ -6,9 +6,11 @@
 
 namespace receiver {
 
-// Converts the text of a descriptor. It is ISO/IEC 8859-15, unless its first bytes select UTF-8 or
-// 16-bit Unicode. Other selectors are skipped, and the rest is read as ISO/IEC 8859-15. Characters
-// that are malformed or beyond 16 bits become U+FFFD. Line breaks of any kind become "\n".
+// Converts the text of a descriptor. A text of ISDB-Tb is ISO/IEC 8859-15 with the control
+// functions of ARIB STD-B24, which are dropped with their parameters. A text of DVB may begin with
+// a selector of UTF-8, 16-bit Unicode or ISO/IEC 8859-9; after any other selector it is read as
+// ISO/IEC 8859-15. Characters that are malformed or beyond 16 bits become U+FFFD. Line breaks of
+// any kind become "\n".
 //   returns  well-formed UTF-8 without other control characters
 std::string ToUtf8(const std::string &bytes);
 

@@ -8,9 +8,9 @@
 
 namespace receiver {
 
-struct DateTime {
-    int year, month, day, hour, minute, second;
-};
+// Seconds since the start of Modified Julian Day 0, in the zone that the stream uses. Unlike the
+// library's calendar, which ends with 2030, it covers every date that a stream can express.
+using DateTime = int64_t;
 
 // Decodes a time of day or a duration: six decimal digits hhmmss.
 //   returns  seconds; nothing for a digit above 9, and for 60 or more minutes or seconds. This
@@ -22,15 +22,9 @@ std::optional<int> DecodeBcdTime(uint32_t bcd);
 //            days before 1900-03-01, the first day of the calendar rule that broadcasting uses
 std::optional<DateTime> DecodeDateTime(uint16_t mjd, uint32_t bcd);
 
-// Returns the time that is `seconds` later, or earlier if they are negative.
-//   returns  nothing when either time is outside 1970 to 2030
-std::optional<DateTime> Shifted(const DateTime &time, int seconds);
-
 // Return "YYYY-MM-DD hh:mm:ss" and "hh:mm:ss"; empty when the time is not known.
 std::string ToText(const std::optional<DateTime> &time);
 std::string ToText(const std::optional<int> &seconds);
-
-bool operator<(const DateTime &left, const DateTime &right);
 
 }  // namespace receiver
 

@@ -15,11 +15,11 @@ constexpr size_t kBlockSize = 256 * kPacketSize;
 
 const char *Explain(int32_t result) {
     switch (result) {
-        case -28:
+        case VARNEK_FILE_MEDIUM_FULL:
             return "no space is left";
-        case -27:
+        case VARNEK_FILE_TOO_LARGE:
             return "the file would become too large";
-        case -5:
+        case VARNEK_FILE_DEVICE_FAILURE:
             return "the device failed";
         default:
             return "it could not be written";

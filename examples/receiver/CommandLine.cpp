@@ -44,6 +44,7 @@ constexpr struct {
     const char *help;
 } kOptions[] = {
     {"--json", nullptr, Set<&Options::json>, "show everything as one JSON object"},
+    {"--all", nullptr, Set<&Options::all>, "list every event and every PID"},
     {"--region", "N", SetRegion,
      "show local times of this region if the nation has several; the default is the first one"},
     {"--capture", "FILE", SetCapture,

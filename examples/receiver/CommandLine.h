@@ -15,6 +15,7 @@ struct Options {
     bool help = false;
     bool version = false;
     bool json = false;
+    bool all = false;
     bool quiet = false;
     bool log = false;
     std::optional<uint8_t> region;

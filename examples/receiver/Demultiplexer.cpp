@@ -2,6 +2,8 @@
 // the PAT here rather than in the table parser, so that no packet in between is missed.
 #include "Demultiplexer.h"
 
+#include <cstring>
+#include <iterator>
 #include <utility>
 
 #include "Tables.h"
@@ -73,29 +75,31 @@ void Demultiplexer::Push(const unsigned char *packet) {
         return;
     }
     if (header.pcr != nullptr) {
-        pcr_meter_.Push(header.pid, ReadPcr(header.pcr), position, header.discontinuity);
+        pcr_meter_.Push(header.pid, ReadPcr(header.pcr), position);
     }
     const Order order = CheckContinuity(header, state);
     if (order == Order::kBroken) {
         ++counters_.continuity_errors;
         ++state.counters.continuity_errors;
     }
-    if (state.table_uses == 0 || order == Order::kRepeated) {
+    const bool claimed = state.table_uses != 0;
+    if ((!claimed && !MayBePmt(header, packet, state)) || order == Order::kRepeated) {
         return;
     }
     const bool unusable = header.has_payload && (header.scrambled || header.payload == kPacketSize);
     if (order != Order::kNext || unusable) {
-        counters_.incomplete += static_cast<unsigned>(state.assembler.Drop());
+        const int dropped = state.assembler.Drop();
+        counters_.incomplete += static_cast<unsigned>(claimed ? dropped : 0);
     }
     if (!header.has_payload || unusable) {
         return;
     }
-    const int given_up = state.assembler.Push(
-        packet + header.payload, kPacketSize - header.payload, header.unit_start,
-        [this, &header](const unsigned char *section, size_t size) {
-            OnSection(header.pid, section, size);
-        });
-    counters_.incomplete += static_cast<unsigned>(given_up);
+    const int given_up =
+        state.assembler.Push(packet + header.payload, kPacketSize - header.payload,
+                             header.unit_start, [&](const unsigned char *section, size_t size) {
+                                 OnSection(header.pid, claimed, section, size);
+                             });
+    counters_.incomplete += static_cast<unsigned>(claimed ? given_up : 0);
 }
 
 // Reads the bytes directly instead of field by field, because it processes every packet.
@@ -141,53 +145,117 @@ Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header, PidSta
     return header.has_payload && repeatable ? Order::kRepeated : Order::kBroken;
 }
 
-void Demultiplexer::OnSection(uint16_t pid, const unsigned char *section, size_t size) {
+// Whether a packet may carry a PMT that no PAT has named. A stream may begin with PMTs, and one
+// that is reduced to its one-seg service has no PAT at all.
+bool Demultiplexer::MayBePmt(const Header &header, const unsigned char *packet,
+                             PidState &state) const {
+    if (pat_complete_) {
+        return false;
+    }
+    if (header.unit_start && header.payload < kPacketSize) {
+        const size_t start = header.payload + 1 + packet[header.payload];
+        state.has_pmt = state.has_pmt || (start < kPacketSize && packet[start] == kTablePmt);
+    }
+    return state.has_pmt;
+}
+
+void Demultiplexer::OnSection(uint16_t pid, bool claimed, const unsigned char *section,
+                              size_t size) {
     const unsigned char table_id = section[0];
+    if (!claimed && table_id != kTablePmt) {
+        return;
+    }
     if (CarriesCrc(table_id) &&
         (size < kSmallestCheckedSection || VarnekUtil_CheckSectionCRC32(section) == FALSE)) {
-        ++counters_.bad_crc;
+        counters_.bad_crc += claimed ? 1 : 0;
         return;
     }
     ++counters_.good;
     ++counters_.tables[table_id];
-    if (pid == kPidPat && table_id == kTablePat) {
-        UpdatePmtPids(section, size);
+    if ((pid == kPidPat && table_id == kTablePat) || table_id == kTablePmt) {
+        FollowNames(section, size);
     }
     handler_(pid, section, size);
 }
 
-// A PID that the PAT no longer names may carry anything, so its unfinished section is dropped. New
-// uses are added before old ones are removed, so that a repeated PAT does not drop the unfinished
-// section of a PID that it still names.
-void Demultiplexer::UpdatePmtPids(const unsigned char *section, size_t size) {
-    Pat pat;
-    SectionHeader header{};
-    if (!ParsePat(section, size, header, pat)) {
+// A PID that is no longer named may carry anything, so its unfinished section is dropped. New uses
+// are added before old ones are removed, so that a PID that stays named keeps it.
+void Demultiplexer::FollowNames(const unsigned char *section, size_t size) {
+    constexpr size_t kHeaderAndCrc = 12;
+    if (size < kHeaderAndCrc) {
         return;
     }
-    std::vector<uint16_t> pids;
-    for (const Program &program : pat) {
-        pids.push_back(program.pmt_pid);
+    const bool is_pat = section[0] == kTablePat;
+    const uint32_t key =
+        is_pat ? section[6] : kPmtKey | uint32_t{section[3]} << 8 | uint32_t{section[4]};
+    uint32_t crc = 0;
+    std::memcpy(&crc, section + size - sizeof crc, sizeof crc);
+    const auto known = namings_.find(key);
+    if (known != namings_.end() && known->second.crc == crc) {
+        return;
+    }
+    FieldReader fields(section, size);
+    SectionHeader header{};
+    if (!ReadHeader(fields, header)) {
+        return;
+    }
+    Naming naming{crc, {}};
+    if (is_pat) {
+        ParsePat(section, size, header, naming.programs);
+    } else {
+        for (const Component &component : ParsePmt(fields).components) {
+            if (component.IsAit()) {
+                naming.programs.push_back({header.extension, component.pid});
+            }
+        }
+    }
+    for (const Program &program : naming.programs) {
         AddUse(program.pmt_pid);
     }
-    pids.swap(pat_sections_[header.number]);
-    RemoveUses(pids);
-    const auto beyond = pat_sections_.upper_bound(header.last);
-    for (auto it = beyond; it != pat_sections_.end(); ++it) {
-        RemoveUses(it->second);
+    Forget(key);
+    namings_[key] = std::move(naming);
+    if (!is_pat) {
+        return;
     }
-    pat_sections_.erase(beyond, pat_sections_.end());
+    for (auto it = namings_.upper_bound(header.last);
+         it != namings_.end() && it->first < kPmtKey;) {
+        Forget((it++)->first);
+    }
+    const bool complete =
+        std::distance(namings_.begin(), namings_.lower_bound(kPmtKey)) == header.last + 1;
+    if (complete && !pat_complete_) {
+        pat_complete_ = true;
+        for (PidState &state : pids_) {
+            if (state.table_uses == 0) {
+                state.assembler.Drop();
+            }
+        }
+    }
+}
+
+// Removes what a section has named. Without its PAT entry, a service has no AIT either.
+void Demultiplexer::Forget(uint32_t key) {
+    const auto found = namings_.find(key);
+    if (found == namings_.end()) {
+        return;
+    }
+    const std::vector<Program> programs = std::move(found->second.programs);
+    namings_.erase(found);
+    for (const Program &program : programs) {
+        RemoveUse(program.pmt_pid);
+        if (key < kPmtKey) {
+            Forget(kPmtKey + program.service_id);
+        }
+    }
 }
 
 void Demultiplexer::AddUse(uint16_t pid) {
     ++pids_[pid].table_uses;
 }
 
-void Demultiplexer::RemoveUses(const std::vector<uint16_t> &pids) {
-    for (const uint16_t pid : pids) {
-        if (--pids_[pid].table_uses == 0) {
-            pids_[pid].assembler.Drop();
-        }
+void Demultiplexer::RemoveUse(uint16_t pid) {
+    if (--pids_[pid].table_uses == 0) {
+        pids_[pid].assembler.Drop();
     }
 }
 

@@ -1,5 +1,6 @@
 // Follows the packets of every PID and extracts the sections of the tables. The tables are on fixed
-// PIDs, and on the PMT PIDs that the PAT names at that point of the stream.
+// PIDs, on the PMT PIDs that the PAT names at that point of the stream, and on the AIT PIDs that
+// the PMTs name. Until there is a PAT, PMTs are found on any PID.
 #ifndef RECEIVER_DEMULTIPLEXER_H
 #define RECEIVER_DEMULTIPLEXER_H
 
@@ -10,6 +11,7 @@
 #include <map>
 #include <vector>
 
+#include "Model.h"
 #include "PcrMeter.h"
 #include "SectionAssembler.h"
 #include "TransportStream.h"
@@ -44,7 +46,9 @@ class Demultiplexer {
     void Push(const unsigned char *packet);
 
     // Whether this PID carries tables at this point of the stream.
-    bool CarriesTables(uint16_t pid) const { return pids_[pid].table_uses != 0; }
+    bool CarriesTables(uint16_t pid) const {
+        return pids_[pid].table_uses != 0 || (!pat_complete_ && pids_[pid].has_pmt);
+    }
 
     DemultiplexerCounters Counters() const;
 
@@ -54,24 +58,35 @@ class Demultiplexer {
         PidCounters counters;
         int last = -1;            // counter of the PID's latest packet, -1 before the first
         bool repeatable = false;  // that packet had a payload and may be repeated once
-        unsigned table_uses = 0;  // one if the PID is fixed, and one for each PAT entry
+        unsigned table_uses = 0;  // one if the PID is fixed, and one for each entry that names it
+        bool has_pmt = false;     // a PMT seems to be on it, though no PAT has named it
         SectionAssembler assembler;
     };
     enum class Order { kNext, kRepeated, kBroken, kRestarted };
 
     static Header ParseHeader(const unsigned char *packet);
     static Order CheckContinuity(const Header &header, PidState &state);
-    void OnSection(uint16_t pid, const unsigned char *section, size_t size);
-    void UpdatePmtPids(const unsigned char *section, size_t size);
+    bool MayBePmt(const Header &header, const unsigned char *packet, PidState &state) const;
+    void OnSection(uint16_t pid, bool claimed, const unsigned char *section, size_t size);
+    void FollowNames(const unsigned char *section, size_t size);
     void AddUse(uint16_t pid);
-    void RemoveUses(const std::vector<uint16_t> &pids);
+    void RemoveUse(uint16_t pid);
+    void Forget(uint32_t key);
 
     Handler handler_;
     DemultiplexerCounters counters_;  // without those of the PIDs and the clock
     uint64_t position_ = 0;           // packets so far
     PcrMeter pcr_meter_;
     std::vector<PidState> pids_;
-    std::map<uint8_t, std::vector<uint16_t>> pat_sections_;  // PMT PIDs, by section_number
+    // The sections that name PIDs: those of the PAT by section_number, and PMTs by service_id plus
+    // kPmtKey. A repeated section, which has the same CRC, is not parsed again.
+    struct Naming {
+        uint32_t crc;
+        std::vector<Program> programs;  // of a PAT; an AIT has the service_id of its PMT
+    };
+    static constexpr uint32_t kPmtKey = 0x10000;
+    std::map<uint32_t, Naming> namings_;
+    bool pat_complete_ = false;
 };
 
 }  // namespace receiver

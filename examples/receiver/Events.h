@@ -8,6 +8,7 @@
 #include <optional>
 #include <string>
 #include <tuple>
+#include <utility>
 #include <vector>
 
 #include "BroadcastTime.h"
@@ -15,20 +16,13 @@
 
 namespace receiver {
 
-struct EventKey {
-    uint16_t service_id;
-    uint16_t event_id;
-    bool operator<(const EventKey &other) const {
-        return std::tie(service_id, event_id) < std::tie(other.service_id, other.event_id);
-    }
-};
-
 struct Rating {
     Code country;  // its rules define the value
     uint8_t value;
 };
 
 struct Event {
+    uint16_t id = 0;
     std::optional<DateTime> start;
     std::optional<int> duration;  // seconds
     Code language;                // of the name and the text
@@ -40,26 +34,52 @@ struct Event {
     std::vector<Code> audio_languages;
 };
 
+struct EventSection {  // the place of a section among all EIT sections
+    uint8_t table_id;
+    uint32_t stream;  // the identifiers of its network and transport stream
+    uint16_t service_id;
+    uint8_t number;
+    bool operator<(const EventSection &other) const {
+        return std::tie(table_id, stream, service_id, number) <
+               std::tie(other.table_id, other.stream, other.service_id, other.number);
+    }
+};
+
+// Keeps the latest content of each section. An event that its section no longer has is gone.
 class EventTable {
   public:
     // Far more than a week of every service needs. The limit bounds the memory for hostile streams.
     static constexpr size_t kMostEvents = 65536;
     static constexpr size_t kMostBytes = 16 << 20;  // of the events' texts and lists
 
-    // Stores the latest data about an event. Tables describe an event in different detail, so
-    // earlier fields stay if the new ones are empty.
-    void Keep(const EventKey &key, Event event);
+    // Replaces the content of a section, and removes the sections that its table no longer has.
+    //   segment_last, last  the last section of its segment of eight, and of its table
+    void Replace(const EventSection &section, uint8_t segment_last, uint8_t last,
+                 std::vector<Event> events);
 
-    // Returns how often there was no room for an event, or for new data about one.
+    // Returns how often there was no room for an event.
     uint64_t LeftOut() const { return left_out_; }
 
-    bool Has(const EventKey &key) const { return events_.count(key) != 0; }
-    auto begin() const { return events_.begin(); }
-    auto end() const { return events_.end(); }
+    using Key = std::pair<uint16_t, uint16_t>;  // service_id, event_id
+
+    // Joins what the sections say about each event. The table of present and following events is
+    // nearer to the truth than a schedule, and otherwise the section that came last. Tables
+    // describe an event in different detail, so the others supply what that section leaves out.
+    std::map<Key, Event> Joined() const;
 
   private:
-    std::map<EventKey, Event> events_;
+    struct Content {
+        uint64_t arrival;
+        std::vector<Event> events;
+    };
+    using Sections = std::map<EventSection, Content>;
+
+    void Erase(Sections::iterator begin, Sections::iterator end);
+
+    Sections sections_;  // without empty ones, so their number is limited too
+    size_t events_ = 0;
     size_t bytes_ = 0;
+    uint64_t arrivals_ = 0;
     uint64_t left_out_ = 0;
 };
 

@@ -2,7 +2,7 @@
 #include "JsonReport.h"
 
 #include "JsonWriter.h"
-#include "Words.h"
+#include "Names.h"
 
 namespace receiver {
 namespace {
@@ -59,7 +59,7 @@ void WriteNetwork(const Model &model, JsonWriter &json) {
     const NetworkStream &stream = own != nullptr ? *own : kNone;
     json.Number("transport_stream_id", model.transport_stream_id);
     json.Number("network_id", model.network_id);
-    json.Text("network_name", model.network_name.Text());
+    json.Text("network_name", model.network_name);
     json.Number("remote_control_key", stream.remote_control_key);
     json.Text("ts_name", stream.name);
     json.Number("area_code", stream.area_code);
@@ -87,6 +87,10 @@ void WriteComponent(const Component &component, JsonWriter &json) {
     json.BeginObject(nullptr);
     json.Number("pid", component.pid);
     json.Number("type", component.stream_type);
+    json.Number("tag", component.tag);
+    json.Text("language", component.languages[0].Text());
+    json.Text("second_language", component.languages[1].Text());
+    json.Text("role", RoleOfComponent(component));
     json.Text("name", NameOfComponent(component));
     json.EndObject();
 }
@@ -97,13 +101,12 @@ void WriteServices(const std::map<uint16_t, Service> &services, JsonWriter &json
         const ServiceInfo *info = service.info;
         json.BeginObject(nullptr);
         json.Number("id", id);
-        json.Text("name", info != nullptr ? info->name.Text() : "");
-        json.Text("provider", info != nullptr ? info->provider.Text() : "");
+        json.Text("name", info != nullptr ? info->name : "");
+        json.Text("provider", info != nullptr ? info->provider : "");
         json.Number("type", info != nullptr ? info->type : std::nullopt);
         json.Boolean("one_seg", service.one_seg);
         json.Number("pmt_pid", service.pmt_pid);
-        json.Number("pcr_pid",
-                    service.map != nullptr ? std::optional(service.map->pcr_pid) : std::nullopt);
+        json.Number("pcr_pid", service.map != nullptr ? service.map->pcr_pid : std::nullopt);
         json.BeginArray("components");
         if (service.map != nullptr) {
             for (const Component &component : service.map->components) {
@@ -117,10 +120,10 @@ void WriteServices(const std::map<uint16_t, Service> &services, JsonWriter &json
 }
 
 void WriteEvent(const ListedEvent &listed, const StreamClock &clock, JsonWriter &json) {
-    const Event &event = *listed.event;
+    const Event &event = listed.event;
     json.BeginObject(nullptr);
-    json.Number("service_id", listed.key.service_id);
-    json.Number("event_id", listed.key.event_id);
+    json.Number("service_id", listed.service_id);
+    json.Number("event_id", event.id);
     json.Boolean("other_stream", listed.other_stream);
     json.Text("start", ToText(clock.Utc(event.start)));
     json.Text("local_start", ToText(clock.Local(event.start)));

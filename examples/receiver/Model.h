@@ -15,7 +15,7 @@
 #include "BroadcastTime.h"
 #include "Code.h"
 #include "Events.h"
-#include "Name.h"
+#include "TransportStream.h"
 
 namespace receiver {
 
@@ -28,13 +28,22 @@ struct Component {  // a PMT entry
     uint16_t pid;
     uint16_t data_component_id;  // if the descriptor is that of a data component
     uint8_t stream_type;
-    uint8_t descriptor;  // tag of the descriptor that says what kind of data it is, 0 for none
-    Code languages[2];   // of audio
+    uint8_t descriptor;          // the one that says what kind of data it is, 0 for none
+    uint8_t audio_type;          // of ISO/IEC 13818-1, 0 when it is not defined
+    std::optional<uint8_t> tag;  // component_tag
+    Code languages[2];           // the second one only of audio
+
+    // Whether it carries application information tables.
+    bool IsAit() const {
+        return stream_type == 0x05 &&
+               (descriptor == kDescriptorApplicationSignalling ||
+                (descriptor == kDescriptorDataComponent && data_component_id == kDataAit));
+    }
 };
 
 struct ProgramMap {    // a PMT
     uint16_t pmt_pid;  // the PID that carried it
-    uint16_t pcr_pid;
+    std::optional<uint16_t> pcr_pid;
     bool emergency;  // an emergency warning is active
     std::vector<Component> components;
 };
@@ -57,8 +66,8 @@ struct NetworkSection {
 struct ServiceInfo {  // an SDT entry
     uint16_t service_id;
     std::optional<uint8_t> type;
-    Name provider;
-    Name name;
+    std::string provider;
+    std::string name;
 };
 
 struct LocalOffset {
@@ -93,7 +102,7 @@ struct Model {
 
     std::optional<uint16_t> transport_stream_id;
     std::optional<uint16_t> network_id;
-    Name network_name;
+    std::string network_name;
     std::optional<DateTime> time;  // the latest, not converted
     std::vector<LocalOffset> local_offsets;
     Sections<std::vector<Program>> pat;

@@ -131,14 +131,16 @@ bool PacketSource::StartsPackets(size_t at, size_t distance) const {
     }
     const size_t wanted = expected ? kSyncsToResume : kSyncsToFind;
     size_t found = 0;
+    bool headers = false;  // one at least, as a file of nothing but sync bytes has none
     while (found < wanted && found * distance < room) {
         const size_t start = at + found * distance;
         if (pending_[start] != kSyncByte || (!expected && !MayBeHeader(start))) {
             return false;
         }
+        headers = headers || start + 3 >= pending_.size() || (pending_[start + 3] & 0x30) != 0;
         ++found;
     }
-    return expected || found >= kSyncsToResume;
+    return headers && (expected || found >= kSyncsToResume);
 }
 
 // Whether the available part of the header has no transport error and a valid

@@ -1,7 +1,12 @@
 // All output goes through Add, so no line can be too wide.
 #include "Paragraphs.h"
 
+#include <langinfo.h>
+
 #include <algorithm>
+#include <climits>
+#include <cstring>
+#include <cuchar>
 
 namespace receiver {
 namespace {
@@ -23,6 +28,28 @@ size_t BytesOf(const std::string &text, size_t from, size_t count) {
         ++at;
     }
     return at - from;
+}
+
+// Converts well-formed UTF-8 to the encoding of the locale, in which '?' replaces what it lacks.
+std::string InLocale(const std::string &text) {
+    if (std::strcmp(nl_langinfo(CODESET), "UTF-8") == 0) {
+        return text;
+    }
+    std::string converted;
+    for (size_t at = 0; at < text.size();) {
+        const size_t size = BytesOf(text, at, 1);
+        char32_t character =
+            static_cast<unsigned char>(text[at]) & (size == 1 ? 0x7Fu : 0xFFu >> (size + 1));
+        for (size_t i = 1; i < size; ++i) {
+            character = character << 6 | (static_cast<unsigned char>(text[at + i]) & 0x3Fu);
+        }
+        char bytes[MB_LEN_MAX];
+        std::mbstate_t state{};
+        const size_t length = std::c32rtomb(bytes, character, &state);
+        converted.append(length <= sizeof bytes ? bytes : "?", length <= sizeof bytes ? length : 1);
+        at += size;
+    }
+    return converted;
 }
 
 }  // namespace
@@ -54,7 +81,7 @@ void Paragraphs::Add(const std::string &lead, const std::string &text) {
         }
         line.append(rest, at, count);
         line.erase(line.find_last_not_of(' ') + 1);
-        std::fprintf(out_, "%s\n", line.c_str());
+        std::fprintf(out_, "%s\n", InLocale(line).c_str());
         at = std::min(rest.find_first_not_of(' ', at + count), rest.size());
         line.assign(indent, ' ');
         room = width_ - indent;

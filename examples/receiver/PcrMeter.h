@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <map>
+#include <optional>
 
 namespace receiver {
 
@@ -14,22 +15,32 @@ struct PcrSpan {
     uint64_t packets = 0;  // of the whole stream
 };
 
+// Each PID with a clock is measured separately, because the programs of a stream may have different
+// clocks. A reference counts once the next one confirms it. So a damaged reference is dropped, and
+// the interval around it still counts.
 class PcrMeter {
   public:
     // Adds a clock reference.
     //   position  number of packets of the stream before this one
-    //   restart   whether the packet announces that the clock jumps
-    void Push(uint16_t pid, uint64_t pcr, uint64_t position, bool restart);
+    void Push(uint16_t pid, uint64_t pcr, uint64_t position);
 
     // Returns the span of the PID with the longest measured time.
     PcrSpan Longest() const;
 
   private:
-    struct Clock {
-        uint64_t pcr = 0;
-        uint64_t position = 0;
-        PcrSpan span;
+    struct Reference {
+        uint64_t pcr;
+        uint64_t position;
     };
+    struct Clock {
+        std::optional<Reference> last;    // confirmed
+        std::optional<Reference> newest;  // not yet
+        PcrSpan span;                     // up to the last one
+    };
+
+    static bool Follows(const std::optional<Reference> &earlier, const Reference &later);
+    static PcrSpan Extended(const Clock &clock);
+
     std::map<uint16_t, Clock> clocks_;  // by PID
 };
 

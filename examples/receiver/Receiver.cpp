@@ -7,17 +7,18 @@
 
 #include <cerrno>
 #include <csignal>
+#include <cstdlib>
 #include <system_error>
 
 #include "BroadcastText.h"
 #include "CommandLine.h"
 #include "JsonReport.h"
+#include "Names.h"
 #include "Paragraphs.h"
 #include "Pipeline.h"
 #include "StreamFile.h"
 #include "Summary.h"
 #include "Varnek_Config.h"
-#include "Words.h"
 
 namespace receiver {
 namespace {
@@ -58,6 +59,7 @@ Settings LoadSettings(const Options &options) {
     settings.nation = ToUtf8(VarnekCfg_GetSupportNation());
     settings.bml = VarnekCfg_IsSupportBML() != FALSE;
     settings.region = options.region;
+    settings.all = options.all;
     return settings;
 }
 
@@ -83,10 +85,21 @@ bool IsTerminal(std::FILE *file) {
     return descriptor >= 0 && isatty(descriptor) != 0;
 }
 
-size_t TerminalWidth(std::FILE *file) {
-    winsize size{};
-    const bool known = fileno(file) >= 0 && ioctl(fileno(file), TIOCGWINSZ, &size) == 0;
-    return known && size.ws_col != 0 ? size.ws_col : Paragraphs::kUsualWidth;
+// Returns the width that COLUMNS names, or else that of a terminal: the output's, or that of the
+// messages when the output goes through a pipe.
+size_t LineWidth(std::FILE *out, std::FILE *err) {
+    const char *columns = std::getenv("COLUMNS");
+    const long width = columns != nullptr ? std::strtol(columns, nullptr, 10) : 0;
+    if (width > 0) {
+        return static_cast<size_t>(width);
+    }
+    for (std::FILE *file : {out, err}) {
+        winsize size{};
+        if (fileno(file) >= 0 && ioctl(fileno(file), TIOCGWINSZ, &size) == 0 && size.ws_col != 0) {
+            return size.ws_col;
+        }
+    }
+    return Paragraphs::kUsualWidth;
 }
 
 // Redirects descriptor 2 to a file, or to nowhere when the file cannot be opened.
@@ -115,12 +128,14 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
         return 2;
     }
     if (options.help) {
-        WriteHelp(out, TerminalWidth(out));
-        return 0;
+        WriteHelp(out, LineWidth(out, err));
     }
     if (options.version) {
         std::fputs("receiver " RECEIVER_VERSION "\n", out);
-        return 0;
+    }
+    if (options.help || options.version) {
+        const bool written = std::fflush(out) == 0 && std::ferror(out) == 0;
+        return written ? 0 : Fail(err, "standard output", "could not be written");
     }
     if (surroundings.log_path != nullptr && !options.log) {
         DivertLog(surroundings.log_path);
@@ -132,6 +147,10 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
         // The library refuses some opens without a system call, so errno may be 0.
         return Fail(err, options.path,
                     "cannot be opened" + (errno != 0 ? ": " + SystemText(errno) : ""));
+    }
+    if (file.IsQuietPipe() && !options.quiet) {
+        std::fprintf(err, "receiver: %s: waiting for a program that writes to this pipe\n",
+                     options.path.c_str());
     }
     Report report;
     report.settings = LoadSettings(options);
@@ -161,7 +180,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     if (options.json) {
         WriteJson(report, out);
     } else {
-        WriteSummary(report, TerminalWidth(out), out);
+        WriteSummary(report, LineWidth(out, err), out);
     }
     if (std::fflush(out) != 0 || std::ferror(out) != 0) {
         return Fail(err, options.path, "the result could not be written");
@@ -171,6 +190,10 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     }
     if (!capture.Failure().empty()) {
         return Fail(err, options.path, "the capture ended early: " + capture.Failure());
+    }
+    if (options.region && StreamClock(report).Offset() == nullptr) {
+        return Fail(err, options.path,
+                    "no local time for region " + std::to_string(*options.region));
     }
     return stopped() ? kInterrupted : 0;
 }

@@ -4,7 +4,7 @@
 #include <algorithm>
 #include <cmath>
 
-#include "Words.h"
+#include "Names.h"
 
 namespace receiver {
 namespace {
@@ -45,28 +45,39 @@ std::map<uint16_t, Service> JoinServices(const Model &model) {
             services[info.service_id].info = &info;
         }
     }
+    for (const auto &[id, map] : model.pmts) {
+        if (!model.transport_stream_id) {
+            services[id].pmt_pid = map.pmt_pid;
+        }
+    }
     const NetworkStream *stream = FindOwnStream(model);
     for (auto &entry : services) {
         const auto map = model.pmts.find(entry.first);
         if (map != model.pmts.end() && entry.second.pmt_pid == map->second.pmt_pid) {
             entry.second.map = &map->second;
         }
+        const bool one_seg_pid = (entry.second.pmt_pid.value_or(0) & 0x1FF8) == kPidOneSegPmt;
         entry.second.one_seg =
-            stream != nullptr && std::count(stream->one_seg_services.begin(),
-                                            stream->one_seg_services.end(), entry.first) != 0;
+            (one_seg_pid && (stream == nullptr || !stream->dvb)) ||
+            (stream != nullptr && std::count(stream->one_seg_services.begin(),
+                                             stream->one_seg_services.end(), entry.first) != 0);
     }
     return services;
 }
 
 const NetworkStream *FindOwnStream(const Model &model) {
+    const NetworkStream *only = nullptr;
+    size_t count = 0;
     for (const auto &section : model.nit) {
         for (const NetworkStream &stream : section.second.streams) {
             if (model.transport_stream_id == stream.transport_stream_id) {
                 return &stream;
             }
+            only = &stream;
+            ++count;
         }
     }
-    return nullptr;
+    return !model.transport_stream_id && count == 1 ? only : nullptr;
 }
 
 bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services) {
@@ -79,17 +90,18 @@ bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services
 
 std::vector<ListedEvent> ListEvents(const Model &model) {
     std::vector<ListedEvent> events;
-    for (const auto &entry : model.events) {
-        events.push_back({entry.first, &entry.second, false});
+    const auto own = model.events.Joined();
+    for (const auto &[key, event] : own) {
+        events.push_back({key.first, event, false});
     }
-    for (const auto &entry : model.other_events) {
-        if (!model.events.Has(entry.first)) {
-            events.push_back({entry.first, &entry.second, true});
+    for (const auto &[key, event] : model.other_events.Joined()) {
+        if (own.count(key) == 0) {
+            events.push_back({key.first, event, true});
         }
     }
     const auto order = [](const ListedEvent &left, const ListedEvent &right) {
-        const auto &first = left.event->start;
-        const auto &second = right.event->start;
+        const auto &first = left.event.start;
+        const auto &second = right.event.start;
         return first && (!second || *first < *second);
     };
     std::stable_sort(events.begin(), events.end(), order);
@@ -121,7 +133,7 @@ StreamClock::StreamClock(const Report &report) {
 }
 
 std::optional<DateTime> StreamClock::Utc(const std::optional<DateTime> &time) const {
-    return time && nation_ == kBrazil ? Shifted(*time, -kBrasiliaMinutes * 60) : time;
+    return time && nation_ == kBrazil ? *time - kBrasiliaMinutes * 60 : time;
 }
 
 std::optional<DateTime> StreamClock::Local(const std::optional<DateTime> &time) const {
@@ -129,7 +141,7 @@ std::optional<DateTime> StreamClock::Local(const std::optional<DateTime> &time) 
         return std::nullopt;
     }
     const bool changed = offset_->change && !(*time < *offset_->change);
-    return Shifted(*time, (changed ? offset_->next_minutes : offset_->minutes) * 60);
+    return *time + (changed ? offset_->next_minutes : offset_->minutes) * 60;
 }
 
 std::string StreamClock::OffsetText(int minutes) const {

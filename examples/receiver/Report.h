@@ -21,6 +21,7 @@ struct Settings {
     std::string nation = "BRA";
     bool bml = false;  // whether that nation has BML data broadcasting
     std::optional<uint8_t> region;
+    bool all = false;  // the summary lists every event and every PID
 };
 
 struct Report {
@@ -46,18 +47,19 @@ struct Service {
 };
 
 // Joins the services that the PAT or the SDT names, by service_id. They point into the model. A PMT
-// counts only if it came on the PID that the PAT names.
+// counts only if it came on the PID that the PAT names. In a stream without a PAT, which one-seg
+// reception may give, every PMT names its service.
 std::map<uint16_t, Service> JoinServices(const Model &model);
 
-// Finds the entry of this stream in the NIT; null without one.
+// Finds the entry of this stream in the NIT; null without one. Without a PAT it is the only entry.
 const NetworkStream *FindOwnStream(const Model &model);
 
 // Whether the NIT or the PMT of a service signals an emergency warning.
 bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services);
 
 struct ListedEvent {
-    EventKey key;
-    const Event *event;
+    uint16_t service_id;
+    Event event;
     bool other_stream;
 };
 

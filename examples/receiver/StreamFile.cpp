@@ -2,6 +2,7 @@
 // a signal may interrupt another thread instead of this one.
 #include "StreamFile.h"
 
+#include <fcntl.h>
 #include <poll.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -25,8 +26,21 @@ StreamFile::~StreamFile() {
 
 bool StreamFile::Open(const std::string &path) {
     owned_ = path != "-";
+    struct stat status = {};
+    if (owned_ && stat(path.c_str(), &status) == 0 && S_ISFIFO(status.st_mode)) {
+        // The library's open would wait for a writer.
+        handle_ = open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+        return handle_ >= 0;
+    }
     handle_ = owned_ ? VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_READ) : STDIN_FILENO;
     return handle_ >= 0;
+}
+
+bool StreamFile::IsQuietPipe() const {
+    struct stat status = {};
+    pollfd request{handle_, POLLIN, 0};
+    return owned_ && fstat(handle_, &status) == 0 && S_ISFIFO(status.st_mode) &&
+           poll(&request, 1, 2 * kPatience) == 0;
 }
 
 size_t StreamFile::Read(unsigned char *buffer, size_t size, const std::atomic<bool> *stop) {

@@ -21,6 +21,10 @@ class StreamFile {
     //   returns  false when it cannot be opened; errno says why
     bool Open(const std::string &path);
 
+    // Waits briefly for the first bytes of a named pipe.
+    //   returns  whether none came; false for other files
+    bool IsQuietPipe() const;
+
     // Waits for bytes until `stop` is set; with null it waits forever.
     //   returns  the bytes read; 0 at the end, on an error, and when it was stopped
     size_t Read(unsigned char *buffer, size_t size, const std::atomic<bool> *stop);

@@ -7,9 +7,9 @@
 #include <utility>
 #include <vector>
 
+#include "Names.h"
 #include "Paragraphs.h"
 #include "TransportStream.h"
-#include "Words.h"
 
 namespace receiver {
 namespace {
@@ -31,7 +31,7 @@ std::string NameOrDash(const std::string &name) {
 std::string NameOf(const Services &services, uint16_t service_id) {
     const auto found = services.find(service_id);
     const ServiceInfo *info = found != services.end() ? found->second.info : nullptr;
-    return info != nullptr ? info->name.Text() : "";
+    return info != nullptr ? info->name : "";
 }
 
 // Puts a comma in front of a text that is not empty.
@@ -68,7 +68,7 @@ void AddStream(const Report &report, Paragraphs &out) {
     out.Add("Receiver  ", "nation " + report.settings.nation +
                               (report.settings.bml ? ", BML supported" : ", BML not supported") +
                               Format(", standard type %d", report.settings.standard_type));
-    out.Add("Network   ", NameOrDash(model.network_name.Text()) +
+    out.Add("Network   ", NameOrDash(model.network_name) +
                               (model.network_id ? Format(" (0x%04X)", *model.network_id) : ""));
 }
 
@@ -114,7 +114,7 @@ void AddServices(const Services &services, Paragraphs &out) {
             items.push_back(NameOfServiceType(*service.info->type));
         }
         items.emplace_back(service.one_seg ? "one-seg" : "");
-        items.push_back(service.info != nullptr ? service.info->provider.Text() : "");
+        items.push_back(service.info != nullptr ? service.info->provider : "");
         const std::string joined = Joined(items);
         text += joined.empty() ? "" : "  " + joined;
         text += service.pmt_pid ? Format("  (PMT 0x%04X)", *service.pmt_pid) : "  (not in the PAT)";
@@ -137,8 +137,7 @@ bool IsOver(const Event &event, const std::optional<DateTime> &now) {
     if (!now || !event.start || !event.duration) {
         return false;
     }
-    const std::optional<DateTime> end = Shifted(*event.start, *event.duration);
-    return end && !(*now < *end);
+    return *now >= *event.start + *event.duration;
 }
 
 // Returns the genre and the nation's own rating, in parentheses.
@@ -164,16 +163,19 @@ void AddEvents(const Report &report, const Services &services, const StreamClock
     const Model &model = report.model;
     std::vector<ListedEvent> events = ListEvents(model);
     events.erase(std::remove_if(events.begin(), events.end(),
-                                [](const ListedEvent &event) { return event.other_stream; }),
+                                [&](const ListedEvent &event) {
+                                    return event.other_stream && !report.settings.all;
+                                }),
                  events.end());
     const auto over = std::stable_partition(
         events.begin(), events.end(),
-        [&](const ListedEvent &event) { return !IsOver(*event.event, model.time); });
+        [&](const ListedEvent &event) { return !IsOver(event.event, model.time); });
     const auto first_over = static_cast<size_t>(over - events.begin());
-    const size_t shown = std::min(events.size(), kEventsShown);
+    const size_t shown =
+        report.settings.all ? events.size() : std::min(events.size(), kEventsShown);
     const auto name_of = [&](const ListedEvent &event) {
-        const std::string name = NameOf(services, event.key.service_id);
-        return !name.empty() ? name : Format("0x%04X", event.key.service_id);
+        const std::string name = NameOf(services, event.service_id);
+        return !name.empty() ? name : Format("0x%04X", event.service_id);
     };
     size_t width = 0;
     for (size_t i = 0; i < shown; ++i) {
@@ -185,12 +187,13 @@ void AddEvents(const Report &report, const Services &services, const StreamClock
     out.AddEmptyLine();
     out.Add("", events.empty() ? "Events    none" : heading);
     for (size_t i = 0; i < shown; ++i) {
-        const Event &event = *events[i].event;
+        const Event &event = events[i].event;
         const std::string start = ToText(local ? clock.Local(event.start) : clock.Utc(event.start));
         out.Add("  " + Padded(start.empty() ? "start not known" : start, 19) + "  " +
                     Padded(NameOrDash(ToText(event.duration)), 8) + "  ",
                 Padded(name_of(events[i]), width) + "  " + NameOrDash(event.name) +
-                    DescribeContent(event, clock.Nation()) + (i < first_over ? "" : ", over"));
+                    DescribeContent(event, clock.Nation()) + (i < first_over ? "" : ", over") +
+                    (events[i].other_stream ? ", other stream" : ""));
     }
     if (events.size() > shown) {
         out.Add("  ", Format("and %zu more", events.size() - shown));
@@ -250,7 +253,9 @@ std::map<uint16_t, std::string> NamePids(const Services &services) {
         for (const Component &component : service.map->components) {
             names.emplace(component.pid, NameOfComponent(component));
         }
-        names.emplace(service.map->pcr_pid, "clock reference");
+        if (service.map->pcr_pid) {
+            names.emplace(*service.map->pcr_pid, "clock reference");
+        }
     }
     return names;
 }
@@ -272,7 +277,7 @@ void AddPids(const Report &report, const Services &services, Paragraphs &out) {
     const std::map<uint16_t, std::string> names = NamePids(services);
     out.AddEmptyLine();
     out.Add("", "PIDs (packets, share, continuity errors)");
-    const size_t shown = std::min(pids.size(), kPidsShown);
+    const size_t shown = report.settings.all ? pids.size() : std::min(pids.size(), kPidsShown);
     for (size_t i = 0; i < shown; ++i) {
         const PidCounters &own = counters[pids[i]];
         const auto found = names.find(pids[i]);

@@ -20,6 +20,7 @@ constexpr uint8_t kDescriptorNetworkName = 0x40;
 constexpr uint8_t kDescriptorService = 0x48;
 constexpr uint8_t kDescriptorShortEvent = 0x4D;
 constexpr uint8_t kDescriptorExtendedEvent = 0x4E;
+constexpr uint8_t kDescriptorStreamIdentifier = 0x52;
 constexpr uint8_t kDescriptorContent = 0x54;
 constexpr uint8_t kDescriptorParentalRating = 0x55;
 constexpr uint8_t kDescriptorLocalOffset = 0x58;
@@ -28,11 +29,10 @@ constexpr uint8_t kDescriptorTsInformation = 0xCD;
 constexpr uint8_t kDescriptorTerrestrialDelivery = 0xFA;
 constexpr uint8_t kDescriptorPartialReception = 0xFB;
 constexpr uint8_t kDescriptorEmergency = 0xFC;
-constexpr uint8_t kDescriptorDataComponent = 0xFD;
 
 // These descriptors define the kind of a component in addition to its stream_type: teletext,
 // subtitles, sound codings, application signalling, data component.
-constexpr uint8_t kDescriptorsOfContent[] = {0x56, 0x59, 0x6A, 0x6F,
+constexpr uint8_t kDescriptorsOfContent[] = {0x56, 0x59, 0x6A, kDescriptorApplicationSignalling,
                                              0x7A, 0x7B, 0x7C, kDescriptorDataComponent};
 // The delivery systems that only DVB has: satellite, cable and terrestrial.
 constexpr uint8_t kDescriptorsOfDvb[] = {0x43, 0x44, 0x5A};
@@ -54,21 +54,6 @@ void ForEachDescriptor(FieldReader loop, Visit visit) {
         }
         visit(tag, body);
     }
-}
-
-// Reads the header of a section. `fields` then contains the fields between header and CRC.
-bool ReadHeader(FieldReader &fields, SectionHeader &header) {
-    fields.Skip(24);
-    header.extension = fields.U16();
-    fields.Skip(7);
-    header.current = fields.U8(1) != 0;
-    header.number = fields.U8();
-    header.last = fields.U8();
-    if (!fields.Ok() || fields.BytesLeft() < kCrcSize) {
-        return false;
-    }
-    fields = fields.Enter(fields.BytesLeft() - kCrcSize);
-    return header.current && header.number <= header.last;
 }
 
 std::optional<DateTime> ReadDateTime(FieldReader &fields) {
@@ -129,10 +114,11 @@ void ReadAudioLanguages(FieldReader &body, Code (&languages)[2]) {
 
 void ReadComponentDescriptor(uint8_t tag, FieldReader &body, Component &component) {
     if (tag == kDescriptorLanguage) {
-        for (Code &language : component.languages) {
-            language = ReadCode(body);
-            body.Skip(8);
-        }
+        component.languages[0] = ReadCode(body);
+        component.audio_type = body.U8();
+        component.languages[1] = ReadCode(body);
+    } else if (tag == kDescriptorStreamIdentifier && body.BytesLeft() >= 1) {
+        component.tag = body.U8();
     } else if (tag == kDescriptorAudioComponent) {
         ReadAudioLanguages(body, component.languages);
     } else if (component.descriptor == 0 && Contains(kDescriptorsOfContent, tag)) {
@@ -216,6 +202,20 @@ void ReadShortEvent(FieldReader &body, const Code &wanted, Event &event) {
 
 }  // namespace
 
+bool ReadHeader(FieldReader &fields, SectionHeader &header) {
+    fields.Skip(24);
+    header.extension = fields.U16();
+    fields.Skip(7);
+    header.current = fields.U8(1) != 0;
+    header.number = fields.U8();
+    header.last = fields.U8();
+    if (!fields.Ok() || fields.BytesLeft() < kCrcSize) {
+        return false;
+    }
+    fields = fields.Enter(fields.BytesLeft() - kCrcSize);
+    return header.current && header.number <= header.last;
+}
+
 bool ParsePat(const unsigned char *section, size_t size, SectionHeader &header, Pat &pat) {
     FieldReader fields(section, size);
     if (!ReadHeader(fields, header)) {
@@ -268,11 +268,11 @@ void TableParser::OnPat(const unsigned char *section, size_t size) {
     }
 }
 
-void TableParser::OnPmt(uint16_t pid, const SectionHeader &header, FieldReader &fields) {
+ProgramMap ParsePmt(FieldReader &fields) {
     ProgramMap map{};
-    map.pmt_pid = pid;
     fields.Skip(3);
-    map.pcr_pid = fields.U16(13);
+    const uint16_t pcr_pid = fields.U16(13);
+    map.pcr_pid = pcr_pid != kPidNull ? std::optional(pcr_pid) : std::nullopt;
     fields.Skip(4);
     const uint16_t info_length = fields.U16(12);
     ForEachDescriptor(fields.Enter(info_length), [&](uint8_t tag, FieldReader &body) {
@@ -290,6 +290,12 @@ void TableParser::OnPmt(uint16_t pid, const SectionHeader &header, FieldReader &
         });
         map.components.push_back(component);
     }
+    return map;
+}
+
+void TableParser::OnPmt(uint16_t pid, const SectionHeader &header, FieldReader &fields) {
+    ProgramMap map = ParsePmt(fields);
+    map.pmt_pid = pid;
     ProgramMap &kept = model_.pmts[header.extension];
     model_.components -= kept.components.size();
     const size_t fitting =
@@ -353,15 +359,23 @@ void TableParser::OnSdt(const SectionHeader &header, FieldReader &fields) {
 void TableParser::OnEit(uint8_t table_id, const SectionHeader &header, FieldReader &fields) {
     const bool other = table_id == kTableEitOther || table_id >= kTableEitOtherSchedule;
     EventTable &events = other ? model_.other_events : model_.events;
-    fields.Skip(48);
-    while (fields.BytesLeft() >= 12) {
-        const uint16_t event_id = fields.U16();
-        events.Keep({header.extension, event_id}, ReadEvent(fields));
+    const uint32_t stream = fields.U32();
+    const uint8_t segment_last = fields.U8();
+    fields.Skip(8);
+    if (!fields.Ok()) {
+        return;
     }
+    std::vector<Event> content;
+    while (fields.BytesLeft() >= 12) {
+        content.push_back(ReadEvent(fields));
+    }
+    events.Replace({table_id, other ? stream : 0, header.extension, header.number}, segment_last,
+                   header.last, std::move(content));
 }
 
 Event TableParser::ReadEvent(FieldReader &fields) const {
-    Event event{};
+    Event event;
+    event.id = fields.U16();
     event.start = ReadDateTime(fields);
     event.duration = DecodeBcdTime(fields.U32(24));
     fields.Skip(4);

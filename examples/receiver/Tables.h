@@ -25,6 +25,13 @@ using Pat = std::vector<Program>;
 //   returns  false when the section does not apply now, or is too short for its header
 bool ParsePat(const unsigned char *section, size_t size, SectionHeader &header, Pat &pat);
 
+// Reads a PMT from the fields that follow the header of its section. `pmt_pid` stays 0.
+ProgramMap ParsePmt(FieldReader &fields);
+
+// Reads the header of a section. `fields` then contains the fields between header and CRC.
+//   returns  false when the section does not apply now, or is too short
+bool ReadHeader(FieldReader &fields, SectionHeader &header);
+
 // Fills a model from sections, in the order of their arrival. Unknown sections and tables are
 // ignored. A loop that claims to be longer than its section ends with the section.
 class TableParser {

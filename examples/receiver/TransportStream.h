@@ -29,6 +29,7 @@ constexpr uint16_t kPidEitMobile = 0x0026;   // events of portable reception
 constexpr uint16_t kPidEitOneSeg = 0x0027;   // the same, of one segment
 constexpr uint16_t kPidSdttOneSeg = 0x0028;  // software downloads within one segment
 constexpr uint16_t kPidCdt = 0x0029;         // common data, such as logos
+constexpr uint16_t kPidOneSegPmt = 0x1FC8;   // PMTs of one-seg services, to 0x1FCF
 constexpr uint16_t kPidNull = 0x1FFF;
 
 // Sections are assembled on all of these PIDs; unknown tables are only counted.
@@ -48,6 +49,12 @@ constexpr uint8_t kTableEitOtherSchedule = 0x60;   // to 0x6F
 constexpr uint8_t kTableEitLast = 0x6F;
 constexpr uint8_t kTableTdt = 0x70;
 constexpr uint8_t kTableTot = 0x73;
+
+constexpr uint8_t kDescriptorApplicationSignalling = 0x6F;
+constexpr uint8_t kDescriptorDataComponent = 0xFD;
+constexpr uint16_t kDataCaptions = 0x0008;
+constexpr uint16_t kDataCaptionsOneSeg = 0x0012;
+constexpr uint16_t kDataAit = 0x00A3;
 
 }  // namespace receiver
 

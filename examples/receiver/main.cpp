@@ -2,6 +2,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <clocale>
 #include <csignal>
 
 #include "Receiver.h"
@@ -50,6 +51,9 @@ std::FILE *OpenMessages() {
 
 int main(int argc, char **argv) {
     TakeStandardDescriptors();
+    if (std::setlocale(LC_CTYPE, "") == nullptr) {
+        std::setlocale(LC_CTYPE, "C.UTF-8");  // the user's locale is not installed
+    }
     CatchInterrupt();
     std::FILE *const messages = OpenMessages();
     return receiver::RunReceiver(std::vector<std::string>(argv + (argc > 0 ? 1 : 0), argv + argc),

@@ -10,6 +10,7 @@
 #include <time.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
@@ -56,17 +57,6 @@ sigevent *Droppable(sigevent *event) {
     return event;
 }
 
-std::atomic<const std::atomic<bool> *> gPostMayGo{nullptr};
-
-sem_t *HeldUp(sem_t *s) {
-    if (const std::atomic<bool> *go = gPostMayGo.exchange(nullptr)) {
-        while (!*go) {
-            usleep(100);
-        }
-    }
-    return s;
-}
-
 int Nameless(int result, struct stat64 *file) {
     file->st_nlink = 0;
     return result;
@@ -92,8 +82,7 @@ int Nameless(int result, struct stat64 *file) {
 WRAP(void *, nullptr, malloc, (size_t size), size)
 WRAP_POSIX(sem_init, (sem_t * s, int shared, unsigned value), s, shared, value)
 WRAP_POSIX(sem_destroy, (sem_t * s), s)
-WRAP_POSIX(sem_post, (sem_t * s), HeldUp(s))
-WRAP_POSIX(sem_getvalue, (sem_t * s, int *value), s, value)
+WRAP_POSIX(sem_post, (sem_t * s), s)
 WRAP_POSIX(sem_wait, (sem_t * s), s)
 WRAP_POSIX(sem_timedwait, (sem_t * s, const timespec *time), s, time)
 WRAP_POSIX(clock_gettime, (clockid_t clock, timespec *time), clock, time)
@@ -169,10 +158,6 @@ void FailCall(const char *function, int nth, int error) {
     call.error = error;
     call.left = nth;
 }
-
-void HoldPost(const std::atomic<bool> *go) { gPostMayGo = go; }
-
-bool IsPostHeld() { return gPostMayGo == nullptr; }
 
 void DropDelivery() { gDrops = 1; }
 

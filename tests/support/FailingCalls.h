@@ -2,7 +2,6 @@
 #ifndef VARNEK_TESTS_SUPPORT_FAILINGCALLS_H
 #define VARNEK_TESTS_SUPPORT_FAILINGCALLS_H
 
-#include <atomic>
 #include <vector>
 
 // Returns the names of all of them. That of operator new[] is mangled.
@@ -14,10 +13,6 @@ void FailCall(const char *function, int nth, int error);
 
 // Whether the call that FailCall() asked for has not been made yet.
 bool IsStillToFail(const char *function);
-
-// Holds up the next post of a semaphore until `go` is true; returns whether it has begun.
-void HoldPost(const std::atomic<bool> *go);
-bool IsPostHeld();
 
 // Drops the system's next delivery of a timer's expiry; returns whether that has happened.
 void DropDelivery();

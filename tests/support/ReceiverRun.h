@@ -3,17 +3,18 @@
 #define VARNEK_TESTS_SUPPORT_RECEIVERRUN_H
 
 #include <algorithm>
+#include <clocale>
 #include <cstdio>
 #include <cstdlib>
 #include <string>
 
 #include "Demultiplexer.h"
 #include "JsonReport.h"
+#include "Names.h"
 #include "PacketSource.h"
 #include "StreamWriter.h"
 #include "Summary.h"
 #include "Tables.h"
-#include "Words.h"
 
 namespace receiver {
 
@@ -61,6 +62,7 @@ inline std::string ToJson(const Report &report) {
 }
 
 inline std::string ToSummary(const Report &report, size_t width) {
+    std::setlocale(LC_CTYPE, "C.UTF-8");
     return Written([&](std::FILE *file) { WriteSummary(report, width, file); });
 }
 

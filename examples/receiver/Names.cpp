@@ -1,6 +1,6 @@
 // The tables of codes and words come first, followed by the functions that search them. Codes
 // without a word are shown as numbers.
-#include "Words.h"
+#include "Names.h"
 
 #include <algorithm>
 #include <cstdarg>
@@ -169,12 +169,17 @@ constexpr Word kPrivateData[] = {
     {0x56, "teletext"},     {0x59, "subtitles"}, {0x6A, "AC-3 audio"}, {0x6F, "AIT"},
     {0x7A, "E-AC-3 audio"}, {0x7B, "DTS audio"}, {0x7C, "AAC audio"},
 };
-constexpr uint8_t kDescriptorDataComponent = 0xFD;
 
 constexpr Word kDataComponents[] = {
-    {0x0007, "BML"},
-    {0x0008, "captions"},
-    {0x00A0, "Ginga"},
+    {0x0007, "BML"},   {kDataCaptions, "captions"},       {0x000C, "BML"},
+    {0x000D, "BML"},   {kDataCaptionsOneSeg, "captions"}, {0x00A0, "Ginga"},
+    {kDataAit, "AIT"},
+};
+
+constexpr Word kAudioTypes[] = {
+    {1, "clean effects"},
+    {2, "hearing impaired"},
+    {3, "audio description"},
 };
 
 constexpr Word kBrazilianGenres[] = {
@@ -248,6 +253,17 @@ std::string NameOfServiceType(uint8_t type) {
     return OrNumber(Find(kServiceTypes, type), "service type", type);
 }
 
+std::string RoleOfComponent(const Component &component) {
+    const bool data = component.descriptor == kDescriptorDataComponent;
+    const uint16_t id = component.data_component_id;
+    if (data && (id == kDataCaptions || id == kDataCaptionsOneSeg)) {
+        const uint8_t tag = component.tag.value_or(0);
+        return (tag & 0xF8) == 0x38 || tag == 0x88 ? "superimposed text" : "captions";
+    }
+    const char *audio = Find(kAudioTypes, component.audio_type);
+    return component.IsAit() ? "AIT" : audio != nullptr ? audio : "";
+}
+
 std::string NameOfComponent(const Component &component) {
     const bool is_private = component.stream_type == 0x05 || component.stream_type == 0x06;
     const char *by_descriptor = is_private ? Find(kPrivateData, component.descriptor) : nullptr;
@@ -256,12 +272,17 @@ std::string NameOfComponent(const Component &component) {
         "stream type", component.stream_type);
     if (component.descriptor == kDescriptorDataComponent) {
         const uint16_t id = component.data_component_id;
-        const std::string data = OrNumber(Find(kDataComponents, id), "data component", id);
+        const std::string role = RoleOfComponent(component);
+        const std::string data = role == "superimposed text"
+                                     ? role
+                                     : OrNumber(Find(kDataComponents, id), "data component", id);
         name = is_private ? data : name + " (" + data + ")";
     }
     for (const Code &language : component.languages) {
         name += language.IsEmpty() ? "" : " " + language.Text();
     }
+    const char *audio = Find(kAudioTypes, component.audio_type);
+    name += audio != nullptr ? std::string(" (") + audio + ")" : "";
     return name;
 }
 

@@ -1,6 +1,6 @@
 // Names for the codes in tables and descriptors.
-#ifndef RECEIVER_WORDS_H
-#define RECEIVER_WORDS_H
+#ifndef RECEIVER_NAMES_H
+#define RECEIVER_NAMES_H
 
 #include <cstdint>
 #include <string>
@@ -18,6 +18,9 @@ std::string Format(const char *format, ...) __attribute__((format(printf, 1, 2))
 std::string NameOfPid(uint16_t pid);
 std::string NameOfTable(uint8_t table_id);
 std::string NameOfServiceType(uint8_t type);
+// Returns what a component is for, if its codes say so: "captions", "superimposed text", "AIT" or a
+// kind of audio; otherwise an empty text.
+std::string RoleOfComponent(const Component &component);
 // Returns the name of a component by its stream_type and descriptors, with the languages of audio.
 std::string NameOfComponent(const Component &component);
 // Returns "1/16", for example; empty for a code beyond two bits.
