@@ -12,7 +12,6 @@
 namespace {
 
 using namespace std::chrono_literals;
-using ::testing::IsEmpty;
 using varnek::Existing;
 using varnek::Limit;
 using varnek::Outcome;

@@ -60,7 +60,7 @@ class Limit {
 namespace detail {
 // A name that must be refused becomes one that is too long for the C calls.
 inline std::string Name(std::string_view text) {
-    return text.find('\0') == text.npos ? std::string(text) : std::string(99, '?');
+    return text.find('\0') == std::string_view::npos ? std::string(text) : std::string(99, '?');
 }
 
 // Common to the objects of a program or shared library; never destroyed, as timers outlive main.
@@ -163,7 +163,7 @@ class Own {
 };
 
 template <typename Wait, typename IsGone>
-Outcome Await(Limit limit, Wait wait, IsGone isGone) {
+[[gnu::always_inline]] inline Outcome Await(Limit limit, Wait wait, IsGone isGone) {
     do {
         errno = 0;  // a C call that fails without waiting leaves it alone
         if (wait(limit.Milliseconds()) != FALSE) {
@@ -221,8 +221,8 @@ bool SendUrgent(int32_t hThread, const Content &content) {
 
 /// Takes the first content of the calling thread's own queue; on kSuccess alone it is stored.
 /// Sender and receiver must agree on the type. Only threads of the registry have a queue.
-template <typename Content, typename = detail::IfMessage<Content>>
-[[nodiscard]] Outcome Receive(Content &content, Limit limit = Limit::None()) {
+template <typename T, typename = detail::IfMessage<T>>
+[[nodiscard, gnu::always_inline]] inline Outcome Receive(T &content, Limit limit = Limit::None()) {
     THREAD_MSG message;
     int32_t left = 0;
     const auto wait = [&](uint32_t ms) { return VarnekPGL_ReceiveMessage(ms, &message, &left); };
@@ -241,10 +241,10 @@ class Thread {
   public:
     /// Starts a thread, unless one has this name of 1 to 31 characters.
     template <typename... Callable>
-    explicit Thread(std::string_view name, uint32_t stackSize, Callable &&...callable) {
-        const auto start = [this, text = detail::Name(name), stackSize](void *call) {
+    explicit Thread(std::string_view name, uint32_t stack, Callable &&...callable) {
+        const auto start = [this, text = detail::Name(name), stack](void *call) {
             if (VarnekPGL_GetThreadByName(text.c_str()) == -1) {
-                handle_ = VarnekPGL_CreateThread(text.c_str(), 1, stackSize, calls_.Run, call);
+                handle_ = VarnekPGL_CreateThread(text.c_str(), 1, stack, detail::Calls::Run, call);
             }
             return handle_ != -1;
         };
