@@ -5,6 +5,7 @@
 /// callable; what a callable did, after Join. The C calls log failures. An object that could not be
 /// made is false, and its functions fail. Names are copied; one that is too long or has a NUL is
 /// refused. Callables are copyable and passed as to std::bind; an exception ends the program.
+/// @see [Guide: tasking](docs/guide/tasking.md)
 #ifndef VARNEK_TASKING_H
 #define VARNEK_TASKING_H
 
@@ -30,15 +31,14 @@ namespace varnek {
 /// How a wait ended. Without a limit it goes on after a POSIX signal. kGone: the calling thread has
 /// no record, or there is no such semaphore.
 enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
-
 /// What becomes of an object that has the name already: kReplace deletes it, unless it is a held
 /// mutex, and owns the new one; kUse uses it, or makes one, and never deletes it.
 enum class Existing { kReplace, kUse };
-
 /// Milliseconds from any std::chrono duration: rounded up, 0 for a negative one, 49 days for a
 /// longer one. Only None() is for ever. Waits go by the wall clock; timers and Join do not.
 class Limit {
   public:
+    /// From a duration, so that it can be given wherever a limit is wanted.
     template <typename Rep, typename Period>
     constexpr Limit(std::chrono::duration<Rep, Period> time) {
         const double exact = std::chrono::duration<double, std::milli>(time).count();
@@ -48,10 +48,9 @@ class Limit {
             milliseconds_ = static_cast<uint32_t>(rounded.count());
         }
     }
-    static constexpr Limit None() { return {}; }
-    constexpr uint32_t Milliseconds() const { return milliseconds_; }
-    constexpr bool IsNone() const { return milliseconds_ == WAIT_FOREVER; }
-
+    static constexpr Limit None() { return {}; }                             ///< for ever
+    constexpr uint32_t Milliseconds() const { return milliseconds_; }        ///< for the C calls
+    constexpr bool IsNone() const { return milliseconds_ == WAIT_FOREVER; }  ///< whether for ever
   private:
     constexpr Limit() : milliseconds_(WAIT_FOREVER) {}
     uint32_t milliseconds_ = WAIT_FOREVER - 1;
@@ -174,7 +173,6 @@ template <typename Wait, typename IsGone>
            : errno == EINTR   ? Outcome::kInterrupted
                               : Outcome::kGone;
 }
-
 template <typename T>
 using IfMessage = std::enable_if_t<std::is_trivially_copyable_v<T> && sizeof(T) <= 40>;
 }  // namespace detail
@@ -183,22 +181,25 @@ using IfMessage = std::enable_if_t<std::is_trivially_copyable_v<T> && sizeof(T) 
 /// owner is destroyed. lock() aborts, after an assertion report, if the mutex cannot be acquired,
 /// with exceptions too, because no section may run unprotected.
 struct Mutex : detail::Own<VarnekPGL_GetMutexByName, VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex> {
-    Mutex(std::string_view name, Existing old) : Own(name, old) {}
+    Mutex(std::string_view name, Existing old) : Own(name, old) {}  ///< see Existing
+    /// Waits without limit.
     void lock() {
         if (VarnekPGL_AcquireMutex(Handle()) == FALSE) {
             VARNEK_PANIC();
             std::abort();
         }
     }
-    void unlock() { VarnekPGL_ReleaseMutex(Handle()); }
+    void unlock() { VarnekPGL_ReleaseMutex(Handle()); }  ///< releases it
 };
 
 /// A counting semaphore; a new one has `count` units. Nobody may use it when its owner is
 /// destroyed; a thread that a Signal wakes may run before that Signal returns.
 struct Semaphore
     : detail::Own<VarnekPGL_SemaphoreByName, VarnekPGL_CreateSemaphore, VarnekPGL_DeleteSemaphore> {
+    /// See Existing.
     Semaphore(std::string_view name, Existing old, uint32_t count) : Own(name, old, count) {}
-    bool Signal() { return VarnekPGL_SignalSemaphore(Handle()) != FALSE; }
+    bool Signal() { return VarnekPGL_SignalSemaphore(Handle()) != FALSE; }  ///< adds a unit
+    /// Takes a unit, waiting for it if need be.
     [[nodiscard]] Outcome Wait(Limit limit = Limit::None()) {
         const auto wait = [this](uint32_t time) { return VarnekPGL_WaitSemaphore(Handle(), time); };
         return detail::Await(limit, wait, [] { return true; });
@@ -214,6 +215,7 @@ bool Send(int32_t hThread, const Content &content,
     std::memcpy(message.data, &content, sizeof content);
     return send(hThread, &message) != FALSE;
 }
+/// Like Send, but overtakes.
 template <typename Content>
 bool SendUrgent(int32_t hThread, const Content &content) {
     return Send(hThread, content, VarnekPGL_SendUrgentMessage);
@@ -251,8 +253,8 @@ class Thread {
         calls_.Add(start, std::forward<Callable>(callable)...);
     }
     ~Thread() { (void)(RemoveRecord() && calls_.Wait(Limit::None())); }
-    explicit operator bool() const { return handle_ != -1; }
-    int32_t Handle() const { return handle_; }
+    explicit operator bool() const { return handle_ != -1; }  ///< whether it has a record
+    int32_t Handle() const { return handle_; }                ///< to send to; -1 for none
     /// Waits until the callable, which must not wait itself, has returned, and then removes the
     /// record. Returns false on a time-out.
     bool Join(Limit limit = Limit::None()) { return calls_.Wait(limit) && RemoveRecord(); }
@@ -268,13 +270,14 @@ class Thread {
 /// waits for a callable that runs, if it is not what destroys the Timer; so hold no lock it takes.
 class Timer {
   public:
+    /// Creates the timer; nothing is armed yet.
     explicit Timer(std::string_view name)
         : handle_(static_cast<uint32_t>(VarnekPGL_CreateTimer(detail::Name(name).c_str()))) {}
     ~Timer() {
         calls_.Drop([&](bool) { return *this && VarnekPGL_DeleteTimer(handle_.exchange(kNone)); });
         calls_.Wait(Limit::None());
     }
-    explicit operator bool() const { return handle_ != kNone; }
+    explicit operator bool() const { return handle_ != kNone; }  ///< whether it was created
     /// Starts the timer for at least a millisecond, unless it is armed; a callable may do so too.
     template <typename... Callable>
     [[nodiscard]] bool Start(Limit delay, Callable &&...callable) {
@@ -288,8 +291,7 @@ class Timer {
     bool Cancel() {
         return calls_.Drop([&](bool any) { return any && (VarnekPGL_CancelTimer(handle_), any); });
     }
-    bool IsActive() const { return VarnekPGL_IsTimerActive(handle_) != FALSE; }
-
+    bool IsActive() const { return VarnekPGL_IsTimerActive(handle_) != FALSE; }  ///< armed
   private:
     static constexpr uint32_t kNone = UINT32_MAX;
     detail::Calls calls_;
