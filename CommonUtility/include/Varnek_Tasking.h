@@ -8,7 +8,6 @@
 /// @see [Guide: tasking](docs/guide/tasking.md)
 #ifndef VARNEK_TASKING_H
 #define VARNEK_TASKING_H
-
 #include "Varnek_Debug.h"
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
@@ -160,7 +159,6 @@ class Own {
     bool isOwned_;
     int32_t handle_ = -1;
 };
-
 template <typename Wait, typename IsGone>
 [[gnu::always_inline]] inline Outcome Await(Limit limit, Wait wait, IsGone isGone) {
     do {
