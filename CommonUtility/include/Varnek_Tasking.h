@@ -1,5 +1,5 @@
 /// @file
-/// The tasking calls as C++17 objects, with or without exceptions and RTTI; C sees the C calls.
+/// The tasking calls as C++17 objects, with or without exceptions and RTTI. C sees the C calls.
 /// Objects cannot be moved; any thread may use them. What a thread did before Send, Signal, unlock
 /// or starting a thread or timer is visible after the Receive, Wait or lock that follows, or in the
 /// callable; what a callable did, after Join. The C calls log failures. An object that could not be
@@ -12,7 +12,7 @@
 #include "Varnek_Semaphore.h"
 #include "Varnek_Thread.h"
 #include "Varnek_Timer.h"
-#ifdef __cplusplus
+#if defined(__cplusplus) && __cplusplus >= 201703L
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
