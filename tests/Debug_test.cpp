@@ -26,7 +26,7 @@ class DebugAlone : public VarnekTest {
     void TearDown() override {
         VarnekTest::TearDown();
         gLogHook = nullptr;
-        WriteAll(kDefault, ReadAll(VARNEK_DEFAULTS "debug_ltn.ini"));
+        WriteAll(kDefault, ReadAll(TestFile("defaults/debug_ltn.ini")));
     }
 
     // Traces with this mask, and returns whether the trace reaches the log.

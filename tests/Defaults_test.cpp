@@ -9,7 +9,7 @@ TEST_F(DefaultsAlone, FilesSayWhatTheirCommentsPromise) {
     const std::string debug = "debug_ltn.ini";
     const std::string config = "Varnek_Config.cfg";
     for (const std::string &name : {debug, config}) {
-        WriteAll(VARNEK_DATA_DIR + name, ReadAll(VARNEK_DEFAULTS + name));
+        WriteAll(VARNEK_DATA_DIR + name, ReadAll(TestFile("defaults/" + name)));
     }
     NOTE(VarnekPGL_InitializeDebug(), 0);
     NOTE(VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON, "through"), 0);

@@ -218,9 +218,10 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
     Force("mutex", [] { return VarnekPGL_DeleteMutex(VarnekPGL_CreateMutex("new")); });
     Force("semaphore", [] {
         const int32_t semaphore = VarnekPGL_CreateSemaphore("new", 0);
-        const BOOL signalled = VarnekPGL_SignalSemaphore(semaphore);
-        const BOOL taken = signalled != FALSE ? VarnekPGL_WaitSemaphore(semaphore, WAIT_FOREVER) : FALSE;
-        return signalled + taken + VarnekPGL_WaitSemaphore(semaphore, 1) + VarnekPGL_DeleteSemaphore(semaphore);
+        const auto pass = [=](uint32_t timeout) {
+            return VarnekPGL_SignalSemaphore(semaphore) != FALSE ? VarnekPGL_WaitSemaphore(semaphore, timeout) : FALSE;
+        };
+        return pass(WAIT_FOREVER) + pass(1) + VarnekPGL_DeleteSemaphore(semaphore);
     });
     Force("thread", [&] { return VarnekPGL_DeleteThread(VarnekPGL_CreateThread("new", 1, 65536, stay, nullptr)); });
     Force("send", [&] {

@@ -117,9 +117,9 @@ TEST_F(File, SizesAndPositions) {
 
     const std::string large = Path("large");
     WriteAll(large, "");
-    fs::resize_file(large, INT32_MAX);
+    truncate64(large.c_str(), INT32_MAX);
     EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), INT32_MAX);
-    fs::resize_file(large, 5LL << 30);
+    truncate64(large.c_str(), 5LL << 30);
     EXPECT_EQ(VarnekPGL_GetFileSize(large.c_str()), 0);
     const PglFileHandle beyond = VarnekPGL_OpenFile(large.c_str(), PGL_FILE_MODE_READ);
     if (beyond != -1 && sizeof(long) == 8) {  // 32 bits have no such position
@@ -204,9 +204,7 @@ TEST_F(LargeFile, FailuresHaveTheirLineAndResult) {
     const rlimit small = {100, old.rlim_max};
     setrlimit(RLIMIT_FSIZE, &small);
     const std::string data(150, 'x');
-    for (int error : {0, ENOSPC, EFBIG, EBADF}) {
-        Show(strerror(error), "error " + std::to_string(error));
-    }
+    Show(strerror(0), "no error");
     Show("Hndl : " + std::to_string(full), "Hndl : FULL");
     Show("Hndl : " + std::to_string(limited), "Hndl : LIMITED");
     Show("Hndl : " + std::to_string(reader), "Hndl : READER");
@@ -240,7 +238,6 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     PglFmFileAttributes attributes;
     PglDirEntryInfo info = {7, ""};
     Show("pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()), "pid(PID) uid(UID");
-    Show("errno(" + std::to_string(EEXIST), "errno(EEXIST");
     NOTE(VarnekPGL_MakeDir(present.c_str()));
     NOTE(VarnekPGL_MakeDir(tooLong.c_str()));
     NOTE(VarnekPGL_DeleteDirEx((none + "/").c_str()));

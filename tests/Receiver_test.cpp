@@ -65,7 +65,7 @@ Bytes Numbered(size_t first, size_t count, const Bytes &lead = {}, const Bytes &
     return out;
 }
 
-std::string SampleText() { return ReadAll(VARNEK_SAMPLE); }
+std::string SampleText() { return ReadAll(TestFile("sample.ts")); }
 
 TEST_F(Receiver, FindsPacketsAmongOtherBytes) {
     std::mt19937 random(47);
@@ -477,7 +477,7 @@ TEST_F(Receiver, AnswersEveryInput) {
     const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, Fill(4, 0)) + Fill(9000, 0x11);
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
     Show("receiver " + std::to_string(VARNEK_VERSION_MAJOR), "receiver MAJOR");
-    Show(VARNEK_SAMPLE, "SAMPLE");
+    Show(TestFile("sample.ts"), "SAMPLE");
     const std::vector<std::string> cases[] = {
         {},
         {"--nonsense", Path("text")},
@@ -494,14 +494,14 @@ TEST_F(Receiver, AnswersEveryInput) {
         {Path("accident")},
         {Path("cut.ts"), "--json"},
         {"--", Path("-dash")},
-        {"--all", "--region", "5", VARNEK_SAMPLE},
+        {"--all", "--region", "5", TestFile("sample.ts")},
     };
     for (const std::vector<std::string> &arguments : cases) {
         NoteProgram(arguments);
     }
     std::FILE *full = std::fopen("/dev/full", "w");
     ASSERT_NE(full, nullptr);
-    EXPECT_EQ(RunReceiver({VARNEK_SAMPLE}, {full, stderr}), 1);
+    EXPECT_EQ(RunReceiver({TestFile("sample.ts")}, {full, stderr}), 1);
     EXPECT_EQ(RunReceiver({"--help"}, {full, stderr}), 1);
     EXPECT_EQ(RunReceiver({"--version"}, {full, stderr}), 1);
     std::fclose(full);
@@ -535,12 +535,12 @@ TEST_F(Receiver, StopsWhileItWaits) {
 
 // Fills the registry of a family, and frees a place for each run until a run has all that it needs.
 TEST_F(Receiver, FreesItsObjects) {
-    Show(VARNEK_SAMPLE, "SAMPLE");
-    const std::string expected = RunProgram({"--json", VARNEK_SAMPLE}).out;
+    Show(TestFile("sample.ts"), "SAMPLE");
+    const std::string expected = RunProgram({"--json", TestFile("sample.ts")}).out;
     for (const Family &family : kFamilies) {
         std::vector<int32_t> fillers = family.Fill();
         for (bool enough = false; !enough; fillers.pop_back()) {
-            const Result result = NoteProgram({"--json", VARNEK_SAMPLE});
+            const Result result = NoteProgram({"--json", TestFile("sample.ts")});
             enough = result.status == 0;
             EXPECT_EQ(result.out, enough ? expected : "");
             Note("There was room for " + std::to_string(family.Room()) + " " + family.name + ".\n");
@@ -553,14 +553,14 @@ TEST_F(Receiver, FreesItsObjects) {
 
 // A capture has the packets that the tables come from. It is a stream with the same tables.
 TEST_F(Receiver, Captures) {
-    Show(VARNEK_SAMPLE, "SAMPLE");
+    Show(TestFile("sample.ts"), "SAMPLE");
     const std::string captured = Path("captured.ts");
     WriteAll(captured, std::string(1000000, 'x'));
     WriteAll(Path("text"), std::string(9999, 'x'));
     NoteProgram({"--capture", captured, Path("text")});
     EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "a run without packets wrote a capture";
 
-    const Result first = NoteProgram({"--json", "--quiet", "--capture", captured, VARNEK_SAMPLE});
+    const Result first = NoteProgram({"--json", "--quiet", "--capture", captured, TestFile("sample.ts")});
     EXPECT_LT(ReadAll(captured).size(), SampleText().size());
     const Result again = NoteProgram({"--json", captured});
     const auto tables = [](const Result &result) {
@@ -570,7 +570,7 @@ TEST_F(Receiver, Captures) {
 
     NoteProgram({"--capture", captured, captured});  // a stream is not overwritten
     NoteProgram({"--capture", Path(""), captured});
-    NoteProgram({"--capture", "/dev/full", VARNEK_SAMPLE});  // the reading goes on
+    NoteProgram({"--capture", "/dev/full", TestFile("sample.ts")});  // the reading goes on
 }
 
 // On a damaged stream too, the program's threads give the report that one thread gives.

@@ -133,6 +133,7 @@ TEST_F(Semaphore, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_WaitSemaphore(0, WAIT_FOREVER));
     NOTE(VarnekPGL_SignalSemaphore(9));
     NOTE(VarnekPGL_SemaphoreByName(nullptr));
+    Show("count=[" + std::to_string(SEM_VALUE_MAX), "count=[SEM_VALUE_MAX");
     NOTE(VarnekPGL_CreateSemaphore("brimful", SEM_VALUE_MAX));
     NOTE(VarnekPGL_SignalSemaphore(1));
     NOTE(VarnekPGL_DeleteSemaphore(1));

@@ -3,7 +3,9 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -27,6 +29,13 @@ void Capture(int priority, const char *tag, const char *text) {
     gLog.push_back(std::move(line));
 }
 
+#define NAMED(error) std::pair(error, #error)
+constexpr std::pair<int, const char *> kErrors[] = {
+    NAMED(EPERM),  NAMED(ENOENT), NAMED(EINTR),  NAMED(EIO),     NAMED(EBADF),     NAMED(ENOMEM),    NAMED(EACCES),
+    NAMED(EFAULT), NAMED(EBUSY),  NAMED(EEXIST), NAMED(ENOTDIR), NAMED(EISDIR),    NAMED(EINVAL),    NAMED(EMFILE),
+    NAMED(EFBIG),  NAMED(ENOSPC), NAMED(ESPIPE), NAMED(EROFS),   NAMED(EOVERFLOW), NAMED(ETIMEDOUT),
+};
+
 }  // namespace
 
 std::string LogLine::Body() const { return BodyOf(tag.c_str(), text.c_str()); }
@@ -46,6 +55,11 @@ std::vector<std::string> TakeBodies(const std::string &tag, int priority) {
         }
     }
     return bodies;
+}
+
+std::string TestFile(const std::string &name) {
+    const char *files = getenv("VARNEK_TEST_FILES");
+    return std::string(files != nullptr ? files : VARNEK_TEST_FILES) + "/" + name;
 }
 
 std::string ReadAll(const std::string &path) {
@@ -78,23 +92,31 @@ void VarnekTest::Note(const std::string &call, int64_t result) {
 }
 
 void VarnekTest::TearDown() {
+    for (const auto &[error, name] : kErrors) {
+        if (error != EINVAL) {  // "Invalid argument" are also words of the library
+            Show(strerror(error), name);
+        }
+        for (const char *before : {"errCode = [", "errno(", "errno = ["}) {
+            const char end = before[strlen(before) - 1] == '(' ? ')' : ']';
+            Show(before + std::to_string(error) + end, before + std::string(name) + end);
+        }
+    }
     for (const auto &[text, name] : names_) {
         for (size_t at = 0; (at = transcript_.find(text, at)) != std::string::npos; at += name.size()) {
             transcript_.replace(at, text.size(), name);
         }
     }
-    if (!transcript_.empty()) {
-        const std::regex system(
-            "((?:linux ?[A-Z][a-z]+=|[pP]threadI[dD] = |tv_n?sec)\\[|[pu]id\\((?=\\d)|(?:pDir|hFile|handle) = 0x)"
-            "[^\\]), \n]*|(process\\()[^)]*/");
-        transcript_ = std::regex_replace(transcript_, system, "$1$2*");
-        const auto &test = *::testing::UnitTest::GetInstance()->current_test_info();
-        const std::string path = std::string(VARNEK_EXPECTED) + test.test_suite_name() + "." + test.name() + ".txt";
-        if (getenv("VARNEK_WRITE_EXPECTED") != nullptr) {
-            WriteAll(path, transcript_);
-        }
-        EXPECT_EQ(transcript_, ReadAll(path));
+    const std::regex system(
+        "((?:linux ?[A-Z][a-z]+=|[pP]threadI[dD] = |tv_n?sec)\\[|[pu]id\\((?=\\d)|(?:pDir|hFile|handle) = 0x)"
+        "[^\\]), \n]*|(process\\()[^)]*/");
+    transcript_ = std::regex_replace(transcript_, system, "$1$2*");
+    const auto &test = *::testing::UnitTest::GetInstance()->current_test_info();
+    const std::string path = TestFile("expected/") + test.test_suite_name() + "." + test.name() + ".txt";
+    if (getenv("VARNEK_WRITE_EXPECTED") != nullptr) {
+        transcript_.empty() ? void(std::filesystem::remove(path)) : WriteAll(path, transcript_);
     }
+    // A file that is missing reads as empty, so a test that notes nothing must have none.
+    EXPECT_EQ(transcript_, ReadAll(path));
     std::error_code ignored;
     std::filesystem::remove_all(folder_, ignored);
 }

@@ -42,6 +42,10 @@ inline std::vector<std::string> TakeErrors() { return TakeBodies("", 6); }
 // Called without a lock for each line before it is captured, in the thread that wrote the line; null for none.
 extern std::atomic<void (*)(const LogLine &line)> gLogHook;
 
+// Returns the path of something that the tests read: "expected/", "defaults/" or "sample.ts". It is in the build tree,
+// or in the folder that VARNEK_TEST_FILES in the environment names.
+std::string TestFile(const std::string &name);
+
 std::string ReadAll(const std::string &path);
 void WriteAll(const std::string &path, const std::string &content);
 
@@ -95,7 +99,8 @@ class VarnekTest : public ::testing::Test {
     // writes that file.
     void Note(const std::string &text) { transcript_ += text; }
     void Note(const std::string &call, int64_t result);
-    // Replaces a text that differs from run to run by `name` in the transcript. The system's handles are always hidden.
+    // Replaces a text that differs from run to run by `name` in the transcript. The system's handles are always hidden,
+    // and its errors have their names instead of its numbers and words.
     void Show(const std::string &text, const std::string &name) { names_.emplace_back(text, name); }
 
   private:
