@@ -39,7 +39,8 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
 }
 
 TEST_F(Mutex, NamesThatResembleEachOther) {
-    // The first two have the same digest. A slot keeps the end of a longer name that it had before.
+    // Some differ in their first word only, some in their last, and some begin like a longer one. A
+    // slot keeps the end of a longer name that it had before.
     const char *const names[] = {"aaaazaaa", "baaa[aaa", "aaaazaaabbbb", "aaaa", "aaa"};
     EXPECT_TRUE(VarnekPGL_DeleteMutex(VarnekPGL_CreateMutex("baaa[aaabbbbcccc")));
     for (const char *name : names) {

@@ -11,6 +11,8 @@ constexpr int MAX_MUTEX_MGR_INFO_ARR_SIZE = 40;
 struct MUTEX_MGR_INFO {
     pthread_mutex_t linuxMutex;
 };
-inline SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE> gMutexArr;
+using Mutexes = SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE>;
+// Hidden, and not an inline variable: each of these saves a load of the table's address.
+extern __attribute__((visibility("hidden"))) Mutexes gMutexArr;
 
 #endif

@@ -12,6 +12,8 @@
 #include "Varnek_Support.h"
 #include "Varnek_Trace.h"
 
+Mutexes gMutexArr;
+
 namespace {
 
 constexpr int MAX_SEM_MGR_INFO_ARR_SIZE = 40;
