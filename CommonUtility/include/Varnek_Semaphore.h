@@ -59,7 +59,7 @@ VARNEK_API BOOL VarnekPGL_DeleteSemaphore(int32_t hSem);
 /// Takes one unit, waiting for it if need be. A POSIX signal ends the wait.
 /// @param hSem     a live semaphore
 /// @param timeout  milliseconds by the wall clock, or WAIT_FOREVER; 0 does not wait
-/// @return TRUE if a unit was taken; FALSE if time ran out or the wait failed
+/// @return TRUE if a unit was taken; FALSE, with errno set (ETIMEDOUT, EINTR), if the wait failed
 /// @par Traces
 /// Low on entry and after waiting without limit; Error for an unknown handle or a failing wait.
 VARNEK_API BOOL VarnekPGL_WaitSemaphore(int32_t hSem, uint32_t timeout);

@@ -19,10 +19,9 @@ int MessageQueue::Wake(int32_t owner, sem_t *waiter) {
     return error;
 }
 
-// Nothing is lost between a look and the wait after it, because both the note and the permits
-// change under the lock: a sender either adds its permit before the look, or finds the note and
-// posts. The owner always looks once more before it reports an error, so that a message which comes
-// together with the end of the wait is taken.
+// Nothing is lost between a look and the wait after it, because note and permits change under the
+// lock: a sender adds its permit before the look, or finds the note and posts. The owner looks once
+// more before it reports an error, so a message that comes as the wait ends is taken.
 MessageQueue::Taken MessageQueue::WaitAndTake(int32_t owner, uint32_t timeout, sem_t *own) {
     timespec now = {};
     timespec deadline = {};

@@ -1,10 +1,7 @@
-// A thread's message queue. All of it is guarded by its lock, which is a leaf: no trace, no wait
-// and no other lock comes under it.
-//
-// The right to take a message is a permit, and a count of them is all there is: each message that
-// is sent adds one, each receive uses one up. The semaphore on which the owner waits carries no
-// count. A post only tells the owner to look again, so one that comes late or twice is harmless.
-// Private.
+// A thread's message queue, guarded by a leaf lock: no trace, wait or other lock comes under it. A
+// count of permits is all there is: sending adds one, receiving uses one up. The semaphore on which
+// the owner waits carries no count; a post only tells it to look again, so one that comes late or
+// twice is harmless. Private.
 #ifndef VARNEK_SOURCE_MESSAGEQUEUE_H
 #define VARNEK_SOURCE_MESSAGEQUEUE_H
 

@@ -1,5 +1,4 @@
-// The table of the named mutexes. Varnek_Semaphore.cpp changes it; HoldMutex only looks mutexes up.
-// Private.
+// The table of the named mutexes, which only Varnek_Semaphore.cpp changes. Private.
 #ifndef VARNEK_SOURCE_MUTEXTABLE_H
 #define VARNEK_SOURCE_MUTEXTABLE_H
 

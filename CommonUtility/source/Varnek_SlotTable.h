@@ -1,8 +1,7 @@
-// The table of named objects: slots, handles and names, and nothing else. A handle is given to one
-// object only and never again. So storing a handle publishes its slot, and a lookup, which takes no
-// lock, trusts what it reads while the handle stays the same. A thread that changes the table holds
-// the lock that guards it; only hints are corrected without it. A table of zero bytes is empty, so
-// it needs no initialisation. Private.
+// The table of named objects: slots, handles and names, and nothing else. A handle is given out
+// only once, so storing it publishes its slot, and a lookup without a lock trusts what it reads
+// while the handle stays the same. Whoever changes the table holds its guard. All zero is empty.
+// Private.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 
@@ -32,10 +31,9 @@ class SlotTable {
         }
     };
 
-    // Returns the slot of a live handle, null for none. It reads one slot if the hint is right, and
-    // scans all slots if not. Acquire pairs with the release in Publish, and makes the Info visible
-    // as it was published. A relaxed read does not, so it is for a caller that needs no more than
-    // what it sees already, such as what happened before the calling thread started.
+    // Returns the slot of a live handle, null for none: one read if the hint is right, else a scan.
+    // Acquire pairs with the release in Publish and makes the Info visible as it was published;
+    // relaxed is for a caller that sees all it needs already, such as a thread its own record.
     Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
         if (handle <= kFree) {
             return nullptr;

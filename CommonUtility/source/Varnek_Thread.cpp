@@ -1,8 +1,6 @@
-// The registry of threads, and the message operations. The named mutex "VarnekThreadMutex" guards
-// changes of the registry; each record's queue has a lock of its own, the only one that is taken
-// under the guard. A thread knows itself by the block that its creator hands to it and that it
-// keeps under a thread-specific key: the system reuses the ids of ended threads, but not that
-// value.
+// The thread registry, guarded by the named mutex "VarnekThreadMutex", and the message operations.
+// A thread knows itself by the block that its creator handed to it, which it keeps under a
+// thread-specific key, because the system reuses the ids of threads that have ended.
 #include "Varnek_Thread.h"
 
 #include <pthread.h>
@@ -26,10 +24,9 @@ namespace {
 constexpr int MAX_THREAD_MGR_INFO_ARR_SIZE = 20;
 constexpr size_t kSystemNameSize = 16;  // of a thread's name in the system, with the terminator
 
-// What a running thread has to itself. Its creator fills it, and it is in use until the thread
-// ends, whatever becomes of the record. Then it waits for another thread. It is never freed, so a
-// sender may post its semaphore at any time, however late: the block's present thread looks at its
-// queue once more and waits on.
+// What a running thread has to itself, whatever becomes of its record. When it ends, the block is
+// kept for another thread and never freed, so a sender may post its semaphore however late: the
+// block's present thread looks at its queue once more and waits on.
 struct RunningThread {
     sem_t wake;
     int32_t hHandle;  // 0 after the thread's end
@@ -53,10 +50,9 @@ Threads gThreadInfoArr;
 Lock gIdleLock;
 RunningThread *gIdle VARNEK_GUARDED_BY(gIdleLock) = nullptr;
 
-// The first creation of a thread creates the key under which a thread keeps its block, and then the
-// guard. The release of the guard's handle publishes both. Even a thread that the registry has not
-// started needs the acquire: it may have a value under a deleted key of the same number, which the
-// C library recognises only if the thread sees the creation of this one.
+// The first thread creation makes the key and then the guard, whose handle publishes both. Threads
+// that the registry did not start need the acquire as well: one may have a value under a deleted
+// key of the same number, which the C library tells apart only if it sees this key being created.
 constexpr int32_t kNoGuard = HoldMutex::kNoMutex;
 OneAtATime gFirstCreation;
 pthread_key_t gSelfKey;
@@ -431,7 +427,7 @@ BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *co
             FALSE, "VarnekPGL_ReceiveMessage: Can't find current thread Info. curThread = [%d]",
             curThread);
     }
-    if (taken.error != 0) {
+    if (SetErrno(taken.error) != 0) {
         return VARNEK_FAIL(FALSE,
                            "***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [%d]",
                            taken.error);

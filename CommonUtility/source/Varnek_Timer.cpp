@@ -83,6 +83,8 @@ int ReadArmed(const TIMER_MGR_INFO &info, bool *armed) {
     return result;
 }
 
+constexpr timespec kAtOnce = {0, 1};
+
 // Sets an OS timer to expire once; a time of 0 disarms it. Returns the result of the OS call.
 int SetTime(timer_t timerId, const timespec &time) {
     itimerspec expiry = {};
@@ -97,6 +99,9 @@ OwedStart TakeDue(TIMER_MGR_INFO *info) {
         const OwedStart due = *oldest;
         info->owed = oldest->next;
         free(oldest);
+        if (info->owed != nullptr) {
+            SetTime(info->owedTimerId, kAtOnce);  // the next one does not wait for this callback
+        }
         return due;
     }
     bool armed = false;
@@ -170,9 +175,7 @@ bool OweLastStart(uint32_t timer, TIMER_MGR_INFO *info) {
     if (start == nullptr) {
         return VARNEK_FAIL(false, "VarnekPGL_StartTimer. memalloc failed");
     }
-    timespec atOnce = {};
-    atOnce.tv_nsec = 1;
-    const int result = info->owed == nullptr ? SetTime(info->owedTimerId, atOnce) : 0;
+    const int result = info->owed == nullptr ? SetTime(info->owedTimerId, kAtOnce) : 0;
     if (result != 0) {
         free(start);
         return VARNEK_FAIL(false, "VarnekPGL_StartTimer. Set Timer is FAIL. errCode = [%d]!",
