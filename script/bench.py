@@ -40,7 +40,7 @@ ROWS = [
     Row('mutex/last', 'locks', 'mutex acquire + release by handle', (Peer('bare', 'pthread mutex', 1.6),), (140, 4)),
     Row('mutex/two', 'locks', 'the same, two threads, adjacent slots', (Peer('onethread', 'one thread', 1.5),)),
     Row('semaphore/last', 'locks', 'semaphore signal + wait', (Peer('bare', 'sem_post, sem_wait', 3.0),), (170, 4)),
-    Row('byname', 'locks', 'mutex by name, 31st of 40', (), (350, 4)),
+    Row('byname', 'locks', 'mutex by name, 31st of 40', (), (450, 4)),
     Row('message/same', 'messages', 'send + receive, same thread',
         (Peer('gasync', 'GAsyncQueue', 1.1), Peer('bare', MESSAGE_LIST, 2.0)), (900, 20)),
     Row('message/oneway', 'messages', 'message, one way',
