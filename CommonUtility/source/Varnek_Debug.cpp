@@ -159,7 +159,7 @@ class SummaryLine {
         length_ += more > 0 ? static_cast<size_t>(more) : 0;
         separator_ = "\t";
     }
-    void Write(const char *end) {
+    void Log(const char *end) {
         snprintf(text_ + length_, sizeof text_ - length_, "%s", end);
         __android_log_write(VARNEK_LOG_DEBUG, "SBTVD", text_);
     }
@@ -175,7 +175,7 @@ void LogSummary(uint32_t enabled) {
     for (const TraceLevel &level : kLevels) {
         levels.Add(level.key, (enabled & level.bit) != 0);
     }
-    levels.Write("\n");
+    levels.Log("\n");
     constexpr uint32_t kLines[][5] = {
         {VARNEK_MODULE_COMMON, VARNEK_MODULE_JNI, VARNEK_MODULE_MAIN_CONTROL, VARNEK_MODULE_ESG,
          VARNEK_MODULE_SESSION_MANAGER},
@@ -190,7 +190,7 @@ void LogSummary(uint32_t enabled) {
                 line.Add(ModuleOf(bit).label, (enabled & bit) != 0);
             }
         }
-        line.Write("");
+        line.Log("");
     }
 }
 
