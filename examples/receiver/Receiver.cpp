@@ -115,6 +115,18 @@ void DivertLog(const char *path) {
     }
 }
 
+// Answers --help and --version. Returns the exit status.
+int WriteFacts(const Options &options, std::FILE *out, std::FILE *err) {
+    if (options.help) {
+        WriteHelp(out, LineWidth(out, err));
+    }
+    if (options.version) {
+        std::fputs("receiver " RECEIVER_VERSION "\n", out);
+    }
+    const bool written = std::fflush(out) == 0 && std::ferror(out) == 0;
+    return written ? 0 : Fail(err, "standard output", "could not be written");
+}
+
 }  // namespace
 
 int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &surroundings) {
@@ -127,15 +139,8 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
                      wrong.c_str());
         return 2;
     }
-    if (options.help) {
-        WriteHelp(out, LineWidth(out, err));
-    }
-    if (options.version) {
-        std::fputs("receiver " RECEIVER_VERSION "\n", out);
-    }
     if (options.help || options.version) {
-        const bool written = std::fflush(out) == 0 && std::ferror(out) == 0;
-        return written ? 0 : Fail(err, "standard output", "could not be written");
+        return WriteFacts(options, out, err);
     }
     if (surroundings.log_path != nullptr && !options.log) {
         DivertLog(surroundings.log_path);
