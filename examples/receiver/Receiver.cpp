@@ -115,6 +115,31 @@ void DivertLog(const char *path) {
     }
 }
 
+bool IsStopped(const Surroundings &surroundings) {
+    return surroundings.stop != nullptr && *surroundings.stop;
+}
+
+bool IsWritten(std::FILE *out) {
+    return std::fflush(out) == 0 && std::ferror(out) == 0;
+}
+
+// Says why a stream cannot be opened. The library refuses some without a system call, and then
+// errno is 0.
+std::string OpenFailure() {
+    return "cannot be opened" + (errno != 0 ? ": " + SystemText(errno) : "");
+}
+
+// Answers --help and --version. Returns the exit status.
+int WriteFacts(const Options &options, std::FILE *out, std::FILE *err) {
+    if (options.help) {
+        WriteHelp(out, LineWidth(out, err));
+    }
+    if (options.version) {
+        std::fputs("receiver " RECEIVER_VERSION "\n", out);
+    }
+    return IsWritten(out) ? 0 : Fail(err, "standard output", "could not be written");
+}
+
 }  // namespace
 
 int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &surroundings) {
@@ -127,26 +152,16 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
                      wrong.c_str());
         return 2;
     }
-    if (options.help) {
-        WriteHelp(out, LineWidth(out, err));
-    }
-    if (options.version) {
-        std::fputs("receiver " RECEIVER_VERSION "\n", out);
-    }
     if (options.help || options.version) {
-        const bool written = std::fflush(out) == 0 && std::ferror(out) == 0;
-        return written ? 0 : Fail(err, "standard output", "could not be written");
+        return WriteFacts(options, out, err);
     }
     if (surroundings.log_path != nullptr && !options.log) {
         DivertLog(surroundings.log_path);
     }
-    const auto stopped = [&] { return surroundings.stop != nullptr && *surroundings.stop; };
     StreamFile file;
     errno = 0;
-    if (!file.Open(options.path) && !stopped()) {
-        // The library refuses some opens without a system call, so errno may be 0.
-        return Fail(err, options.path,
-                    "cannot be opened" + (errno != 0 ? ": " + SystemText(errno) : ""));
+    if (!file.Open(options.path) && !IsStopped(surroundings)) {
+        return Fail(err, options.path, OpenFailure());
     }
     if (file.IsQuietPipe() && !options.quiet) {
         std::fprintf(err, "receiver: %s: waiting for a program that writes to this pipe\n",
@@ -169,7 +184,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
         return Fail(err, options.path, "the " + missing + " could not be created");
     }
     const std::string fault = FindFault(report, file.Error());
-    if (!fault.empty() && !stopped()) {
+    if (!fault.empty() && !IsStopped(surroundings)) {
         return Fail(err, options.path, fault);
     }
     if (surroundings.stop != nullptr) {
@@ -182,7 +197,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     } else {
         WriteSummary(report, LineWidth(out, err), out);
     }
-    if (std::fflush(out) != 0 || std::ferror(out) != 0) {
+    if (!IsWritten(out)) {
         return Fail(err, options.path, "the result could not be written");
     }
     if (file.Error() != 0) {
@@ -195,7 +210,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
         return Fail(err, options.path,
                     "no local time for region " + std::to_string(*options.region));
     }
-    return stopped() ? kInterrupted : 0;
+    return IsStopped(surroundings) ? kInterrupted : 0;
 }
 
 }  // namespace receiver

@@ -91,6 +91,7 @@ bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services
 std::vector<ListedEvent> ListEvents(const Model &model) {
     std::vector<ListedEvent> events;
     const auto own = model.events.Joined();
+    events.reserve(own.size());
     for (const auto &[key, event] : own) {
         events.push_back({key.first, event, false});
     }
@@ -133,7 +134,7 @@ StreamClock::StreamClock(const Report &report) {
 }
 
 std::optional<DateTime> StreamClock::Utc(const std::optional<DateTime> &time) const {
-    return time && nation_ == kBrazil ? *time - kBrasiliaMinutes * 60 : time;
+    return time && nation_ == kBrazil ? *time - DateTime{kBrasiliaMinutes} * 60 : time;
 }
 
 std::optional<DateTime> StreamClock::Local(const std::optional<DateTime> &time) const {
@@ -141,7 +142,7 @@ std::optional<DateTime> StreamClock::Local(const std::optional<DateTime> &time) 
         return std::nullopt;
     }
     const bool changed = offset_->change && !(*time < *offset_->change);
-    return *time + (changed ? offset_->next_minutes : offset_->minutes) * 60;
+    return *time + DateTime{changed ? offset_->next_minutes : offset_->minutes} * 60;
 }
 
 std::string StreamClock::OffsetText(int minutes) const {

@@ -51,9 +51,11 @@ std::FILE *OpenMessages() {
 
 int main(int argc, char **argv) {
     TakeStandardDescriptors();
+    // NOLINTBEGIN(concurrency-mt-unsafe): there is no other thread yet
     if (std::setlocale(LC_CTYPE, "") == nullptr) {
         std::setlocale(LC_CTYPE, "C.UTF-8");  // the user's locale is not installed
     }
+    // NOLINTEND(concurrency-mt-unsafe)
     CatchInterrupt();
     std::FILE *const messages = OpenMessages();
     return receiver::RunReceiver(std::vector<std::string>(argv + (argc > 0 ? 1 : 0), argv + argc),
