@@ -33,12 +33,6 @@ inline bool IsMissing(const char *path) {
     return stat64(path, &status) != 0 && errno == ENOENT;
 }
 
-// Whether the path is a link, so that a change would reach a file elsewhere.
-inline bool IsLink(const char *path) {
-    struct stat64 status = {};
-    return lstat64(path, &status) == 0 && S_ISLNK(status.st_mode);
-}
-
 // Copies the line at `*text` as far as it fits, and moves `*text` past it and all line ends that
 // follow. Returns false at `end`, and for an empty line.
 template <size_t size>

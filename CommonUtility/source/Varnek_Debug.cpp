@@ -4,6 +4,7 @@
 #include "Varnek_Debug.h"
 
 #include <errno.h>
+#include <fcntl.h>
 #include <pthread.h>
 #include <stdarg.h>
 #include <stdio.h>
@@ -352,7 +353,8 @@ int32_t VarnekPGL_SysGetLastErro() {
 void VarnekPGL_changeModeForDebug() {
     VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, " VarnekCfg_changeDebugMode\n");
     for (const char *path : {kDebugPath, kSettingsPath}) {
-        if (!IsLink(path) && IsReadable(path)) {
+        // A change must not reach a file elsewhere.
+        if (!IsLink(AT_FDCWD, path) && IsReadable(path)) {
             (void)VarnekPGL_Chmod(path, 666);
         }
     }

@@ -43,11 +43,6 @@ void ReadProcessName(char (&name)[size]) {
     }
 }
 
-bool IsLink(int dir, const char *name) {
-    char target = '\0';
-    return readlinkat(dir, name, &target, sizeof target) >= 0;
-}
-
 bool IsDirectory(const char *path) {
     const int fd = open(path, O_PATH | O_DIRECTORY | O_CLOEXEC);
     if (fd >= 0) {

@@ -7,6 +7,7 @@
 
 #include <stdio.h>
 #include <string.h>
+#include <unistd.h>
 
 #include "Varnek_File.h"
 #include "Varnek_Support.h"
@@ -19,6 +20,11 @@ constexpr uint32_t kSeekBases = 3;  // SEEK_SET 0, SEEK_CUR 1, SEEK_END 2
 
 inline bool IsTooLong(const char *path) {
     return path != nullptr && strnlen(path, MAX_PGL_FILE_PATH_LEN) >= MAX_PGL_FILE_PATH_LEN;
+}
+
+inline bool IsLink(int dir, const char *name) {
+    char target = '\0';
+    return readlinkat(dir, name, &target, sizeof target) >= 0;
 }
 
 // Returns the stream of a handle, null for none. A failed open returns the handle -1.
