@@ -193,6 +193,22 @@ TEST_F(LargeFile, BeyondFourGiB) {
     EXPECT_THAT(TakeLog(), IsEmpty());
 }
 
+TEST_F(File, ASizeQueryOnAFullMediumKeepsThePosition) {
+    const PglFileHandle file = VarnekPGL_OpenFile(Path("full").c_str(), PGL_FILE_MODE_CREATE_RW);
+    signal(SIGXFSZ, SIG_IGN);
+    rlimit old = {};
+    getrlimit(RLIMIT_FSIZE, &old);
+    const rlimit small = {10, old.rlim_max};
+    setrlimit(RLIMIT_FSIZE, &small);
+    const std::string data(100, 'x');
+    EXPECT_EQ(VarnekPGL_WriteFileByHandle(file, data.data(), 100), 100u);
+    EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(file), 10);
+    EXPECT_EQ(VarnekPGL_TellFile(file), 100);
+    EXPECT_THAT(TakeLog(), Not(IsEmpty()));
+    setrlimit(RLIMIT_FSIZE, &old);
+    VarnekPGL_CloseFile(file);
+}
+
 TEST_F(LargeFile, FailuresHaveTheirLineAndResult) {
     const std::string path = Path("limited");
     const int32_t full = VarnekPGL_OpenFile64Bits("/dev/full", PGL_FILE_MODE_WRITE);

@@ -39,6 +39,7 @@ constexpr size_t kFileSize = 900;  // the text that is written, with its termina
 
 // A save writes a draft first. Its name ends in the saver's process id and a number.
 constexpr char kDraftPrefix[] = "Varnek_Config.new.";
+std::atomic<unsigned int> gNextDraft{0};  // number of this process's next draft
 
 enum ConfigField {
     AREA_NAME,
@@ -201,14 +202,24 @@ bool ImitateOld(int draft) {
                                  fchmod(draft, old.st_mode & 07777) == 0));
 }
 
-// Removes the drafts of processes that ended while saving. Whether a process exists can be told
-// without any permission; if its id is in use again, the draft stays until that process has ended.
+// Whether the saver of a draft is gone, given the "PID.NUMBER" at the end of its name. Whether
+// another process exists can be told without any permission; if its id is in use again, the draft
+// stays until that process has ended. Of this process's drafts, one whose number has not been taken
+// yet is from an earlier process with its id; a live one had its number taken before it could be
+// listed.
+bool IsDead(const char *saver) {
+    char *end = nullptr;
+    const pid_t process = static_cast<pid_t>(strtoll(saver, &end, 10));
+    if (process == getpid()) {
+        return strtoull(*end == '.' ? end + 1 : end, nullptr, 10) >= gNextDraft.load();
+    }
+    return kill(process, 0) != 0 && errno == ESRCH;
+}
+
 void RemoveDeadDrafts(DIR *directory) {
     while (const struct dirent64 *entry = readdir64(directory)) {
         constexpr size_t kLength = sizeof kDraftPrefix - 1;
-        if (strncmp(entry->d_name, kDraftPrefix, kLength) == 0 &&
-            kill(static_cast<pid_t>(strtoll(entry->d_name + kLength, nullptr, 10)), 0) != 0 &&
-            errno == ESRCH) {
+        if (strncmp(entry->d_name, kDraftPrefix, kLength) == 0 && IsDead(entry->d_name + kLength)) {
             unlinkat(dirfd(directory), entry->d_name, 0);
         }
     }
@@ -219,13 +230,14 @@ void RemoveDeadDrafts(DIR *directory) {
 // of its own and needs no lock. Returns false on failure, without a line; the file then has its old
 // text, or the new one that may not be on the medium yet.
 bool Replace(DIR *directory, const char *text, size_t length) {
-    static std::atomic<unsigned int> saves{0};
     const int in = dirfd(directory);
     char draft[48];
-    snprintf(draft, sizeof draft, "%s%d.%u", kDraftPrefix, static_cast<int>(getpid()),
-             saves.fetch_add(1, std::memory_order_relaxed));
-    unlinkat(in, draft, 0);  // of an earlier process with this id
-    const int fd = openat(in, draft, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0666);
+    int fd = -1;
+    do {
+        snprintf(draft, sizeof draft, "%s%d.%u", kDraftPrefix, static_cast<int>(getpid()),
+                 gNextDraft.fetch_add(1));
+        fd = openat(in, draft, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0666);
+    } while (fd < 0 && errno == EEXIST);  // somebody else's, so it stays as it is
     if (fd < 0) {
         return false;
     }

@@ -145,16 +145,14 @@ uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer, ui
 
 int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
-    if (stream != nullptr) {
-        // Makes the bytes written so far count, and ends the end-of-file state, so that a reader
-        // can follow a file that grows. A stream without a position refuses it.
-        (void)fseek(stream, 0, SEEK_CUR);
-        const int64_t size = SizeOfRegularFile(stream);
-        if (size >= 0) {
-            return size <= INT32_MAX ? static_cast<int32_t>(size) : -1;
-        }
-    }
     const int32_t position = VarnekPGL_TellFile(hFile);
+    // The seek makes the bytes written so far count, which a full medium refuses, and ends the
+    // end-of-file state, so that a reader can follow a file that grows.
+    if (stream != nullptr && SizeOfRegularFile(stream) >= 0 &&
+        VarnekPGL_SeekFile(hFile, 0, SEEK_CUR) == 0) {
+        const int64_t size = SizeOfRegularFile(stream);
+        return size <= INT32_MAX ? static_cast<int32_t>(size) : -1;
+    }
     VarnekPGL_SeekFile(hFile, 0, SEEK_END);
     const int32_t size = VarnekPGL_TellFile(hFile);
     if (position >= 0 && position != size) {
