@@ -211,7 +211,7 @@ bool IsDead(const char *saver) {
     char *end = nullptr;
     const pid_t process = static_cast<pid_t>(strtoll(saver, &end, 10));
     if (process == getpid()) {
-        return strtoull(*end == '.' ? end + 1 : end, nullptr, 10) >= gNextDraft.load();
+        return strtoll(*end == '.' ? end + 1 : end, nullptr, 10) >= int64_t{gNextDraft.load()};
     }
     return kill(process, 0) != 0 && errno == ESRCH;
 }
