@@ -24,22 +24,22 @@ TEST_F(BitInputStream, WithoutASourceEverythingIsRefused) {
         stream->Skip(5);
         unsigned char flags[2] = {1, 1};
         EXPECT_EQ(stream->ReadInt(32, flags[0]), 0u);
-        EXPECT_EQ(stream->GetByteArray(&byte, 1), -22);
+        EXPECT_EQ(stream->GetByteArray(&byte, 1), VARNEK_BITS_END);
         EXPECT_THAT(TakeBodies(), IsEmpty());
         EXPECT_EQ(stream->GetBits(1, flags[1]), 0u);
         EXPECT_THAT(TakeBodies(), ElementsAre("BIS: GetBits Warning: End of Stream!\n"));
         EXPECT_THAT(flags, ElementsAre(0, 0));
     }
-    EXPECT_EQ(VarnekCBitInputStream(&byte, 1, 1).GetByteArray(nullptr, 1), -10);
+    EXPECT_EQ(VarnekCBitInputStream(&byte, 1, 1).GetByteArray(nullptr, 1), VARNEK_BITS_TOO_FEW);
 }
 
 TEST_F(BitInputStream, EveryRefusalHasItsLine) {
     unsigned char byte = 0xA5, flag = 1;
     VarnekCBitInputStream stream(&byte, 1, 1);
-    NOTE(stream.ReadByte(9, flag));
-    NOTE(stream.ReadInt(-1, flag));
+    NOTE_AS("ReadByte(9)", stream.ReadByte(9, flag));
+    NOTE_AS("ReadInt(-1)", stream.ReadInt(-1, flag));
     for (const int count : {3, 6, -1, 9, 5, 1, 0, -1}) {
-        NOTE(stream.GetBits(count, flag));
+        NOTE_AS("GetBits(" + std::to_string(count) + ")", stream.GetBits(count, flag));
     }
 }
 

@@ -37,23 +37,26 @@ std::string File(const std::string &area, int64_t standard, int capture, int sim
 }
 
 TEST_F(ConfigAlone, SavesOnChangeAndLoadsOnDemand) {
-    NOTE(VarnekCfg_LoadConfigFile(), 0);
-    NOTE(VarnekCfg_SetStandard(2), std::filesystem::exists(kPath));
-    NOTE(VarnekCfg_SetStandard(-3), 0);
+    NOTE_VOID(VarnekCfg_LoadConfigFile());
+    NOTE_VOID(VarnekCfg_SetStandard(2));
+    EXPECT_FALSE(std::filesystem::exists(kPath)) << "the standard had not changed";
+    NOTE_VOID(VarnekCfg_SetStandard(-3));
     EXPECT_EQ(ReadAll(kPath), File("", -3, 0, 0, 68, ""));
     WriteAll(kPath, File("", 0, 1, 2, 0, "ARG"));
     NOTE(VarnekCfg_GetTSCaptueEnable());
     info_.standardType = 0;
     NOTE(VarnekCfg_GetTSCaptueEnable());
     info_.tsFileSimulEnable = 0;
-    NOTE(VarnekCfg_GetTSFileSimulEnable());
+    EXPECT_EQ(VarnekCfg_GetTSFileSimulEnable(), 2);
     WriteAll(kPath, File("", 7, 0, 0, 0, "ARG"));
-    NOTE(VarnekCfg_GetStandard());
+    EXPECT_EQ(VarnekCfg_GetStandard(), 7);
 }
 
 TEST_F(ConfigAlone, LinesAreTracedAsTheyAreRead) {
     const std::string file = "config_standardtype= +3x\r\n#nothing\n\rxCONFIG_TSCAPTURE=1\n";
-    NOTE(Reloaded(file) == File("", 3, 1, 0, 0, "BRA"));
+    WriteAll(kPath, file);
+    NOTE_VOID(VarnekCfg_LoadConfigFile());
+    EXPECT_EQ(Reloaded(file), File("", 3, 1, 0, 0, "BRA"));
 }
 
 TEST_F(ConfigAlone, AnyFileLoads) {
@@ -101,7 +104,8 @@ TEST_F(ConfigAlone, AnUnreadableFileLeavesTheSettings) {
     };
     for (const auto &make : makers) {
         make();
-        NOTE(VarnekCfg_LoadConfigFile(), info_.cprmPlayerDelay);
+        NOTE_VOID(VarnekCfg_LoadConfigFile());
+        EXPECT_EQ(info_.cprmPlayerDelay, 68);
         std::filesystem::remove(kPath);
     }
 }
@@ -143,18 +147,20 @@ TEST_F(ConfigAlone, TheNationComesFromFileThenPlatformThenDefault) {
 }
 
 TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
-    const auto save = [] { return VarnekCfg_SaveConfigFile(), std::filesystem::remove(kPath); };
     std::filesystem::create_symlink("/dev/full", kPath);
-    NOTE(save());
+    NOTE_AS("saving to a full device", (VarnekCfg_SaveConfigFile(), ""));
+    EXPECT_TRUE(std::filesystem::remove(kPath));
     std::filesystem::create_directory(kPath);
-    NOTE(save());
+    NOTE_AS("saving to a directory", (VarnekCfg_SaveConfigFile(), ""));
+    EXPECT_TRUE(std::filesystem::remove(kPath));
     WriteAll(kPath, "protected");
     chmod(kPath.c_str(), 0444);
-    NOTE((VarnekCfg_SaveConfigFile(), ReadAll(kPath) == "protected"));
+    NOTE_AS("saving to a protected file", (VarnekCfg_SaveConfigFile(), ""));
+    EXPECT_EQ(ReadAll(kPath), "protected");
     std::filesystem::remove(kPath);
     const std::string data = std::filesystem::path(VARNEK_DATA_DIR).parent_path();
     std::filesystem::rename(data, Path("aside"));
-    NOTE(save());
+    NOTE_AS("saving without the data directory", (VarnekCfg_SaveConfigFile(), ""));
     EXPECT_FALSE(std::filesystem::exists(data));
     std::filesystem::rename(Path("aside"), data);
 }

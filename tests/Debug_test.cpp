@@ -4,6 +4,7 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
+#include <regex>
 
 #include "support/VarnekTest.h"
 
@@ -12,6 +13,7 @@ namespace {
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 
+constexpr uint32_t kErrorOfCommon = VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON;
 constexpr char kWorking[] = VARNEK_DATA_DIR "debug_ltn.ini";
 constexpr char kDefault[] = VARNEK_SYSTEM_DIR "debug_ltn.ini";
 
@@ -29,6 +31,20 @@ class DebugAlone : public VarnekTest {
         WriteAll(kDefault, ReadAll(TestFile("defaults/debug_ltn.ini")));
     }
 
+    // Returns the levels and modules that a load's summary shows as enabled, and each line that is no part of one.
+    static std::vector<std::string> Enabled(const std::vector<std::string> &lines) {
+        std::vector<std::string> enabled;
+        const std::regex field("(\\w[\\w ]*\\w) ?=\\[1\\]");
+        for (const std::string &line : lines) {
+            if (line.rfind("Log Config: ", 0) != 0) {
+                enabled.push_back(line);
+            }
+            for (std::sregex_iterator found(line.begin(), line.end(), field), end; found != end; ++found) {
+                enabled.push_back((*found)[1]);
+            }
+        }
+        return enabled;
+    }
     // Traces with this mask, and returns whether the trace reaches the log.
     static bool Passes(uint32_t mask) {
         TakeLog();
@@ -45,9 +61,14 @@ TEST_F(DebugAlone, EveryLevelAndModuleHasItsPriorityAndTag) {
     VarnekPGL_InitializeDebug();
     TakeLog();
     // Each module with one or several levels; then masks without a known level or module, which trace nothing.
-    for (uint32_t mask : {0x80000001u, 0x40000002u, 0x20000004u, 0x10000008u, 0xC0000010u, 0x81000020u, 0x80000040u,
-                          0x80000080u, 0x80000100u, 0x80000200u, 0x80000400u, 0x80000800u, 0x80000003u, 0x80000000u,
-                          0x00000001u, 0x08000001u, 0x80001000u, 0x83FFF000u}) {
+    const uint32_t error = VARNEK_LEVEL_ERROR, common = VARNEK_MODULE_COMMON;
+    for (const uint32_t mask :
+         {error | common, VARNEK_LEVEL_HIGH | VARNEK_MODULE_JNI, VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL,
+          VARNEK_LEVEL_LOW | VARNEK_MODULE_ESG, error | VARNEK_LEVEL_HIGH | VARNEK_MODULE_SESSION_MANAGER,
+          error | 0x01000000 | VARNEK_MODULE_SECTION_PARSER, error | VARNEK_MODULE_DSMCC_DC,
+          error | VARNEK_MODULE_DSMCC_OC, error | VARNEK_MODULE_TS_DEMUX, error | VARNEK_MODULE_CPRM,
+          error | VARNEK_MODULE_GINGA, error | VARNEK_MODULE_SM_PLAYER, error | common | VARNEK_MODULE_JNI, error,
+          common, 0x08000000 | common, error | 0x00001000, error | 0x03FFF000}) {
         gszVarnekDbgFilePath = "a/b/Some.cpp";
         gVarnekDbgLineNum = 442;
         VarnekPGL_TraceOut(mask, "%s %d", "text", 7);
@@ -58,56 +79,62 @@ TEST_F(DebugAlone, EveryLevelAndModuleHasItsPriorityAndTag) {
 }
 
 TEST_F(DebugAlone, ALineEnablesByTheFirstKeyInIt) {
-    for (const char *file : {
-             "LogToUSB=1\nHigh=1\nCommon=1\n",
-             "Error=1\nCommon=1\n",
-             "1 LogToUSB\nError=10\nxCommon 1",
-             "LogToUSB=1\n#Error=1\nHigh=1\nCommon=1",
-             "LogToUSB=1\nErrorHigh=1\nCommon=1",
-             "LogToUSB=1\nError=0\nerror=1\nHigh=1\nCommon=1",
-             "\nLogToUSB=1\nError=1\nCommon=1",
-             "LogToUSB=1\r\n\r\n\nError=1\rCommon=1",
-             "LogToUSB=1\nError=1\nGingaAppMgr=1",
-             "LogToUSB=1\nError=1\nSMPlayer=1",
-             // The line is cut at 51 characters: its key counts, and the '1' after the cut does not.
-             "LogToUSB=1\nCommon=1\nError=1\nHigh                                              0  1",
-         }) {
-        WriteAll(kWorking, file);
+    const struct {
+        const char *file;
+        std::vector<std::string> enabled;
+        bool traced;  // whether an Error of Common is
+    } rows[] = {
+        {"LogToUSB=1\nHigh=1\nCommon=1\n", {"High", "Common"}, false},
+        {"Error=1\nCommon=1\n", {"Error", "Common"}, false},
+        {"1 LogToUSB\nError=10\nxCommon 1", {"Error", "Common"}, true},
+        {"LogToUSB=1\n#Error=1\nHigh=1\nCommon=1", {"High", "Common"}, false},
+        {"LogToUSB=1\nErrorHigh=1\nCommon=1", {"Error", "Common"}, true},
+        {"LogToUSB=1\nError=0\nerror=1\nHigh=1\nCommon=1", {"High", "Common"}, false},
+        {"\nLogToUSB=1\nError=1\nCommon=1", {}, false},
+        {"LogToUSB=1\r\n\r\n\nError=1\rCommon=1", {"Error", "Common"}, true},
+        {"LogToUSB=1\nError=1\nGingaAppMgr=1", {"Error", "Ginga"}, false},
+        {"LogToUSB=1\nError=1\nSMPlayer=1", {"Error", "SMPlayer"}, false},
+        // The line is cut at 51 characters: its key counts, and the '1' after the cut does not.
+        {"LogToUSB=1\nCommon=1\nError=1\nHigh                                              0  1",
+         {"Error", "Common"},
+         true},
+    };
+    for (const auto &row : rows) {
+        WriteAll(kWorking, row.file);
         TakeLog();
         VarnekPGL_InitializeDebug();
-        Note(::testing::PrintToString(file), 0);
-        Note(std::string("  An Error of Common is ") + (Passes(0x80000001) ? "traced.\n" : "not traced.\n"));
+        EXPECT_EQ(Enabled(TakeBodies()), row.enabled) << row.file;
+        EXPECT_EQ(Passes(kErrorOfCommon), row.traced) << row.file;
     }
 }
 
 TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
-    const auto load = [] { return VarnekPGL_InitializeDebug(), 0; };
-    NOTE(VARNEK_TRACE(0x80000001, "the first trace loads"), 0);
+    NOTE_VOID(VARNEK_TRACE(kErrorOfCommon, "the first trace loads"));
     TakeLog();
     WriteAll(kDefault, "LogToUSB=1\nError=1\nCommon=1\n");
-    VARNEK_TRACE(0x80000001, "a failed load is not tried again");
+    VARNEK_TRACE(kErrorOfCommon, "a failed load is not tried again");
     EXPECT_THAT(TakeLog(), IsEmpty());
     WriteAll(kWorking, "");
-    NOTE(load());
+    NOTE_VOID(VarnekPGL_InitializeDebug());
     for (const bool directory : {true, false}) {
         std::filesystem::remove(kWorking);
         EXPECT_EQ(directory ? mkdir(kWorking, 0777) : mkfifo(kWorking, 0666), 0);
-        NOTE(load());
+        NOTE_VOID(VarnekPGL_InitializeDebug());
         VarnekPGL_changeModeForDebug();
     }
     std::filesystem::remove(kWorking);
     WriteAll(kWorking, std::string((1 << 20) + 1, '#'));
-    NOTE(load());  // more than 1 MiB
+    NOTE_VOID(VarnekPGL_InitializeDebug());  // more than 1 MiB
     std::filesystem::remove(kWorking);
-    NOTE(load());
+    NOTE_VOID(VarnekPGL_InitializeDebug());
     EXPECT_EQ(ReadAll(kWorking), ReadAll(kDefault)) << "the working copy is not the default file";
-    EXPECT_TRUE(Passes(0x80000001));
-    EXPECT_FALSE(Passes(0x80000002));
+    EXPECT_TRUE(Passes(kErrorOfCommon));
+    EXPECT_FALSE(Passes(VARNEK_LEVEL_ERROR | VARNEK_MODULE_JNI));
 }
 
 TEST_F(DebugAlone, EightFirstTracesLoadOnceAndAllGetThrough) {
     WriteAll(kWorking, "LogToUSB=1\nError=1\nCommon=1\n");
-    AtOnce(8, [](int) { VARNEK_TRACE(0x80000001, "here"); });
+    AtOnce(8, [](int) { VARNEK_TRACE(kErrorOfCommon, "here"); });
     const std::vector<LogLine> lines = TakeLog();
     const auto count = [&lines](const char *tag) {
         return std::count_if(lines.begin(), lines.end(), [tag](const LogLine &line) { return line.tag == tag; });
@@ -120,11 +147,11 @@ TEST_F(DebugAlone, ALogFunctionMayTrace) {
     WriteAll(kWorking, "LogToUSB=1\nHigh=1\nCommon=1\n");
     gLogHook = [](const LogLine &line) {
         if (line.tag == "SBTVD") {
-            VARNEK_TRACE(0x40000001, "from the log function");
+            VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_COMMON, "from the log function");
             VarnekPGL_InitializeDebug();
         }
     };
-    VARNEK_TRACE(0x40000001, "one");
+    VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_COMMON, "one");
     EXPECT_THAT(TakeBodies("SBTVD_COM"), ElementsAre("one"));
 }
 
@@ -159,7 +186,7 @@ TEST_F(Trace, LinesAreCutToTheirBuffer) {
          {std::string("Short.cpp"), std::string(200, 'f'), std::string(2040, 'f'), std::string(5000, 'f')}) {
         gszVarnekDbgFilePath = file.c_str();
         gVarnekDbgLineNum = 1;
-        VarnekPGL_TraceOut(0x80000001, "%s", text.c_str());
+        VarnekPGL_TraceOut(kErrorOfCommon, "%s", text.c_str());
         const auto log = TakeLog();
         ASSERT_EQ(log.size(), 1u);
         EXPECT_EQ(log[0].text.size(), std::min<size_t>(strlen("[E][-   1] ") + file.size() + 2017, 2047));
@@ -168,7 +195,7 @@ TEST_F(Trace, LinesAreCutToTheirBuffer) {
     gszVarnekDbgFilePath = nullptr;
     for (const auto &[number, prefix] : {std::pair(INT32_MIN, "[E][--2147483648]"), std::pair(0, "[E][-   0]")}) {
         gVarnekDbgLineNum = number;
-        VarnekPGL_TraceOut(0x80000001, nullptr);
+        VarnekPGL_TraceOut(kErrorOfCommon, nullptr);
         EXPECT_EQ(TakeLog()[0].text, prefix + std::string(" (null)"));
     }
 }
@@ -176,7 +203,7 @@ TEST_F(Trace, LinesAreCutToTheirBuffer) {
 TEST_F(Trace, LeavesErrnoAloneAndReportsIt) {
     gLogHook = [](const LogLine &) { errno = ENOMEM; };
     errno = EXDEV;
-    VARNEK_TRACE(0x80000001, "%d", VarnekPGL_SysGetLastErro());
+    VARNEK_TRACE(kErrorOfCommon, "%d", VarnekPGL_SysGetLastErro());
     VARNEK_PANIC();
     VarnekPGL_InitializeDebug();
     EXPECT_EQ(VarnekPGL_SysGetLastErro(), EXDEV);

@@ -8,6 +8,8 @@
 
 namespace {
 
+using ::testing::IsEmpty;
+
 using Units = std::vector<unsigned short>;
 
 class LngPack : public VarnekTest {};
@@ -53,31 +55,37 @@ TEST_F(LngPack, EveryUnitSurvivesUtf8) {
     ASSERT_EQ(WmConvert2LCode(text.data(), all.data()), TRUE);
     const int length = static_cast<int>(strlen(text.data()));
     EXPECT_EQ(__WmLngStrlenByByte(text.data(), length), 0x20000);
-    NOTE(WmConvertUTF2PCode(back.data(), 0x20000, text.data(), length));
+    EXPECT_EQ(WmConvertUTF2PCode(back.data(), 0x20000, text.data(), length), TRUE);
+    EXPECT_THAT(TakeLog(), IsEmpty());
     all[0xA0 - 1] = ' ';
     EXPECT_TRUE(back == all);
 }
 
 TEST_F(LngPack, MalformedUtf8IsDecodedByteByByte) {
-    const std::pair<std::string, Units> rows[] = {
-        {"\xA9", {0x29}},
-        {"\xF0\x9F\x98\x80", {0x07D8, 0}},
-        {"a\xC2\xA0\xC2\xE0", {'a', ' ', 0xA0}},
-        {"\xE2\x82", {0x62, 0x02}},
-        {"\xDF", {0x5F}},
-        {"\xE2\x82zz", {0x62, 0x02, 'z', 'z'}},
-        {std::string("\xE2\x82\0\x80", 4), {0x62, 0x02}},
-        {std::string("a\0b", 3), {'a'}},
+    const struct {
+        std::string utf8;
+        Units units;
+        size_t incorrect;  // how often a byte is out of range
+    } rows[] = {
+        {"\xA9", {0x29}, 1},
+        {"\xF0\x9F\x98\x80", {0x07D8, 0}, 1},
+        {"a\xC2\xA0\xC2\xE0", {'a', ' ', 0xA0}, 0},
+        {"\xE2\x82", {0x62, 0x02}, 2},
+        {"\xDF", {0x5F}, 1},
+        {"\xE2\x82zz", {0x62, 0x02, 'z', 'z'}, 2},
+        {std::string("\xE2\x82\0\x80", 4), {0x62, 0x02}, 2},
+        {std::string("a\0b", 3), {'a'}, 0},
     };
-    for (auto [utf8, expected] : rows) {
+    for (auto [utf8, expected, incorrect] : rows) {
+        std::vector<std::string> lines(incorrect, "__WmLngStrlenByByte: utf8 incorrect range!\n");
+        lines.resize(incorrect * 2, "__WmLngUTF2Unicode: utf8 incorrect range!\n");
         expected.push_back(0);
         Units units(expected.size(), 0x5555);
         const int room = static_cast<int>(expected.size() * 2);
         const std::vector<char> exact(utf8.begin(), utf8.end());  // no terminator follows
-        TakeLog();
-        Note(::testing::PrintToString(utf8),
-             WmConvertUTF2PCode(units.data(), room, exact.data(), static_cast<int>(utf8.size())));
+        EXPECT_EQ(WmConvertUTF2PCode(units.data(), room, exact.data(), static_cast<int>(utf8.size())), TRUE);
         EXPECT_EQ(units, expected);
+        EXPECT_EQ(TakeBodies("SBTVD_COM"), lines);
     }
 }
 
@@ -92,7 +100,8 @@ TEST_F(LngPack, FailuresAreNamed) {
     NOTE(__WmLngUnicode2UTF(nullptr, abc, 3));
     NOTE(__WmLngUnicode2UTF(bytes, nullptr, 3));
     NOTE(__WmLngUnicode2UTF(bytes, abc, 0));
-    NOTE(WmConvertPCode2UTF(bytes, abc, 0) + bytes[0]);
+    NOTE(WmConvertPCode2UTF(bytes, abc, 0));
+    EXPECT_STREQ(bytes, "");
     NOTE(WmConvert2LCode(bytes, nullptr));
     TakeLog();
     EXPECT_EQ(WmConvert2LCode(nullptr, abc + 3), FALSE);
@@ -103,7 +112,8 @@ TEST_F(LngPack, FailuresAreNamed) {
     NOTE(WmConvertUTF2PCode(units, 8, nullptr, 1));
     NOTE(WmConvertUTF2PCode(units, 4, "abc", 3));
     NOTE(WmConvertUTF2PCode(units, 6, "abc", 3));
-    NOTE(WmConvertUTF2PCode(units, 0, "abc", 0) + units[0]);
+    NOTE(WmConvertUTF2PCode(units, 0, "abc", 0));
+    EXPECT_EQ(units[0], 0);
     NOTE(__WmLngStrlenByByte("abc", 0));
     NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, nullptr, 1));
 }

@@ -6,6 +6,8 @@
 #include <cstdint>
 #include <vector>
 
+#include "Varnek_CBitInputStream.h"
+
 struct BitStreamModel {
     explicit BitStreamModel(const std::vector<unsigned char> &source) : bytes(source) {}
 
@@ -56,13 +58,13 @@ struct BitStreamModel {
     }
     int GetByteArray(unsigned char *dest, int count) {
         if (end) {
-            return -22;
+            return VARNEK_BITS_END;
         }
         if (consumed != 0) {
-            return -1;
+            return VARNEK_BITS_NOT_ALIGNED;
         }
         if (count < 0 || count > size - index) {
-            return -10;
+            return VARNEK_BITS_TOO_FEW;
         }
         std::copy_n(bytes.begin() + index, count, dest);
         index += count;

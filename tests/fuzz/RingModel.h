@@ -1,93 +1,66 @@
-// A model of the byte ring that moves single bytes.
+// A model of the byte ring: what was written last, and how much of it is unread.
 #ifndef VARNEK_TESTS_FUZZ_RINGMODEL_H
 #define VARNEK_TESTS_FUZZ_RINGMODEL_H
 
-#include <vector>
+#include <algorithm>
+#include <cstdio>
+#include <deque>
 
-#include "support/RingFields.h"
+#include "Varnek_CRingBuffer.h"
 
-struct RingModel : Fields {
-    std::vector<unsigned char> bytes;
+struct RingModel {
+    explicit RingModel(int ringSize) : size(ringSize), last(static_cast<size_t>(ringSize)) {}
 
-    int Ahead() const { return static_cast<int>(int64_t{wl} - rl); }
-    int Flush() { return w = r = wl = rl = 0; }
+    int size;
+    std::deque<unsigned char> last;  // the newest `size` bytes, where a ring that was never full has zeros
+    int unread = 0, written = 0;
+
+    int Flush() {
+        std::fill(last.begin(), last.end(), static_cast<unsigned char>(0));
+        return unread = written = 0;
+    }
     int Reset(int newSize) {
         if (newSize < 1) {
-            return -8;
+            return VARNEK_RING_INVALID;
         }
-        bytes.resize(static_cast<size_t>(size = newSize));
+        last.resize(static_cast<size_t>(size = newSize));
         return Flush();
     }
-    int Used() const { return w - r + Ahead() * size; }
-    int Space(bool reading) const {
-        if ((Ahead() == 0 && r <= w) || (Ahead() == 1 && w <= r)) {
-            return reading ? Used() : size - Used();
-        }
-        return Ahead() > 0 ? -32 : -34;
-    }
-    int GetDistance() const { return Used() * 100 / size - (Used() < 0 ? 1 : 0); }
-    // Loop counts wrap around.
-    static int Plus(int laps, int more) {
-        return static_cast<int>(static_cast<unsigned int>(laps) + static_cast<unsigned int>(more));
-    }
-    void Step(int &pos, int &laps) const {
-        laps = Plus(laps, ++pos == size ? 1 : 0);
-        pos %= size;
-    }
+    int GetSpaceReading() const { return unread; }
+    int GetSpaceWriting() const { return size - unread; }
+    int GetDistance() const { return unread * 100 / size; }
     int Write(const unsigned char *data, int n) {
         if (n < 0 || n > size) {
-            return -8;
+            return VARNEK_RING_INVALID;
         }
-        if (Ahead() == 0 && w < r) {
-            return -11;
+        if (n > size - unread) {
+            return VARNEK_RING_NO_SPACE;
         }
-        if (Ahead() < 0 || (Ahead() > 0 && r < w)) {
-            const int result = Ahead() > 0 ? -10 : -11;
-            return Reset(size), result;
-        }
-        if (n > (Ahead() > 0 ? r - w : size - (w - r))) {
-            return -10;
-        }
-        for (int i = 0; i < n; ++i, Step(w, wl)) {
-            bytes[static_cast<size_t>(w)] = data[i];
-        }
+        last.insert(last.end(), data, data + n);
+        last.erase(last.begin(), last.begin() + n);
+        unread += n;
+        written = (written + n) % size;
         return 0;
     }
     int Read(unsigned char *dest, int n) {
         if (n < 0 || n > size) {
-            return -8;
+            return VARNEK_RING_INVALID;
         }
-        if (Ahead() == 0 && w == r) {
-            return -11;
+        if (unread == 0 || n > unread) {
+            return VARNEK_RING_NO_DATA;
         }
-        if (Ahead() < 0 || (Ahead() == 0 ? w < r : r < w)) {
-            const int result = Ahead() > 0 ? -10 : -11;
-            return Reset(size), result;
-        }
-        if (n > w - r + (Ahead() > 0 ? size : 0)) {
-            return -11;
-        }
-        rl = Plus(rl, r / size);  // a reader at the end continues at the beginning
-        r %= size;
-        for (int i = 0; i < n; ++i, Step(r, rl)) {
-            dest[i] = bytes[static_cast<size_t>(r)];
-        }
+        std::copy_n(last.end() - unread, n, dest);
+        unread -= n;
         return 0;
     }
     int Seek(int n, int origin) {
-        if (origin < 0 || origin > 2) {
-            return -8;
+        if (origin < SEEK_SET || origin > SEEK_END) {
+            return VARNEK_RING_INVALID;
         }
-        if (n < 0 || n > (origin == 1 ? Space(true) : size)) {
-            return -10;
+        if (n < 0 || n > (origin == SEEK_CUR ? unread : size)) {
+            return VARNEK_RING_NO_SPACE;
         }
-        if (origin == 1) {
-            rl = Plus(rl, (r + n) / size);
-            r = (r + n) % size;
-            return 0;
-        }
-        r = origin == 0 ? n : (size - n + w) % size;
-        rl = w < r ? Plus(wl, -1) : wl;
+        unread = origin == SEEK_CUR ? unread - n : (origin == SEEK_END ? n : size + written - n) % size;
         return 0;
     }
 };

@@ -2,7 +2,6 @@
 // bits.
 #include "BitStreamModel.h"
 #include "Fuzz.h"
-#include "Varnek_CBitInputStream.h"
 
 int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     Input input(data, size);

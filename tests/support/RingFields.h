@@ -3,7 +3,6 @@
 #define VARNEK_TESTS_SUPPORT_RINGFIELDS_H
 
 #include <cstring>
-#include <tuple>
 
 #include "Varnek_CRingBuffer.h"
 
@@ -11,7 +10,6 @@ struct Fields {
     unsigned char *storage;
     int size, w, r, wl, rl;
     int32_t mutex;
-    auto State() const { return std::tie(size, w, r, wl, rl); }
 };
 
 inline Fields FieldsOf(const VarnekCRingBuffer &ring) {

@@ -81,8 +81,8 @@ void VarnekTest::SetUp() {
     ASSERT_EQ(TakeLog().size(), 1u) << "the log is not captured";
 }
 
-void VarnekTest::Note(const std::string &call, int64_t result) {
-    transcript_ += call + " = " + std::to_string(result) + "\n";
+void VarnekTest::Note(const std::string &call, const std::string &result) {
+    transcript_ += call + (result.empty() ? "\n" : " = " + result + "\n");
     for (const LogLine &line : TakeLog()) {
         if (line.thread == syscall(SYS_gettid)) {
             transcript_ += std::string("  ") + "??LMH?EP"[line.priority & 7] + " " + line.tag + " ";

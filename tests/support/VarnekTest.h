@@ -98,7 +98,8 @@ class VarnekTest : public ::testing::Test {
     // The transcript must equal tests/expected/SUITE.TEST.txt. A run with VARNEK_WRITE_EXPECTED in its environment
     // writes that file.
     void Note(const std::string &text) { transcript_ += text; }
-    void Note(const std::string &call, int64_t result);
+    void Note(const std::string &call, const std::string &result);
+    void Note(const std::string &call, int64_t result) { Note(call, std::to_string(result)); }
     // Replaces a text that differs from run to run by `name` in the transcript. The system's handles are always hidden,
     // and its errors have their names instead of its numbers and words.
     void Show(const std::string &text, const std::string &name) { names_.emplace_back(text, name); }
@@ -108,7 +109,10 @@ class VarnekTest : public ::testing::Test {
     std::vector<std::pair<std::string, std::string>> names_{{VARNEK_DATA_DIR, "DATA/"}, {VARNEK_SYSTEM_DIR, "SYSTEM/"}};
 };
 
-// Notes a call with its source text.
+// Notes a call with its source text, a call without a result, and a call under a label that says what the variables in
+// its source text are.
 #define NOTE(...) (TakeLog(), Note(#__VA_ARGS__, (__VA_ARGS__)))
+#define NOTE_VOID(...) (TakeLog(), (__VA_ARGS__), Note(#__VA_ARGS__, ""))
+#define NOTE_AS(label, ...) (TakeLog(), Note(label, (__VA_ARGS__)))
 
 #endif
