@@ -2,6 +2,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <atomic>
 #include <cerrno>
 #include <cstdlib>
@@ -9,7 +10,11 @@
 #include <filesystem>
 #include <functional>
 #include <future>
+#include <initializer_list>
 #include <memory>
+#include <string>
+#include <utility>
+#include <vector>
 
 #include "Varnek_CBitInputStream.h"
 #include "Varnek_CRingBuffer.h"
@@ -28,7 +33,72 @@
 
 namespace {
 
-class Fault : public VarnekTest {};
+// Returns the results of several calls, in their order.
+std::string Results(std::initializer_list<int64_t> results) {
+    std::string text;
+    for (const int64_t result : results) {
+        text += (text.empty() ? "" : " ") + std::to_string(result);
+    }
+    return text;
+}
+
+class Fault : public VarnekTest {
+  protected:
+    // Runs an operation that leaves nothing behind while the first, second, ... call of each function fails, until no
+    // call is left to fail. Notes what the operation returns and then, for each other outcome, the calls whose failures
+    // lead to it and the errors traced, unless these depend on the order of a directory's entries.
+    void Force(const std::string &name, const std::function<std::string()> &run, bool ordered = true) {
+        struct Outcome {
+            std::string text, calls;
+            const char *last;  // of the calls
+        };
+        TakeLog();
+        const std::string success = run(), unharmed = success + Errors();
+        std::vector<Outcome> outcomes = {{unharmed, "", nullptr}};
+        for (const char *call : FailingCalls()) {
+            const std::string shown = strncmp(call, "_Zna", 4) == 0 ? "operator new[]" : call;
+            // The library does not check the locks of its own tables, which cannot fail.
+            for (int nth = 1; strncmp(call, "pthread_mutex_", 14) != 0 || strstr(call, "init") != nullptr; ++nth) {
+                SCOPED_TRACE(name + ", " + shown + " " + std::to_string(nth));
+                TakeLog();
+                FailCall(call, nth, EIO);
+                const std::string result = run();
+                const bool over = IsStillToFail(call);
+                FailCall(call, 0, 0);
+                if (over) {
+                    ASSERT_EQ(result, success);
+                    break;
+                }
+                const std::string text = result + Errors();
+                const auto known = std::find_if(outcomes.begin(), outcomes.end(),
+                                                [&text](const Outcome &each) { return each.text == text; });
+                Outcome &outcome = known != outcomes.end() ? *known : outcomes.emplace_back(Outcome{text, "", nullptr});
+                if (outcome.last != call) {
+                    outcome.calls += (outcome.calls.empty() ? "" : ", ") + shown;
+                }
+                outcome.calls += " " + std::to_string(nth);
+                outcome.last = call;
+                ASSERT_EQ(run(), success) << "the failure left something behind";
+            }
+        }
+        Note(name + ": " + (ordered ? unharmed : success) + "\n");
+        for (const Outcome &outcome : outcomes) {
+            if (ordered && !outcome.calls.empty()) {
+                Note("  " + outcome.calls + (&outcome == &outcomes[0] ? " change nothing" : ": " + outcome.text) +
+                     "\n");
+            }
+        }
+    }
+
+  private:
+    static std::string Errors() {
+        std::string lines;
+        for (const std::string &error : TakeErrors()) {
+            lines += "\n    " + error.substr(0, error.find('\n'));
+        }
+        return lines;
+    }
+};
 
 // Notes a call of the library during which the next call of a function fails.
 #define FAULT(function, error, ...)                                                                  \
@@ -129,37 +199,7 @@ TEST_F(Fault, ADroppedExpiryIsDeliveredWhateverTheNextStartAsksFor) {
     EXPECT_EQ(second, 0);
 }
 
-class FaultAlone : public Fault {
-  protected:
-    // Runs an operation that leaves nothing behind while the first, second, ... call of each function fails, until no
-    // call is left to fail. Notes each result with its errors, unless these depend on the order of a directory's
-    // entries.
-    void Force(const std::string &name, const std::function<int64_t()> &run, bool ordered = true) {
-        const int64_t success = run();
-        Note(name + ": " + std::to_string(success) + "\n");
-        for (const char *call : FailingCalls()) {
-            // The library does not check the locks of its own tables, which cannot fail.
-            for (int nth = 1; strncmp(call, "pthread_mutex_", 14) != 0 || strstr(call, "init") != nullptr; ++nth) {
-                SCOPED_TRACE(name + ", " + call + " " + std::to_string(nth));
-                TakeLog();
-                FailCall(call, nth, EIO);
-                const int64_t result = run();
-                const bool over = IsStillToFail(call);
-                FailCall(call, 0, 0);
-                if (over) {
-                    ASSERT_EQ(result, success);
-                    break;
-                }
-                std::string note = "  " + std::string(call) + " " + std::to_string(nth) + ": " + std::to_string(result);
-                for (const std::string &error : TakeErrors()) {
-                    note += "\n    " + error.substr(0, error.find('\n'));
-                }
-                Note(ordered ? note + "\n" : "");
-                ASSERT_EQ(run(), success) << "the failure left something behind";
-            }
-        }
-    }
-};
+class FaultAlone : public Fault {};
 
 TEST_F(FaultAlone, OnlyAMissingDebugConfigurationIsSeeded) {
     const std::string working = VARNEK_DATA_DIR "debug_ltn.ini", shipped = VARNEK_SYSTEM_DIR "debug_ltn.ini";
@@ -201,75 +241,81 @@ TEST_F(FaultAlone, ASaveReplacesAFileThatAnotherHasJustReplacedAndFollowsNoPlant
     EXPECT_EQ(ReadAll(victim), "kept");
 }
 
-TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
-    const std::string file = Path("file"), target = Path("target"), directory = Path("directory");
+TEST_F(Fault, ObjectsSurviveEachFailingCall) {
     // No thread ends, so that each new one needs a semaphore of its own.
     const auto stay = [](void *) -> void * { return VarnekPGL_MSleep(600000), nullptr; };
     const int32_t sink = VarnekPGL_CreateThread("sink", 1, 65536, stay, nullptr);
-    const VarnekConfigInfo initial = *VarnekCfg_GetConfigInfo();
-    char bytes[8] = {};
-    unsigned char raw[8] = {};
-    const auto content = [&] { WriteAll(file, "12345678"); };
-    const int next = dup(STDERR_FILENO);
-    close(next);
-    Show("Hndl : " + std::to_string(next), "Hndl : NEXT");
-    Show("_ZnamRKSt9nothrow_t", "operator new[]");
-    Show("_ZnajRKSt9nothrow_t", "operator new[]");
-    Force("mutex", [] { return VarnekPGL_DeleteMutex(VarnekPGL_CreateMutex("new")); });
-    Force("semaphore", [] {
+    Force("mutex", [last = VarnekPGL_CreateMutex("last")]() mutable {
+        const int32_t mutex = VarnekPGL_CreateMutex("new");
+        EXPECT_TRUE(mutex == -1 || mutex == ++last) << "a failure took a handle";
+        return Results({VarnekPGL_DeleteMutex(mutex)});
+    });
+    Force("semaphore", [last = VarnekPGL_CreateSemaphore("last", 0)]() mutable {
         const int32_t semaphore = VarnekPGL_CreateSemaphore("new", 0);
+        EXPECT_TRUE(semaphore == -1 || semaphore == ++last) << "a failure took a handle";
         const auto pass = [=](uint32_t timeout) {
             return VarnekPGL_SignalSemaphore(semaphore) != FALSE ? VarnekPGL_WaitSemaphore(semaphore, timeout) : FALSE;
         };
-        return pass(WAIT_FOREVER) + pass(1) + VarnekPGL_DeleteSemaphore(semaphore);
+        return Results({pass(WAIT_FOREVER), pass(1), VarnekPGL_DeleteSemaphore(semaphore)});
     });
-    Force("thread", [&] { return VarnekPGL_DeleteThread(VarnekPGL_CreateThread("new", 1, 65536, stay, nullptr)); });
-    Force("send", [&] {
+    Force("thread", [stay, last = sink]() mutable {
+        const int32_t thread = VarnekPGL_CreateThread("new", 1, 65536, stay, nullptr);
+        EXPECT_TRUE(thread == -1 || thread == ++last) << "a failure took a handle";
+        return Results({VarnekPGL_DeleteThread(thread)});
+    });
+    Force("send", [sink] {
         const THREAD_MSG message = {};
-        return VarnekPGL_SendMessage(sink, &message) + VarnekPGL_SendUrgentMessage(sink, &message);
+        return Results({VarnekPGL_SendMessage(sink, &message), VarnekPGL_SendUrgentMessage(sink, &message)});
     });
     Force("timer", [] {
         const uint32_t timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("new"));
         const auto nothing = [](uint32_t, void *) {};
         const auto start = [=] { return VarnekPGL_StartTimer(timer, 60000, nothing, nullptr); };
-        const BOOL started = start() + VarnekPGL_IsTimerActive(timer) + start() + VarnekPGL_CancelTimer(timer);
-        const BOOL again = start();
-        return started + (again != FALSE ? again : start()) + VarnekPGL_DeleteTimer(timer);
+        const std::string results =
+            Results({start(), VarnekPGL_IsTimerActive(timer), start(), VarnekPGL_CancelTimer(timer), start()});
+        // A second try, if it has failed; refused, if it has not.
+        return results + " " + Results({start(), VarnekPGL_DeleteTimer(timer)});
     });
-    Force("list", [&] {
+    EXPECT_TRUE(VarnekPGL_DeleteThread(sink));
+}
+
+TEST_F(Fault, ValuesSurviveEachFailingCall) {
+    unsigned char raw[8] = {};
+    Force("list", [&raw] {
         list_t list;
         list_initialize(&list);
-        list_insertHead(&list, bytes);
-        list_insertTail(&list, bytes);
-        list_insertAt(&list, 1, bytes);
+        list_insertHead(&list, raw);
+        list_insertTail(&list, raw);
+        list_insertAt(&list, 1, raw);
         const int32_t count = list.count;
         for (int32_t i = 0; i < count; ++i) {
-            EXPECT_EQ(list_removeTail(&list), bytes);
+            EXPECT_EQ(list_removeTail(&list), raw);
         }
-        return count + (list.head == nullptr ? 0 : 100);
+        EXPECT_EQ(list.head, nullptr);
+        return Results({count});
     });
-    Force("bit stream", [&] {
+    Force("bit stream", [&raw] {
         const VarnekCBitInputStream stream(raw, 8, 1);
         VarnekCBitInputStream copy(stream), assigned(raw, 8, 0);
         assigned = stream;
-        int64_t results = 0;
-        for (VarnekCBitInputStream *each : {&copy, &assigned}) {
+        const auto use = [&raw](VarnekCBitInputStream &each) {
             unsigned char flag = 1;
-            each->ReadByte(8, flag);
-            each->RwindToFirst();
-            results = results * 1000 + int64_t{flag} * 100 + each->GetByteArray(raw, 8);
-        }
-        return results;
+            each.ReadByte(8, flag);
+            each.RwindToFirst();
+            return Results({flag, each.GetByteArray(raw, 8)});
+        };
+        const std::string copied = use(copy);
+        return "copied " + copied + ", assigned " + use(assigned);
     });
-    Force("ring", [&] {
+    Force("ring", [&raw] {
         VarnekCRingBuffer ring(8), copy(ring);
-        int64_t results = ring.Reset(9);
-        for (VarnekCRingBuffer *each : {&ring, &copy}) {
-            results =
-                results * 1000 + int64_t{each->Write(raw, 8)} * 100 + each->GetSpaceReading() + each->GetSpaceWriting();
-            results = results * 1000 + each->GetDistance() + int64_t{each->Reset(4)} * 10 + each->Write(raw, 1);
-        }
-        return results;
+        std::string results = Results({ring.Reset(9)});
+        const auto use = [&raw](VarnekCRingBuffer &each) {
+            return Results({each.Write(raw, 8), each.GetSpaceReading(), each.GetSpaceWriting(), each.GetDistance(),
+                            each.Reset(4), each.Write(raw, 1)});
+        };
+        results += ", then " + use(ring);
+        return results + ", the copy " + use(copy);
     });
     Force("string", [] {
         const VarnekCString text("text");
@@ -278,32 +324,62 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         literal = "text";
         sum += text;
         sum += "more";
-        int64_t lengths = 0;
+        std::string all;
         for (const VarnekCString &string : {assigned, literal, sum, text + text, text + "text"}) {
             const std::unique_ptr<char[]> copy(string.String());
-            lengths = lengths * 100 + (copy != nullptr ? static_cast<int64_t>(strlen(copy.get())) : 99);
+            all += (all.empty() ? "" : " ") + std::string(copy != nullptr ? copy.get() : "(null)");
         }
-        return lengths;
+        return all;
     });
     Force("Latin-15", [] {
         char *text = strdup("kept");
         const BOOL done = VarnekPGL_ConvertLatin15toUTF8(&text, "text", 4);
-        EXPECT_STREQ(text, done ? "text" : "kept");
+        const std::string result = Results({done}) + " " + text;
         free(text);
-        return done;
+        return result;
     });
+    Force("clock", [] {
+        PglMilliTime now;
+        return Results({VarnekPGL_GetMilliseconds(&now)});
+    });
+}
+
+TEST_F(Fault, FilesSurviveEachFailingCall) {
+    const std::string file = Path("file"), target = Path("target");
+    char bytes[8] = {};
+    const auto content = [&file] { WriteAll(file, "12345678"); };
+    const int next = dup(STDERR_FILENO);
+    close(next);
+    Show("Hndl : " + std::to_string(next), "Hndl : NEXT");
+    const auto force = [&](const char *name, const std::function<int64_t()> &run) {
+        Force(name, [&] { return content(), Results({run()}); });
+    };
     Force("check of a CRC", [&] {
         WriteAll(file, std::string("1234\0\0\0\0", 8));
-        return VarnekUtil_CheckFileCRC32(file.c_str());
+        return Results({VarnekUtil_CheckFileCRC32(file.c_str())});
     });
-    Force("append of a CRC", [&] { return content(), VarnekUtil_AppendCRC32ToFile(file.c_str()); });
-    Force("read", [&] { return content(), VarnekPGL_ReadFile(file.c_str(), bytes, 8); });
-    Force("write", [&] { return VarnekPGL_WriteFile(file.c_str(), bytes, 8); });
-    Force("append", [&] { return content(), VarnekPGL_AppendFile(file.c_str(), bytes, 8); });
-    Force("size", [&] { return content(), VarnekPGL_GetFileSize(file.c_str()); });
+    force("append of a CRC", [&] { return VarnekUtil_AppendCRC32ToFile(file.c_str()); });
+    force("read", [&] { return VarnekPGL_ReadFile(file.c_str(), bytes, 8); });
+    force("write", [&] { return VarnekPGL_WriteFile(file.c_str(), bytes, 8); });
+    force("append", [&] { return VarnekPGL_AppendFile(file.c_str(), bytes, 8); });
+    force("size", [&] { return VarnekPGL_GetFileSize(file.c_str()); });
+    force("copy", [&] { return VarnekPGL_CopyFile(file.c_str(), target.c_str()); });
+    force("move", [&] { return VarnekPGL_MoveFile(file.c_str(), target.c_str()); });
+    force("permissions", [&] { return VarnekPGL_Chmod(file.c_str(), 666); });
+    force("removal", [&] { return VarnekPGL_DeleteFile(file.c_str()); });
+    force("large size", [&] { return VarnekPGL_GetFileSize64Bits(file.c_str()); });
+    force("attributes", [&] {
+        PglFmFileAttributes attributes;
+        return VarnekPGL_FmGetFileAttributes(file.c_str(), &attributes);
+    });
     Force("flush", [&] {
         const PglFileHandle handle = VarnekPGL_OpenFile(file.c_str(), PGL_FILE_MODE_CREATE_RW);
-        return handle == -1 ? -1 : VarnekPGL_FlushFile(handle) + VarnekPGL_CloseFile(handle);
+        return handle == -1 ? "-1" : Results({VarnekPGL_FlushFile(handle), VarnekPGL_CloseFile(handle)});
+    });
+    Force("position", [&] {
+        const PglFileHandle handle = VarnekPGL_OpenFile(file.c_str(), PGL_FILE_MODE_CREATE_RW);
+        return Results({VarnekPGL_SeekFile(handle, 0, SEEK_END), VarnekPGL_TellFile(handle),
+                        VarnekPGL_GetFileSizeByHandle(handle), VarnekPGL_CloseFile(handle)});
     });
     Force("large file", [&] {
         const int32_t handle = VarnekPGL_OpenFile64Bits(file.c_str(), PGL_FILE_MODE_CREATE_RW);
@@ -311,18 +387,17 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         VarnekPGL_SeekFile64Bits(handle, 0, SEEK_SET);
         const int32_t read = VarnekPGL_ReadFileByHandle64Bits(handle, bytes, 8);
         VarnekPGL_CloseFile64Bits(handle);
-        return written * 100 + read;
+        return Results({written, read});
     });
-    Force("copy", [&] { return content(), VarnekPGL_CopyFile(file.c_str(), target.c_str()); });
-    Force("move", [&] { return content(), VarnekPGL_MoveFile(file.c_str(), target.c_str()); });
-    Force("permissions", [&] { return content(), VarnekPGL_Chmod(file.c_str(), 666); });
-    Force("removal", [&] { return content(), VarnekPGL_DeleteFile(file.c_str()); });
-    Force("position", [&] {
-        const PglFileHandle handle = VarnekPGL_OpenFile(file.c_str(), PGL_FILE_MODE_CREATE_RW);
-        const int32_t end = VarnekPGL_SeekFile(handle, 0, SEEK_END) + VarnekPGL_TellFile(handle);
-        return end + VarnekPGL_GetFileSizeByHandle(handle) + VarnekPGL_CloseFile(handle);
-    });
-    Force("large size", [&] { return content(), VarnekPGL_GetFileSize64Bits(file.c_str()); });
+    content();
+    const PglFileHandle handle = VarnekPGL_OpenFile(file.c_str(), PGL_FILE_MODE_READ);
+    FailCall("ftell", 1, EOVERFLOW);
+    FAULT("fseek", EBADF, VarnekPGL_GetFileSizeByHandle(handle));
+    VarnekPGL_CloseFile(handle);
+}
+
+TEST_F(Fault, DirectoriesSurviveEachFailingCall) {
+    const std::string directory = Path("directory");
     Force("listing", [&] {
         VarnekPGL_MakeDir(directory.c_str());
         int entries = 0;
@@ -332,26 +407,28 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         }
         VarnekPGL_CloseDir(listed);
         std::filesystem::remove_all(directory);
-        return entries;
-    });
-    Force("attributes", [&] {
-        PglFmFileAttributes attributes;
-        return content(), VarnekPGL_FmGetFileAttributes(file.c_str(), &attributes);
-    });
-    Force("clock", [] {
-        PglMilliTime now;
-        return VarnekPGL_GetMilliseconds(&now);
+        return Results({entries});
     });
     const auto removal = [&] {
-        const int32_t cleared = VarnekPGL_ClearDir(directory.c_str());
-        const int32_t deleted = VarnekPGL_DeleteDirEx(directory.c_str());
+        const std::string results =
+            Results({VarnekPGL_ClearDir(directory.c_str()), VarnekPGL_DeleteDirEx(directory.c_str())});
         std::filesystem::remove_all(directory);
-        return cleared + deleted;
+        return results;
     };
-    Force("empty directory", [&] { return VarnekPGL_MakeDir(directory.c_str()) + removal(); });
-    const auto populate = [&] { std::filesystem::create_directory(directory), WriteAll(directory + "/file", "text"); };
-    const auto removeWithFile = [&] { return populate(), removal(); };
+    Force("empty directory", [&] {
+        const std::string made = Results({VarnekPGL_MakeDir(directory.c_str())});
+        return made + " " + removal();
+    });
+    const auto removeWithFile = [&] {
+        std::filesystem::create_directory(directory);
+        WriteAll(directory + "/file", "text");
+        return removal();
+    };
     Force("directory", removeWithFile, false);
+}
+
+TEST_F(FaultAlone, ConfigurationsSurviveEachFailingCall) {
+    const VarnekConfigInfo initial = *VarnekCfg_GetConfigInfo();
     const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg", draft = VARNEK_DATA_DIR "Varnek_Config.new.";
     const auto saveAndLoad = [&] {
         WriteAll(draft + "999999999.0", "of no process");
@@ -362,23 +439,15 @@ TEST_F(FaultAlone, EveryOperationSurvivesTheFailureOfEachOfItsCalls) {
         for (const auto &entry : std::filesystem::directory_iterator(VARNEK_DATA_DIR)) {
             EXPECT_NE(entry.path().string().rfind(draft + std::to_string(getpid()), 0), 0u) << "a draft is left";
         }
-        return VarnekCfg_GetConfigInfo()->cprmPlayerDelay;
+        return Results({VarnekCfg_GetConfigInfo()->cprmPlayerDelay});
     };
     Force("settings", saveAndLoad);
     std::filesystem::create_hard_link(settings, Path("second name"));
     Force("settings in place", [&] { return WriteAll(settings, std::string(400, '\n')), saveAndLoad(); });
-    Force("debug configuration", [] { return VarnekPGL_InitializeDebug(), 0; });
-    EXPECT_TRUE(VarnekPGL_DeleteThread(sink));
-    FAULT("malloc", ENOMEM, (VarnekCfg_LoadConfigFile(), 0));
-    content();
-    const PglFileHandle handle = VarnekPGL_OpenFile(file.c_str(), PGL_FILE_MODE_READ);
-    FailCall("ftell", 1, EOVERFLOW);
-    FAULT("fseek", EBADF, VarnekPGL_GetFileSizeByHandle(handle));
-    VarnekPGL_CloseFile(handle);
-    // No failure took a handle.
-    NOTE(VarnekPGL_CreateMutex("last"));
-    NOTE(VarnekPGL_CreateSemaphore("last", 0));
-    NOTE(VarnekPGL_CreateThread("last", 1, 0, Nothing, nullptr));
+    Force("debug configuration", [] { return VarnekPGL_InitializeDebug(), std::string("loaded"); });
+    FailCall("malloc", 1, ENOMEM);
+    NOTE_VOID(VarnekCfg_LoadConfigFile());
+    FailCall("malloc", 0, 0);
 }
 
 }  // namespace

@@ -1,11 +1,10 @@
 #include <semaphore.h>
 
-#include <algorithm>
 #include <chrono>
 #include <thread>
 
 #include "../CommonUtility/source/Varnek_Clock.h"
-#include "support/Families.h"
+#include "Varnek_Semaphore.h"
 #include "support/VarnekTest.h"
 
 namespace {
@@ -95,17 +94,6 @@ TEST_F(Mutex, FailuresHaveTheirLineAndResult) {
     EXPECT_EQ(VarnekPGL_GetMutexByName("held"), held) << "a failure removed the mutex";
     EXPECT_TRUE(VarnekPGL_ReleaseMutex(held));
     EXPECT_TRUE(VarnekPGL_DeleteMutex(held));
-}
-
-TEST_F(Mutex, AFullRegistryOfEachFamilyHasRoomAfterARemoval) {
-    for (const Family &family : kFamilies) {
-        std::vector<int32_t> handles = family.Fill();
-        NOTE(family.create("one more"));
-        EXPECT_TRUE(family.remove(handles[7]));
-        handles[7] = family.create("one more");
-        Note(std::to_string(handles.size()) + " " + family.name + ", the last " + std::to_string(handles[7]) + "\n");
-        std::for_each(handles.begin(), handles.end(), family.remove);
-    }
 }
 
 TEST_F(Semaphore, HandlesCountApartAndUnitsAreKept) {

@@ -9,7 +9,6 @@
 #include <future>
 #include <thread>
 
-#include "../CommonUtility/source/Varnek_SlotTable.h"
 #include "Varnek_Tasking.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"
@@ -139,21 +138,6 @@ TEST_F(Thread, ALogFunctionGetsNoThreadWhileItsOwnCallMakesTheGuard) {
     gLogHook = nullptr;
     EXPECT_THAT(TakeErrors(), ElementsAre("***** __Varnek_create_thread : Thread Mutex Creation Fail!!",
                                           "Thread Creation Fail! szThreadName=[inner]\n"));
-}
-
-// A table that has given out all handles but two.
-struct LateTable : SlotTable<int, 3> {
-    LateTable() { SkipHandles(INT32_MAX - 2); }
-};
-
-TEST_F(Thread, HandlesEnd) {
-    static LateTable table;
-    EXPECT_EQ(table.Publish(table.FirstFree(), "a"), INT32_MAX - 1);
-    EXPECT_EQ(table.Publish(table.FirstFree(), "b"), INT32_MAX);
-    EXPECT_EQ(table.NumberOf(table.Find(INT32_MAX)), 1);
-    EXPECT_EQ(table.FirstFree(), nullptr);
-    EXPECT_EQ(table.Withdraw(table.Find(INT32_MAX - 1)), 1);
-    EXPECT_EQ(table.FirstFree(), nullptr) << "there was no handle left for the free slot";
 }
 
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {

@@ -1,0 +1,38 @@
+// What the families of named objects share: registries of limited size, and handles that never come back.
+#include <algorithm>
+
+#include "../CommonUtility/source/Varnek_SlotTable.h"
+#include "support/Families.h"
+#include "support/VarnekTest.h"
+
+namespace {
+
+class NamedObjects : public VarnekTest {};
+
+TEST_F(NamedObjects, AFullRegistryOfEachFamilyHasRoomAfterARemoval) {
+    for (const Family &family : kFamilies) {
+        std::vector<int32_t> handles = family.Fill();
+        NOTE_AS("one more of the " + std::string(family.name), family.create("one more"));
+        EXPECT_TRUE(family.remove(handles[7]));
+        handles[7] = family.create("one more");
+        Note(std::to_string(handles.size()) + " " + family.name + ", the last " + std::to_string(handles[7]) + "\n");
+        std::for_each(handles.begin(), handles.end(), family.remove);
+    }
+}
+
+// A table that has given out all handles but two.
+struct LateTable : SlotTable<int, 3> {
+    LateTable() { SkipHandles(INT32_MAX - 2); }
+};
+
+TEST_F(NamedObjects, HandlesEnd) {
+    static LateTable table;
+    EXPECT_EQ(table.Publish(table.FirstFree(), "a"), INT32_MAX - 1);
+    EXPECT_EQ(table.Publish(table.FirstFree(), "b"), INT32_MAX);
+    EXPECT_EQ(table.NumberOf(table.Find(INT32_MAX)), 1);
+    EXPECT_EQ(table.FirstFree(), nullptr);
+    EXPECT_EQ(table.Withdraw(table.Find(INT32_MAX - 1)), 1);
+    EXPECT_EQ(table.FirstFree(), nullptr) << "there was no handle left for the free slot";
+}
+
+}  // namespace
