@@ -94,7 +94,9 @@ TEST_F(RingBuffer, EveryRefusalHasItsLine) {
         NOTE_AS("GetSpaceReading()", Named(ring.GetSpaceReading()));
         EXPECT_EQ(ring.GetSpaceWriting(), ring.GetSpaceReading());
         NOTE(ring.GetDistance());
-        seek(0, SEEK_CUR);
+        TakeLog();
+        EXPECT_EQ(ring.Seek(0, SEEK_CUR), VARNEK_RING_NO_SPACE);
+        EXPECT_THAT(TakeBodies("SBTVD_COM"), SizeIs(3)) << "the two of an inconsistent state and that of the seek";
         write(1);
         NOTE(ring.GetDistance());
         SetFields(ring, state);

@@ -114,13 +114,15 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
     WriteAll(kDefault, "LogToUSB=1\nError=1\nCommon=1\n");
     VARNEK_TRACE(kErrorOfCommon, "a failed load is not tried again");
     EXPECT_THAT(TakeLog(), IsEmpty());
+    const auto load = [] { return VarnekPGL_InitializeDebug(), Enabled(TakeBodies()); };
     WriteAll(kWorking, "");
-    NOTE_VOID(VarnekPGL_InitializeDebug());
+    EXPECT_THAT(load(), ElementsAre("Debug Configuration File Doesn't exist!\n"));
     for (const bool directory : {true, false}) {
         std::filesystem::remove(kWorking);
         EXPECT_EQ(directory ? mkdir(kWorking, 0777) : mkfifo(kWorking, 0666), 0);
-        NOTE_VOID(VarnekPGL_InitializeDebug());
+        EXPECT_THAT(load(), ElementsAre("Debug Configuration File Doesn't exist!\n"));
         VarnekPGL_changeModeForDebug();
+        TakeLog();
     }
     std::filesystem::remove(kWorking);
     WriteAll(kWorking, std::string((1 << 20) + 1, '#'));
