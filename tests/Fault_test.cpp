@@ -96,7 +96,7 @@ class Fault : public VarnekTest {
         for (const std::string &error : TakeErrors()) {
             lines += "\n    " + error.substr(0, error.find('\n'));
         }
-        return lines;
+        return WithoutHandles(lines);
     }
 };
 

@@ -91,6 +91,13 @@ void VarnekTest::Note(const std::string &call, const std::string &result) {
     }
 }
 
+std::string WithoutHandles(const std::string &text) {
+    static const std::regex system(
+        "((?:linux ?[A-Z][a-z]+=|[pP]threadI[dD] = |tv_n?sec)\\[|[pu]id\\((?=\\d)|(?:pDir|hFile|handle) = 0x)"
+        "[^\\]), \n]*|(process\\()[^)]*/");
+    return std::regex_replace(text, system, "$1$2*");
+}
+
 void VarnekTest::TearDown() {
     for (const auto &[error, name] : kErrors) {
         if (error != EINVAL) {  // "Invalid argument" are also words of the library
@@ -106,10 +113,7 @@ void VarnekTest::TearDown() {
             transcript_.replace(at, text.size(), name);
         }
     }
-    const std::regex system(
-        "((?:linux ?[A-Z][a-z]+=|[pP]threadI[dD] = |tv_n?sec)\\[|[pu]id\\((?=\\d)|(?:pDir|hFile|handle) = 0x)"
-        "[^\\]), \n]*|(process\\()[^)]*/");
-    transcript_ = std::regex_replace(transcript_, system, "$1$2*");
+    transcript_ = WithoutHandles(transcript_);
     const auto &test = *::testing::UnitTest::GetInstance()->current_test_info();
     const std::string path = TestFile("expected/") + test.test_suite_name() + "." + test.name() + ".txt";
     if (getenv("VARNEK_WRITE_EXPECTED") != nullptr) {

@@ -39,6 +39,9 @@ std::vector<std::string> TakeBodies(const std::string &tag = "", int priority = 
 // Returns the bodies of the Error traces and storage failures since the last call.
 inline std::vector<std::string> TakeErrors() { return TakeBodies("", 6); }
 
+// Returns the text with "*" for what the system chose, such as its handles and the time.
+std::string WithoutHandles(const std::string &text);
+
 // Called without a lock for each line before it is captured, in the thread that wrote the line; null for none.
 extern std::atomic<void (*)(const LogLine &line)> gLogHook;
 
