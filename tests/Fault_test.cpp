@@ -84,7 +84,7 @@ class Fault : public VarnekTest {
         Note(name + ": " + (ordered ? unharmed : success) + "\n");
         for (const Outcome &outcome : outcomes) {
             if (ordered && !outcome.calls.empty()) {
-                Note("  " + outcome.calls + (&outcome == &outcomes[0] ? " change nothing" : ": " + outcome.text) +
+                Note("  " + outcome.calls + (outcome.text == unharmed ? " change nothing" : ": " + outcome.text) +
                      "\n");
             }
         }
