@@ -36,10 +36,10 @@ TEST_F(BitInputStream, WithoutASourceEverythingIsRefused) {
 TEST_F(BitInputStream, EveryRefusalHasItsLine) {
     unsigned char byte = 0xA5, flag = 1;
     VarnekCBitInputStream stream(&byte, 1, 1);
-    NOTE_AS("ReadByte(9)", stream.ReadByte(9, flag));
-    NOTE_AS("ReadInt(-1)", stream.ReadInt(-1, flag));
-    for (const int count : {3, 6, -1, 9, 5, 1, 0, -1}) {
-        NOTE_AS("GetBits(" + std::to_string(count) + ")", stream.GetBits(count, flag));
+    Noting("ReadByte", [&](int count) { return stream.ReadByte(count, flag); })(9);
+    Noting("ReadInt", [&](int count) { return stream.ReadInt(count, flag); })(-1);
+    for (const int count : {3, 6, -1, 9, 5, 1, 0}) {
+        Noting("GetBits", [&](int bits) { return stream.GetBits(bits, flag); })(count);
     }
 }
 

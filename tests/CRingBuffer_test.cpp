@@ -3,7 +3,6 @@
 #include "Varnek_CRingBuffer.h"
 
 #include <cstdio>
-#include <map>
 #include <memory>
 #include <set>
 #include <tuple>
@@ -17,19 +16,15 @@ namespace {
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
 
-class RingBuffer : public VarnekTest {};
+class RingBuffer : public VarnekTest {
+  protected:
+    RingBuffer() {
+        resultNames_ = {NAMED(VARNEK_RING_INVALID), NAMED(VARNEK_RING_NO_SPACE), NAMED(VARNEK_RING_NO_DATA),
+                        NAMED(VARNEK_RING_OVERFLOW), NAMED(VARNEK_RING_UNDERFLOW)};
+    }
+};
 
 using Bytes = std::vector<unsigned char>;
-
-#define NAME(result) \
-    { result, #result }
-std::string Named(int result) {
-    static const std::map<int, const char *> names = {
-        NAME(VARNEK_RING_INVALID),  NAME(VARNEK_RING_NO_SPACE),  NAME(VARNEK_RING_NO_DATA),
-        NAME(VARNEK_RING_OVERFLOW), NAME(VARNEK_RING_UNDERFLOW), {0, "0"},
-    };
-    return names.at(result);
-}
 
 TEST_F(RingBuffer, WithoutStorageEverythingIsRefused) {
     VarnekCRingBuffer none(0), negative(-1), copy(none), target(4);
@@ -59,49 +54,48 @@ TEST_F(RingBuffer, WithoutStorageEverythingIsRefused) {
 TEST_F(RingBuffer, EveryRefusalHasItsLine) {
     VarnekCRingBuffer ring(8);
     unsigned char bytes[9] = {};
-    const auto label = [](const char *call, int count) { return call + ("(" + std::to_string(count) + ")"); };
-    const auto write = [&](int count) { NOTE_AS(label("Write", count), Named(ring.Write(bytes, count))); };
-    const auto read = [&](int count) { NOTE_AS(label("Read", count), Named(ring.Read(bytes, count))); };
-    const auto seek = [&](int offset, int origin) {
-        NOTE_AS("Seek(" + std::to_string(offset) + ", " + std::to_string(origin) + ")",
-                Named(ring.Seek(offset, origin)));
-    };
+    const auto write = Noting("Write", [&](int count) { return ring.Write(bytes, count); });
+    const auto read = Noting("Read", [&](int count) { return ring.Read(bytes, count); });
+    const auto reset = Noting("Reset", [&](int size) { return ring.Reset(size); });
     read(1);
     write(5);
     write(4);
     read(6);
-    seek(0, 3);
+    Noting("Seek", [&](int offset, int origin) { return ring.Seek(offset, origin); })(0, 3);
     for (const int count : {-1, 9}) {
         write(count);
         read(count);
-        for (const int origin : {SEEK_SET, SEEK_CUR, SEEK_END}) {
-            seek(count, origin);
+        for (const auto &[origin, name] : {NAMED(SEEK_SET), NAMED(SEEK_CUR), NAMED(SEEK_END)}) {
+            const int base = origin;
+            Noting(std::string(name) + ": Seek", [&](int offset) { return ring.Seek(offset, base); })(count);
         }
     }
-    NOTE(ring.Flush());
-    NOTE_AS("Reset(0)", Named(ring.Reset(0)));
-    NOTE(ring.Reset(8));
-    NOTE(VarnekCRingBuffer(-1).GetDistance());
+    Noting("Flush", [&] { return ring.Flush(); })();
+    reset(0);
+    reset(8);
     // States that no operation leaves behind: an overflow, an underflow within a lap and, where the loop counts wrap
-    // around, over laps, and one lap too many.
+    // around, over laps, and one lap too many. The distances are those at first, after a write and after a read.
     const struct {
-        int w, r, wl, rl;
-    } states[] = {{3, 2, 1, 0}, {2, 3, 0, 0}, {2, 2, INT32_MAX, INT32_MIN}, {2, 3, 2, 0}};
-    for (const auto &[w, r, wl, rl] : states) {
+        int w, r, wl, rl, distance, written, read;
+    } states[] = {{3, 2, 1, 0, 112, 0, 0},
+                  {2, 3, 0, 0, -13, -13, 0},
+                  {2, 2, INT32_MAX, INT32_MIN, -101, 0, 0},
+                  {2, 3, 2, 0, 187, 200, 175}};
+    for (const auto &expected : states) {
         Fields state = FieldsOf(ring);
-        std::tie(state.w, state.r, state.wl, state.rl) = std::tie(w, r, wl, rl);
+        std::tie(state.w, state.r, state.wl, state.rl) = std::tie(expected.w, expected.r, expected.wl, expected.rl);
         SetFields(ring, state);
-        NOTE_AS("GetSpaceReading()", Named(ring.GetSpaceReading()));
+        Noting("GetSpaceReading", [&] { return ring.GetSpaceReading(); })();
         EXPECT_EQ(ring.GetSpaceWriting(), ring.GetSpaceReading());
-        NOTE(ring.GetDistance());
+        EXPECT_EQ(ring.GetDistance(), expected.distance);
         TakeLog();
         EXPECT_EQ(ring.Seek(0, SEEK_CUR), VARNEK_RING_NO_SPACE);
         EXPECT_THAT(TakeBodies("SBTVD_COM"), SizeIs(3)) << "the two of an inconsistent state and that of the seek";
         write(1);
-        NOTE(ring.GetDistance());
+        EXPECT_EQ(ring.GetDistance(), expected.written);
         SetFields(ring, state);
         read(1);
-        NOTE(ring.GetDistance());
+        EXPECT_EQ(ring.GetDistance(), expected.read);
     }
 }
 

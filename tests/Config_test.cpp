@@ -2,11 +2,11 @@
 #include "Varnek_Config.h"
 
 #include <signal.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <array>
 #include <cstring>
 #include <filesystem>
 #include <functional>
@@ -37,15 +37,15 @@ std::string File(const std::string &area, int64_t standard, int capture, int sim
 }
 
 TEST_F(ConfigAlone, SavesOnChangeAndLoadsOnDemand) {
-    NOTE_VOID(VarnekCfg_LoadConfigFile());
-    NOTE_VOID(VarnekCfg_SetStandard(2));
+    NOTE(VarnekCfg_LoadConfigFile)();
+    NOTE(VarnekCfg_SetStandard)(2);
     EXPECT_FALSE(std::filesystem::exists(kPath)) << "the standard had not changed";
-    NOTE_VOID(VarnekCfg_SetStandard(-3));
+    NOTE(VarnekCfg_SetStandard)(-3);
     EXPECT_EQ(ReadAll(kPath), File("", -3, 0, 0, 68, ""));
     WriteAll(kPath, File("", 0, 1, 2, 0, "ARG"));
-    NOTE(VarnekCfg_GetTSCaptueEnable());
+    NOTE(VarnekCfg_GetTSCaptueEnable)();
     info_.standardType = 0;
-    NOTE(VarnekCfg_GetTSCaptueEnable());
+    NOTE(VarnekCfg_GetTSCaptueEnable)();
     info_.tsFileSimulEnable = 0;
     EXPECT_EQ(VarnekCfg_GetTSFileSimulEnable(), 2);
     WriteAll(kPath, File("", 7, 0, 0, 0, "ARG"));
@@ -55,7 +55,7 @@ TEST_F(ConfigAlone, SavesOnChangeAndLoadsOnDemand) {
 TEST_F(ConfigAlone, LinesAreTracedAsTheyAreRead) {
     const std::string file = "config_standardtype= +3x\r\n#nothing\n\rxCONFIG_TSCAPTURE=1\n";
     WriteAll(kPath, file);
-    NOTE_VOID(VarnekCfg_LoadConfigFile());
+    NOTE(VarnekCfg_LoadConfigFile)();
     EXPECT_EQ(Reloaded(file), File("", 3, 1, 0, 0, "BRA"));
 }
 
@@ -104,7 +104,7 @@ TEST_F(ConfigAlone, AnUnreadableFileLeavesTheSettings) {
     };
     for (const auto &make : makers) {
         make();
-        NOTE_VOID(VarnekCfg_LoadConfigFile());
+        NOTE(VarnekCfg_LoadConfigFile)();
         EXPECT_EQ(info_.cprmPlayerDelay, 68);
         std::filesystem::remove(kPath);
     }
@@ -139,39 +139,48 @@ TEST_F(ConfigAlone, TheNationComesFromFileThenPlatformThenDefault) {
     for (const auto &[feature, nation] : rows) {
         gFeature = feature;
         info_.supportNation[0] = '\0';
-        NOTE(VarnekCfg_IsSupportBML());
+        EXPECT_EQ(VarnekCfg_IsSupportBML(), strcmp(nation, "PHL") == 0 ? TRUE : FALSE);
         EXPECT_STREQ(VarnekCfg_GetSupportNation(), nation);
     }
-    gFeature = "NATION:PHL";
+    for (const char *feature : {static_cast<const char *>(nullptr), "", "NATION:PHL"}) {
+        gFeature = feature;
+        info_.supportNation[0] = '\0';
+        NOTE(VarnekCfg_IsSupportBML)();
+    }
     EXPECT_EQ(Reloaded("CONFIG_SUPPORT_NATION=ARG"), File("", 0, 0, 0, 0, "ARG"));
 }
 
 TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
+    const auto save = [this](const std::string &where) {
+        VarnekCfg_SaveConfigFile();
+        Note("saving " + where, "");
+    };
     std::filesystem::create_symlink("/dev/full", kPath);
-    NOTE_AS("saving to a full device", (VarnekCfg_SaveConfigFile(), ""));
+    save("to a full device");
     EXPECT_TRUE(std::filesystem::remove(kPath));
     std::filesystem::create_directory(kPath);
-    NOTE_AS("saving to a directory", (VarnekCfg_SaveConfigFile(), ""));
+    save("to a directory");
     EXPECT_TRUE(std::filesystem::remove(kPath));
     WriteAll(kPath, "protected");
     chmod(kPath.c_str(), 0444);
-    NOTE_AS("saving to a protected file", (VarnekCfg_SaveConfigFile(), ""));
+    save("to a protected file");
     EXPECT_EQ(ReadAll(kPath), "protected");
     std::filesystem::remove(kPath);
     const std::string data = std::filesystem::path(VARNEK_DATA_DIR).parent_path();
     std::filesystem::rename(data, Path("aside"));
-    NOTE_AS("saving without the data directory", (VarnekCfg_SaveConfigFile(), ""));
+    save("without the data directory");
     EXPECT_FALSE(std::filesystem::exists(data));
     std::filesystem::rename(Path("aside"), data);
 }
 
 TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
-    signal(SIGXFSZ, SIG_IGN);
-    rlimit old = {};
-    getrlimit(RLIMIT_FSIZE, &old);
     const auto area = [this](char letter, size_t length) {
         memset(info_.currentAreaName, 0, sizeof info_.currentAreaName);
         memset(info_.currentAreaName, letter, length);
+    };
+    const auto saveLimited = [](rlim_t size) {
+        const FileSizeLimit limit(size);
+        VarnekCfg_SaveConfigFile();
     };
     for (const bool inPlace : {false, true}) {
         for (const size_t oldLength : {1u, 20u, 99u}) {
@@ -185,10 +194,7 @@ TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
                     std::filesystem::create_hard_link(kPath, Path("second name"));
                 }
                 area('b', 50);
-                const rlimit small = {limit, old.rlim_max};
-                setrlimit(RLIMIT_FSIZE, &small);
-                VarnekCfg_SaveConfigFile();
-                setrlimit(RLIMIT_FSIZE, &old);
+                saveLimited(limit);
                 const std::string after = File(std::string(50, 'b'), 2, 0, 0, 68, "");
                 EXPECT_EQ(ReadAll(kPath), limit < after.size() ? before : after) << limit;
             }
@@ -196,10 +202,7 @@ TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
     }
     // Where there was no file, none is left that a load would take for empty settings.
     std::filesystem::remove(kPath);
-    const rlimit none = {0, old.rlim_max};
-    setrlimit(RLIMIT_FSIZE, &none);
-    VarnekCfg_SaveConfigFile();
-    setrlimit(RLIMIT_FSIZE, &old);
+    saveLimited(0);
     EXPECT_FALSE(std::filesystem::exists(kPath));
 }
 
@@ -215,25 +218,33 @@ TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
         const char letter = text[strlen("CONFIG_CURRENTAREANAME=")];
         return text == File(std::string(static_cast<size_t>(letter - 'a' + 1) * 10, letter), 2, 0, 0, 68, "");
     };
+    const auto fork2 = [](const auto &work) {
+        std::array<pid_t, 2> children;
+        for (int i = 0; i < 2; ++i) {
+            children[size_t(i)] = fork();  // of this process's only thread
+            if (children[size_t(i)] == 0) {
+                work(i);
+                _exit(0);
+            }
+        }
+        return children;
+    };
     save('a');
     for (int round = 0; round < 100 && !HasFailure(); ++round) {
-        pid_t children[2];
-        for (pid_t &child : children) {
-            child = fork();  // of this process's only thread
-            while (child == 0) {
+        const auto children = fork2([&save](int) {
+            for (;;) {
                 save('a');
                 save('i');
             }
-        }
-        for (int left = round % 20; left >= 0; --left) {
-            if (left == 0) {
-                for (const pid_t child : children) {
-                    kill(child, SIGKILL);
-                    waitpid(child, nullptr, 0);
-                }
-            }
+        });
+        for (int left = round % 20; left > 0; --left) {
             EXPECT_TRUE(isWhole(ReadAll(kPath)));
         }
+        for (const pid_t child : children) {
+            kill(child, SIGKILL);
+            waitpid(child, nullptr, 0);
+        }
+        EXPECT_TRUE(isWhole(ReadAll(kPath)));
     }
     // One that an earlier process with this id has left, too.
     WriteAll(VARNEK_DATA_DIR "Varnek_Config.new." + std::to_string(getpid()) + ".57", "left");
@@ -244,16 +255,11 @@ TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
     // Savers that write in place check each other's text.
     std::filesystem::create_hard_link(kPath, Path("second name"));
     for (int round = 0; round < 50; ++round) {
-        pid_t children[2];
-        for (pid_t &child : children) {
-            child = fork();
-            if (child == 0) {
-                for (int i = 0; i < 20; ++i) {
-                    save(static_cast<char>('a' + (i + (&child - children)) % 9));
-                }
-                _exit(0);
+        const auto children = fork2([&save](int index) {
+            for (int i = 0; i < 20; ++i) {
+                save(static_cast<char>('a' + (i + index) % 9));
             }
-        }
+        });
         for (const pid_t child : children) {
             waitpid(child, nullptr, 0);
         }

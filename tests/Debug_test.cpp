@@ -109,7 +109,8 @@ TEST_F(DebugAlone, ALineEnablesByTheFirstKeyInIt) {
 }
 
 TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
-    NOTE_VOID(VARNEK_TRACE(kErrorOfCommon, "the first trace loads"));
+    VARNEK_TRACE(kErrorOfCommon, "it loads");
+    Note("the first trace", "");
     TakeLog();
     WriteAll(kDefault, "LogToUSB=1\nError=1\nCommon=1\n");
     VARNEK_TRACE(kErrorOfCommon, "a failed load is not tried again");
@@ -126,9 +127,9 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
     }
     std::filesystem::remove(kWorking);
     WriteAll(kWorking, std::string((1 << 20) + 1, '#'));
-    NOTE_VOID(VarnekPGL_InitializeDebug());  // more than 1 MiB
+    NOTE(VarnekPGL_InitializeDebug)();  // more than 1 MiB
     std::filesystem::remove(kWorking);
-    NOTE_VOID(VarnekPGL_InitializeDebug());
+    NOTE(VarnekPGL_InitializeDebug)();
     EXPECT_EQ(ReadAll(kWorking), ReadAll(kDefault)) << "the working copy is not the default file";
     EXPECT_TRUE(Passes(kErrorOfCommon));
     EXPECT_FALSE(Passes(VARNEK_LEVEL_ERROR | VARNEK_MODULE_JNI));
@@ -158,26 +159,23 @@ TEST_F(DebugAlone, ALogFunctionMayTrace) {
 }
 
 TEST_F(DebugAlone, MakesTheDebugFilesWritableForEveryUser) {
-    const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg";
-    for (const std::string &path : {std::string(kWorking), settings}) {
+    const auto modeAfter = [](const std::string &path) {
+        VarnekPGL_changeModeForDebug();
+        struct stat status = {};
+        EXPECT_EQ(stat(path.c_str(), &status), 0);
+        return status.st_mode & 0777u;
+    };
+    for (const std::string &path : {std::string(kWorking), std::string(VARNEK_DATA_DIR "Varnek_Config.cfg")}) {
         WriteAll(path, "#");
         chmod(path.c_str(), 0600);
-    }
-    VarnekPGL_changeModeForDebug();
-    for (const std::string &path : {std::string(kWorking), settings}) {
-        struct stat status = {};
-        ASSERT_EQ(stat(path.c_str(), &status), 0);
-        EXPECT_EQ(status.st_mode & 0777u, 0666u) << path;
+        EXPECT_EQ(modeAfter(path), 0666u) << path;
     }
     // A link may lead to a file that only the administrator may write.
     WriteAll(kDefault, "#");
     chmod(kDefault, 0644);
     std::filesystem::remove(kWorking);
     std::filesystem::create_symlink(kDefault, kWorking);
-    VarnekPGL_changeModeForDebug();
-    struct stat status = {};
-    ASSERT_EQ(stat(kDefault, &status), 0);
-    EXPECT_EQ(status.st_mode & 0777u, 0644u);
+    EXPECT_EQ(modeAfter(kDefault), 0644u);
 }
 
 class Trace : public VarnekTest {};
@@ -216,7 +214,7 @@ TEST_F(Trace, LeavesErrnoAloneAndReportsIt) {
 TEST_F(Trace, PanicNamesTheCallersPlace) {
     gszVarnekDbgFilePath = "x/Place.cpp";
     gVarnekDbgLineNum = 17;
-    NOTE(VarnekPGL_Panic());
+    NOTE(VarnekPGL_Panic)();
 }
 
 }  // namespace

@@ -11,8 +11,9 @@ TEST_F(DefaultsAlone, FilesSayWhatTheirCommentsPromise) {
     for (const std::string &name : {debug, config}) {
         WriteAll(VARNEK_DATA_DIR + name, ReadAll(TestFile("defaults/" + name)));
     }
-    NOTE(VarnekPGL_InitializeDebug(), 0);
-    NOTE(VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON, "through"), 0);
+    NOTE(VarnekPGL_InitializeDebug)();
+    VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON, "through");
+    Note("an error of the library", "");
     VarnekCfg_GetConfigInfo()->cprmPlayerDelay = 1;
     VarnekCfg_LoadConfigFile();
     VarnekCfg_SaveConfigFile();

@@ -1,15 +1,14 @@
 #include "Varnek_File.h"
 
 #include <fcntl.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <csignal>
 #include <cstring>
 #include <filesystem>
 #include <map>
+#include <optional>
 #include <thread>
 
 #include "support/VarnekTest.h"
@@ -21,17 +20,42 @@ namespace fs = std::filesystem;
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 
-class File : public VarnekTest {};
+constexpr int32_t kCreate = PGL_FILE_MODE_CREATE_RW, kRead = PGL_FILE_MODE_READ, kWrite = PGL_FILE_MODE_WRITE,
+                  kAppend = PGL_FILE_MODE_APPEND;
+
+class File : public VarnekTest {
+  protected:
+    File() {
+        resultNames_ = {NAMED(VARNEK_FILE_INVALID_BASE), NAMED(VARNEK_FILE_NOT_OPENED), NAMED(VARNEK_FILE_TOO_LARGE),
+                        NAMED(VARNEK_FILE_MEDIUM_FULL)};
+    }
+};
+class LargeFile : public File {};
+class Directory : public VarnekTest {};
+class Command : public VarnekTest {};
 
 TEST_F(File, FlagsResolveInTheirOrder) {
+    const struct {
+        int32_t flags;
+        const char *content;  // of a file with "old" to which "new" was written
+    } rows[] = {
+        {0, nullptr},
+        {16, nullptr},
+        {kRead, "old"},
+        {kRead | kWrite, "new"},
+        {kCreate, "new"},
+        {kCreate | kRead | kWrite, "new"},
+        {kRead | kAppend, "oldnew"},
+        {kCreate | kRead | kWrite | kAppend, "oldnew"},
+    };
     const std::string path = Path("file");
-    for (int32_t flags : {0, 1, 2, 4, 6, 7, 8, 10, 15, 16, 32}) {
+    for (const auto &[flags, content] : rows) {
         WriteAll(path, "old");
         const PglFileHandle file = VarnekPGL_OpenFile(path.c_str(), flags);
-        const size_t written = VarnekPGL_WriteFileByHandle(file, "new", 3);
+        EXPECT_EQ(file != -1, content != nullptr) << flags;
+        VarnekPGL_WriteFileByHandle(file, "new", 3);
         VarnekPGL_CloseFile(file);
-        Note("flags " + std::to_string(flags) + ": " + std::to_string(written) + " " + ReadAll(path),
-             file == -1 ? -1 : 0);
+        EXPECT_EQ(ReadAll(path), content != nullptr ? content : "old") << flags;
     }
 }
 
@@ -53,42 +77,43 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
     const PglFileHandle writer = VarnekPGL_OpenFile(Path("w").c_str(), PGL_FILE_MODE_WRITE);
     const PglFileHandle full = VarnekPGL_OpenFile("/dev/full", PGL_FILE_MODE_WRITE);
     char buffer[8] = {};
-    char shown[16];
-    snprintf(shown, sizeof shown, "0x%x", static_cast<unsigned>(writer));
-    Show(shown, "WRITER");
+    char hexadecimal[16];
+    snprintf(hexadecimal, sizeof hexadecimal, "0x%x", static_cast<unsigned>(writer));
+    Show(hexadecimal, "WRITER");
+    Show("(" + std::to_string(writer) + ", ", "(WRITER, ");
+    Show("(" + std::to_string(full) + ")", "(FULL)");
     VarnekPGL_WriteFileByHandle(full, "data", 4);
-    NOTE(VarnekPGL_OpenFile(nullptr, 2));
-    NOTE(VarnekPGL_CloseFile(0));
-    NOTE(VarnekPGL_CloseFile(-1));
-    NOTE(VarnekPGL_SeekFile(0, 0, 3));
-    NOTE(VarnekPGL_SeekFile(writer, 0, 3));
-    NOTE(VarnekPGL_SeekFile(writer, -1, 0));
-    NOTE(VarnekPGL_TellFile(0));
-    NOTE(VarnekPGL_FlushFile(0));
-    NOTE(VarnekPGL_FlushFile(full));
-    NOTE(VarnekPGL_ReadFileByHandle(0, buffer, 1));
-    NOTE(VarnekPGL_WriteFileByHandle(0, buffer, 1));
-    NOTE(VarnekPGL_WriteFileByHandle(writer, nullptr, 1));
-    NOTE(VarnekPGL_ReadFileByHandle(writer, nullptr, 1));
-    NOTE(VarnekPGL_ReadFileByHandle(writer, buffer, 8));
-    NOTE(VarnekPGL_GetFileSizeByHandle(0));
-    NOTE(VarnekPGL_ReadFile(none.c_str(), buffer, 8));
-    NOTE(VarnekPGL_GetFileSize(none.c_str()));
-    NOTE(VarnekPGL_CheckFile(none.c_str()));
-    NOTE(VarnekPGL_DeleteFile(none.c_str()));
-    NOTE(VarnekPGL_WriteFile("/no/dir", "x", 1));
-    NOTE(VarnekPGL_AppendFile("/no/dir", "x", 1));
-    NOTE(VarnekPGL_WriteFile(Path("w").c_str(), nullptr, 1));
-    NOTE(VarnekPGL_AppendFile(Path("w").c_str(), nullptr, 1));
+    NOTE(VarnekPGL_OpenFile)(nullptr, kRead);
+    NOTE(VarnekPGL_CloseFile)(0);
+    EXPECT_EQ(VarnekPGL_CloseFile(-1), -1);
+    NOTE(VarnekPGL_SeekFile)(0, 0, SEEK_SET);
+    NOTE(VarnekPGL_SeekFile)(writer, 0, 3);
+    NOTE(VarnekPGL_SeekFile)(writer, -1, SEEK_SET);
+    NOTE(VarnekPGL_TellFile)(0);
+    NOTE(VarnekPGL_FlushFile)(0);
+    NOTE(VarnekPGL_FlushFile)(full);
+    NOTE(VarnekPGL_ReadFileByHandle)(0, buffer, 1);
+    NOTE(VarnekPGL_WriteFileByHandle)(0, buffer, 1);
+    NOTE(VarnekPGL_WriteFileByHandle)(writer, nullptr, 1);
+    NOTE(VarnekPGL_ReadFileByHandle)(writer, nullptr, 1);
+    EXPECT_EQ(VarnekPGL_ReadFileByHandle(writer, buffer, 8), 0u);
+    NOTE(VarnekPGL_GetFileSizeByHandle)(0);
+    NOTE(VarnekPGL_ReadFile)(none, buffer, 8);
+    NOTE(VarnekPGL_GetFileSize)(none);
+    NOTE(VarnekPGL_CheckFile)(none);
+    NOTE(VarnekPGL_DeleteFile)(none);
+    NOTE(VarnekPGL_WriteFile)("/no/dir", "x", 1);
+    NOTE(VarnekPGL_AppendFile)("/no/dir", "x", 1);
+    NOTE(VarnekPGL_WriteFile)(Path("w"), nullptr, 1);
+    NOTE(VarnekPGL_AppendFile)(Path("w"), nullptr, 1);
     VarnekPGL_CloseFile(full);
     VarnekPGL_CloseFile(writer);
 }
 
 TEST_F(File, AFullDiskIsNotReportedAsStored) {
-    const std::string large(100000, 'x');
-    NOTE(VarnekPGL_WriteFile("/dev/full", "abc", 3));
-    NOTE(VarnekPGL_AppendFile("/dev/full", "abc", 3));
-    NOTE(VarnekPGL_AppendFile("/dev/full", large.data(), 100000));
+    NOTE(VarnekPGL_WriteFile)("/dev/full", "abc", 3);
+    NOTE(VarnekPGL_AppendFile)("/dev/full", "abc", 3);
+    NOTE(VarnekPGL_AppendFile)("/dev/full", std::vector<char>(100000).data(), 100000);
 }
 
 TEST_F(File, SizesAndPositions) {
@@ -145,26 +170,38 @@ TEST_F(File, LogLinesOfThreadsAreCutAndNeverMix) {
     }
 }
 
-class LargeFile : public VarnekTest {};
-
 TEST_F(LargeFile, FlagsGiveTheirAccess) {
     const std::string path = Path("file");
-    for (int32_t flags = 0; flags < 16; flags++) {
-        for (const bool exists : {true, false}) {
-            fs::remove(path);
-            if (exists) {
-                WriteAll(path, "kept");
-            }
-            TakeLog();
-            const int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), flags);
-            const int access = fd < 0 ? -1 : fcntl(fd, F_GETFL) & (O_ACCMODE | O_APPEND);
+    const std::pair<int32_t, int> rows[] = {
+        {0, O_RDONLY},
+        {kRead, O_RDONLY},
+        {kWrite, O_WRONLY},
+        {kRead | kWrite, O_RDWR},
+        {kAppend, O_RDONLY | O_APPEND},
+        {kRead | kAppend, O_RDONLY | O_APPEND},
+        {kWrite | kAppend, O_WRONLY | O_APPEND},
+        {kRead | kWrite | kAppend, O_RDWR},
+    };
+    for (const auto &[flags, access] : rows) {
+        for (const int create : {0, kCreate}) {
+            const std::string label = std::to_string(flags | create);
+            WriteAll(path, "kept");
+            int32_t fd = VarnekPGL_OpenFile64Bits(path.c_str(), flags | create);
             struct stat status = {};
-            fstat(fd, &status);
-            Note("flags " + std::to_string(flags) + ", " + std::to_string(status.st_size) + " bytes", access);
-            EXPECT_TRUE(fd < 0 || exists || (status.st_mode & 0777u) == 0644);
+            EXPECT_EQ(fcntl(fd, F_GETFL) & (O_ACCMODE | O_APPEND), create != 0 ? O_RDWR | (access & O_APPEND) : access)
+                << label;
+            EXPECT_TRUE(fstat(fd, &status) == 0 && status.st_size == 4) << label;
             VarnekPGL_CloseFile64Bits(fd);
+            fs::remove(path);
+            EXPECT_THAT(TakeLog(), IsEmpty());
+            fd = VarnekPGL_OpenFile64Bits(path.c_str(), flags | create);
+            EXPECT_EQ(fd == -1, create == 0) << label;
+            EXPECT_TRUE(fd == -1 || (fstat(fd, &status) == 0 && (status.st_mode & 0777u) == 0644)) << label;
+            VarnekPGL_CloseFile64Bits(fd);
+            TakeLog();
         }
     }
+    NOTE(VarnekPGL_OpenFile64Bits)(path, kRead);
 }
 
 TEST_F(LargeFile, BeyondFourGiB) {
@@ -195,17 +232,12 @@ TEST_F(LargeFile, BeyondFourGiB) {
 
 TEST_F(File, ASizeQueryOnAFullMediumKeepsThePosition) {
     const PglFileHandle file = VarnekPGL_OpenFile(Path("full").c_str(), PGL_FILE_MODE_CREATE_RW);
-    signal(SIGXFSZ, SIG_IGN);
-    rlimit old = {};
-    getrlimit(RLIMIT_FSIZE, &old);
-    const rlimit small = {10, old.rlim_max};
-    setrlimit(RLIMIT_FSIZE, &small);
+    const FileSizeLimit limit(10);
     const std::string data(100, 'x');
     EXPECT_EQ(VarnekPGL_WriteFileByHandle(file, data.data(), 100), 100u);
     EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(file), 10);
     EXPECT_EQ(VarnekPGL_TellFile(file), 100);
     EXPECT_THAT(TakeLog(), Not(IsEmpty()));
-    setrlimit(RLIMIT_FSIZE, &old);
     VarnekPGL_CloseFile(file);
 }
 
@@ -214,28 +246,25 @@ TEST_F(LargeFile, FailuresHaveTheirLineAndResult) {
     const int32_t full = VarnekPGL_OpenFile64Bits("/dev/full", PGL_FILE_MODE_WRITE);
     const int32_t limited = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_CREATE_RW);
     const int32_t reader = VarnekPGL_OpenFile64Bits(path.c_str(), PGL_FILE_MODE_READ);
-    signal(SIGXFSZ, SIG_IGN);
-    rlimit old = {};
-    getrlimit(RLIMIT_FSIZE, &old);
-    const rlimit small = {100, old.rlim_max};
-    setrlimit(RLIMIT_FSIZE, &small);
+    std::optional<FileSizeLimit> limit(100);
     const std::string data(150, 'x');
     Show(strerror(0), "no error");
-    Show("Hndl : " + std::to_string(full), "Hndl : FULL");
-    Show("Hndl : " + std::to_string(limited), "Hndl : LIMITED");
-    Show("Hndl : " + std::to_string(reader), "Hndl : READER");
-    NOTE(VarnekPGL_WriteFileByHandle64Bits(full, "x", 1));
-    NOTE(VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150));
-    NOTE(VarnekPGL_WriteFileByHandle64Bits(limited, data.data(), 150));
-    NOTE(VarnekPGL_WriteFileByHandle64Bits(reader, "x", 1));
-    NOTE(VarnekPGL_WriteFileByHandle64Bits(-2, "x", 1));
-    NOTE(VarnekPGL_ReadFileByHandle64Bits(-1, nullptr, 1));
-    NOTE(VarnekPGL_SeekFile64Bits(-1, 0, 5));
-    NOTE(VarnekPGL_SeekFile64Bits(-1, 0, 2));
-    NOTE(VarnekPGL_TellFile64Bits(-1));
-    NOTE(VarnekPGL_FlushFile64Bits(-1));
-    NOTE(VarnekPGL_CloseFile64Bits(-1));
-    setrlimit(RLIMIT_FSIZE, &old);
+    for (const auto &[fd, name] : {NAMED(full), NAMED(limited), NAMED(reader)}) {
+        Show("Hndl : " + std::to_string(fd), std::string("Hndl : ") + name);
+        Show("(" + std::to_string(fd) + ", ", "(" + std::string(name) + ", ");
+    }
+    NOTE(VarnekPGL_WriteFileByHandle64Bits)(full, "x", 1);
+    NOTE(VarnekPGL_WriteFileByHandle64Bits)(limited, data, 150);
+    NOTE(VarnekPGL_WriteFileByHandle64Bits)(limited, data, 150);
+    NOTE(VarnekPGL_WriteFileByHandle64Bits)(reader, "x", 1);
+    NOTE(VarnekPGL_WriteFileByHandle64Bits)(-2, "x", 1);
+    NOTE(VarnekPGL_ReadFileByHandle64Bits)(-1, nullptr, 1);
+    NOTE(VarnekPGL_SeekFile64Bits)(-1, 0, 5);
+    NOTE(VarnekPGL_SeekFile64Bits)(-1, 0, SEEK_END);
+    NOTE(VarnekPGL_TellFile64Bits)(-1);
+    NOTE(VarnekPGL_FlushFile64Bits)(-1);
+    NOTE(VarnekPGL_CloseFile64Bits)(-1);
+    limit.reset();
     EXPECT_EQ(VarnekPGL_ReadFileByHandle64Bits(full + 500, nullptr, 1), -1);
     EXPECT_EQ(VarnekPGL_GetFileSizeByHandle64Bits(-1), -1);
     EXPECT_THAT(TakeLog(), IsEmpty());
@@ -243,8 +272,6 @@ TEST_F(LargeFile, FailuresHaveTheirLineAndResult) {
         VarnekPGL_CloseFile64Bits(fd);
     }
 }
-
-class Directory : public VarnekTest {};
 
 TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     const std::string none = Path("none");
@@ -254,20 +281,20 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     PglFmFileAttributes attributes;
     PglDirEntryInfo info = {7, ""};
     Show("pid(" + std::to_string(getpid()) + ") uid(" + std::to_string(getuid()), "pid(PID) uid(UID");
-    NOTE(VarnekPGL_MakeDir(present.c_str()));
-    NOTE(VarnekPGL_MakeDir(tooLong.c_str()));
-    NOTE(VarnekPGL_DeleteDirEx((none + "/").c_str()));
-    NOTE(VarnekPGL_DeleteDirEx(""));
-    NOTE(VarnekPGL_DeleteDirEx(nullptr));
-    NOTE(VarnekPGL_ClearDir(tooLong.c_str()));
-    NOTE(VarnekPGL_ClearDir(none.c_str()));
-    NOTE(VarnekPGL_CheckDir(none.c_str()));
-    NOTE(__VarnekPGL_ReadDir(nullptr, nullptr));
-    NOTE(VarnekPGL_ReadDir(nullptr, nullptr));
-    NOTE(VarnekPGL_ReadDir(PGL_INVALID_DIR_HANDLE, &info));
-    NOTE(VarnekPGL_FmGetFileAttributes(none.c_str(), nullptr));
-    NOTE(VarnekPGL_FmGetFileAttributes(none.c_str(), &attributes));
-    NOTE(VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE));
+    NOTE(VarnekPGL_MakeDir)(present);
+    NOTE(VarnekPGL_MakeDir)(tooLong);
+    NOTE(VarnekPGL_DeleteDirEx)(none + "/");
+    NOTE(VarnekPGL_DeleteDirEx)("");
+    NOTE(VarnekPGL_DeleteDirEx)(nullptr);
+    NOTE(VarnekPGL_ClearDir)(tooLong);
+    NOTE(VarnekPGL_ClearDir)(none);
+    NOTE(VarnekPGL_CheckDir)(none);
+    NOTE(__VarnekPGL_ReadDir)(nullptr, nullptr);
+    NOTE(VarnekPGL_ReadDir)(nullptr, nullptr);
+    NOTE(VarnekPGL_ReadDir)(PGL_INVALID_DIR_HANDLE, &info);
+    EXPECT_FALSE(VarnekPGL_FmGetFileAttributes(none.c_str(), nullptr));
+    NOTE(VarnekPGL_FmGetFileAttributes)(none, &attributes);
+    EXPECT_TRUE(VarnekPGL_CloseDir(PGL_INVALID_DIR_HANDLE));
     EXPECT_EQ(info.type, 0u);
     EXPECT_FALSE(fs::exists(none));
 }
@@ -285,7 +312,7 @@ TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
     for (const auto &[name, type] : types) {
         Note(name + " " + std::to_string(type) + "\n");
     }
-    NOTE(VarnekPGL_ReadDir(dir, &info));
+    NOTE(VarnekPGL_ReadDir)(dir, &info);
     EXPECT_EQ(info.type, 0u);
     EXPECT_EQ(VarnekPGL_CloseDir(dir), TRUE);
     PglFmFileAttributes attributes;
@@ -380,8 +407,6 @@ TEST_F(Directory, AFileThatCannotBeDeletedStaysAndIsReported) {
                                          "VarnekPGL_DeleteDirEx : rmdir[" + tree + "] Fail. return FALSE"}));
 }
 
-class Command : public VarnekTest {};
-
 TEST_F(Command, AnyPathIsOneWord) {
     const fs::path home = fs::current_path();
     fs::current_path(Path(""));
@@ -411,11 +436,11 @@ TEST_F(Command, RefusalsKeepTheDestination) {
     fs::create_hard_link(destination, Path("same"));
     const std::string longPath(520, 'x');
     for (const std::string &source : {Path("none"), Path(""), Path("same"), destination, longPath, std::string()}) {
-        NOTE(VarnekPGL_CopyFile(source.c_str(), destination.c_str()));
+        NOTE(VarnekPGL_CopyFile)(source, destination);
     }
-    NOTE(VarnekPGL_CopyFile(destination.c_str(), longPath.c_str()));
-    NOTE(VarnekPGL_MoveFile(destination.c_str(), longPath.c_str()));
-    NOTE(VarnekPGL_MoveFile(nullptr, destination.c_str()));
+    NOTE(VarnekPGL_CopyFile)(destination, longPath);
+    NOTE(VarnekPGL_MoveFile)(destination, longPath);
+    NOTE(VarnekPGL_MoveFile)(nullptr, destination);
     EXPECT_EQ(ReadAll(destination), "kept");
 }
 
@@ -428,9 +453,9 @@ TEST_F(Command, ChmodTakesThreeModesAndReturnsTheStatus) {
         stat(path.c_str(), &status);
         EXPECT_EQ(status.st_mode & 0777u, std::stoul(std::to_string(mode), nullptr, 8));
     }
-    NOTE(VarnekPGL_Chmod(path.c_str(), 644));
-    NOTE(VarnekPGL_Chmod(Path("none").c_str(), 666));  // exit status 1, as system() returns it
-    NOTE(VarnekPGL_Chmod(std::string(505, 'x').c_str(), 666));
+    NOTE(VarnekPGL_Chmod)(path, 644);
+    NOTE(VarnekPGL_Chmod)(Path("none"), 666);  // exit status 1, as system() returns it
+    NOTE(VarnekPGL_Chmod)(std::string(505, 'x'), 666);
 }
 
 }  // namespace

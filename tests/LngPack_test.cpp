@@ -26,11 +26,11 @@ TEST_F(LngPack, Latin15BecomesUtf8) {
                  "`abcdefghijklmnopqrstuvwxyz{|}~"
                  " ¡¢£€¥Š§š©ª«¬\u00AD®¯°±²³Žµ¶·ž¹º»ŒœŸ¿"
                  "ÀÁÂÃÄÅÆÇÈÉÊËÌÍÎÏÐÑÒÓÔÕÖ×ØÙÚÛÜÝÞßàáâãäåæçèéêëìíîïðñòóôõö÷øùúûüýþÿ");
-    NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, "caf\xE9", 4));
+    NOTE(VarnekPGL_ConvertLatin15toUTF8)(&text, "caf\xE9", 4);
     // The text stays when there is nothing to convert, or far more than stated.
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "", 0), TRUE);
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\x09\x0A\x1B\x7F\x85", 5), TRUE);
-    NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, "12345", 1));
+    NOTE(VarnekPGL_ConvertLatin15toUTF8)(&text, "12345", 1);
     EXPECT_STREQ(text, "café");
     // A little more than stated fits the work buffers, and so does the largest statement.
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4\xA4\xA4\xA4", 1), TRUE);
@@ -94,28 +94,28 @@ TEST_F(LngPack, FailuresAreNamed) {
     unsigned short units[8];
     char bytes[8] = "before";
     char *text = nullptr;
-    NOTE(WmConvertLatin15Code2PCode(nullptr, 4, "a"));
-    NOTE(WmConvertLatin15Code2PCode(units, 4, "12345"));
-    NOTE(WmConvertLatin15Code2PCode(units, 5, "12345"));
-    NOTE(__WmLngUnicode2UTF(nullptr, abc, 3));
-    NOTE(__WmLngUnicode2UTF(bytes, nullptr, 3));
-    NOTE(__WmLngUnicode2UTF(bytes, abc, 0));
-    NOTE(WmConvertPCode2UTF(bytes, abc, 0));
+    NOTE(WmConvertLatin15Code2PCode)(nullptr, 4, "a");
+    NOTE(WmConvertLatin15Code2PCode)(units, 4, "12345");
+    NOTE(WmConvertLatin15Code2PCode)(units, 5, "12345");
+    NOTE(__WmLngUnicode2UTF)(nullptr, abc, 3);
+    NOTE(__WmLngUnicode2UTF)(bytes, nullptr, 3);
+    NOTE(__WmLngUnicode2UTF)(bytes, abc, 0);
+    NOTE(WmConvertPCode2UTF)(bytes, abc, 0);
     EXPECT_STREQ(bytes, "");
-    NOTE(WmConvert2LCode(bytes, nullptr));
+    NOTE(WmConvert2LCode)(bytes, nullptr);
     TakeLog();
     EXPECT_EQ(WmConvert2LCode(nullptr, abc + 3), FALSE);
     EXPECT_EQ(TakeBodies()[0], "WmConvertPCode2UTF : pszOutText - null  !!");
-    NOTE(__WmLngUTF2Unicode(nullptr, "a", 1));
-    NOTE(__WmLngUTF2Unicode(units, nullptr, 1));
-    NOTE(WmConvertUTF2PCode(nullptr, 8, "a", 1));
-    NOTE(WmConvertUTF2PCode(units, 8, nullptr, 1));
-    NOTE(WmConvertUTF2PCode(units, 4, "abc", 3));
-    NOTE(WmConvertUTF2PCode(units, 6, "abc", 3));
-    NOTE(WmConvertUTF2PCode(units, 0, "abc", 0));
+    NOTE(__WmLngUTF2Unicode)(nullptr, "a", 1);
+    NOTE(__WmLngUTF2Unicode)(units, nullptr, 1);
+    NOTE(WmConvertUTF2PCode)(nullptr, 8, "a", 1);
+    NOTE(WmConvertUTF2PCode)(units, 8, nullptr, 1);
+    NOTE(WmConvertUTF2PCode)(units, 4, "abc", 3);
+    NOTE(WmConvertUTF2PCode)(units, 6, "abc", 3);
+    NOTE(WmConvertUTF2PCode)(units, 0, "abc", 0);
     EXPECT_EQ(units[0], 0);
-    NOTE(__WmLngStrlenByByte("abc", 0));
-    NOTE(VarnekPGL_ConvertLatin15toUTF8(&text, nullptr, 1));
+    NOTE(__WmLngStrlenByByte)("abc", 0);
+    NOTE(VarnekPGL_ConvertLatin15toUTF8)(&text, nullptr, 1);
 }
 
 }  // namespace

@@ -12,7 +12,7 @@ class NamedObjects : public VarnekTest {};
 TEST_F(NamedObjects, AFullRegistryOfEachFamilyHasRoomAfterARemoval) {
     for (const Family &family : kFamilies) {
         std::vector<int32_t> handles = family.Fill();
-        NOTE_AS("one more of the " + std::string(family.name), family.create("one more"));
+        Noting(std::string(family.name) + ": create", family.create)("one more");
         EXPECT_TRUE(family.remove(handles[7]));
         handles[7] = family.create("one more");
         Note(std::to_string(handles.size()) + " " + family.name + ", the last " + std::to_string(handles[7]) + "\n");

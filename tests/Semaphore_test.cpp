@@ -26,7 +26,7 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
     EXPECT_TRUE(VarnekPGL_DeleteMutex(1));
     EXPECT_EQ(VarnekPGL_GetMutexByName("one"), -1);
     EXPECT_EQ(VarnekPGL_CreateMutex("one"), 3);
-    NOTE(VarnekPGL_CreateMutex("one"));
+    NOTE(VarnekPGL_CreateMutex)("one");
     // Handles that share a place among the lookup's hints.
     for (int handle = 5; handle < 300; handle++) {
         EXPECT_EQ(VarnekPGL_CreateMutex("again"), handle);
@@ -38,8 +38,7 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
 }
 
 TEST_F(Mutex, NamesThatResembleEachOther) {
-    // Some differ in their first word only, some in their last, and some begin like a longer one. A
-    // slot keeps the end of a longer name that it had before.
+    // They differ in their first or last word only, or begin alike, and a slot keeps the end of an earlier longer name.
     const char *const names[] = {"aaaazaaa", "baaa[aaa", "aaaazaaabbbb", "aaaa", "aaa"};
     EXPECT_TRUE(VarnekPGL_DeleteMutex(VarnekPGL_CreateMutex("baaa[aaabbbbcccc")));
     for (const char *name : names) {
@@ -82,15 +81,14 @@ TEST_F(Mutex, FailuresHaveTheirLineAndResult) {
     const int32_t held = VarnekPGL_CreateMutex("held");
     VarnekPGL_AcquireMutex(held);
     TakeLog();
-    NOTE(VarnekPGL_CreateMutex(nullptr));
-    NOTE(VarnekPGL_CreateMutex(""));
-    NOTE(VarnekPGL_CreateMutex(k32.c_str()));
-    NOTE(VarnekPGL_CreateMutex("held"));
-    NOTE(VarnekPGL_DeleteMutex(-1));
-    NOTE(VarnekPGL_AcquireMutex(0));
-    NOTE(VarnekPGL_ReleaseMutex(2147483647));
-    NOTE(VarnekPGL_GetMutexByName(nullptr));
-    NOTE(VarnekPGL_GetMutexByName(""));
+    for (const char *name : {static_cast<const char *>(nullptr), "", k32.c_str(), "held"}) {
+        NOTE(VarnekPGL_CreateMutex)(name);
+    }
+    NOTE(VarnekPGL_DeleteMutex)(-1);
+    NOTE(VarnekPGL_AcquireMutex)(0);
+    NOTE(VarnekPGL_ReleaseMutex)(INT32_MAX);
+    EXPECT_EQ(VarnekPGL_GetMutexByName(nullptr), -1);
+    EXPECT_EQ(VarnekPGL_GetMutexByName(""), -1);
     EXPECT_EQ(VarnekPGL_GetMutexByName("held"), held) << "a failure removed the mutex";
     EXPECT_TRUE(VarnekPGL_ReleaseMutex(held));
     EXPECT_TRUE(VarnekPGL_DeleteMutex(held));
@@ -106,26 +104,25 @@ TEST_F(Semaphore, HandlesCountApartAndUnitsAreKept) {
     EXPECT_THAT(TakeErrors(), IsEmpty()) << "a time-out traced an Error";
     EXPECT_TRUE(VarnekPGL_SignalSemaphore(sem));
     EXPECT_TRUE(VarnekPGL_WaitSemaphore(sem, WAIT_FOREVER));
-    NOTE(VarnekPGL_CreateSemaphore(k31.c_str(), 0));
-    NOTE(VarnekPGL_SemaphoreByName(k31.c_str()));
-    NOTE(VarnekPGL_SignalSemaphore(2));
-    NOTE(VarnekPGL_WaitSemaphore(2, WAIT_FOREVER));
+    NOTE(VarnekPGL_CreateSemaphore)(k31, 0);
+    EXPECT_EQ(VarnekPGL_SemaphoreByName(k31.c_str()), 2);
+    NOTE(VarnekPGL_SignalSemaphore)(2);
+    NOTE(VarnekPGL_WaitSemaphore)(2, WAIT_FOREVER);
 }
 
 TEST_F(Semaphore, FailuresHaveTheirLineAndResult) {
-    NOTE(VarnekPGL_CreateSemaphore(nullptr, 0));
-    NOTE(VarnekPGL_CreateSemaphore("", 0));
-    NOTE(VarnekPGL_CreateSemaphore(k32.c_str(), 0));
-    NOTE(VarnekPGL_CreateSemaphore("much", 0xFFFFFFFF));
-    NOTE(VarnekPGL_DeleteSemaphore(1));
-    NOTE(VarnekPGL_WaitSemaphore(-1, 0));
-    NOTE(VarnekPGL_WaitSemaphore(0, WAIT_FOREVER));
-    NOTE(VarnekPGL_SignalSemaphore(9));
-    NOTE(VarnekPGL_SemaphoreByName(nullptr));
+    for (const char *name : {static_cast<const char *>(nullptr), "", k32.c_str()}) {
+        NOTE(VarnekPGL_CreateSemaphore)(name, 0);
+    }
+    NOTE(VarnekPGL_CreateSemaphore)("much", -1);
+    NOTE(VarnekPGL_DeleteSemaphore)(1);
+    NOTE(VarnekPGL_WaitSemaphore)(-1, 0);
+    NOTE(VarnekPGL_SignalSemaphore)(9);
+    EXPECT_EQ(VarnekPGL_SemaphoreByName(nullptr), -1);
     Show("count=[" + std::to_string(SEM_VALUE_MAX), "count=[SEM_VALUE_MAX");
-    NOTE(VarnekPGL_CreateSemaphore("brimful", SEM_VALUE_MAX));
-    NOTE(VarnekPGL_SignalSemaphore(1));
-    NOTE(VarnekPGL_DeleteSemaphore(1));
+    NOTE(VarnekPGL_CreateSemaphore)("brimful", SEM_VALUE_MAX);
+    NOTE(VarnekPGL_SignalSemaphore)(1);
+    EXPECT_TRUE(VarnekPGL_DeleteSemaphore(1));
 }
 
 TEST_F(Semaphore, ASignalEndsAWaitAndATimeoutLasts) {

@@ -36,23 +36,25 @@ TEST_F(Thread, HandlesNamesAndTheThreadsOwnView) {
     EXPECT_EQ(first.Handle(), 1);
     EXPECT_TRUE(Eventually([&seen] { return seen == 1; }));
     EXPECT_EQ(VarnekPGL_CreateThread("second", 1, 0, Nothing, nullptr), 2);
-    for (const char *name : {k31.c_str(), "First", static_cast<const char *>(nullptr)}) {
-        NOTE(VarnekPGL_GetThreadByName(name));
+    NOTE(VarnekPGL_GetThreadByName)(k31);
+    for (const char *name : {"First", static_cast<const char *>(nullptr)}) {
+        EXPECT_EQ(VarnekPGL_GetThreadByName(name), -1);
     }
     EXPECT_TRUE(VarnekPGL_DeleteThread(1));
     EXPECT_FALSE(VarnekPGL_DeleteThread(1));
-    NOTE(VarnekPGL_CreateThread("third", 99, 65536, Nothing, nullptr));
-    NOTE(VarnekPGL_GetCurrentThread());
+    NOTE(VarnekPGL_CreateThread)("third", 99, 65536, Nothing, nullptr);
+    NOTE(VarnekPGL_GetCurrentThread)();
 }
 
 TEST_F(Thread, FailuresHaveTheirLineAndResult) {
-    NOTE(VarnekPGL_DeleteThread(1));  // there is no guard before the first thread
+    NOTE(VarnekPGL_DeleteThread)(1);  // there is no guard before the first thread
     const std::string k32(32, 'n');
     for (const char *name : {static_cast<const char *>(nullptr), "", k32.c_str()}) {
-        NOTE(VarnekPGL_CreateThread(name, 50, 0, Nothing, nullptr));
+        NOTE(VarnekPGL_CreateThread)(name, 50, 0, Nothing, nullptr);
     }
-    for (int32_t priority : {0, 100, 50}) {
-        NOTE(VarnekPGL_CreateThread("x", priority, 0, nullptr, nullptr));
+    NOTE(VarnekPGL_CreateThread)("x", 50, 0, nullptr, nullptr);
+    for (int32_t priority : {0, 100}) {
+        EXPECT_EQ(VarnekPGL_CreateThread("x", priority, 0, Nothing, nullptr), -1) << priority;
     }
     EXPECT_EQ(VarnekPGL_CreateThread("x", 50, 0, Nothing, nullptr), 1) << "a failure took a handle";
 }
@@ -62,10 +64,10 @@ TEST_F(Thread, ADuplicateTakesTheRecord) {
     const THREAD_MSG message = Message('m');
     EXPECT_TRUE(VarnekPGL_SendMessage(old, &message));
     EXPECT_TRUE(VarnekPGL_SendMessage(old, &message));
-    NOTE(VarnekPGL_CreateThread("same", 1, 0, Nothing, nullptr));
+    NOTE(VarnekPGL_CreateThread)("same", 1, 0, Nothing, nullptr);
     EXPECT_FALSE(VarnekPGL_SendMessage(old, &message));
     VarnekPGL_SendMessage(old + 1, &message);
-    NOTE(VarnekPGL_DeleteThread(old + 1));
+    NOTE(VarnekPGL_DeleteThread)(old + 1);
 }
 
 TEST_F(Thread, AWaitersRecordIsReplacedInAFullTable) {
@@ -113,13 +115,23 @@ TEST_F(Thread, AThreadWithAnEndedThreadsSystemIdIsUnknown) {
     }
 }
 
-TEST_F(Thread, AThreadKnowsItselfToItsEnd) {
+TEST_F(Thread, AThreadKnowsItselfInTheFirstDestructorsOfOtherKeys) {
     VarnekPGL_CreateThread("makes the registry's key first", 1, 0, Nothing, nullptr);
-    static std::promise<int32_t> last;
     static pthread_key_t key;
-    pthread_key_create(&key, [](void *) { last.set_value(VarnekPGL_GetCurrentThread()); });
+    static std::vector<int32_t> handles;
+    static std::promise<void> ended;
+    pthread_key_create(&key, [](void *value) {
+        THREAD_MSG message = Message('m');
+        int32_t count = -1;
+        handles.push_back(VarnekPGL_GetCurrentThread());
+        const BOOL isKnown = handles.back() != -1 ? TRUE : FALSE;
+        EXPECT_EQ(VarnekPGL_SendMessage(handles.back(), &message), isKnown);
+        EXPECT_EQ(VarnekPGL_ReceiveMessage(0, &message, &count), isKnown);
+        handles.size() < 3 ? void(pthread_setspecific(key, value)) : ended.set_value();
+    });
     const varnek::Thread worker("worker", kStack, [] { pthread_setspecific(key, &key); });
-    EXPECT_EQ(last.get_future().get(), worker.Handle());
+    ended.get_future().wait();
+    EXPECT_THAT(handles, ElementsAre(worker.Handle(), -1, -1));
 }
 
 TEST_F(Thread, TheSystemKnowsTheNamesBeginning) {
@@ -235,8 +247,11 @@ TEST_F(MessageQueue, UrgentMessagesOvertake) {
     });
     for (const char text : {'a', 'b', '1', '2'}) {
         THREAD_MSG message = Message(text);
-        const auto send = text < 'a' ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage;
-        NOTE(send(worker.Handle(), &message));
+        if (text < 'a') {
+            NOTE(VarnekPGL_SendUrgentMessage)(worker.Handle(), &message);
+        } else {
+            NOTE(VarnekPGL_SendMessage)(worker.Handle(), &message);
+        }
         message = Message('x');
     }
     TakeLog();
@@ -252,6 +267,11 @@ TEST_F(MessageQueue, APeekLeavesASignalBehind) {
         THREAD_MSG message;
         int32_t count = -1;
         EXPECT_FALSE(VarnekPGL_PeekMessage(&message, &count));
+        EXPECT_FALSE(VarnekPGL_PeekMessage(&message, nullptr));
+        EXPECT_FALSE(VarnekPGL_ReceiveMessage(0, nullptr, &count));
+        EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_PeekMessage: Msg is NULL",
+                                              "***** VarnekPGL_PeekMessage: message or count is NULL",
+                                              "***** VarnekPGL_ReceiveMessage: message or count is NULL"));
         EXPECT_TRUE(VarnekPGL_SendMessage(VarnekPGL_GetCurrentThread(), &sent));
         EXPECT_TRUE(VarnekPGL_PeekMessage(&message, &count));
         EXPECT_EQ(message.data[39], 'm');
@@ -267,14 +287,12 @@ TEST_F(MessageQueue, APeekLeavesASignalBehind) {
 TEST_F(MessageQueue, FailuresHaveTheirLineAndResult) {
     THREAD_MSG message = Message('m');
     int32_t count = 77;
-    NOTE(VarnekPGL_SendMessage(-1, &message));
-    NOTE(VarnekPGL_SendMessage(1, nullptr));
-    NOTE(VarnekPGL_SendUrgentMessage(0, &message));
-    NOTE(VarnekPGL_SendUrgentMessage(1, nullptr));
-    NOTE(VarnekPGL_ReceiveMessage(0, &message, &count));
-    NOTE(VarnekPGL_PeekMessage(&message, &count));
-    NOTE(VarnekPGL_ReceiveMessage(0, nullptr, &count));
-    NOTE(VarnekPGL_PeekMessage(&message, nullptr));
+    NOTE(VarnekPGL_SendMessage)(-1, &message);
+    NOTE(VarnekPGL_SendMessage)(1, nullptr);
+    NOTE(VarnekPGL_SendUrgentMessage)(0, &message);
+    NOTE(VarnekPGL_SendUrgentMessage)(1, nullptr);
+    NOTE(VarnekPGL_ReceiveMessage)(0, &message, &count);
+    NOTE(VarnekPGL_PeekMessage)(&message, &count);
     EXPECT_EQ(count, 77);
 }
 

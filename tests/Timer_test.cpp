@@ -39,10 +39,10 @@ TEST_F(Timer, HandlesAreSlotsAndNamesAreUnique) {
     Expiries expiries;
     EXPECT_TRUE(VarnekPGL_StartTimer(0, 60000, CountExpiry, &expiries));
     EXPECT_EQ(VarnekPGL_GetTimerByName(k40.c_str()), 0);
-    NOTE(VarnekPGL_CreateTimer(k40.c_str()));
-    NOTE(VarnekPGL_CreateTimer((k40 + "n").c_str()));
-    NOTE(VarnekPGL_CreateTimer(nullptr));
-    NOTE(VarnekPGL_GetTimerByName(nullptr));
+    NOTE(VarnekPGL_CreateTimer)(k40);
+    NOTE(VarnekPGL_CreateTimer)(k40 + "n");
+    NOTE(VarnekPGL_CreateTimer)(nullptr);
+    NOTE(VarnekPGL_GetTimerByName)(nullptr);
     EXPECT_TRUE(VarnekPGL_IsTimerActive(0)) << "the duplicate changed the timer";
     EXPECT_TRUE(VarnekPGL_DeleteTimer(0));
     EXPECT_EQ(VarnekPGL_CreateTimer("again"), 0);
@@ -51,18 +51,18 @@ TEST_F(Timer, HandlesAreSlotsAndNamesAreUnique) {
 }
 
 TEST_F(Timer, BadHandlesAndArgumentsHaveTheirLine) {
-    const int32_t timer = VarnekPGL_CreateTimer("never started");
-    Expiries expiries;
-    for (uint32_t handle : {32u, 0xFFFFFFFFu, 5u}) {
-        NOTE(VarnekPGL_StartTimer(handle, 1, CountExpiry, &expiries));
-        NOTE(VarnekPGL_CancelTimer(handle));
-        NOTE(VarnekPGL_DeleteTimer(handle));
-        NOTE(VarnekPGL_IsTimerActive(handle));
+    VarnekPGL_CreateTimer("never started");
+    for (int32_t handle : {32, 5}) {
+        NOTE(VarnekPGL_StartTimer)(handle, 1, CountExpiry, nullptr);
+        NOTE(VarnekPGL_CancelTimer)(handle);
+        NOTE(VarnekPGL_DeleteTimer)(handle);
+        NOTE(VarnekPGL_IsTimerActive)(handle);
     }
-    NOTE(VarnekPGL_StartTimer(0, 0, CountExpiry, &expiries));
-    NOTE(VarnekPGL_StartTimer(0, 1, nullptr, &expiries));
-    NOTE(VarnekPGL_CancelTimer(0));
-    NOTE(VarnekPGL_IsTimerActive(static_cast<uint32_t>(timer)));
+    NOTE(VarnekPGL_IsTimerActive)(-1);
+    NOTE(VarnekPGL_StartTimer)(0, 0, CountExpiry, nullptr);
+    NOTE(VarnekPGL_StartTimer)(0, 1, nullptr, nullptr);
+    NOTE(VarnekPGL_CancelTimer)(0);
+    EXPECT_FALSE(VarnekPGL_IsTimerActive(0));
 }
 
 TEST_F(Timer, ExpiresOnceOnAnotherThreadAndStartsAgain) {
@@ -73,14 +73,14 @@ TEST_F(Timer, ExpiresOnceOnAnotherThreadAndStartsAgain) {
         const auto start = Clock::now();
         EXPECT_TRUE(VarnekPGL_StartTimer(timer, 60, CountExpiry, &expiries));
         EXPECT_TRUE(VarnekPGL_IsTimerActive(timer));
-        NOTE(VarnekPGL_StartTimer(timer, 1, CountExpiry, &expiries));
+        EXPECT_FALSE(VarnekPGL_StartTimer(timer, 1, CountExpiry, &expiries)) << "it is armed";
         EXPECT_TRUE(Eventually([&] { return expiries.count == round; }));
         EXPECT_GE(Clock::now() - start, std::chrono::milliseconds(55));
         EXPECT_FALSE(VarnekPGL_IsTimerActive(timer));
     }
     EXPECT_EQ(expiries.timer, timer);
     EXPECT_NE(expiries.thread, static_cast<pid_t>(syscall(SYS_gettid)));
-    NOTE(VarnekPGL_CancelTimer(timer));  // an expired timer is already disarmed
+    NOTE(VarnekPGL_CancelTimer)(timer);  // an expired timer is already disarmed
     EXPECT_TRUE(VarnekPGL_DeleteTimer(timer));
     std::this_thread::sleep_for(std::chrono::milliseconds(100));
     EXPECT_EQ(expiries.count, 2);

@@ -69,8 +69,8 @@ TEST_F(Util, AFlippedBitInvalidatesASection) {
 TEST_F(Util, AFileCarriesItsCrc) {
     const std::string path = Path("file");
     WriteAll(path, "1234");
-    NOTE(VarnekUtil_AppendCRC32ToFile(path.c_str()));
-    NOTE(VarnekUtil_CheckFileCRC32(path.c_str()));
+    NOTE(VarnekUtil_AppendCRC32ToFile)(path);
+    NOTE(VarnekUtil_CheckFileCRC32)(path);
     EXPECT_EQ(ReadAll(path), "1234\xa6\x95\xc4\xaa");
     EXPECT_EQ(VarnekUtil_AppendCRC32ToFile(path.c_str()), TRUE);
     EXPECT_EQ(VarnekUtil_CheckFileCRC32(path.c_str()), TRUE);
@@ -81,12 +81,12 @@ TEST_F(Util, AFileCarriesItsCrc) {
 
 TEST_F(Util, FilesThatCannotCarryACrcAreRefused) {
     const std::string path = Path("file");
-    NOTE(VarnekUtil_CheckFileCRC32(path.c_str()));
-    NOTE(VarnekUtil_AppendCRC32ToFile(nullptr));
+    NOTE(VarnekUtil_CheckFileCRC32)(path);
+    NOTE(VarnekUtil_AppendCRC32ToFile)(nullptr);
     WriteAll(path, "1234567");
-    NOTE(VarnekUtil_CheckFileCRC32(path.c_str()));
+    NOTE(VarnekUtil_CheckFileCRC32)(path);
     WriteAll(path, "123");
-    NOTE(VarnekUtil_AppendCRC32ToFile(path.c_str()));
+    NOTE(VarnekUtil_AppendCRC32ToFile)(path);
     EXPECT_EQ(ReadAll(path), "123");
     // A file of the kernel states the size of a page and has only a line.
     const char *line = "/sys/devices/system/cpu/online";

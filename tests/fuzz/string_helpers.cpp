@@ -15,17 +15,18 @@ int Sign(int value) { return (value > 0) - (value < 0); }
 
 void CheckNumber(uint32_t value, uint32_t radix) {
     char text[33];
-    VarnekPGL_Itoa(value, text, radix);
+    CHECK(VarnekPGL_Itoa(value, text, radix) == text);
     if (radix >= 2 && radix <= 16) {
         CHECK(strtoull(text, nullptr, static_cast<int>(radix)) == value && strpbrk(text, "abcdef") == nullptr);
     } else {
         CHECK(text[0] == '\0');
     }
     const int32_t number = static_cast<int32_t>(value);
-    VarnekPGL_Ltoa(number, text, radix);
+    CHECK(VarnekPGL_Ltoa(number, text, radix) == text);
     if (radix >= 2 && radix <= 36) {
         const int64_t expected = radix == 10 ? int64_t{number} : int64_t{value};
-        CHECK(strtoll(text, nullptr, static_cast<int>(radix)) == expected);
+        CHECK(strtoll(text, nullptr, static_cast<int>(radix)) == expected &&
+              strpbrk(text, "ABCDEFGHIJKLMNOPQRSTUVWXYZ") == nullptr);
     } else {
         CHECK(text[0] == '\0');
     }

@@ -57,6 +57,15 @@ sigevent *Droppable(sigevent *event) {
     return event;
 }
 
+// Ends a wait with this error, or with a time-out at the moment of a signal.
+int Missed(sem_t *semaphore, int error) {
+    for (int units = 0; error == ETIMEDOUT && units == 0; sem_getvalue(semaphore, &units)) {
+        usleep(100);
+    }
+    errno = error;
+    return -1;
+}
+
 int Nameless(int result, struct stat64 *file) {
     file->st_nlink = 0;
     return result;
@@ -84,7 +93,8 @@ WRAP_POSIX(sem_init, (sem_t * s, int shared, unsigned value), s, shared, value)
 WRAP_POSIX(sem_destroy, (sem_t * s), s)
 WRAP_POSIX(sem_post, (sem_t * s), s)
 WRAP_POSIX(sem_wait, (sem_t * s), s)
-WRAP_POSIX(sem_timedwait, (sem_t * s, const timespec *time), s, time)
+// When it is to time out, a signal comes just then.
+WRAP(int, Missed(s, errno), sem_timedwait, (sem_t * s, const timespec *time), s, time)
 WRAP_POSIX(clock_gettime, (clockid_t clock, timespec *time), clock, time)
 WRAP_POSIX(timer_create, (clockid_t clock, sigevent *event, timer_t *id), clock, Droppable(event), id)
 WRAP_POSIX(timer_settime, (timer_t id, int flags, const itimerspec *now, itimerspec *old), id, flags, now, old)

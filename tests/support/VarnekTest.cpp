@@ -29,7 +29,6 @@ void Capture(int priority, const char *tag, const char *text) {
     gLog.push_back(std::move(line));
 }
 
-#define NAMED(error) std::pair(error, #error)
 constexpr std::pair<int, const char *> kErrors[] = {
     NAMED(EPERM),  NAMED(ENOENT), NAMED(EINTR),  NAMED(EIO),     NAMED(EBADF),     NAMED(ENOMEM),    NAMED(EACCES),
     NAMED(EFAULT), NAMED(EBUSY),  NAMED(EEXIST), NAMED(ENOTDIR), NAMED(EISDIR),    NAMED(EINVAL),    NAMED(EMFILE),
@@ -82,13 +81,22 @@ void VarnekTest::SetUp() {
 }
 
 void VarnekTest::Note(const std::string &call, const std::string &result) {
-    transcript_ += call + (result.empty() ? "\n" : " = " + result + "\n");
+    std::string text = call + (result.empty() ? "\n" : " = " + result + "\n");
     for (const LogLine &line : TakeLog()) {
         if (line.thread == syscall(SYS_gettid)) {
-            transcript_ += std::string("  ") + "??LMH?EP"[line.priority & 7] + " " + line.tag + " ";
-            transcript_ += std::regex_replace(line.Body(), std::regex("\n"), "\\n") + "\n";
+            text += std::string("  ") + "??LMH?EP"[line.priority & 7] + " " + line.tag + " ";
+            text += std::regex_replace(line.Body(), std::regex("\n"), "\\n") + "\n";
         }
     }
+    // A letter that is repeated very often is followed by the number.
+    for (size_t at = 0; at < text.size(); ++at) {
+        const char letter = text[at];
+        const size_t count = std::min(text.find_first_not_of(letter, at), text.size()) - at;
+        if (count > 30) {
+            text.replace(at, count, letter + ("{" + std::to_string(count) + "}"));
+        }
+    }
+    transcript_ += text;
 }
 
 std::string WithoutHandles(const std::string &text) {

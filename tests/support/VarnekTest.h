@@ -5,15 +5,19 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/resource.h>
 #include <sys/types.h>
 
 #include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <functional>
+#include <map>
 #include <random>
 #include <string>
 #include <thread>
+#include <type_traits>
 #include <utility>
 #include <vector>
 
@@ -88,6 +92,23 @@ bool Eventually(Condition condition) {
     return true;
 }
 
+// No file grows beyond `size` bytes while such an object lives.
+class FileSizeLimit {
+  public:
+    explicit FileSizeLimit(rlim_t size) {
+        signal(SIGXFSZ, SIG_IGN);
+        getrlimit(RLIMIT_FSIZE, &old_);
+        const rlimit limit = {size, old_.rlim_max};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    }
+    FileSizeLimit(const FileSizeLimit &) = delete;
+    FileSizeLimit &operator=(const FileSizeLimit &) = delete;
+    ~FileSizeLimit() { setrlimit(RLIMIT_FSIZE, &old_); }
+
+  private:
+    rlimit old_;
+};
+
 // Every level and every module is traced, and the debug configuration has been loaded.
 class VarnekTest : public ::testing::Test {
   protected:
@@ -97,25 +118,74 @@ class VarnekTest : public ::testing::Test {
     // Returns a path in this test's own folder.
     std::string Path(const std::string &name) const { return folder_ + "/" + name; }
 
-    // Appends a text, or a call's result and this thread's lines since the last TakeLog(), to the test's transcript.
-    // The transcript must equal tests/expected/SUITE.TEST.txt. A run with VARNEK_WRITE_EXPECTED in its environment
-    // writes that file.
+    // Appends a text, or a call's result and this thread's lines since the last TakeLog(), to the transcript, which
+    // must equal tests/expected/SUITE.TEST.txt. A run with VARNEK_WRITE_EXPECTED in its environment writes that file.
     void Note(const std::string &text) { transcript_ += text; }
     void Note(const std::string &call, const std::string &result);
-    void Note(const std::string &call, int64_t result) { Note(call, std::to_string(result)); }
+
     // Replaces a text that differs from run to run by `name` in the transcript. The system's handles are always hidden,
     // and its errors have their names instead of its numbers and words.
     void Show(const std::string &text, const std::string &name) { names_.emplace_back(text, name); }
 
+    // What the transcript shows for a result: its name, if the test has given it one, or else the number.
+    std::string Named(int64_t result) const {
+        const auto named = resultNames_.find(result);
+        return named != resultNames_.end() ? named->second : std::to_string(result);
+    }
+    std::map<int64_t, const char *> resultNames_;
+
+    // Returns a function that calls `function` and notes the call with the values of its arguments.
+    template <typename Result, typename... Parameters>
+    auto Noting(const std::string &name, Result (*function)(Parameters...)) {
+        return Noting(name, [function](auto... arguments) { return function(static_cast<Parameters>(arguments)...); });
+    }
+    template <typename Function>
+    auto Noting(const std::string &name, Function function) {
+        return [this, name, function](auto &&...arguments) {
+            std::string list;
+            ((list += (list.empty() ? "" : ", ") + Shown(arguments)), ...);
+            const std::string call = name + "(" + list + ")";
+            TakeLog();
+            if constexpr (std::is_void_v<decltype(function(Passed(arguments)...))>) {
+                function(Passed(arguments)...);
+                Note(call, "");
+            } else {
+                Note(call, Named(function(Passed(arguments)...)));
+            }
+        };
+    }
+
   private:
+    template <typename T>
+    static auto Passed(T &value) {
+        if constexpr (std::is_same_v<std::remove_const_t<T>, std::string>) {
+            return value.c_str();
+        } else {
+            return std::decay_t<T>(value);
+        }
+    }
+    // Texts are quoted, and an address is a star.
+    template <typename T>
+    static std::string Shown(const T &value) {
+        if constexpr (std::is_integral_v<T>) {
+            return std::is_unsigned_v<T> && value == T(WAIT_FOREVER) ? "WAIT_FOREVER" : std::to_string(value);
+        } else {
+            return std::is_null_pointer_v<T> ? "null" : "*";
+        }
+    }
+    static std::string Shown(const std::string &text) { return '"' + text + '"'; }
+    static std::string Shown(const char *const &text) {
+        return text != nullptr ? '"' + std::string(text) + '"' : "null";
+    }
+
     std::string folder_, transcript_;
     std::vector<std::pair<std::string, std::string>> names_{{VARNEK_DATA_DIR, "DATA/"}, {VARNEK_SYSTEM_DIR, "SYSTEM/"}};
 };
 
-// Notes a call with its source text, a call without a result, and a call under a label that says what the variables in
-// its source text are.
-#define NOTE(...) (TakeLog(), Note(#__VA_ARGS__, (__VA_ARGS__)))
-#define NOTE_VOID(...) (TakeLog(), (__VA_ARGS__), Note(#__VA_ARGS__, ""))
-#define NOTE_AS(label, ...) (TakeLog(), Note(label, (__VA_ARGS__)))
+// NOTE(VarnekPGL_DeleteMutex)(-1) notes this call.
+#define NOTE(function) Noting(#function, function)
+
+// A constant and its name.
+#define NAMED(constant) std::pair(constant, #constant)
 
 #endif
