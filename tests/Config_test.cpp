@@ -15,16 +15,14 @@
 
 namespace {
 
-const std::string kPath = VARNEK_DATA_DIR "Varnek_Config.cfg";
-
 class ConfigAlone : public VarnekTest {
   protected:
     // Loads this content, saves the settings and returns the saved file.
     static std::string Reloaded(const std::string &content) {
-        WriteAll(kPath, content);
+        WriteAll(kSettingsFile, content);
         VarnekCfg_LoadConfigFile();
         VarnekCfg_SaveConfigFile();
-        return ReadAll(kPath);
+        return ReadAll(kSettingsFile);
     }
     VarnekConfigInfo &info_ = *VarnekCfg_GetConfigInfo();
 };
@@ -39,22 +37,22 @@ std::string File(const std::string &area, int64_t standard, int capture, int sim
 TEST_F(ConfigAlone, SavesOnChangeAndLoadsOnDemand) {
     NOTE(VarnekCfg_LoadConfigFile)();
     NOTE(VarnekCfg_SetStandard)(2);
-    EXPECT_FALSE(std::filesystem::exists(kPath)) << "the standard had not changed";
+    EXPECT_FALSE(std::filesystem::exists(kSettingsFile)) << "the standard had not changed";
     NOTE(VarnekCfg_SetStandard)(-3);
-    EXPECT_EQ(ReadAll(kPath), File("", -3, 0, 0, 68, ""));
-    WriteAll(kPath, File("", 0, 1, 2, 0, "ARG"));
+    EXPECT_EQ(ReadAll(kSettingsFile), File("", -3, 0, 0, 68, ""));
+    WriteAll(kSettingsFile, File("", 0, 1, 2, 0, "ARG"));
     NOTE(VarnekCfg_GetTSCaptueEnable)();
     info_.standardType = 0;
     NOTE(VarnekCfg_GetTSCaptueEnable)();
     info_.tsFileSimulEnable = 0;
     EXPECT_EQ(VarnekCfg_GetTSFileSimulEnable(), 2);
-    WriteAll(kPath, File("", 7, 0, 0, 0, "ARG"));
+    WriteAll(kSettingsFile, File("", 7, 0, 0, 0, "ARG"));
     EXPECT_EQ(VarnekCfg_GetStandard(), 7);
 }
 
 TEST_F(ConfigAlone, LinesAreTracedAsTheyAreRead) {
     const std::string file = "config_standardtype= +3x\r\n#nothing\n\rxCONFIG_TSCAPTURE=1\n";
-    WriteAll(kPath, file);
+    WriteAll(kSettingsFile, file);
     NOTE(VarnekCfg_LoadConfigFile)();
     EXPECT_EQ(Reloaded(file), File("", 3, 1, 0, 0, "BRA"));
 }
@@ -93,37 +91,37 @@ TEST_F(ConfigAlone, AnyFileLoads) {
     memset(info_.supportNation, 'x', sizeof info_.supportNation);
     info_.standardType = info_.cprmPlayerDelay = INT32_MIN;
     VarnekCfg_SaveConfigFile();
-    EXPECT_EQ(ReadAll(kPath), File(cut, INT32_MIN, 0, 0, INT32_MIN, cut));
+    EXPECT_EQ(ReadAll(kSettingsFile), File(cut, INT32_MIN, 0, 0, INT32_MIN, cut));
 }
 
 TEST_F(ConfigAlone, AnUnreadableFileLeavesTheSettings) {
     const std::function<void()> makers[] = {
-        [] { std::filesystem::create_directory(kPath); },
-        [] { mkfifo(kPath.c_str(), 0666); },
-        [] { WriteAll(kPath, std::string((1 << 20) + 1, '\n')); },
+        [] { std::filesystem::create_directory(kSettingsFile); },
+        [] { mkfifo(kSettingsFile, 0666); },
+        [] { WriteAll(kSettingsFile, std::string((1 << 20) + 1, '\n')); },
     };
     for (const auto &make : makers) {
         make();
         NOTE(VarnekCfg_LoadConfigFile)();
         EXPECT_EQ(info_.cprmPlayerDelay, 68);
-        std::filesystem::remove(kPath);
+        std::filesystem::remove(kSettingsFile);
     }
 }
 
 TEST_F(ConfigAlone, ASaveKeepsTheModeAndTheLinks) {
     const std::string other = std::filesystem::absolute(Path("other"));
-    WriteAll(kPath, "");
-    chmod(kPath.c_str(), 0640);
-    const bool mayChange = chown(kPath.c_str(), static_cast<uid_t>(-1), 1234) == 0;  // only root may
+    WriteAll(kSettingsFile, "");
+    chmod(kSettingsFile, 0640);
+    const bool mayChange = chown(kSettingsFile, static_cast<uid_t>(-1), 1234) == 0;  // only root may
     VarnekCfg_SaveConfigFile();
     struct stat saved = {};
-    EXPECT_EQ(stat(kPath.c_str(), &saved), 0);
+    EXPECT_EQ(stat(kSettingsFile, &saved), 0);
     EXPECT_TRUE(saved.st_gid == 1234 || !mayChange);
-    EXPECT_EQ(std::filesystem::status(kPath).permissions(), static_cast<std::filesystem::perms>(0640));
+    EXPECT_EQ(std::filesystem::status(kSettingsFile).permissions(), static_cast<std::filesystem::perms>(0640));
     for (const bool hard : {true, false}) {
-        std::filesystem::remove(kPath);
+        std::filesystem::remove(kSettingsFile);
         WriteAll(other, "");
-        EXPECT_EQ((hard ? link : symlink)(other.c_str(), kPath.c_str()), 0);
+        EXPECT_EQ((hard ? link : symlink)(other.c_str(), kSettingsFile), 0);
         VarnekCfg_SaveConfigFile();
         EXPECT_EQ(ReadAll(other), File("", 2, 0, 0, 68, "")) << "the save did not write to the linked file";
     }
@@ -155,17 +153,17 @@ TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
         VarnekCfg_SaveConfigFile();
         Note("saving " + where, "");
     };
-    std::filesystem::create_symlink("/dev/full", kPath);
+    std::filesystem::create_symlink("/dev/full", kSettingsFile);
     save("to a full device");
-    EXPECT_TRUE(std::filesystem::remove(kPath));
-    std::filesystem::create_directory(kPath);
+    EXPECT_TRUE(std::filesystem::remove(kSettingsFile));
+    std::filesystem::create_directory(kSettingsFile);
     save("to a directory");
-    EXPECT_TRUE(std::filesystem::remove(kPath));
-    WriteAll(kPath, "protected");
-    chmod(kPath.c_str(), 0444);
+    EXPECT_TRUE(std::filesystem::remove(kSettingsFile));
+    WriteAll(kSettingsFile, "protected");
+    chmod(kSettingsFile, 0444);
     save("to a protected file");
-    EXPECT_EQ(ReadAll(kPath), "protected");
-    std::filesystem::remove(kPath);
+    EXPECT_EQ(ReadAll(kSettingsFile), "protected");
+    std::filesystem::remove(kSettingsFile);
     const std::string data = std::filesystem::path(VARNEK_DATA_DIR).parent_path();
     std::filesystem::rename(data, Path("aside"));
     save("without the data directory");
@@ -185,29 +183,29 @@ TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
     for (const bool inPlace : {false, true}) {
         for (const size_t oldLength : {1u, 20u, 99u}) {
             for (rlim_t limit = 0; limit < 260; limit += 13) {
-                std::filesystem::remove(kPath);
+                std::filesystem::remove(kSettingsFile);
                 std::filesystem::remove(Path("second name"));
                 area('a', oldLength);
                 VarnekCfg_SaveConfigFile();
-                const std::string before = ReadAll(kPath);
+                const std::string before = ReadAll(kSettingsFile);
                 if (inPlace) {
-                    std::filesystem::create_hard_link(kPath, Path("second name"));
+                    std::filesystem::create_hard_link(kSettingsFile, Path("second name"));
                 }
                 area('b', 50);
                 saveLimited(limit);
                 const std::string after = File(std::string(50, 'b'), 2, 0, 0, 68, "");
-                EXPECT_EQ(ReadAll(kPath), limit < after.size() ? before : after) << limit;
+                EXPECT_EQ(ReadAll(kSettingsFile), limit < after.size() ? before : after) << limit;
             }
         }
     }
     // Where there was no file, none is left that a load would take for empty settings.
-    std::filesystem::remove(kPath);
+    std::filesystem::remove(kSettingsFile);
     saveLimited(0);
-    EXPECT_FALSE(std::filesystem::exists(kPath));
+    EXPECT_FALSE(std::filesystem::exists(kSettingsFile));
 }
 
 TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
-    WriteAll(VARNEK_DATA_DIR "debug_ltn.ini", "# off");
+    WriteAll(kDebugFile, "# off");
     VarnekPGL_InitializeDebug();
     const auto save = [this](char letter) {
         memset(info_.currentAreaName, 0, sizeof info_.currentAreaName);
@@ -238,13 +236,13 @@ TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
             }
         });
         for (int left = round % 20; left > 0; --left) {
-            EXPECT_TRUE(isWhole(ReadAll(kPath)));
+            EXPECT_TRUE(isWhole(ReadAll(kSettingsFile)));
         }
         for (const pid_t child : children) {
             kill(child, SIGKILL);
             waitpid(child, nullptr, 0);
         }
-        EXPECT_TRUE(isWhole(ReadAll(kPath)));
+        EXPECT_TRUE(isWhole(ReadAll(kSettingsFile)));
     }
     // One that an earlier process with this id has left, too.
     WriteAll(VARNEK_DATA_DIR "Varnek_Config.new." + std::to_string(getpid()) + ".57", "left");
@@ -253,7 +251,7 @@ TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
         EXPECT_EQ(entry.path().filename().string().rfind("Varnek_Config.new", 0), std::string::npos);
     }
     // Savers that write in place check each other's text.
-    std::filesystem::create_hard_link(kPath, Path("second name"));
+    std::filesystem::create_hard_link(kSettingsFile, Path("second name"));
     for (int round = 0; round < 50; ++round) {
         const auto children = fork2([&save](int index) {
             for (int i = 0; i < 20; ++i) {
@@ -263,7 +261,7 @@ TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
         for (const pid_t child : children) {
             waitpid(child, nullptr, 0);
         }
-        ASSERT_TRUE(isWhole(ReadAll(kPath))) << ReadAll(kPath);
+        ASSERT_TRUE(isWhole(ReadAll(kSettingsFile))) << ReadAll(kSettingsFile);
     }
 }
 

@@ -14,8 +14,6 @@ using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 
 constexpr uint32_t kErrorOfCommon = VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON;
-constexpr char kWorking[] = VARNEK_DATA_DIR "debug_ltn.ini";
-constexpr char kDefault[] = VARNEK_SYSTEM_DIR "debug_ltn.ini";
 
 // Starts from a process that has not traced yet and from empty directories.
 class DebugAlone : public VarnekTest {
@@ -23,12 +21,12 @@ class DebugAlone : public VarnekTest {
     void SetUp() override {
         LeaveClean();
         std::filesystem::create_directories(VARNEK_SYSTEM_DIR);
-        std::filesystem::remove(kDefault);
+        std::filesystem::remove(kShippedDebugFile);
     }
     void TearDown() override {
         VarnekTest::TearDown();
         gLogHook = nullptr;
-        WriteAll(kDefault, ReadAll(TestFile("defaults/debug_ltn.ini")));
+        WriteAll(kShippedDebugFile, ReadAll(TestFile("defaults/debug_ltn.ini")));
     }
 
     // Returns the levels and modules that a load's summary shows as enabled, and each line that is no part of one.
@@ -54,7 +52,7 @@ class DebugAlone : public VarnekTest {
 };
 
 TEST_F(DebugAlone, EveryLevelAndModuleHasItsPriorityAndTag) {
-    WriteAll(kWorking,
+    WriteAll(kDebugFile,
              "LogToUSB=1\nError=1\r\nHigh=1\r\rMid=1\nLow=1\nCommon=1\nJNI=1\nMainControl=1\nESG=1\n"
              "SessionManager=1\nSectionParser=1\nDsmccDC=1\nDsmccOC=1\nTsDemux=1\nCPRM=1\n"
              "SMPlayer=1\nGingaAppMgr=1");
@@ -100,7 +98,7 @@ TEST_F(DebugAlone, ALineEnablesByTheFirstKeyInIt) {
          true},
     };
     for (const auto &row : rows) {
-        WriteAll(kWorking, row.file);
+        WriteAll(kDebugFile, row.file);
         TakeLog();
         VarnekPGL_InitializeDebug();
         EXPECT_EQ(Enabled(TakeBodies()), row.enabled) << row.file;
@@ -112,31 +110,31 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
     VARNEK_TRACE(kErrorOfCommon, "it loads");
     Note("the first trace", "");
     TakeLog();
-    WriteAll(kDefault, "LogToUSB=1\nError=1\nCommon=1\n");
+    WriteAll(kShippedDebugFile, "LogToUSB=1\nError=1\nCommon=1\n");
     VARNEK_TRACE(kErrorOfCommon, "a failed load is not tried again");
     EXPECT_THAT(TakeLog(), IsEmpty());
     const auto load = [] { return VarnekPGL_InitializeDebug(), Enabled(TakeBodies()); };
-    WriteAll(kWorking, "");
+    WriteAll(kDebugFile, "");
     EXPECT_THAT(load(), ElementsAre("Debug Configuration File Doesn't exist!\n"));
     for (const bool directory : {true, false}) {
-        std::filesystem::remove(kWorking);
-        EXPECT_EQ(directory ? mkdir(kWorking, 0777) : mkfifo(kWorking, 0666), 0);
+        std::filesystem::remove(kDebugFile);
+        EXPECT_EQ(directory ? mkdir(kDebugFile, 0777) : mkfifo(kDebugFile, 0666), 0);
         EXPECT_THAT(load(), ElementsAre("Debug Configuration File Doesn't exist!\n"));
         VarnekPGL_changeModeForDebug();
         TakeLog();
     }
-    std::filesystem::remove(kWorking);
-    WriteAll(kWorking, std::string((1 << 20) + 1, '#'));
+    std::filesystem::remove(kDebugFile);
+    WriteAll(kDebugFile, std::string((1 << 20) + 1, '#'));
     NOTE(VarnekPGL_InitializeDebug)();  // more than 1 MiB
-    std::filesystem::remove(kWorking);
+    std::filesystem::remove(kDebugFile);
     NOTE(VarnekPGL_InitializeDebug)();
-    EXPECT_EQ(ReadAll(kWorking), ReadAll(kDefault)) << "the working copy is not the default file";
+    EXPECT_EQ(ReadAll(kDebugFile), ReadAll(kShippedDebugFile)) << "the working copy is not the default file";
     EXPECT_TRUE(Passes(kErrorOfCommon));
     EXPECT_FALSE(Passes(VARNEK_LEVEL_ERROR | VARNEK_MODULE_JNI));
 }
 
 TEST_F(DebugAlone, EightFirstTracesLoadOnceAndAllGetThrough) {
-    WriteAll(kWorking, "LogToUSB=1\nError=1\nCommon=1\n");
+    WriteAll(kDebugFile, "LogToUSB=1\nError=1\nCommon=1\n");
     AtOnce(8, [](int) { VARNEK_TRACE(kErrorOfCommon, "here"); });
     const std::vector<LogLine> lines = TakeLog();
     const auto count = [&lines](const char *tag) {
@@ -147,7 +145,7 @@ TEST_F(DebugAlone, EightFirstTracesLoadOnceAndAllGetThrough) {
 }
 
 TEST_F(DebugAlone, ALogFunctionMayTrace) {
-    WriteAll(kWorking, "LogToUSB=1\nHigh=1\nCommon=1\n");
+    WriteAll(kDebugFile, "LogToUSB=1\nHigh=1\nCommon=1\n");
     gLogHook = [](const LogLine &line) {
         if (line.tag == "SBTVD") {
             VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_COMMON, "from the log function");
@@ -159,23 +157,23 @@ TEST_F(DebugAlone, ALogFunctionMayTrace) {
 }
 
 TEST_F(DebugAlone, MakesTheDebugFilesWritableForEveryUser) {
-    const auto modeAfter = [](const std::string &path) {
+    const auto modeAfter = [](const char *path) {
         VarnekPGL_changeModeForDebug();
         struct stat status = {};
-        EXPECT_EQ(stat(path.c_str(), &status), 0);
+        EXPECT_EQ(stat(path, &status), 0);
         return status.st_mode & 0777u;
     };
-    for (const std::string &path : {std::string(kWorking), std::string(VARNEK_DATA_DIR "Varnek_Config.cfg")}) {
+    for (const char *path : {kDebugFile, kSettingsFile}) {
         WriteAll(path, "#");
-        chmod(path.c_str(), 0600);
+        chmod(path, 0600);
         EXPECT_EQ(modeAfter(path), 0666u) << path;
     }
     // A link may lead to a file that only the administrator may write.
-    WriteAll(kDefault, "#");
-    chmod(kDefault, 0644);
-    std::filesystem::remove(kWorking);
-    std::filesystem::create_symlink(kDefault, kWorking);
-    EXPECT_EQ(modeAfter(kDefault), 0644u);
+    WriteAll(kShippedDebugFile, "#");
+    chmod(kShippedDebugFile, 0644);
+    std::filesystem::remove(kDebugFile);
+    std::filesystem::create_symlink(kShippedDebugFile, kDebugFile);
+    EXPECT_EQ(modeAfter(kShippedDebugFile), 0644u);
 }
 
 class Trace : public VarnekTest {};

@@ -33,6 +33,9 @@
 
 namespace {
 
+using ::testing::ElementsAre;
+using ::testing::IsEmpty;
+
 class Fault : public VarnekTest {
   protected:
     // Returns the results of several calls, in their order.
@@ -42,22 +45,6 @@ class Fault : public VarnekTest {
             text += (text.empty() ? "" : " ") + Named(result);
         }
         return text;
-    }
-
-    // Returns a function that notes a call of `function`, in which the next call of `failing` fails.
-    template <typename Function>
-    auto Failing(const std::string &failing, int error, const char *name, Function function) {
-        return Noting(failing + " fails: " + name, [failing, error, function](auto... arguments) {
-            FailCall(failing.c_str(), 1, error);
-            if constexpr (std::is_void_v<decltype(function(arguments...))>) {
-                function(arguments...);
-                FailCall(failing.c_str(), 0, 0);
-            } else {
-                const auto result = function(arguments...);
-                FailCall(failing.c_str(), 0, 0);
-                return result;
-            }
-        });
     }
 
     // Runs an operation that leaves nothing behind while the first, second, ... call of each function fails, until no
@@ -116,18 +103,26 @@ class Fault : public VarnekTest {
     }
 };
 
-#define FAULT(failing, error, function) Failing(failing, error, #function, function)
-
 TEST_F(Fault, AMutexSurvivesEachFailingCall) {
-    // The first thread makes the guard of all threads.
-    FAULT("pthread_mutex_init", ENOMEM, VarnekPGL_CreateThread)("new", 1, 0u, Nothing, nullptr);
+    FailCall("pthread_mutex_init", 1, ENOMEM);
+    NOTE(VarnekPGL_CreateThread)("new", 1, 0, Nothing, nullptr);  // the first thread makes the guard of all
     const int32_t mutex = VarnekPGL_CreateMutex("mutex");
-    FAULT("pthread_mutex_lock", EINVAL, VarnekPGL_AcquireMutex)(mutex);
-    EXPECT_TRUE(VarnekPGL_AcquireMutex(mutex));
-    FAULT("pthread_mutex_unlock", EPERM, VarnekPGL_ReleaseMutex)(mutex);
-    EXPECT_TRUE(VarnekPGL_ReleaseMutex(mutex));
-    FAULT("pthread_mutex_destroy", EBUSY, VarnekPGL_DeleteMutex)(mutex);
-    EXPECT_TRUE(VarnekPGL_AcquireMutex(mutex) && VarnekPGL_ReleaseMutex(mutex) && VarnekPGL_DeleteMutex(mutex));
+    const struct {
+        const char *call;
+        BOOL (*operation)(int32_t);
+        const char *error;
+    } rows[] = {
+        {"pthread_mutex_lock", VarnekPGL_AcquireMutex, "VarnekPGL_AcquireMutex : Mutex Lock"},
+        {"pthread_mutex_unlock", VarnekPGL_ReleaseMutex, "VarnekPGL_ReleaseMutex : Mutex Unlock"},
+        {"pthread_mutex_destroy", VarnekPGL_DeleteMutex, "VarnekPGL_DeleteMutex : Mutex Destroy"},
+    };
+    for (const auto &[call, operation, error] : rows) {
+        TakeLog();
+        FailCall(call, 1, EINVAL);
+        EXPECT_FALSE(operation(mutex));
+        EXPECT_THAT(TakeErrors(), ElementsAre("***** " + std::string(error) + " FAIL! errCode = [22]"));
+        EXPECT_TRUE(operation(mutex)) << call;
+    }
 }
 
 TEST_F(Fault, APostThatFailsLetsTheNextWakeTheOwner) {
@@ -148,9 +143,10 @@ TEST_F(Fault, APostThatFailsLetsTheNextWakeTheOwner) {
         VarnekPGL_MSleep(1);
         FailCall("sem_post", 1, EOVERFLOW);
     } while (VarnekPGL_SendMessage(1, &message));
-    EXPECT_EQ(TakeErrors(),
-              std::vector<std::string>{"***** VarnekPGL_SendMessage: Semaphore Post FAIL. errCode = [75]"});
-    FAULT("sem_post", EOVERFLOW, VarnekPGL_SendUrgentMessage)(1, &urgent);
+    FailCall("sem_post", 1, EOVERFLOW);
+    EXPECT_FALSE(VarnekPGL_SendUrgentMessage(1, &urgent));
+    EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_SendMessage: Semaphore Post FAIL. errCode = [75]",
+                                          "***** VarnekPGL_SendUrgentMessage: Semaphore Post FAIL. errCode = [75]"));
     EXPECT_TRUE(VarnekPGL_SendMessage(1, &message));
     auto woken = left.get_future();
     EXPECT_EQ(woken.wait_for(std::chrono::seconds(20)), std::future_status::ready);
@@ -160,29 +156,23 @@ TEST_F(Fault, APostThatFailsLetsTheNextWakeTheOwner) {
 
 TEST_F(Fault, AReceiveReportsWhyItsWaitEnded) {
     varnek::Thread("worker", 256 * 1024, [] {
-        const THREAD_MSG message = {};
-        THREAD_MSG received;
+        THREAD_MSG message = {};
         int32_t count = -1;
-        const auto receive = [&](uint32_t timeout) { return VarnekPGL_ReceiveMessage(timeout, &received, &count); };
-        const auto error = [](const std::string &number) {
-            return std::vector<std::string>{"***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [" +
-                                            number + "]"};
-        };
         for (const auto send : {VarnekPGL_SendMessage, VarnekPGL_SendUrgentMessage}) {
             FailCall("malloc", 1, ENOMEM);
-            EXPECT_FALSE(send(1, &message));
+            EXPECT_FALSE(send(1, &message)) << "and it leaves neither a message nor a signal";
         }
-        TakeLog();
-        EXPECT_FALSE(receive(0)) << "a failed send leaves a message or a signal";
-        EXPECT_EQ(TakeErrors(), error(std::to_string(ETIMEDOUT)));
-        FailCall("sem_wait", 1, EINTR);
-        EXPECT_FALSE(receive(WAIT_FOREVER));
-        EXPECT_EQ(TakeErrors(), error(std::to_string(EINTR)));
-        FailCall("clock_gettime", 1, EFAULT);
-        EXPECT_FALSE(receive(7));
-        EXPECT_EQ(TakeErrors(), error(std::to_string(EFAULT)));
+        for (const auto &[call, error, timeout] : {std::tuple("sem_timedwait", EINTR, 9u),
+                                                   {"sem_wait", EINTR, WAIT_FOREVER},
+                                                   {"clock_gettime", EFAULT, 9u}}) {
+            TakeLog();
+            FailCall(call, 1, error);
+            EXPECT_FALSE(VarnekPGL_ReceiveMessage(timeout, &message, &count));
+            EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_ReceiveMessage: Semaphore wait FAIL. errCode = [" +
+                                                  std::to_string(error) + "]"));
+        }
     }).Join();
-    EXPECT_EQ(TakeErrors(), std::vector<std::string>()) << "the queue was not empty";
+    EXPECT_THAT(TakeErrors(), IsEmpty()) << "the queue was not empty";
 }
 
 TEST_F(Fault, AMessageThatComesAsTheWaitTimesOutIsReceived) {
@@ -218,7 +208,8 @@ TEST_F(Fault, ADroppedExpiryIsDeliveredWhateverTheNextStartAsksFor) {
         FailCall(call, 1, EAGAIN);
         EXPECT_FALSE(startLong());
     }
-    FAULT("malloc", ENOMEM, VarnekPGL_StartTimer)(0u, 10000u, count, &second);
+    FailCall("malloc", 1, ENOMEM);
+    NOTE(VarnekPGL_StartTimer)(0, 10000, count, &second);
     const auto start = std::chrono::steady_clock::now();
     EXPECT_TRUE(startLong());
     EXPECT_TRUE(Eventually([&] { return first == 1; }));
@@ -239,28 +230,26 @@ TEST_F(Fault, ADroppedExpiryIsDeliveredWhateverTheNextStartAsksFor) {
 class FaultAlone : public Fault {};
 
 TEST_F(FaultAlone, OnlyAMissingDebugConfigurationIsSeeded) {
-    const std::string working = VARNEK_DATA_DIR "debug_ltn.ini", shipped = VARNEK_SYSTEM_DIR "debug_ltn.ini";
-    const std::string own = ReadAll(working);
-    WriteAll(shipped, "LogToUSB=1\n");
+    const std::string own = ReadAll(kDebugFile);
+    WriteAll(kShippedDebugFile, "LogToUSB=1\n");
     FailCall("fopen", 1, EMFILE);
     VarnekPGL_InitializeDebug();
-    std::filesystem::remove(shipped);
-    EXPECT_EQ(ReadAll(working), own);
+    std::filesystem::remove(kShippedDebugFile);
+    EXPECT_EQ(ReadAll(kDebugFile), own);
 }
 
 TEST_F(FaultAlone, ASaveReplacesAFileThatAnotherHasJustReplacedAndFollowsNoPlantedLink) {
-    const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg";
     const std::string draft = VARNEK_DATA_DIR "Varnek_Config.new." + std::to_string(getpid()) + ".";
-    WriteAll(settings, "old");
-    std::filesystem::create_hard_link(settings, Path("second name"));
+    WriteAll(kSettingsFile, "old");
+    std::filesystem::create_hard_link(kSettingsFile, Path("second name"));
     FailCall("lstat64", 1, 0);  // a link count of 0 ...
     VarnekCfg_SaveConfigFile();
-    EXPECT_NE(ReadAll(settings), "old") << "two names are written in place";
+    EXPECT_NE(ReadAll(kSettingsFile), "old") << "two names are written in place";
     std::filesystem::remove(Path("second name"));
-    std::filesystem::create_hard_link(settings, Path("open"));
-    std::filesystem::remove(settings);
-    WriteAll(settings, "old");
-    const int reader = open(settings.c_str(), O_RDONLY);
+    std::filesystem::create_hard_link(kSettingsFile, Path("open"));
+    std::filesystem::remove(kSettingsFile);
+    WriteAll(kSettingsFile, "old");
+    const int reader = open(kSettingsFile, O_RDONLY);
     FailCall("lstat64", 1, 0);  // ... is no second name
     VarnekCfg_SaveConfigFile();
     char text[3] = {};
@@ -393,10 +382,6 @@ TEST_F(Fault, ValuesSurviveEachFailingCall) {
         free(text);
         return result;
     });
-    Force("clock", [this] {
-        PglMilliTime now;
-        return Results({VarnekPGL_GetMilliseconds(&now)});
-    });
 }
 
 TEST_F(Fault, FilesSurviveEachFailingCall) {
@@ -483,7 +468,7 @@ TEST_F(Fault, DirectoriesSurviveEachFailingCall) {
 TEST_F(FaultAlone, ConfigurationsSurviveEachFailingCall) {
     VarnekConfigInfo initial = *VarnekCfg_GetConfigInfo();
     strcpy(initial.supportNation, "BRA");
-    const std::string settings = VARNEK_DATA_DIR "Varnek_Config.cfg", draft = VARNEK_DATA_DIR "Varnek_Config.new.";
+    const std::string draft = VARNEK_DATA_DIR "Varnek_Config.new.";
     const auto saveAndLoad = [&] {
         WriteAll(draft + "999999999.0", "of no process");
         *VarnekCfg_GetConfigInfo() = initial;
@@ -496,10 +481,11 @@ TEST_F(FaultAlone, ConfigurationsSurviveEachFailingCall) {
         return Results({VarnekCfg_GetConfigInfo()->cprmPlayerDelay});
     };
     Force("settings", saveAndLoad);
-    std::filesystem::create_hard_link(settings, Path("second name"));
-    Force("settings in place", [&] { return WriteAll(settings, std::string(400, '\n')), saveAndLoad(); });
+    std::filesystem::create_hard_link(kSettingsFile, Path("second name"));
+    Force("settings in place", [&] { return WriteAll(kSettingsFile, std::string(400, '\n')), saveAndLoad(); });
     Force("debug configuration", [] { return VarnekPGL_InitializeDebug(), std::string("loaded"); });
-    FAULT("malloc", ENOMEM, VarnekCfg_LoadConfigFile)();
+    FailCall("malloc", 1, ENOMEM);
+    NOTE(VarnekCfg_LoadConfigFile)();
 }
 
 }  // namespace

@@ -106,14 +106,12 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_AppendFile)("/no/dir", "x", 1);
     NOTE(VarnekPGL_WriteFile)(Path("w"), nullptr, 1);
     NOTE(VarnekPGL_AppendFile)(Path("w"), nullptr, 1);
-    VarnekPGL_CloseFile(full);
-    VarnekPGL_CloseFile(writer);
-}
-
-TEST_F(File, AFullDiskIsNotReportedAsStored) {
+    // A full disk is not reported as stored.
     NOTE(VarnekPGL_WriteFile)("/dev/full", "abc", 3);
     NOTE(VarnekPGL_AppendFile)("/dev/full", "abc", 3);
     NOTE(VarnekPGL_AppendFile)("/dev/full", std::vector<char>(100000).data(), 100000);
+    VarnekPGL_CloseFile(full);
+    VarnekPGL_CloseFile(writer);
 }
 
 TEST_F(File, SizesAndPositions) {
@@ -299,45 +297,40 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     EXPECT_FALSE(fs::exists(none));
 }
 
-TEST_F(Directory, ListingGivesTypesAndEndsWithItsLine) {
-    fs::create_directory(Path("sub"));
-    WriteAll(Path("file"), "");
-    fs::create_symlink("sub", Path("link"));
-    void *dir = VarnekPGL_OpenDir(Path("").c_str());
+// Returns what a directory's listing shows.
+std::map<std::string, uint32_t> ListingOf(const std::string &path) {
+    std::map<std::string, uint32_t> types;
+    void *const directory = VarnekPGL_OpenDir(path.c_str());
     PglDirEntryInfo info;
-    std::multimap<std::string, uint32_t> types;
-    while (VarnekPGL_ReadDir(dir, &info)) {
-        types.emplace(info.name, info.type);
+    while (VarnekPGL_ReadDir(directory, &info)) {
+        types[info.name] = info.type;
     }
-    for (const auto &[name, type] : types) {
-        Note(name + " " + std::to_string(type) + "\n");
-    }
-    NOTE(VarnekPGL_ReadDir)(dir, &info);
     EXPECT_EQ(info.type, 0u);
-    EXPECT_EQ(VarnekPGL_CloseDir(dir), TRUE);
-    PglFmFileAttributes attributes;
-    memset(&attributes, 0xFF, sizeof attributes);
-    WriteAll(Path("file"), "12345");
-    EXPECT_TRUE(VarnekPGL_FmGetFileAttributes(Path("file").c_str(), &attributes));
-    PglFmFileAttributes expected = {};
-    expected.size = 5;
-    EXPECT_EQ(memcmp(&attributes, &expected, sizeof expected), 0);
+    EXPECT_EQ(VarnekPGL_CloseDir(directory), TRUE);
+    return types;
 }
 
-TEST_F(Directory, AListingEndsAtANameOfMoreThan236Bytes) {
+TEST_F(Directory, AListingGivesTypesAndEndsAtANameOfMoreThan236Bytes) {
+    fs::create_directory(Path("sub"));
+    WriteAll(Path("file"), "12345");
+    fs::create_symlink("sub", Path("link"));
+    EXPECT_EQ(ListingOf(Path("")), (std::map<std::string, uint32_t>{{".", PGL_ENTRY_DIR},
+                                                                    {"..", PGL_ENTRY_DIR},
+                                                                    {"file", PGL_ENTRY_FILE},
+                                                                    {"link", PGL_ENTRY_FILE},
+                                                                    {"sub", PGL_ENTRY_DIR}}));
+    EXPECT_THAT(TakeErrors(), ElementsAre(::testing::StartsWith("__VarnekPGL_ReadDir : return FALSE pDir = 0x")));
     for (const size_t length : {236u, 237u}) {
-        const std::string sub = Path(std::to_string(length));
-        fs::create_directory(sub);
-        WriteAll(sub + "/" + std::string(length, 'n'), "");
-        void *dir = VarnekPGL_OpenDir(sub.c_str());
-        PglDirEntryInfo info;
-        bool listed = false;
-        while (VarnekPGL_ReadDir(dir, &info)) {
-            listed |= info.name == std::string(length, 'n');
-        }
-        VarnekPGL_CloseDir(dir);
-        EXPECT_EQ(listed, length == 236) << length;
+        const std::string name(length, 'n');
+        WriteAll(Path("sub/" + name), "");
+        EXPECT_EQ(ListingOf(Path("sub")).count(name), length == 236 ? 1u : 0u);
+        fs::remove(Path("sub/" + name));
     }
+    PglFmFileAttributes attributes, expected = {};
+    memset(&attributes, 0xFF, sizeof attributes);
+    expected.size = 5;
+    EXPECT_TRUE(VarnekPGL_FmGetFileAttributes(Path("file").c_str(), &attributes));
+    EXPECT_EQ(memcmp(&attributes, &expected, sizeof expected), 0);
 }
 
 TEST_F(Directory, TreesAreDeletedWholeAndNothingElse) {
@@ -447,11 +440,9 @@ TEST_F(Command, RefusalsKeepTheDestination) {
 TEST_F(Command, ChmodTakesThreeModesAndReturnsTheStatus) {
     const std::string path = Path("file");
     WriteAll(path, "");
-    for (int32_t mode : {666, 755, 777}) {
+    for (const auto &[mode, permissions] : {std::pair(666, 0666), {755, 0755}, {777, 0777}}) {
         EXPECT_EQ(VarnekPGL_Chmod(path.c_str(), mode), 0);
-        struct stat status = {};
-        stat(path.c_str(), &status);
-        EXPECT_EQ(status.st_mode & 0777u, std::stoul(std::to_string(mode), nullptr, 8));
+        EXPECT_EQ(fs::status(path).permissions(), static_cast<fs::perms>(permissions));
     }
     NOTE(VarnekPGL_Chmod)(path, 644);
     NOTE(VarnekPGL_Chmod)(Path("none"), 666);  // exit status 1, as system() returns it

@@ -11,9 +11,9 @@ extern "C" const char *__asan_default_options();
 // Freed memory waits in a small quarantine. Blocks are small here, and cold memory costs a third of a run.
 const char *__asan_default_options() { return "quarantine_size_mb=1:malloc_context_size=8"; }
 
-void WriteDataFile(const std::string &name, const std::string &content) {
+void WriteInPlace(const char *path, const std::string &content) {
     // Opened each time, since a save of the library replaces the file.
-    const int fd = open((VARNEK_DATA_DIR + name).c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0666);
+    const int fd = open(path, O_WRONLY | O_CREAT | O_CLOEXEC, 0666);
     CHECK(fd >= 0);
     CHECK(write(fd, content.data(), content.size()) == static_cast<ssize_t>(content.size()));
     CHECK(ftruncate(fd, static_cast<off_t>(content.size())) == 0);

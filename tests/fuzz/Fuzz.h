@@ -13,8 +13,8 @@
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
 
-// Writes a file in the library's data directory in place, since a new file each time would cost more than all the rest.
-void WriteDataFile(const std::string &name, const std::string &content);
+// Writes a file in place, since a new file each time would cost more than all the rest.
+void WriteInPlace(const char *path, const std::string &content);
 
 // The input's bytes in order, and zeros after its end.
 class Input {

@@ -7,7 +7,7 @@
 
 int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     Input input(data, size);
-    WriteDataFile("Varnek_Config.cfg", input.Text().data());
+    WriteInPlace(kSettingsFile, input.Text().data());
     const std::vector<char> feature = input.Text();
     gFeature = feature.data();
 

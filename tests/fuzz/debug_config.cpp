@@ -22,7 +22,7 @@ void OnLog(int, const char *tag, const char *text) {
 
 // Loads a text, tries all traces, and counts those of each level and of each module that reach the log.
 Masks Load(const std::string &text) {
-    WriteDataFile("debug_ltn.ini", text);
+    WriteInPlace(kDebugFile, text);
     gShown = 0;
     VarnekPGL_InitializeDebug();
     Masks passing;

@@ -16,7 +16,6 @@ const char *gFeature = "";
 
 namespace {
 
-constexpr char kConfig[] = "debug_ltn.ini";
 constexpr char kEverythingOn[] =
     "LogToUSB=1\nError=1\nHigh=1\nMid=1\nLow=1\n"
     "Common=1\nJNI=1\nMainControl=1\nESG=1\nSessionManager=1\nSectionParser=1\nDsmccDC=1\n"
@@ -27,7 +26,7 @@ void EmptyDataDirectory(bool keepConfig) {
     std::error_code ignored;
     std::filesystem::create_directories(VARNEK_DATA_DIR, ignored);
     for (const auto &entry : std::filesystem::directory_iterator(VARNEK_DATA_DIR, ignored)) {
-        const bool isConfig = entry.path().filename().string().rfind(kConfig, 0) == 0;
+        const bool isConfig = entry.path().string().rfind(kDebugFile, 0) == 0;
         if (!keepConfig || !isConfig || entry.is_directory(ignored)) {
             std::filesystem::remove_all(entry.path(), ignored);
         }
@@ -46,16 +45,15 @@ const char *BodyOf(const char *tag, const char *text) {
 }
 
 void StartClean() {
-    const std::string path = VARNEK_DATA_DIR + std::string(kConfig);
     EmptyDataDirectory(true);
-    std::ifstream file(path, std::ios::binary);
+    std::ifstream file(kDebugFile, std::ios::binary);
     if (std::string(std::istreambuf_iterator<char>(file), {}) == kEverythingOn) {
         return;
     }
     // Other processes may be reading the file, so a rename replaces it as a whole.
-    const std::string draft = path + std::to_string(getpid());
+    const std::string draft = kDebugFile + std::to_string(getpid());
     std::ofstream(draft, std::ios::binary) << kEverythingOn;
-    std::filesystem::rename(draft, path);
+    std::filesystem::rename(draft, kDebugFile);
 }
 
 void LeaveClean() { EmptyDataDirectory(false); }

@@ -3,6 +3,11 @@
 #ifndef VARNEK_TESTS_SUPPORT_PLATFORM_H
 #define VARNEK_TESTS_SUPPORT_PLATFORM_H
 
+// The files of the library: settings, the debug configuration in use, and the one that the system comes with.
+constexpr char kSettingsFile[] = VARNEK_DATA_DIR "Varnek_Config.cfg";
+constexpr char kDebugFile[] = VARNEK_DATA_DIR "debug_ltn.ini";
+constexpr char kShippedDebugFile[] = VARNEK_SYSTEM_DIR "debug_ltn.ini";
+
 // Called for each line of the log in the thread that writes it; null for none.
 extern void (*gOnLog)(int priority, const char *tag, const char *text);
 
