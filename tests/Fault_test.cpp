@@ -11,6 +11,7 @@
 #include <functional>
 #include <future>
 #include <initializer_list>
+#include <map>
 #include <memory>
 #include <string>
 #include <utility>
@@ -48,16 +49,13 @@ class Fault : public VarnekTest {
     }
 
     // Runs an operation that leaves nothing behind while the first, second, ... call of each function fails, until no
-    // call is left to fail. Notes what the operation returns and then, for each other outcome, the calls whose failures
-    // lead to it and the errors traced, unless these depend on the order of a directory's entries.
+    // call is left to fail. Notes what the operation returns and traces, and then, for each other outcome, the calls
+    // whose failures lead to it and the errors it adds, unless these depend on the order of a directory's entries.
     void Force(const std::string &name, const std::function<std::string()> &run, bool ordered = true) {
-        struct Outcome {
-            std::string text, calls;
-            const char *last;  // of the calls
-        };
         TakeLog();
-        const std::string success = run(), unharmed = success + Errors();
-        std::vector<Outcome> outcomes = {{unharmed, "", nullptr}};
+        const std::string success = run();
+        const std::vector<std::string> usual = Errors();
+        std::map<std::string, std::string> outcomes;  // with the calls
         for (const char *call : FailingCalls()) {
             const std::string shown = strncmp(call, "_Zna", 4) == 0 ? "operator new[]" : call;
             // The library does not check the locks of its own tables, which cannot fail.
@@ -72,34 +70,39 @@ class Fault : public VarnekTest {
                     ASSERT_EQ(result, success);
                     break;
                 }
-                const std::string text = result + Errors();
-                const auto known = std::find_if(outcomes.begin(), outcomes.end(),
-                                                [&text](const Outcome &each) { return each.text == text; });
-                Outcome &outcome = known != outcomes.end() ? *known : outcomes.emplace_back(Outcome{text, "", nullptr});
-                if (outcome.last != call) {
-                    outcome.calls += (outcome.calls.empty() ? "" : ", ") + shown;
-                }
-                outcome.calls += " " + std::to_string(nth);
-                outcome.last = call;
+                std::string &calls = outcomes[result + Added(Errors(), usual)];
+                const size_t last = calls.rfind(", ") + 2;
+                const bool isSame = calls.compare(last <= calls.size() ? last : 0, shown.size(), shown) == 0;
+                calls += (isSame ? " " : calls.empty() ? shown + " " : ", " + shown + " ") + std::to_string(nth);
                 ASSERT_EQ(run(), success) << "the failure left something behind";
             }
         }
-        Note(name + ": " + (ordered ? unharmed : success) + "\n");
-        for (const Outcome &outcome : outcomes) {
-            if (ordered && !outcome.calls.empty()) {
-                Note("  " + outcome.calls + (outcome.text == unharmed ? " change nothing" : ": " + outcome.text) +
-                     "\n");
+        Note(name + ": " + success + (ordered ? Added(usual, {}) : "") + "\n");
+        for (const auto &[outcome, calls] : outcomes) {
+            if (ordered) {
+                Note("  " + calls + (outcome == success ? " change nothing" : ": " + outcome) + "\n");
             }
         }
     }
 
   private:
-    static std::string Errors() {
-        std::string lines;
-        for (const std::string &error : TakeErrors()) {
-            lines += "\n    " + error.substr(0, error.find('\n'));
+    static std::vector<std::string> Errors() {
+        std::vector<std::string> errors = TakeErrors();
+        for (std::string &error : errors) {
+            error = WithoutHandles(error.substr(0, error.find('\n')));
         }
-        return WithoutHandles(lines);
+        return errors;
+    }
+    static std::string Added(std::vector<std::string> errors, const std::vector<std::string> &usual) {
+        for (const std::string &error : usual) {
+            const auto found = std::find(errors.begin(), errors.end(), error);
+            errors.erase(found, found == errors.end() ? found : found + 1);
+        }
+        std::string lines;
+        for (const std::string &error : errors) {
+            lines += (errors.size() == 1 ? " | " : "\n    ") + error;
+        }
+        return lines;
     }
 };
 

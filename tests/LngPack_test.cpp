@@ -37,6 +37,19 @@ TEST_F(LngPack, Latin15BecomesUtf8) {
     EXPECT_STREQ(text, "€€€€");
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4", UINT32_MAX), TRUE);
     EXPECT_STREQ(text, "€");
+    // A character of two bytes and one that is left out, at each place of a run of ASCII.
+    for (size_t at = 0; at < 20; ++at) {
+        std::string latin(22, 'a'), utf8(20, 'a');
+        latin.replace(at, 2, "\xE9\x1B");
+        utf8.replace(at, 1, "é");
+        EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, latin.c_str(), 22), TRUE);
+        EXPECT_EQ(text, utf8 + "a");
+        Units units(22), expected(21, 'a');
+        expected[at] = 0xE9;
+        expected.push_back(0);
+        EXPECT_EQ(WmConvertLatin15Code2PCode(units.data(), 22, latin.c_str()), TRUE);
+        EXPECT_EQ(units, expected);
+    }
     free(text);
 }
 
