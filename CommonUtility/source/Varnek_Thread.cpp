@@ -353,7 +353,9 @@ inline __attribute__((always_inline)) BOOL Send(int32_t hThread, const THREAD_MS
     if (message == nullptr) {
         return VARNEK_FAIL(FALSE, "***** %s: message is NULL", operation);
     }
-    Threads::Slot *const slot = gThreadInfoArr.Find(hThread);
+    // Relaxed, because the queue has a lock: its owner was stored under it before the handle was
+    // published, so whoever has read the handle finds that owner or a later one.
+    Threads::Slot *const slot = gThreadInfoArr.Find(hThread, std::memory_order_relaxed);
     if (slot == nullptr) {
         return VARNEK_FAIL(FALSE, "***** %s. Can't find thread info. thread = [%d]", operation,
                            hThread);
