@@ -114,7 +114,8 @@ TreeLevel *DeleteChild(TreeLevel *level, const PglDirEntry &entry) {
     const size_t length = strlen(level->path);
     const char *slash = length > 0 && level->path[length - 1] == '/' ? "" : "/";
     char path[kChildPathSize];
-    if (length + strlen(slash) + strlen(name) >= sizeof path) {
+    const int needed = snprintf(path, sizeof path, "%s%s%s", level->path, slash, name);
+    if (static_cast<size_t>(needed) >= sizeof path) {
         return FILE_FAIL(level, "%s : exceed max file path length : %s/%s", kDeletion, level->path,
                          name);
     }
@@ -127,7 +128,6 @@ TreeLevel *DeleteChild(TreeLevel *level, const PglDirEntry &entry) {
         RemoveAt(dir, name);
         return level;
     }
-    snprintf(path, sizeof path, "%s%s%s", level->path, slash, name);
     TreeLevel *child = Enter(level, fd, path, strlen(name));
     return child != nullptr ? child : level;
 }
