@@ -1,4 +1,4 @@
-// The bit input stream. Nearly every field comes from the current byte or, if it ends behind that,
+// The bit input stream. Nearly every field comes from the current byte or, if it ends beyond that,
 // from a word of the buffer. Near the end, and after rewinding from inside a byte, GetBits reads a
 // field piece by piece; it alone detects the end of the stream.
 #include "Varnek_CBitInputStream.h"

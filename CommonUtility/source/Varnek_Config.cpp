@@ -250,8 +250,8 @@ bool Replace(DIR *directory, const char *text, size_t length) {
     return fsync(in) == 0;
 }
 
-// Whether these bytes are a whole text: six lines and nothing behind them. With the rest of a
-// longer text there would be a line end too many, in a text that was cut one too few.
+// Whether these bytes are a whole text: six lines and nothing after them. The rest of a longer text
+// would add a line end, and a cut would lose one.
 bool IsWhole(const char *text, ssize_t size) {
     return size > 0 && text[size - 1] == '\n' &&
            std::count(text, text + size, '\n') == CONFIG_FIELD_COUNT;
@@ -281,8 +281,8 @@ bool WriteOver(int fd, const char *text, size_t length) {
     return false;
 }
 
-// Saves in place, where the file cannot be replaced. Creates nothing, except behind a link: where a
-// new file could not be stored, an empty one would only cost the settings at the next loading.
+// Saves in place, where the file cannot be replaced. Creates nothing, unless a link points to it:
+// where no new file could be stored, an empty one would only wipe the settings when next loaded.
 void SaveInPlace(const struct stat64 &old, const char *text) {
     const int flags = O_RDWR | O_CLOEXEC | (S_ISLNK(old.st_mode) ? O_CREAT : 0);
     const int fd = IsProtected(old) ? -1 : open(kSettingsPath, flags, 0666);
@@ -322,7 +322,7 @@ void VarnekCfg_LoadConfigFile() {
         CTRL_HIGH("  VarnekCfg_LoadConfigFile : Cannot Open Config File!");
         return;
     }
-    // Cleared only once there is a text, or an unreadable file would cost the settings.
+    // The record is cleared only once there is a text, lest an unreadable file wipe it.
     char *text = ReadSettings(file);
     VarnekPGL_CloseFile(file);
     if (text == nullptr) {

@@ -68,7 +68,7 @@ bool RemoveAt(int dir, const char *name) {
 struct TreeLevel {
     TreeLevel *parent;  // null for the root
     DIR *dir;
-    const char *path;  // from the caller's root, for the log; stored behind the level
+    const char *path;  // from the caller's root, for the log; stored after the level
     const char *name;  // the end of the path, as its parent knows the directory
 
     int Container() const { return parent != nullptr ? dirfd(parent->dir) : AT_FDCWD; }
@@ -80,8 +80,8 @@ int OpenWithoutFollowing(int dir, const char *name) {
     return openat(dir, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
 }
 
-// Returns the level of a directory, and owns its descriptor. Returns null, after log lines, when
-// the directory cannot be read.
+// Takes over `fd` and returns the level of its directory; null, after log lines, if the directory
+// cannot be read.
 TreeLevel *Enter(TreeLevel *parent, int fd, const char *path, size_t nameLength) {
     DIR *dir = fd >= 0 ? fdopendir(fd) : nullptr;
     if (dir == nullptr) {
@@ -356,8 +356,8 @@ class ShellCommand {
     bool fits_ = true;
 };
 
-// Runs "COMMAND source BETWEEN destination". Returns 0; -1, after a line of the operation, on
-// failure and if it may not run.
+// Runs "COMMAND source BETWEEN destination". Returns 0; on failure, or if it may not run, logs a
+// line that names `operation` and returns -1.
 int32_t RunOnTwo(const char *operation, bool mayRun, const char *command, const char *source,
                  const char *between, const char *destination) {
     ShellCommand<kCopyCommandSize> line;

@@ -6,8 +6,8 @@
 #include "Varnek_Semaphore.h"
 
 // Holds a named mutex until the end of the scope or until Release, as if by VarnekPGL_AcquireMutex
-// and VarnekPGL_ReleaseMutex. Where the short road here fails, these two are called, both of them,
-// and write the lines of the failure.
+// and VarnekPGL_ReleaseMutex. Where the fast path here fails, both of these are called, so that
+// they log the failure.
 class HoldMutex {
   public:
     static constexpr int32_t kNoMutex = -1;

@@ -1,7 +1,7 @@
 // The table of named objects: slots, handles and names, and nothing else. A handle is given out
 // only once, so storing it publishes its slot, and a lookup without a lock trusts what it reads
-// while the handle stays the same. Whoever changes the table holds its guard. All zero is empty.
-// Private.
+// while the handle stays the same. Whoever changes the table holds its guard. A zeroed table is
+// empty. Private.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 
@@ -33,7 +33,7 @@ class SlotTable {
 
     // Returns the slot of a live handle, null for none: one read if the hint is right, else a scan.
     // Acquire pairs with the release in Publish and makes the Info visible as it was published;
-    // relaxed is for a caller that sees all it needs already, such as a thread its own record.
+    // relaxed is for a caller that sees it already, as a thread sees its own record.
     Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
         if (handle <= kFree) {
             return nullptr;
@@ -48,7 +48,7 @@ class SlotTable {
         if (length == kNameSize) {
             return kInvalidHandle;
         }
-        // The last word is compared here, because there names that belong together usually differ.
+        // The last word is compared here, because similar names usually differ at the end.
         const PackedName wanted(name, length);
         const size_t last = wanted.used - 1;
         for (size_t slot = 0; slot < kSlots; slot++) {
@@ -131,8 +131,8 @@ class SlotTable {
             if (!slot.Has(handle, std::memory_order_acquire)) {
                 continue;
             }
-            // Two live handles may share a hint. A hint that points to the other one is not
-            // changed. A hint that points to neither is stale and is corrected.
+            // Two live handles may share a hint: one that points to the other handle stays as it
+            // is, and one that points to neither is stale, so it is corrected.
             const int32_t hinted = hint->handle.load(std::memory_order_relaxed);
             if (hinted == kFree || &HintOf(hinted) != &HintOf(handle)) {
                 HintOf(handle).store(static_cast<uint32_t>(NumberOf(&slot)),

@@ -1,4 +1,4 @@
-// Helpers that the sources of File share, and the reading of whole files for other areas. Private.
+// Helpers that File's sources share, and functions that read whole files for other areas. Private.
 //
 // File reports through __VarnekPGL_FileLog and never through the trace, because the trace reads its
 // configuration through File.

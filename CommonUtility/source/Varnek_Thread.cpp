@@ -26,7 +26,7 @@ constexpr size_t kSystemNameSize = 16;  // of a thread's name in the system, wit
 
 // What a running thread has to itself, whatever becomes of its record. When it ends, the block is
 // kept for another thread and never freed, so a sender may post its semaphore however late: the
-// block's present thread looks at its queue once more and waits on.
+// block's next thread just looks at its queue once more.
 struct RunningThread {
     sem_t wake;
     int32_t hHandle;  // 0 after the thread's end

@@ -36,7 +36,7 @@ struct TIMER_MGR_INFO {
     bool bTimerCreated;
     bool bAwaited;  // the last start has neither called back nor been cancelled
     bool isOwedTimerCreated;
-    OwedStart *owed;  // oldest first; while there is one, a call of the second timer is to come
+    OwedStart *owed;  // oldest first; while there is one, a call of the second timer is pending
 };
 
 Lock gTimerArrLock;
