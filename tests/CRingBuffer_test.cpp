@@ -62,13 +62,14 @@ TEST_F(RingBuffer, EveryRefusalHasItsLine) {
     write(4);
     read(6);
     Noting("Seek", [&](int offset, int origin) { return ring.Seek(offset, origin); })(0, 3);
-    for (const int count : {-1, 9}) {
-        write(count);
-        read(count);
-        for (const auto &[origin, name] : {NAMED(SEEK_SET), NAMED(SEEK_CUR), NAMED(SEEK_END)}) {
-            const int base = origin;
-            Noting(std::string(name) + ": Seek", [&](int offset) { return ring.Seek(offset, base); })(count);
-        }
+    write(-1);
+    read(-1);
+    EXPECT_EQ(ring.Write(bytes, 9), VARNEK_RING_INVALID);
+    EXPECT_EQ(ring.Read(bytes, 9), VARNEK_RING_INVALID);
+    for (const auto &[origin, name] : {NAMED(SEEK_SET), NAMED(SEEK_CUR), NAMED(SEEK_END)}) {
+        const int base = origin;
+        Noting(std::string(name) + ": Seek", [&](int offset) { return ring.Seek(offset, base); })(-1);
+        EXPECT_EQ(ring.Seek(9, base), VARNEK_RING_NO_SPACE);
     }
     Noting("Flush", [&] { return ring.Flush(); })();
     reset(0);

@@ -71,8 +71,9 @@ class Fault : public VarnekTest {
                     break;
                 }
                 std::string &calls = outcomes[result + Added(Errors(), usual)];
-                const size_t last = calls.rfind(", ") + 2;
-                const bool isSame = calls.compare(last <= calls.size() ? last : 0, shown.size(), shown) == 0;
+                const size_t comma = calls.rfind(", ");
+                const size_t last = comma != std::string::npos ? comma + 2 : 0;
+                const bool isSame = calls.compare(last, shown.size(), shown) == 0;
                 calls += (isSame ? " " : calls.empty() ? shown + " " : ", " + shown + " ") + std::to_string(nth);
                 ASSERT_EQ(run(), success) << "the failure left something behind";
             }
