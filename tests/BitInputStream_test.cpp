@@ -1,5 +1,4 @@
-// A bit stream's lines and memory, and one without a source. A fuzz target, which runs as a test, compares the
-// operations with a model.
+// What a bit stream logs and owns, and one without a source. fuzz/bit_stream.cpp compares the operations with a model.
 #include "Varnek_CBitInputStream.h"
 
 #include <memory>

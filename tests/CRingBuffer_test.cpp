@@ -1,5 +1,5 @@
-// A ring's lines and mutexes, and one without storage. A fuzz target, which runs as a test, compares the operations
-// with a model, and the soak has threads at both ends of a ring.
+// What a ring logs, its mutex, and rings without storage. fuzz/ring.cpp compares the operations with a model, and the
+// soak has threads at both ends of a ring.
 #include "Varnek_CRingBuffer.h"
 
 #include <cstdio>
@@ -75,7 +75,7 @@ TEST_F(RingBuffer, EveryRefusalHasItsLine) {
     reset(0);
     reset(8);
     // States that no operation leaves behind: an overflow, an underflow within a lap and, where the loop counts wrap
-    // around, over laps, and one lap too many. The distances are those at first, after a write and after a read.
+    // around, over laps, and one lap too many. The distances are those before, after writing and after reading.
     const struct {
         int w, r, wl, rl, distance, written, read;
     } states[] = {{3, 2, 1, 0, 112, 0, 0},

@@ -1,4 +1,4 @@
-// The configuration file: loads of well-formed and of hostile files, saves, and the source of the nation.
+// Loading well-formed and hostile configuration files, saving, and where the nation comes from.
 #include "Varnek_Config.h"
 
 #include <signal.h>
@@ -73,7 +73,7 @@ TEST_F(ConfigAlone, AnyFileLoads) {
         {type.substr(0, 19), none},
         {area + many('x', 100000), File(cut, 0, 0, 0, 0, "BRA")},
         {nation + many('x', 100000) + "\n" + type + "4", File("", 4, 0, 0, 0, cut)},
-        // A load reads 254 characters of a line.
+        // Only 254 characters of a line are read.
         {many('x', 233) + type + "51", ofType(5)},
         {many('x', 235) + type + "51", none},
         {type + "99999999999999999999", ofType(INT32_MAX)},
@@ -198,7 +198,7 @@ TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
             }
         }
     }
-    // Where there was no file, none is left that a load would take for empty settings.
+    // Saving for the first time leaves no file that would load as empty settings.
     std::filesystem::remove(kSettingsFile);
     saveLimited(0);
     EXPECT_FALSE(std::filesystem::exists(kSettingsFile));
@@ -244,7 +244,7 @@ TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
         }
         EXPECT_TRUE(isWhole(ReadAll(kSettingsFile)));
     }
-    // One that an earlier process with this id has left, too.
+    // So is a draft that an earlier process with this id left behind.
     WriteAll(VARNEK_DATA_DIR "Varnek_Config.new." + std::to_string(getpid()) + ".57", "left");
     save('a');
     for (const auto &entry : std::filesystem::directory_iterator(VARNEK_DATA_DIR)) {

@@ -1,4 +1,4 @@
-// A list that is null. A fuzz target, which runs as a test, compares the operations with a model.
+// A list that is null. fuzz/list.cpp compares the operations with a model.
 #include "Varnek_List.h"
 
 #include "support/VarnekTest.h"

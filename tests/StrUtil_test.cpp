@@ -1,4 +1,4 @@
-// The string helpers with null. A fuzz target, which runs as a test, compares them with the C library.
+// The string helpers with null. fuzz/string_helpers.cpp compares them with the C library.
 #include "Varnek_StrUtil.h"
 
 #include "support/VarnekTest.h"

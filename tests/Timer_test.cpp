@@ -52,13 +52,14 @@ TEST_F(Timer, HandlesAreSlotsAndNamesAreUnique) {
 
 TEST_F(Timer, BadHandlesAndArgumentsHaveTheirLine) {
     VarnekPGL_CreateTimer("never started");
-    for (int32_t handle : {32, 5}) {
-        NOTE(VarnekPGL_StartTimer)(handle, 1, CountExpiry, nullptr);
-        NOTE(VarnekPGL_CancelTimer)(handle);
-        NOTE(VarnekPGL_DeleteTimer)(handle);
-        NOTE(VarnekPGL_IsTimerActive)(handle);
+    NOTE(VarnekPGL_StartTimer)(5, 1, CountExpiry, nullptr);
+    NOTE(VarnekPGL_CancelTimer)(5);
+    NOTE(VarnekPGL_DeleteTimer)(5);
+    NOTE(VarnekPGL_IsTimerActive)(5);
+    for (uint32_t handle : {32u, UINT32_MAX}) {
+        EXPECT_FALSE(VarnekPGL_StartTimer(handle, 1, CountExpiry, nullptr) || VarnekPGL_CancelTimer(handle) ||
+                     VarnekPGL_DeleteTimer(handle) || VarnekPGL_IsTimerActive(handle));
     }
-    NOTE(VarnekPGL_IsTimerActive)(-1);
     NOTE(VarnekPGL_StartTimer)(0, 0, CountExpiry, nullptr);
     NOTE(VarnekPGL_StartTimer)(0, 1, nullptr, nullptr);
     NOTE(VarnekPGL_CancelTimer)(0);

@@ -88,7 +88,7 @@ TEST_F(Util, FilesThatCannotCarryACrcAreRefused) {
     WriteAll(path, "123");
     NOTE(VarnekUtil_AppendCRC32ToFile)(path);
     EXPECT_EQ(ReadAll(path), "123");
-    // A file of the kernel states the size of a page and has only a line.
+    // This file of the kernel claims a page and holds a line.
     const char *line = "/sys/devices/system/cpu/online";
     if (access(line, R_OK) == 0) {
         for (const auto operation : {VarnekUtil_CheckFileCRC32, VarnekUtil_AppendCRC32ToFile}) {

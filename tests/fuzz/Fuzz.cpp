@@ -12,7 +12,7 @@ extern "C" const char *__asan_default_options();
 const char *__asan_default_options() { return "quarantine_size_mb=1:malloc_context_size=8"; }
 
 void WriteInPlace(const char *path, const std::string &content) {
-    // Opened each time, since a save of the library replaces the file.
+    // Opened each time, since saving replaces the file.
     const int fd = open(path, O_WRONLY | O_CREAT | O_CLOEXEC, 0666);
     CHECK(fd >= 0);
     CHECK(write(fd, content.data(), content.size()) == static_cast<ssize_t>(content.size()));

@@ -235,7 +235,7 @@ void UseThread(Worker &me) {
         std::this_thread::sleep_for(std::chrono::microseconds(me.Below(1000)));
     }
     CHECK(VarnekPGL_DeleteThread(thread) == TRUE);
-    // The removal wakes the waiter.
+    // Removing the record wakes the waiter.
     for (++me.shortLived; me.ended < me.shortLived;) {
         std::this_thread::yield();
     }

@@ -1,5 +1,4 @@
-// The fixture of the tests. It captures the lines that the library writes to the Android log, and gives each test a
-// folder of its own.
+// The tests' fixture, which captures what the library writes to the Android log and gives each test its own folder.
 #ifndef VARNEK_TESTS_SUPPORT_VARNEKTEST_H
 #define VARNEK_TESTS_SUPPORT_VARNEKTEST_H
 
@@ -49,8 +48,8 @@ std::string WithoutHandles(const std::string &text);
 // Called without a lock for each line before it is captured, in the thread that wrote the line; null for none.
 extern std::atomic<void (*)(const LogLine &line)> gLogHook;
 
-// Returns the path of something that the tests read: "expected/", "defaults/" or "sample.ts". It is in the build tree,
-// or in the folder that VARNEK_TEST_FILES in the environment names.
+// Returns the path of what the tests read ("expected/", "defaults/" or "sample.ts"): in the build tree, or in the
+// folder that VARNEK_TEST_FILES in the environment names.
 std::string TestFile(const std::string &name);
 
 std::string ReadAll(const std::string &path);
