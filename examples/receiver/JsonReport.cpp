@@ -1,5 +1,5 @@
 // Each function writes a part of the report: some members of the outermost object, or an array.
-#include "JsonReport.h"
+#include "Report.h"
 
 #include "JsonWriter.h"
 #include "Names.h"

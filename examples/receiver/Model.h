@@ -35,7 +35,7 @@ struct Component {  // a PMT entry
 
     // Whether it carries application information tables.
     bool IsAit() const {
-        return stream_type == 0x05 &&
+        return stream_type == kStreamPrivateSections &&
                (descriptor == kDescriptorApplicationSignalling ||
                 (descriptor == kDescriptorDataComponent && data_component_id == kDataAit));
     }

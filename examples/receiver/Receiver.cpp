@@ -12,12 +12,10 @@
 
 #include "BroadcastText.h"
 #include "CommandLine.h"
-#include "JsonReport.h"
 #include "Names.h"
 #include "Paragraphs.h"
 #include "Pipeline.h"
 #include "StreamFile.h"
-#include "Summary.h"
 #include "Varnek_Config.h"
 
 namespace receiver {

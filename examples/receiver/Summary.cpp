@@ -1,6 +1,6 @@
 // Joins the parts of a report and writes them for people, with the names in the stream and with
 // words for codes.
-#include "Summary.h"
+#include "Report.h"
 
 #include <algorithm>
 #include <map>
