@@ -42,7 +42,7 @@ std::map<uint16_t, Service> JoinServices(const Model &model) {
     }
     for (const auto &section : model.sdt) {
         for (const ServiceInfo &info : section.second) {
-            services[info.service_id].info = &info;
+            services[info.service_id].info = info;
         }
     }
     for (const auto &[id, map] : model.pmts) {
@@ -88,14 +88,14 @@ bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services
            });
 }
 
-std::vector<ListedEvent> ListEvents(const Model &model) {
+std::vector<ListedEvent> ListEvents(const Model &model, bool others) {
     std::vector<ListedEvent> events;
     const auto own = model.events.Joined();
-    events.reserve(own.size());
     for (const auto &[key, event] : own) {
         events.push_back({key.first, event, false});
     }
-    for (const auto &[key, event] : model.other_events.Joined()) {
+    const auto foreign = others ? model.other_events.Joined() : decltype(own)();
+    for (const auto &[key, event] : foreign) {
         if (own.count(key) == 0) {
             events.push_back({key.first, event, true});
         }

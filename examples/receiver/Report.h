@@ -43,14 +43,13 @@ std::optional<int64_t> BitRateOf(const Report &report);
 
 struct Service {
     std::optional<uint16_t> pmt_pid;
-    const ServiceInfo *info = nullptr;  // null without an SDT entry
-    const ProgramMap *map = nullptr;    // null without a PMT
+    ServiceInfo info{};               // empty without an SDT entry
+    const ProgramMap *map = nullptr;  // of the model; null without a PMT
     bool one_seg = false;
 };
 
-// Joins the services that the PAT or the SDT names, by service_id. They point into the model. A PMT
-// counts only if it came on the PID that the PAT names. In a stream without a PAT, which one-seg
-// reception may give, every PMT names its service.
+// Joins the services that the PAT or the SDT names, by service_id. A PMT counts only on the PID
+// that the PAT names; without a PAT, as in one-seg reception, every PMT names its service.
 std::map<uint16_t, Service> JoinServices(const Model &model);
 
 // Finds the entry of this stream in the NIT; null without one. Without a PAT it is the only entry.
@@ -65,9 +64,9 @@ struct ListedEvent {
     bool other_stream;
 };
 
-// Lists all events by start; events whose start is not known come last. If both this and another
-// stream describe an event, only the description of this stream is listed.
-std::vector<ListedEvent> ListEvents(const Model &model);
+// Lists the events by start, those whose start is not known last. With `others`, these include the
+// events of other streams that this stream does not describe itself.
+std::vector<ListedEvent> ListEvents(const Model &model, bool others);
 
 // Converts the stream's times. In Brazil they are the official time of Brasilia, and local offsets
 // are relative to that; elsewhere they are UTC.
