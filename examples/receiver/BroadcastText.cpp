@@ -52,39 +52,38 @@ bool IsControl(char c) {
     return (static_cast<unsigned char>(c) & 0x7F) < 0x20;
 }
 
-// Returns the bytes of a control function of ISDB with its parameters. A parameter ends at the
-// first byte that is outside the range of its intermediate bytes, and is cut short by a byte that
-// cannot belong to it.
+// Returns the number of bytes of a control function of ISDB with its parameters. Each of these is a
+// printable byte, which intermediate bytes may precede; one that is missing is not waited for.
 size_t ControlSize(const std::string &text, size_t at) {
     static const struct {
-        unsigned char control;
-        unsigned char least, most;  // of intermediate bytes; none if the first one is larger
+        const char *controls;
         int parameters;
+        unsigned char most;  // the largest intermediate byte; the least is 0x20
     } kWithParameters[] = {
-        {0x16, 1, 0, 1},       {0x19, 1, 0, 1},       {0x1D, 1, 0, 1},  // PAPF, SS2, SS3
-        {0x1B, 0x20, 0x2F, 1}, {0x1C, 1, 0, 2},                         // ESC, APS
-        {0x8B, 1, 0, 1},       {0x90, 0x20, 0x20, 1}, {0x91, 1, 0, 1},  // SZX, COL, FLC
-        {0x92, 0x20, 0x20, 1}, {0x93, 1, 0, 1},       {0x94, 1, 0, 1},  // CDC, POL, WMM
-        {0x97, 1, 0, 1},       {0x98, 1, 0, 1},                         // HLC, RPC
-        {0x9B, 0x20, 0x3F, 1}, {0x9D, 0x20, 0x3F, 1},                   // CSI, TIME
+        {"\x16\x19\x1D\x8B\x91\x93\x94\x97\x98", 1, 0},  // PAPF SS2 SS3 SZX FLC POL WMM HLC RPC
+        {"\x1C", 2, 0},                                  // APS
+        {"\x90\x92", 1, 0x20},                           // COL CDC
+        {"\x1B", 1, 0x2F},                               // ESC
+        {"\x9B\x9D", 1, 0x3F},                           // CSI TIME
     };
-    const auto byte = [&](size_t i) {
-        return i < text.size() ? static_cast<unsigned char>(text[i]) : 0;
-    };
-    if (byte(at) == 0x95) {  // MACRO, whose definition ends with another one
+    if (text[at] == '\x95') {  // MACRO, whose definition ends with another one
         const size_t end = text.find("\x95\x4F", at);
         return end == std::string::npos ? 2 : end + 2 - at;
     }
-    size_t size = 1;
+    const auto is_within = [&](size_t i, unsigned char most) {
+        return i < text.size() && text[i] >= 0x20 && static_cast<unsigned char>(text[i]) <= most;
+    };
+    size_t end = at + 1;
     for (const auto &row : kWithParameters) {
-        for (int left = row.control == byte(at) ? row.parameters : 0; left > 0; --left) {
-            while (byte(at + size) >= row.least && byte(at + size) <= row.most) {
-                ++size;
+        const bool found = text[at] != 0 && std::strchr(row.controls, text[at]) != nullptr;
+        for (int left = found ? row.parameters : 0; left > 0; --left) {
+            while (is_within(end, row.most)) {
+                ++end;
             }
-            size += byte(at + size) >= 0x20 && byte(at + size) < 0x7F ? 1u : 0u;
+            end += is_within(end, 0x7E) ? 1u : 0u;
         }
     }
-    return size;
+    return end - at;
 }
 
 // Converts the text between two control functions at a time, because the library's conversion drops
