@@ -69,7 +69,6 @@ class Demultiplexer {
     bool MayBePmt(const Header &header, const unsigned char *packet, PidState &state) const;
     void OnSection(uint16_t pid, bool claimed, const unsigned char *section, size_t size);
     void FollowNames(const unsigned char *section, size_t size);
-    void AddUse(uint16_t pid);
     void RemoveUse(uint16_t pid);
     void Forget(uint32_t key);
 

@@ -14,11 +14,6 @@ constexpr int kBrasiliaMinutes = -180;  // from UTC, all year round
 
 }  // namespace
 
-bool IsHardlyStream(const Report &report) {
-    const PacketCounters &packets = report.packets;
-    return report.sections.good == 0 && packets.packets * packets.packet_size < packets.bytes / 2;
-}
-
 std::optional<int64_t> DurationOf(const Report &report) {
     const uint64_t ticks = report.sections.clock.ticks;
     return ticks == 0 ? std::nullopt : std::optional<int64_t>(ticks / (uint64_t{27} * 1000));

@@ -17,7 +17,7 @@
 
 namespace receiver {
 
-// The receiver's settings: the library's configuration, and the region that the user names.
+// The library's configuration and the user's choices.
 struct Settings {
     int standard_type = 2;
     std::string nation = "BRA";
@@ -33,11 +33,7 @@ struct Report {
     Model model;
 };
 
-// Whether so few of the bytes are packets that the file is not a transport stream.
-bool IsHardlyStream(const Report &report);
-
-// Return the duration in milliseconds and the bit rate in bits per second, from the clock
-// references.
+// Return milliseconds and bits per second, by the clock references.
 std::optional<int64_t> DurationOf(const Report &report);
 std::optional<int64_t> BitRateOf(const Report &report);
 
@@ -52,7 +48,7 @@ struct Service {
 // that the PAT names; without a PAT, as in one-seg reception, every PMT names its service.
 std::map<uint16_t, Service> JoinServices(const Model &model);
 
-// Finds the entry of this stream in the NIT; null without one. Without a PAT it is the only entry.
+// Finds this stream's entry in the NIT, or without a PAT the only entry; null for none.
 const NetworkStream *FindOwnStream(const Model &model);
 
 // Whether the NIT or the PMT of a service signals an emergency warning.
@@ -68,23 +64,21 @@ struct ListedEvent {
 // events of other streams that this stream does not describe itself.
 std::vector<ListedEvent> ListEvents(const Model &model, bool others);
 
-// Converts the stream's times. In Brazil they are the official time of Brasilia, and local offsets
-// are relative to that; elsewhere they are UTC.
+// Converts the stream's times, which are in UTC except in Brazil, where they and the local offsets
+// are relative to the official time of Brasilia.
 class StreamClock {
   public:
     explicit StreamClock(const Report &report);
 
-    // The nation whose rules the stream follows. It is the receiver's nation if the TOT names it or
-    // names none, otherwise the first nation in the TOT. It is empty for a DVB stream whose TOT
-    // names none.
+    // The nation whose rules the stream follows: the receiver's if the TOT names it or none,
+    // otherwise the first in the TOT; empty for a DVB stream whose TOT names none.
     const Code &Nation() const { return nation_; }
 
-    // The offset for local times: that of the receiver's nation and region. If there is none and
-    // the user names no region, it is the first offset. Null for none.
+    // The offset for local times: that of the receiver's nation and region, or the first one if the
+    // user names no region. Null for none.
     const LocalOffset *Offset() const { return offset_; }
 
-    // These convert a time of the stream, and return nothing when it is not known. The local time
-    // uses the offset that applies at that time.
+    // Convert a time of the stream, the latter by the offset that applies at that time.
     std::optional<DateTime> Utc(const std::optional<DateTime> &time) const;
     std::optional<DateTime> Local(const std::optional<DateTime> &time) const;
 
