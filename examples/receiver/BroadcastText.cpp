@@ -1,5 +1,5 @@
-// The library converts the characters. This file handles the selector of the character table, the
-// control functions, and characters that the conversions do not support.
+// The library converts characters; this file handles the selector of their table, control
+// functions, and characters that those conversions do not support.
 #include "BroadcastText.h"
 
 #include <algorithm>
@@ -20,7 +20,7 @@ constexpr unsigned char kSelectUnicode = 0x11;
 constexpr unsigned char kSelectUtf8 = 0x15;
 constexpr unsigned char kSelectEncoding = 0x1F;  // the encoding's number follows in one byte
 
-// Returns the size of a DVB selector; 0 when the text begins with anything else.
+// Returns the size of a DVB selector; 0 if the text begins with none.
 size_t SelectorSize(const std::string &text) {
     const unsigned char first = static_cast<unsigned char>(text[0]);
     if (first == kSelectNumbered || first == kSelectEncoding) {
@@ -86,8 +86,8 @@ size_t ControlSize(const std::string &text, size_t at) {
     return end - at;
 }
 
-// Converts the text between two control functions at a time, because the library's conversion drops
-// the line breaks too.
+// Converts the text between control functions piece by piece, because the library's conversion
+// drops line breaks too.
 std::string FromLatin15(const std::string &text, bool dvb) {
     std::string result;
     for (size_t at = 0; at < text.size();) {
@@ -171,9 +171,8 @@ std::string FromUnicode(const std::string &text) {
     return FromUnits(units);
 }
 
-// Returns the number of bytes of the first character of a UTF-8 text.
-//   valid    out: whether it is well-formed
-//   returns  for a malformed one, the number of bytes that could begin a character, at least 1
+// Returns the number of bytes of the first character of a UTF-8 text, or of what could begin one.
+//   valid  out: whether the character is well-formed
 size_t MeasureCharacter(const unsigned char *text, size_t size, bool &valid) {
     const unsigned char lead = text[0];
     const size_t length = lead < 0x80 ? 1 : lead < 0xC2 ? 0 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
@@ -192,8 +191,8 @@ size_t MeasureCharacter(const unsigned char *text, size_t size, bool &valid) {
     return count;
 }
 
-// Replaces malformed characters and those of four bytes with U+FFFD. The library's conversion does
-// not support them and would return other letters.
+// Replaces malformed characters and those of four bytes, which the library's conversion would turn
+// into other letters, with U+FFFD.
 std::string ReplaceMalformed(const std::string &text) {
     std::string result;
     for (size_t i = 0; i < text.size();) {

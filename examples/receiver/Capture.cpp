@@ -54,7 +54,7 @@ void Capture::Finish() {
 
 void Capture::Write() {
     if (!empty_) {
-        // The library's open never truncates, so this does. Devices and pipes have no length.
+        // The library's open never truncates. Devices and pipes have no length.
         if (ftruncate(file_, 0) != 0 && errno != EINVAL) {
             failure_ = "the old content could not be removed";
             return;

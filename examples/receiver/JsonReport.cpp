@@ -1,4 +1,4 @@
-// Each function writes a part of the report: some members of the outermost object, or an array.
+// Each function writes some members of the outermost object, or an array.
 #include "Report.h"
 
 #include "JsonWriter.h"

@@ -1,5 +1,5 @@
 // Writes JSON text (RFC 8259) to a file. Each member of the outermost object gets a line, and so
-// does each element of an array in it. Deeper levels stay on the same line.
+// does each element of an array in it.
 #ifndef RECEIVER_JSONWRITER_H
 #define RECEIVER_JSONWRITER_H
 

@@ -137,7 +137,7 @@ std::string DescribeContent(const Event &event, const Code &nation) {
     return items.empty() ? "" : " (" + Joined(items) + ")";
 }
 
-// Lists this stream's events: current and future ones first, past ones last.
+// Lists events, the past ones last.
 void AddEvents(const Report &report, const Services &services, const StreamClock &clock,
                Paragraphs &out) {
     const Model &model = report.model;
