@@ -86,6 +86,7 @@ bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services
 std::vector<ListedEvent> ListEvents(const Model &model, bool others) {
     std::vector<ListedEvent> events;
     const auto own = model.events.Joined();
+    events.reserve(own.size());
     for (const auto &[key, event] : own) {
         events.push_back({key.first, event, false});
     }
