@@ -25,7 +25,7 @@ namespace receiver {
 namespace {
 
 using namespace streamwriter;
-using ::testing::ElementsAre;
+using ::testing::AllOf, ::testing::ElementsAre, ::testing::EndsWith, ::testing::HasSubstr, ::testing::StartsWith;
 
 using Arguments = std::vector<std::string>;
 
@@ -605,7 +605,7 @@ TEST_F(Receiver, ReportsAReadError) {
     NoteProgram({"-"});
 }
 
-// No program writes to the pipe, and the user gives up half a second later.
+// No program writes to the pipe, and the user, who sees this, gives up half a second later.
 TEST_F(Receiver, StopsWhileItWaits) {
     ASSERT_EQ(mkfifo(Path("pipe").c_str(), 0600), 0);
     std::atomic<bool> stop{false};
@@ -613,8 +613,14 @@ TEST_F(Receiver, StopsWhileItWaits) {
         std::this_thread::sleep_for(std::chrono::milliseconds(500));
         stop = true;
     });
-    NoteProgram({Path("pipe")}, &stop);
+    const Terminal err(80);
+    EXPECT_THAT(Written([&](std::FILE *out) {
+                    EXPECT_EQ(RunReceiver({Path("pipe")}, {out, err.file, &stop}), 130);
+                }),
+                StartsWith("Stream    0 packets\n"));
     user.join();
+    EXPECT_THAT(err.Finish(), AllOf(HasSubstr("pipe: waiting for a program that writes to this pipe\n\r0 MB\r"),
+                                    EndsWith("\r0 MB\r\r    \r")));
 }
 
 // Fills the registry of a family, and frees a place for each run until a run has all that it needs.
