@@ -4,7 +4,7 @@
     (gdb) varnek
 
 The library must have debug information; the packaged one has it in libvarnekutils-ltn-dbg. The script works on a
-stopped process and on a core dump. It reads structures of glibc and libstdc++, so it works for a PC only."""
+stopped process and on a core dump. It reads structures of glibc and libstdc++, so it works only on a PC."""
 
 import gdb
 

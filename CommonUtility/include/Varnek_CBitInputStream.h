@@ -32,8 +32,8 @@ class VARNEK_API VarnekCBitInputStream {
     /// caller's array. The stream is at its end if the source is null or empty, or there is no
     /// memory for the copy. Bytes beyond 2 GiB are not read.
     VarnekCBitInputStream(unsigned char *source, unsigned int length, unsigned char copyMode);
-    /// Copies the position and a private copy, or shares a borrowed array. Without memory for the
-    /// copy, the new stream has no source and is at its end.
+    /// Copies the position and a private copy, or shares a borrowed array. If memory runs out, the
+    /// new stream has no source and is at its end.
     VarnekCBitInputStream(const VarnekCBitInputStream &other);
     VarnekCBitInputStream &operator=(const VarnekCBitInputStream &other);  ///< copies likewise
 
@@ -42,11 +42,11 @@ class VARNEK_API VarnekCBitInputStream {
 
     /// Reads the next bit, 0 or 1.
     unsigned int ReadBit(unsigned char &success);
-    /// Reads 0 to 8 bits that are all in the current byte, else nothing. Traces its failures; the
-    /// other reads trace only the pieces beyond the end.
+    /// Reads 0 to 8 bits that are all in the current byte, else nothing. Traces every failure; the
+    /// other reads trace only if the stream ends inside the field.
     unsigned int GetBits(int aNum, unsigned char &success);
-    /// Reads at most 8 bits, and nothing if `count` is out of range. If the stream ends inside the
-    /// field, the missing bits read as 0. The next two differ only in their most bits.
+    /// Reads at most 8 bits (the next two read at most 16 and 32), and nothing if `count` is out of
+    /// range. If the stream ends inside the field, the missing bits read as 0.
     unsigned char ReadByte(int count, unsigned char &success);
     unsigned short ReadShort(int count, unsigned char &success);  ///< at most 16
     unsigned int ReadInt(int count, unsigned char &success);      ///< at most 32

@@ -15,9 +15,9 @@
 
 #ifdef __cplusplus
 
-/// Writing and reading move all of the bytes or none, and never wait. Each side has a position and
-/// counts its laps, which tells a full ring from an empty one, and both from an inconsistent state.
-/// With W and R as the positions and WL and RL as the laps completed:
+/// Writing and reading move all of the bytes or none, and never wait for room or data. Each side
+/// has a position and counts its laps, which tells a full ring from an empty one, and both from an
+/// inconsistent state. With W and R as the positions and WL and RL as the laps completed:
 ///
 ///     state                    condition                        readable       writable
 ///     same lap                 WL = RL, R <= W                  W - R          size - (W - R)
@@ -35,7 +35,7 @@
 /// side) are not guarded. A copy has no mutex, so it is not thread-safe.
 class VARNEK_API VarnekCRingBuffer {
   public:
-    /// Creates an empty ring of `size` bytes, without a mutex if all of them are in use.
+    /// Creates an empty ring of `size` bytes, without a mutex if none is free.
     explicit VarnekCRingBuffer(int size);
     /// Copies the state and the bytes, not the mutex; an assigned ring keeps its own.
     VarnekCRingBuffer(const VarnekCRingBuffer &other);
@@ -51,16 +51,16 @@ class VARNEK_API VarnekCRingBuffer {
     int Flush();
 
     /// Moves the reader to the index `aOffset` (origin 0), forward by `aOffset` bytes (1), or to
-    /// the start of the last `aOffset` bytes written (2). Origins 0 and 2 do not ask whether those
-    /// bytes are unread or were ever written; with 2, an offset of the whole size leaves nothing to
-    /// read; with 0, an index equal to the size is accepted, but then read, or seek forward by 0,
-    /// before the next write. Returns 0; VARNEK_RING_NO_SPACE for an offset that is negative,
-    /// beyond the size or, with origin 1, beyond the readable bytes, for a ring without storage
-    /// and, with origin 1, for an inconsistent one; VARNEK_RING_INVALID for another origin.
+    /// the start of the last `aOffset` bytes written (2). Origins 0 and 2 do not check that those
+    /// bytes are unread or were ever written. With 2, an offset of the whole size leaves nothing to
+    /// read. With 0, after an index equal to the size, read or seek forward by 0 before the next
+    /// write. Returns 0; VARNEK_RING_NO_SPACE for an offset that is negative, beyond the size or,
+    /// with origin 1, beyond the readable bytes, for a ring without storage and, with origin 1, for
+    /// an inconsistent one; VARNEK_RING_INVALID for another origin.
     int Seek(int aOffset, int origin);
 
-    /// Tells how many bytes can be read now, and the next one how many can be written;
-    /// VARNEK_RING_OVERFLOW or VARNEK_RING_UNDERFLOW in an inconsistent state.
+    /// Returns how many bytes can be read now, and GetSpaceWriting how many can be written; in an
+    /// inconsistent state, VARNEK_RING_OVERFLOW or VARNEK_RING_UNDERFLOW.
     int GetSpaceReading() const;
     int GetSpaceWriting() const;  ///< the bytes that fit
     /// Tells the readable bytes in per cent of the size; in an inconsistent state, maybe a number

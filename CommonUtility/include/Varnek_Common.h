@@ -1,10 +1,10 @@
 /// @file
 /// Types and constants that every module of the stack shares, in C11 and C++17.
 ///
-/// On 32-bit ARM, with all traces enabled, the library uses at most this much stack: 3.9 KiB to
-/// trace, report assertions and for tasking, 2.1 KiB to load the debug configuration, 3.4 KiB for
-/// files, 3.3 KiB to delete a tree of any depth, 4.1 KiB for the settings. The platform's log
-/// function comes on top.
+/// On 32-bit ARM, with all traces enabled, the library uses at most this much stack: 3.9 KiB for
+/// traces, assertion reports and tasking, 2.1 KiB for loading the debug configuration, 3.4 KiB for
+/// files, 3.3 KiB for deleting a tree of any depth, 4.1 KiB for the settings, plus what the
+/// platform's log function takes.
 #ifndef VARNEK_COMMON_H
 #define VARNEK_COMMON_H
 
@@ -34,7 +34,7 @@ typedef int32_t BOOL;  ///< a truth value of 32 bits
 #define VARNEK_LEVEL_ERROR 0x80000000u  ///< a failure, or misuse by a caller
 #define VARNEK_LEVEL_HIGH 0x40000000u   ///< an important event
 #define VARNEK_LEVEL_MID 0x20000000u    ///< the end of an operation, a reset
-#define VARNEK_LEVEL_LOW 0x10000000u    ///< the start and end of each call
+#define VARNEK_LEVEL_LOW 0x10000000u    ///< the start and end of calls
 
 #define VARNEK_MODULE_COMMON 0x001u           ///< this library
 #define VARNEK_MODULE_JNI 0x002u              ///< Java bridge
@@ -62,7 +62,7 @@ typedef intptr_t PglFileHandle;
 #define PGL_FILE_MODE_APPEND 8     ///< writes at the end
 /// @}
 
-/// One more than the longest path, which has 255 characters.
+/// Room for a path of 255 characters and its terminator.
 #define MAX_PGL_FILE_PATH_LEN 256
 
 #endif

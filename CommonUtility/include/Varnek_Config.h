@@ -3,8 +3,8 @@
 /// data directory with one KEY=value line for each field.
 ///
 /// The record starts with the values below. Loading replaces all of it: a field that the file does
-/// not set becomes 0 or empty. Not thread-safe: whoever loads, sets or saves must keep all others
-/// away from the record.
+/// not set becomes 0 or empty, and an empty nation is then filled in as VarnekCfg_GetSupportNation
+/// does. Not thread-safe: whoever loads, sets or saves must keep all others away from the record.
 /// @see [Guide: configuration](docs/guide/configuration.md)
 #ifndef VARNEK_CONFIG_H
 #define VARNEK_CONFIG_H
@@ -46,7 +46,7 @@ VARNEK_API void VarnekCfg_SaveConfigFile(void);
 /// Sets the standard type, and saves the record when the type changes.
 VARNEK_API void VarnekCfg_SetStandard(int32_t std);
 
-/// Reads a field, as the next two do. All three load the file first while `standardType` is 0.
+/// Returns a field. This getter and the next two load the file first while `standardType` is 0.
 VARNEK_API int32_t VarnekCfg_GetStandard(void);
 VARNEK_API uint8_t VarnekCfg_GetTSCaptueEnable(void);     ///< as VarnekCfg_GetStandard
 VARNEK_API uint8_t VarnekCfg_GetTSFileSimulEnable(void);  ///< as VarnekCfg_GetStandard

@@ -2,8 +2,8 @@
 /// Tracing for the whole stack, its configuration, and the assertion report.
 ///
 /// A trace reaches the Android log only if the debug configuration ("debug_ltn.ini" in the data
-/// directory, loaded by the first trace) enables the output, its level and its module. What the
-/// configuration enables, failures of file operations and assertion reports are always logged.
+/// directory, loaded by the first trace) enables the output, its level and its module. The summary
+/// of a loaded configuration, failed file operations and assertion reports are always logged.
 /// @see [Guide: trace](docs/guide/trace.md)
 #ifndef VARNEK_DEBUG_H
 #define VARNEK_DEBUG_H
@@ -40,19 +40,19 @@ static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
      (void)VarnekPGL_Panic())
 
 /// Writes one line to the Android log if the configuration enables it, and preserves errno. Takes
-/// no lock; lines of different threads never mix.
+/// no lock once that is loaded; lines of different threads never mix.
 /// @param mask    level and module; without a module nothing is written
 /// @param format  printf format; null shows "(null)". The text is cut to 2017 bytes, and to 2047
 ///                with the prefix
 VARNEK_API void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...)
     __attribute__((format(printf, 2, 3)));
 
-/// Loads the debug configuration, again if need be: disables everything, copies the shipped file
-/// from the system directory if the working copy is missing, reads the working copy and logs what
+/// Loads the debug configuration, even if it is loaded already: disables everything, copies the
+/// shipped file from the system directory if the working copy is missing, reads that and logs what
 /// is enabled. Threads that load at the same time do so one after the other.
 VARNEK_API void VarnekPGL_InitializeDebug(void);
 
-/// Loads the debug configuration unless that has been tried before, even in vain.
+/// Loads the debug configuration unless that was tried before, successfully or not.
 VARNEK_API void VarnekPGL_CheckAndInitDebug(void);
 
 /// Writes the assertion report at fatal priority under the tag "Varnek", whatever the configuration

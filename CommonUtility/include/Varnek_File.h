@@ -4,9 +4,10 @@
 ///
 /// Most failures are logged at error priority under the tag "SBTVD_File", whatever the debug
 /// configuration says, and never through the trace. Not logged are streams that read or write too
-/// few bytes and, for large files, everything but failing opens and writes, negative descriptors
-/// and invalid seek bases. All calls are thread-safe, but only one thread at a time may use a
-/// handle. A null path fails like one that does not exist; a null buffer moves no bytes.
+/// few bytes or have no known position or size, open flags and permissions that mean nothing, and,
+/// for large files, everything but failing opens and writes, negative descriptors and invalid seek
+/// bases. All calls are thread-safe, but only one thread at a time may use a handle. A null path
+/// fails like one that does not exist; a null buffer moves no bytes.
 /// @see [Guide: files](docs/guide/files.md)
 #ifndef VARNEK_FILE_H
 #define VARNEK_FILE_H
@@ -28,14 +29,14 @@ extern "C" {
 #endif
 
 /// @name Streams
-/// Offsets and sizes have 32 bits, so they end below 2 GiB. Handles 0 and -1 are no streams: using
+/// Offsets and sizes have 32 bits, so they end below 2 GiB. Handles 0 and -1 are not streams: using
 /// one is logged and gives the result listed for "no stream".
 /// @{
 
 /// Opens a stream.
 /// @param path   at most 255 characters
-/// @param flags  PGL_FILE_MODE_ bits, of which the first set one of APPEND, CREATE_RW, WRITE and
-///               READ counts, so READ | WRITE truncates. Other bits open nothing
+/// @param flags  PGL_FILE_MODE_ bits: the first of APPEND, CREATE_RW, WRITE and READ that is set
+///               counts, so READ | WRITE truncates. Other bits alone open nothing
 /// @return the handle, which the caller closes; -1 on failure
 VARNEK_API PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags);
 
@@ -91,7 +92,8 @@ VARNEK_API int32_t VarnekPGL_DeleteFile(const char *path);
 /// @}
 /// @name Large files
 /// The handle is the system's file descriptor, and offsets and sizes have 64 bits. Reading or
-/// writing is one unbuffered system call. A negative descriptor is logged, and the call fails.
+/// writing is one unbuffered system call. A negative descriptor fails and, unless only the size was
+/// asked for, is logged.
 /// @{
 
 /// Opens a descriptor, never truncating the file. The path may have any length the system accepts.

@@ -37,7 +37,7 @@ VARNEK_API void list_insertHead(list_t *list, void *data);
 /// Inserts data at the tail.
 VARNEK_API void list_insertTail(list_t *list, void *data);
 VARNEK_API void list_insert(list_t *list, void *data);  ///< as list_insertTail
-/// Inserts data at a position: at the tail from the count on, nowhere if it is negative.
+/// Inserts data at a position: at the tail if that is past the end, nowhere if it is negative.
 VARNEK_API void list_insertAt(list_t *list, int32_t position, void *data);
 
 /// Returns the data at a position; null outside the list.

@@ -3,8 +3,9 @@
 /// UTF-8 as in RFC 3629 ("LCode").
 ///
 /// Every text ends in a 0 byte or unit. A unit is one character from U+0001 to U+FFFF; surrogates
-/// are not paired. The caller provides the output buffers. Thread-safe. A failure may be traced
-/// more than once, by the function that fails and by those that called it.
+/// are not paired. The caller provides the output buffers, except that of
+/// VarnekPGL_ConvertLatin15toUTF8. Thread-safe. A failure may be traced more than once, by the
+/// function that fails and by those that called it.
 /// @see [Guide: text](docs/guide/text.md)
 #ifndef VARNEK_LNGPACK_H
 #define VARNEK_LNGPACK_H
@@ -26,7 +27,7 @@ VARNEK_API BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outB
 /// Counts the units before the terminator; -1 for null.
 VARNEK_API int WmStrlen(const unsigned short *mszText);
 
-/// Converts at most `nChar` units to UTF-8, which takes up to three bytes for each and one more.
+/// Converts at most `nChar` units to UTF-8, which takes up to three bytes each plus a terminator.
 /// @return TRUE, with an empty output for an `nChar` of 0; FALSE for a null pointer
 VARNEK_API BOOL WmConvertPCode2UTF(char *pszOutText, const unsigned short *mszInText, int nChar);
 
@@ -62,7 +63,7 @@ VARNEK_API BOOL __WmConvertCodeBufferSizeCheck(const char *szName, int OutBuffer
 /// @return the units written, without the terminator; -1 for a null pointer
 VARNEK_API int __WmLngUTF2Unicode(unsigned short *des, const char *src, int length);
 
-/// Decodes a character of one byte, and the next two one of two and of three well-formed bytes.
+/// Decodes a one-byte character; the next two decode well-formed ones of two and three bytes.
 VARNEK_API unsigned short __WmLngConvert1ByteChar(unsigned char first);
 /// As `__WmLngConvert1ByteChar`
 VARNEK_API unsigned short __WmLngConvert2ByteChar(unsigned char first, unsigned char second);
@@ -74,7 +75,7 @@ VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned 
 /// @param outputData   in: null or a block from malloc, which is freed; out: a block from malloc
 ///                     that the caller frees; unchanged on failure and if the result is empty
 /// @param szInput      the Latin-15 text, read up to its NUL, so copy a slice first
-/// @param szInputSize  its length in bytes; up to three times this plus one byte is accepted
+/// @param szInputSize  its length n in bytes; up to 3 n + 1 bytes are accepted
 /// @return TRUE; FALSE for a null pointer, a longer text or too little memory
 VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
                                                unsigned int szInputSize);

@@ -2,9 +2,9 @@
 /// Named mutexes and named counting semaphores, at most 40 of each in a process.
 ///
 /// Each family hands out the handles 1 to 2147483647 in order, never one twice, and creates nothing
-/// after the last. Names have 1 to 31 characters, compare exactly and are unique, unless two
+/// after the last. Names have 1 to 31 characters, are case-sensitive and are unique, unless two
 /// threads create objects of one name at the same time. All calls are thread-safe. Failures are
-/// traced at Error; a time-out, and a lookup that finds nothing, are no failures and not traced.
+/// traced at Error, but not a time-out or a lookup that finds nothing.
 /// @see [Guide: mutexes and semaphores](docs/guide/mutexes-and-semaphores.md)
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H

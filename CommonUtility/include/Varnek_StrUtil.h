@@ -34,7 +34,7 @@ VARNEK_API char *VarnekPGL_Itoa(uint32_t value, char *buffer, uint32_t radix);
 VARNEK_API char *VarnekPGL_Ltoa(int32_t value, char *buffer, uint32_t radix);
 
 /// Compares without case.
-/// @return how the first two bytes that differ do so, as unsigned lower-case characters; else 0
+/// @return the difference of the first two bytes that differ, in lower case and unsigned; else 0
 VARNEK_API int32_t VarnekPGL_Stricmp(const char *a, const char *b);
 
 /// Compares at most `count` bytes without case; a count of 0 compares equal.

@@ -3,8 +3,8 @@
 /// Objects cannot be moved; any thread may use them. What a thread did before Send, Signal, unlock
 /// or starting a thread or timer is visible after the Receive, Wait or lock that follows, or in the
 /// callable; what a callable did, after Join. The C calls log failures. An object that could not be
-/// made is false, and its functions fail. Names are copied; one that is too long or has a NUL is
-/// refused. Callables are copyable and passed as to std::bind; an exception ends the program.
+/// made, perhaps because its name (which is copied) is too long or has a NUL, is false, and its
+/// functions fail. Callables are copied, as by std::bind; an exception from one ends the program.
 /// @see [Guide: tasking](docs/guide/tasking.md)
 #ifndef VARNEK_TASKING_H
 #define VARNEK_TASKING_H
@@ -33,8 +33,8 @@ enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
 /// What becomes of an object that has the name already: kReplace deletes it, unless it is a held
 /// mutex, and owns the new one; kUse uses it, or makes one, and never deletes it.
 enum class Existing { kReplace, kUse };
-/// Milliseconds from any std::chrono duration: rounded up, 0 for a negative one, 49 days for a
-/// longer one. Only None() is for ever. Waits go by the wall clock; timers and Join do not.
+/// Milliseconds from any std::chrono duration, rounded up and kept within 0 and 49 days; only
+/// None() is for ever. Waits go by the wall clock; timers and Join do not.
 class Limit {
   public:
     /// From a duration, so that it can be given wherever a limit is wanted.
@@ -71,7 +71,7 @@ struct Shared {
     std::mutex lock;  // also makes finding and creating an object one step
     std::condition_variable ended;
     std::map<uintptr_t, Call> calls;   // that wait or run
-    std::atomic<uintptr_t> number{0};  // of the last call or owner; an address would come back
+    std::atomic<uintptr_t> number{0};  // of the last call or owner; an address could be reused
     static Shared &Get() {
         static Shared *const shared = new Shared;
         return *shared;
@@ -110,7 +110,7 @@ struct Calls {
         }
         return nullptr;
     }
-    // Drops the calls that have not begun. `stop` learns whether there were any, and is the result.
+    // Drops the calls that have not begun, and returns what `stop` makes of whether there were any.
     template <typename Stop>
     bool Drop(Stop stop) {
         decltype(Shared::calls) dropped;  // destroyed without the lock
@@ -123,7 +123,7 @@ struct Calls {
         }
         return stop(!dropped.empty());
     }
-    // Waits until there is no call but one that waits itself. Returns false on a time-out.
+    // Waits until no call is left but one that runs in this thread. Returns false on a time-out.
     bool Wait(Limit limit) {
         const auto isDone = [this, self = std::this_thread::get_id()] {
             return std::all_of(shared.calls.begin(), shared.calls.end(), [&](const auto &call) {
@@ -176,8 +176,8 @@ using IfMessage = std::enable_if_t<std::is_trivially_copyable_v<T> && sizeof(T) 
 }  // namespace detail
 
 /// A mutex for std::lock_guard and std::unique_lock; not recursive. Nobody may use it when its
-/// owner is destroyed. lock() aborts, after an assertion report, if the mutex cannot be acquired,
-/// with exceptions too, because no section may run unprotected.
+/// owner is destroyed. If the mutex cannot be acquired, lock() aborts after an assertion report,
+/// even where it could throw, because no section may run unprotected.
 struct Mutex : detail::Own<VarnekPGL_GetMutexByName, VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex> {
     Mutex(std::string_view name, Existing old) : Own(name, old) {}  ///< see Existing
     /// Waits without limit.
@@ -204,8 +204,8 @@ struct Semaphore
     }
 };
 
-/// Sends a trivially copyable content of up to 40 bytes to a thread; with SendUrgent it overtakes
-/// all that wait. Returns false if the thread has no record, or there is too little memory.
+/// Sends a trivially copyable value of up to 40 bytes to a thread; with SendUrgent it overtakes all
+/// others. Returns false if the thread has no record, or there is too little memory.
 template <typename Content, typename = detail::IfMessage<Content>>
 bool Send(int32_t hThread, const Content &content,
           BOOL (*send)(int32_t, const THREAD_MSG *) = VarnekPGL_SendMessage) {
@@ -219,14 +219,14 @@ bool SendUrgent(int32_t hThread, const Content &content) {
     return Send(hThread, content, VarnekPGL_SendUrgentMessage);
 }
 
-/// Takes the first content of the calling thread's own queue; on kSuccess alone it is stored.
+/// Takes the first message of the calling thread's queue; `content` changes only on kSuccess.
 /// Sender and receiver must agree on the type. Only threads of the registry have a queue.
 template <typename T, typename = detail::IfMessage<T>>
 [[nodiscard, gnu::always_inline]] inline Outcome Receive(T &content, Limit limit = Limit::None()) {
     THREAD_MSG message;
     int32_t left = 0;
     const auto wait = [&](uint32_t ms) { return VarnekPGL_ReceiveMessage(ms, &message, &left); };
-    const auto isGone = [] { return VarnekPGL_GetCurrentThread() == -1; };  // or it was a peek's
+    const auto isGone = [] { return VarnekPGL_GetCurrentThread() == -1; };  // or peeking took it
     const Outcome outcome = detail::Await(limit, wait, isGone);
     if (outcome == Outcome::kSuccess) {
         std::memcpy(static_cast<void *>(&content), message.data, sizeof content);
@@ -253,7 +253,7 @@ class Thread {
     ~Thread() { (void)(RemoveRecord() && calls_.Wait(Limit::None())); }
     explicit operator bool() const { return handle_ != -1; }  ///< whether it has a record
     int32_t Handle() const { return handle_; }                ///< to send to; -1 for none
-    /// Waits until the callable, which must not wait itself, has returned, and then removes the
+    /// Waits until the callable, which must not call this, has returned, and then removes the
     /// record. Returns false on a time-out.
     bool Join(Limit limit = Limit::None()) { return calls_.Wait(limit) && RemoveRecord(); }
 
@@ -265,7 +265,7 @@ class Thread {
 
 /// A one-shot timer that runs callables on threads of the system; its name, of 0 to 40 characters,
 /// must be free. Each start calls once, unless Cancel or the destructor comes first. The destructor
-/// waits for a callable that runs, if it is not what destroys the Timer; so hold no lock it takes.
+/// waits for a running callable, unless that destroys the Timer, so hold no lock that it takes.
 class Timer {
   public:
     /// Creates the timer; nothing is armed yet.
@@ -276,7 +276,7 @@ class Timer {
         calls_.Wait(Limit::None());
     }
     explicit operator bool() const { return handle_ != kNone; }  ///< whether it was created
-    /// Starts the timer for at least a millisecond, unless it is armed; a callable may do so too.
+    /// Starts the timer for at least a millisecond; false if it is armed. A callable may call this.
     template <typename... Callable>
     [[nodiscard]] bool Start(Limit delay, Callable &&...callable) {
         const auto start = [this, time = std::max(delay.Milliseconds(), 1u)](void *call) {

@@ -3,9 +3,9 @@
 ///
 /// The registry keeps a record of each thread so that others can find it and send it messages. The
 /// threads are detached; the registry never stops, joins or cancels one, and none may be cancelled
-/// inside a call of this library. Names have 1 to 31 characters, compare exactly and are unique,
+/// inside a call of this library. Names have 1 to 31 characters, are case-sensitive and are unique,
 /// unless two threads create threads of one name at the same time. All calls are thread-safe.
-/// Failures are traced at Error; a lookup that finds nothing is none.
+/// Failures are traced at Error; a lookup that finds nothing is not one.
 /// @see [Guide: threads and messages](docs/guide/threads-and-messages.md)
 #ifndef VARNEK_THREAD_H
 #define VARNEK_THREAD_H
@@ -35,8 +35,8 @@ VARNEK_API int32_t VarnekPGL_CreateThread(const char *szThreadName, int32_t prio
                                           void *argument);
 
 /// Removes a thread's record and frees its unread messages, but not the memory they point to; if
-/// there are any, an Error line counts them. Freeing ten million takes 0.26 s on a PC, during which
-/// no other operation waits. The thread runs on; if it is waiting to receive, it gets FALSE.
+/// there are any, an Error line counts them. No other operation waits while they are freed. The
+/// thread runs on; if it is waiting to receive, it gets FALSE.
 /// @return TRUE, or FALSE for an unknown handle
 VARNEK_API BOOL VarnekPGL_DeleteThread(int32_t hThread);
 
@@ -52,8 +52,8 @@ VARNEK_API int32_t VarnekPGL_GetCurrentThread(void);
 /// @}
 /// @name Messages
 /// Messages are copied in and out. Only memory limits the length of a queue. What one thread sends
-/// with VarnekPGL_SendMessage arrives in that order, and whoever takes a message sees all that its
-/// sender did before sending it.
+/// with VarnekPGL_SendMessage arrives in order, and whoever takes a message sees all that its
+/// sender did before.
 /// @{
 
 /// A message of 40 bytes, whose content the modules agree on. The alignment lets them overlay it

@@ -39,8 +39,8 @@ struct VarnekCDateTime
     /// fill month number `iMonth` count as one more month, and 12 months as one more year.
     uint32_t GetElapsedSeconds() const;
 
-    /// Adds the seconds of the other record, modulo 2^32. Subtracting more than there is is traced
-    /// and changes nothing.
+    /// Adds the seconds of the other record, modulo 2^32. Subtracting too much is traced and
+    /// changes nothing.
     VarnekCDateTime &operator+=(const VarnekCDateTime &other);
     VarnekCDateTime &operator-=(const VarnekCDateTime &other);      ///< subtracts
     VarnekCDateTime operator+(const VarnekCDateTime &other) const;  ///< adds

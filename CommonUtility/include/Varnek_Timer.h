@@ -2,9 +2,9 @@
 /// Named one-shot timers with a callback, and functions that sleep.
 ///
 /// A process has at most 32 timers. A handle is the index of a slot, 0 to 31, and is reused once
-/// the timer is deleted. Names have 0 to 40 characters, compare exactly and are unique. All calls
-/// are thread-safe, also from a callback. Failures are traced at Error, but a lookup that finds
-/// nothing is not one.
+/// the timer is deleted. Names have 0 to 40 characters, are case-sensitive and unique. All calls
+/// are thread-safe, even from a callback. Failures are traced at Error; a lookup that finds nothing
+/// is not one.
 /// @see [Guide: timers](docs/guide/timers.md)
 #ifndef VARNEK_TIMER_H
 #define VARNEK_TIMER_H
@@ -15,10 +15,10 @@
 extern "C" {
 #endif
 
-/// The callback of a timer. It runs on a thread of the OS timer service, with no lock held and
-/// maybe beside other callbacks, even of the same timer, which it may use and start again. It sees
-/// all that the caller of the start did before. Once the timer has expired, it may begin after the
-/// timer is cancelled or deleted, so `pUserData` should be a number, a handle, or memory that
+/// The callback of a timer. It runs on a thread of the OS timer service, with no lock held, maybe
+/// beside other callbacks, even of the same timer, and sees all that the starting thread did
+/// before. It may use the timer and start it again. Once the timer has expired, it may begin after
+/// the timer is cancelled or deleted, so `pUserData` should be a number, a handle, or memory that
 /// outlives the timer.
 typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 
@@ -36,8 +36,8 @@ VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 /// @param callback  called once at the expiry
 /// @param userData  passed to `callback` unchanged
 /// @return TRUE when armed; FALSE for an unknown handle, an armed timer, a null callback, a time of
-///         0, a failing OS call, and if an earlier start has expired but not called back and there
-///         is no memory or OS timer to let it
+///         0, a failing OS call, and if an earlier start has expired without calling back yet and
+///         memory or OS timers run out
 VARNEK_API BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc callback,
                                      void *userData);
 
@@ -56,8 +56,7 @@ VARNEK_API BOOL VarnekPGL_DeleteTimer(uint32_t timer);
 /// @return the handle of the timer of this name; -1 for none and, after an Error line, for null
 VARNEK_API int32_t VarnekPGL_GetTimerByName(const char *szTmName);
 
-/// Checks whether a timer is armed.
-/// @return TRUE while the timer is armed; FALSE otherwise and for an unknown handle
+/// Says whether a timer is armed; FALSE for an unknown handle.
 VARNEK_API BOOL VarnekPGL_IsTimerActive(uint32_t timer);
 
 /// Sleeps for milliseconds. A signal ends the sleep early; a negative time returns at once.

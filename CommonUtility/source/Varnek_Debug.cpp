@@ -243,8 +243,8 @@ void LoadConfig() {
     gDebugState.store(StateOf(enabled), std::memory_order_relaxed);
 }
 
-// Loads the configuration, once if several threads find it missing at the same time, and always
-// with `again`. Loading calls the log function; if that traces, in this thread, nothing happens.
+// Loads the configuration if nobody has, and always with `again`; threads that come together load
+// it once. While it loads, the log function can neither trace nor load in this thread.
 void LoadConfigOnce(bool again) {
     const ErrnoKeeper keeper;
     gDebugLoad.Do([again] {
@@ -353,7 +353,7 @@ int32_t VarnekPGL_SysGetLastErro() {
 void VarnekPGL_changeModeForDebug() {
     VARNEK_TRACE(VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL, " VarnekCfg_changeDebugMode\n");
     for (const char *path : {kDebugPath, kSettingsPath}) {
-        // A change must not reach a file elsewhere.
+        // chmod would follow a link out of the directory.
         if (!IsLink(AT_FDCWD, path) && IsReadable(path)) {
             (void)VarnekPGL_Chmod(path, 666);
         }

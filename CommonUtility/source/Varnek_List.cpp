@@ -1,5 +1,4 @@
-// The linked list. Its nodes come from malloc. All insertions share one link step, and all removals
-// share one unlink step.
+// The linked list.
 #include "Varnek_List.h"
 
 #include <stdlib.h>

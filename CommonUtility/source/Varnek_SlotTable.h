@@ -1,7 +1,7 @@
 // The table of named objects: slots, handles and names, and nothing else. A handle is given out
 // only once, so storing it publishes its slot, and a lookup without a lock trusts what it reads
-// while the handle stays the same. Whoever changes the table holds its guard. All zero is empty.
-// Private.
+// while the handle stays the same. Whoever changes the table holds its guard. A zeroed table is
+// empty. Private.
 #ifndef VARNEK_SOURCE_SLOTTABLE_H
 #define VARNEK_SOURCE_SLOTTABLE_H
 
@@ -33,7 +33,7 @@ class SlotTable {
 
     // Returns the slot of a live handle, null for none: one read if the hint is right, else a scan.
     // Acquire pairs with the release in Publish and makes the Info visible as it was published;
-    // relaxed is for a caller that sees all it needs already, such as a thread its own record.
+    // relaxed is for a caller that sees it already, as a thread sees its own record.
     Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
         if (handle <= kFree) {
             return nullptr;
@@ -48,7 +48,7 @@ class SlotTable {
         if (length == kNameSize) {
             return kInvalidHandle;
         }
-        // The last word is compared here, because there names that belong together usually differ.
+        // The last word is compared here, because similar names usually differ at the end.
         const PackedName wanted(name, length);
         const size_t last = wanted.used - 1;
         for (size_t slot = 0; slot < kSlots; slot++) {
@@ -82,7 +82,7 @@ class SlotTable {
         return nullptr;
     }
 
-    // The handle that the next publication gives out.
+    // The handle that Publish gives out next.
     int32_t NextHandle() const { return given_ + 1; }
 
     // Makes a free slot visible under a name of at most 31 characters. The slot's Info must be
@@ -97,8 +97,8 @@ class SlotTable {
         return handle;
     }
 
-    // Makes the slot invisible; its name stays until the next publication. Returns the number of
-    // slots that remain in use.
+    // Makes the slot invisible; its name stays until the slot is published again. Returns the
+    // number of slots that remain in use.
     int32_t Withdraw(Slot *slot) {
         slot->handle.store(kFree, std::memory_order_relaxed);
         return count_.fetch_sub(1, std::memory_order_relaxed) - 1;
@@ -131,8 +131,8 @@ class SlotTable {
             if (!slot.Has(handle, std::memory_order_acquire)) {
                 continue;
             }
-            // Two live handles may share a hint. A hint that points to the other one is not
-            // changed. A hint that points to neither is stale and is corrected.
+            // Two live handles may share a hint: one that points to the other handle stays as it
+            // is, and one that points to neither is stale, so it is corrected.
             const int32_t hinted = hint->handle.load(std::memory_order_relaxed);
             if (hinted == kFree || &HintOf(hinted) != &HintOf(handle)) {
                 HintOf(handle).store(static_cast<uint32_t>(NumberOf(&slot)),
@@ -153,19 +153,19 @@ class SlotTable {
         return true;
     }
 
-    // Returns the handle of a slot if this is its name, kFree if not. The comparison before
-    // the first read of the handle, like that of the last word in FindByName, is only a filter,
-    // which saves the barriers below where nothing matches. It cannot miss a name whose creation
-    // happened before the lookup, because it reads the words of that creation or, if the object is
-    // being replaced meanwhile, later ones.
+    // Returns the handle of a slot if this is its name, kFree if not. Comparing before the handle
+    // is read, like comparing the last word in FindByName, is only a filter, which saves the
+    // barriers below where nothing matches. It cannot miss a name that was published before the
+    // lookup, because it reads the words stored then or, if the object is being replaced, later
+    // ones.
     //
     // The rest is a sequence lock whose sequence number, the handle, cannot repeat. If both reads
-    // return the same handle, the words in between belong to it:
-    // - They are not older. The first read acquires what Publish released, and the words were
-    //   stored before that.
-    // - They are not newer. A newer word was stored after the release fence in StoreName, and so
-    //   after the handle was withdrawn. If this reads such a word, its acquire fence synchronises
-    //   with that fence, and the second read does not find the handle any more.
+    // return the same handle, the words read in between belong to it:
+    // - They are not older, because the first read acquires what Publish released, and the words
+    //   were stored before that.
+    // - They are not newer. A newer word is stored after the release fence in StoreName, which
+    //   comes after the handle is withdrawn. Whoever reads such a word has an acquire fence that
+    //   synchronises with that fence, so the second read no longer finds the handle.
     __attribute__((noinline)) int32_t HandleOfName(size_t slot, const PackedName &wanted) const {
         if (!HasWords(slot, wanted)) {
             return kFree;

@@ -1,4 +1,4 @@
-// Helpers that the sources of File share, and the reading of whole files for other areas. Private.
+// Helpers that File's sources share, and functions that read whole files for other areas. Private.
 //
 // File reports through __VarnekPGL_FileLog and never through the trace, because the trace reads its
 // configuration through File.
@@ -15,6 +15,9 @@
 // Logs a failure of a file operation at error priority under "SBTVD_File". The text is truncated to
 // 1023 characters. Preserves errno.
 void __VarnekPGL_FileLog(const char *format, ...) __attribute__((format(printf, 1, 2)));
+
+// Logs a failure and evaluates to the result. The caller writes the `return`.
+#define FILE_FAIL(result, ...) (__VarnekPGL_FileLog(__VA_ARGS__), (result))
 
 constexpr uint32_t kSeekBases = 3;  // SEEK_SET 0, SEEK_CUR 1, SEEK_END 2
 
