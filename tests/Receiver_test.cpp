@@ -41,15 +41,14 @@ class Receiver : public VarnekTest {
     }
 
     // Runs the program, and notes its status and its messages.
-    int NoteProgram(const Arguments &arguments, std::FILE *out, const std::atomic<bool> *stop = nullptr) {
+    void NoteProgram(const Arguments &arguments, std::FILE *out) {
         int status = -1;
-        const std::string err = Written([&](std::FILE *file) { status = RunReceiver(arguments, {out, file, stop}); });
+        const std::string err = Written([&](std::FILE *file) { status = RunReceiver(arguments, {out, file}); });
         Note(::testing::PrintToString(arguments) + " = " + std::to_string(status) + "\n" + err);
-        return status;
     }
     // Returns the output too, and notes it up to its first empty line, unless it is JSON.
-    std::string NoteProgram(const Arguments &arguments, const std::atomic<bool> *stop = nullptr) {
-        const std::string out = Written([&](std::FILE *file) { NoteProgram(arguments, file, stop); });
+    std::string NoteProgram(const Arguments &arguments) {
+        const std::string out = Written([&](std::FILE *file) { NoteProgram(arguments, file); });
         Note(out[0] == '{' ? "" : out.substr(0, (out + '\n').find("\n\n") + 1));
         return out;
     }
@@ -59,7 +58,7 @@ class Receiver : public VarnekTest {
 std::string NewLines(const std::string &text, const std::string &other) {
     std::string lines;
     for (size_t at = 0, end = 0; at < text.size(); at = end) {
-        end = std::min(text.find('\n', at) + 1, text.size());
+        end = std::min(text.find('\n', at), text.size() - 1) + 1;
         const std::string line = text.substr(at, end - at);
         lines += ("\n" + other).find("\n" + line) == std::string::npos ? line : "";
     }
