@@ -80,7 +80,7 @@ void AddClock(const Model &model, const StreamClock &clock, Paragraphs &out) {
     const std::optional<DateTime> local = clock.Local(model.time);
     std::string text = utc ? ToText(utc) + " UTC" : "-";
     for (const LocalOffset &offset : model.local_offsets) {
-        text += ", " + offset.country.Text();
+        text = Joined({text, offset.country.Text()});
         text += offset.region != 0 ? Format(" region %d ", offset.region) : " ";
         text += clock.OffsetText(offset.minutes);
     }
