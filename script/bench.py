@@ -14,7 +14,8 @@ from typing import NamedTuple
 
 
 class Peer(NamedTuple):
-    """What a row is compared with. The peer 'bare' is the least code that does the same work."""
+    """What a row is compared with: another library, the library in another state, or, as 'bare', the least code that does
+    the same work."""
     name: str
     title: str
     goal: float | None = None  # our time on a PC divided by the peer's, at most
@@ -45,7 +46,7 @@ ROWS = [
     Row('byname', 'locks', 'mutex by name, 31st of 40', (Peer('alone', 'the only mutex'),), (450, 4)),
     Row('message/same', 'messages', 'send + receive, same thread',
         (Peer('gasync', 'GAsyncQueue', 1.1), Peer('bare', MESSAGE_LIST, 2.0)), (900, 20)),
-    Row('message/queued', 'messages', 'the same, 1000000 messages in the queue', (Peer('empty', 'empty queue', 1.2),)),
+    Row('message/queued', 'messages', 'send + receive behind 1000000 messages', (Peer('empty', 'empty queue', 1.2),)),
     Row('message/oneway', 'messages', 'message, one way',
         (Peer('gasync', 'GAsyncQueue', 0.9), Peer('bare', MESSAGE_LIST, 2.0)), wall=True),
     Row('message/pingpong1', 'messages', 'ping-pong on one core',
