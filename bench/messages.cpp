@@ -136,11 +136,10 @@ void SameThread(benchmark::State &state) {
 // A thread on its own core that answers every so many messages, until the first byte of one says
 // that it is the last.
 template <typename Queue>
-class Partner {
-  public:
+struct Partner {
     Partner(int core, int every)
-        : thread_("partner", 1024 * 1024, &Partner::Answer, this, core, every) {
-        there.GiveTo(thread_.Handle());
+        : thread("partner", 1024 * 1024, &Partner::Answer, this, core, every) {
+        there.GiveTo(thread.Handle());
         back.GiveTo(VarnekPGL_GetCurrentThread());
     }
     ~Partner() {
@@ -151,9 +150,6 @@ class Partner {
     Partner(const Partner &) = delete;
     Partner &operator=(const Partner &) = delete;
 
-    Queue there, back;
-
-  private:
     void Answer(int core, int every) {
         bench::PinTo(core);
         THREAD_MSG message = {};
@@ -164,7 +160,8 @@ class Partner {
         }
     }
 
-    varnek::Thread thread_;
+    Queue there, back;
+    varnek::Thread thread;
 };
 
 template <typename Queue>
