@@ -11,7 +11,7 @@ die() {
     exit 1
 }
 
-# quietly NAME COMMAND...: runs a command with its output in build/log/NAME.log, whose end it shows if the command fails.
+# quietly NAME COMMAND...: runs a command with its output in build/log/NAME.log, and shows the end if that fails.
 quietly() {
     local log=build/log/$1.log status=0
     shift
