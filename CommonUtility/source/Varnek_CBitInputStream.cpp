@@ -1,6 +1,6 @@
 // The bit input stream. Nearly every field comes from the current byte or, if it ends behind that,
-// from a word of the buffer. Near the end, and after a rewind inside a byte, GetBits reads a field
-// piece by piece; only GetBits detects the end of the stream.
+// from a word of the buffer. Near the end, and after rewinding from inside a byte, GetBits reads a
+// field piece by piece; it alone detects the end of the stream.
 #include "Varnek_CBitInputStream.h"
 
 #include <limits.h>
@@ -11,9 +11,9 @@
 #include "Varnek_Bytes.h"
 #include "Varnek_Trace.h"
 
-// Values of bEndOfStream. A rewind inside a byte loads the whole target byte into ucCurByte but
-// keeps the bit index, so ucCurByte does not correspond to buffer and index. kRewound marks this
-// state, in which GetBits reads all fields until it reaches the end of that byte.
+// Values of bEndOfStream. Rewinding from inside a byte loads the whole target byte into ucCurByte
+// but keeps the bit index, so the two no longer match. In that state, kRewound, GetBits reads all
+// fields up to the end of the byte.
 static constexpr unsigned char kReading = 0;
 static constexpr unsigned char kAtEnd = 1;
 static constexpr unsigned char kRewound = 2;
@@ -118,7 +118,7 @@ unsigned int VarnekCBitInputStream::GetBits(int aNum, unsigned char &success) {
     return value;
 }
 
-// Reads a field of `width` bits; the current byte has `left` unread bits. It is out of line and
+// Reads a field of `width` bits when the current byte has `left` unread bits. Out of line and
 // called last, so that reading the usual fields does not have to save registers.
 template <typename Value>
 __attribute__((noinline, cold)) static Value ReadByPieces(VarnekCBitInputStream &stream, int left,

@@ -1,5 +1,5 @@
-// The byte ring. A position is below the size, with one exception: a seek may set the reader to the
-// end of the storage, so that the next read starts at the first byte.
+// The byte ring. Positions are below the size, except that seeking may put the reader at the end of
+// the storage, from where the next read starts over at the first byte.
 #include "Varnek_CRingBuffer.h"
 
 #include <stdio.h>
@@ -68,7 +68,7 @@ struct VarnekRingSteps {
                                                               HoldMutex *hold) {
         hold->Release();
         TRACE_MID("Ring Buffer will be reset!!!\n");
-        hold->Acquire();
+        const HoldMutex again(ring->hRingMutex);
         Empty(ring);
     }
 
@@ -87,8 +87,8 @@ namespace {
 
 using Steps = VarnekRingSteps;
 
-// Numbers the names of the rings' mutexes. If two rings used the same name, the second would delete
-// the mutex of the first.
+// Numbers the names of the rings' mutexes, since a ring that reused a name would delete the mutex
+// of the other.
 std::atomic<int32_t> gRingBufCount{0};
 
 // Advances a position by `length` bytes; `length` is at most `size`.

@@ -37,7 +37,7 @@ namespace {
 constexpr size_t kLineSize = 255;  // a line that is read, with its terminator
 constexpr size_t kFileSize = 900;  // the text that is written, with its terminator
 
-// A save writes a draft first. Its name ends in the saver's process id and a number.
+// Saving writes a draft first, whose name ends in the saver's process id and a number.
 constexpr char kDraftPrefix[] = "Varnek_Config.new.";
 std::atomic<unsigned int> gNextDraft{0};  // number of this process's next draft
 
@@ -193,7 +193,7 @@ bool MayReplace(struct stat64 *old) {
     return IsOwnFile(*old) && !IsProtected(*old) && old->st_nlink <= 1;
 }
 
-// Gives the draft the group and the mode of the file that it will replace, as late as possible, as
+// Gives the draft the group and mode of the file that it will replace, as late as possible, because
 // another process may change them. Returns false if that fails or the file must not be replaced.
 bool ImitateOld(int draft) {
     struct stat64 old = {};
@@ -202,11 +202,10 @@ bool ImitateOld(int draft) {
                                  fchmod(draft, old.st_mode & 07777) == 0));
 }
 
-// Whether the saver of a draft is gone, given the "PID.NUMBER" at the end of its name. Whether
-// another process exists can be told without any permission; if its id is in use again, the draft
-// stays until that process has ended. Of this process's drafts, one whose number has not been taken
-// yet is from an earlier process with its id; a live one had its number taken before it could be
-// listed.
+// Whether the saver of a draft is gone, given the "PID.NUMBER" at the end of its name. It takes no
+// permission to learn whether a process exists; if the id is in use again, the draft stays until
+// that process ends, too. Under our own id, a number that we have not reached yet is an earlier
+// process's, since a draft of ours takes its number before it can be listed.
 bool IsDead(const char *saver) {
     char *end = nullptr;
     const pid_t process = static_cast<pid_t>(strtoll(saver, &end, 10));
@@ -226,9 +225,9 @@ void RemoveDeadDrafts(DIR *directory) {
 }
 
 // Writes the text to a draft, flushes it to the medium and renames it over the settings file, so a
-// reader finds the old text or the new one, whatever happens to this process. Each save has a draft
-// of its own and needs no lock. Returns false on failure, without a line; the file then has its old
-// text, or the new one that may not be on the medium yet.
+// reader finds the old text or the new one, whatever happens to this process. No lock is needed,
+// because every caller writes a draft of its own. Returns false on failure, without a line; the
+// file then has its old text, or the new one, which may not be on the medium yet.
 bool Replace(DIR *directory, const char *text, size_t length) {
     const int in = dirfd(directory);
     char draft[48];
@@ -251,8 +250,8 @@ bool Replace(DIR *directory, const char *text, size_t length) {
     return fsync(in) == 0;
 }
 
-// Whether these bytes are the text of a save: six lines, and nothing behind the last one. The rest
-// of a longer text would have a line end too many, and a text that was cut would have one too few.
+// Whether these bytes are a whole text: six lines and nothing behind them. With the rest of a
+// longer text there would be a line end too many, in a text that was cut one too few.
 bool IsWhole(const char *text, ssize_t size) {
     return size > 0 && text[size - 1] == '\n' &&
            std::count(text, text + size, '\n') == CONFIG_FIELD_COUNT;
@@ -282,8 +281,8 @@ bool WriteOver(int fd, const char *text, size_t length) {
     return false;
 }
 
-// Saves in place, where the file cannot be replaced. Nothing is created, except behind a link:
-// where a new file could not be stored, an empty one would only cost the settings at the next load.
+// Saves in place, where the file cannot be replaced. Creates nothing, except behind a link: where a
+// new file could not be stored, an empty one would only cost the settings at the next loading.
 void SaveInPlace(const struct stat64 &old, const char *text) {
     const int flags = O_RDWR | O_CLOEXEC | (S_ISLNK(old.st_mode) ? O_CREAT : 0);
     const int fd = IsProtected(old) ? -1 : open(kSettingsPath, flags, 0666);

@@ -57,14 +57,13 @@ bool RemoveAt(int dir, const char *name) {
         (errno == EISDIR && unlinkat(dir, name, AT_REMOVEDIR) == 0)) {
         return true;
     }
-    __VarnekPGL_FileLog("%s : remove File[] Fail", "VarnekPGL_DeleteFile");
-    return false;
+    return FILE_FAIL(false, "%s : remove File[] Fail", "VarnekPGL_DeleteFile");
 }
 
-// The deletion of a directory tree works on descriptors that are opened without following links, so
-// it does not enter a link that replaces a directory during the deletion.
+// Deleting a directory tree works on descriptors that are opened without following links, so it
+// does not enter a link that replaces a directory meanwhile.
 
-// An open directory between the root of a deletion and its current position. The levels are on the
+// An open directory between the root of the tree and the current position. The levels are on the
 // heap, so that a deep tree needs no more stack.
 struct TreeLevel {
     TreeLevel *parent;  // null for the root
@@ -115,10 +114,10 @@ TreeLevel *DeleteChild(TreeLevel *level, const PglDirEntry &entry) {
     const size_t length = strlen(level->path);
     const char *slash = length > 0 && level->path[length - 1] == '/' ? "" : "/";
     char path[kChildPathSize];
-    if (length + strlen(slash) + strlen(name) >= sizeof path) {
-        __VarnekPGL_FileLog("%s : exceed max file path length : %s/%s", kDeletion, level->path,
-                            name);
-        return level;
+    const int needed = snprintf(path, sizeof path, "%s%s%s", level->path, slash, name);
+    if (static_cast<size_t>(needed) >= sizeof path) {
+        return FILE_FAIL(level, "%s : exceed max file path length : %s/%s", kDeletion, level->path,
+                         name);
     }
     if (entry.type != PGL_ENTRY_DIR) {
         RemoveAt(dir, name);
@@ -129,7 +128,6 @@ TreeLevel *DeleteChild(TreeLevel *level, const PglDirEntry &entry) {
         RemoveAt(dir, name);
         return level;
     }
-    snprintf(path, sizeof path, "%s%s%s", level->path, slash, name);
     TreeLevel *child = Enter(level, fd, path, strlen(name));
     return child != nullptr ? child : level;
 }
@@ -166,8 +164,7 @@ int32_t DeleteTree(const char *path, int fd) {
 
 int32_t VarnekPGL_MakeDir(const char *path) {
     if (IsTooLong(path)) {
-        __VarnekPGL_FileLog("%s : exceed max file path length : %s", __func__, path);
-        return -1;
+        return FILE_FAIL(-1, "%s : exceed max file path length : %s", __func__, path);
     }
     if (path != nullptr && mkdir(path, 0755) == 0) {
         return 0;
@@ -175,10 +172,9 @@ int32_t VarnekPGL_MakeDir(const char *path) {
     const int error = path != nullptr ? errno : EFAULT;  // as mkdir reports a null path
     char process[200];
     ReadProcessName(process);
-    __VarnekPGL_FileLog("%s : [%s] dir create failed! errno(%d),process(%s) pid(%d) uid(%d)",
-                        __func__, Shown(path), error, process, static_cast<int>(getpid()),
-                        static_cast<int>(getuid()));
-    return -1;
+    return FILE_FAIL(-1, "%s : [%s] dir create failed! errno(%d),process(%s) pid(%d) uid(%d)",
+                     __func__, Shown(path), error, process, static_cast<int>(getpid()),
+                     static_cast<int>(getuid()));
 }
 
 int32_t VarnekPGL_DeleteDir(const char *path) {
@@ -214,12 +210,10 @@ int32_t VarnekPGL_DeleteDirEx(const char *path) {
 int32_t VarnekPGL_ClearDir(const char *path) {
     // A directory that could not be created again is not deleted. MakeDir below logs the reason.
     if (!IsTooLong(path) && VarnekPGL_DeleteDirEx(path) != 0) {
-        __VarnekPGL_FileLog("%s : Directory Deletion Fail. Dir Path=[%s]", __func__, Shown(path));
-        return -1;
+        return FILE_FAIL(-1, "%s : Directory Deletion Fail. Dir Path=[%s]", __func__, Shown(path));
     }
     if (VarnekPGL_MakeDir(path) != 0) {
-        __VarnekPGL_FileLog("%s : Directory Creation Fail. Dir Path=[%s]", __func__, path);
-        return -1;
+        return FILE_FAIL(-1, "%s : Directory Creation Fail. Dir Path=[%s]", __func__, path);
     }
     return 0;
 }
@@ -227,8 +221,7 @@ int32_t VarnekPGL_ClearDir(const char *path) {
 void *VarnekPGL_OpenDir(const char *path) {
     DIR *dir = path != nullptr ? opendir(path) : nullptr;
     if (dir == nullptr) {
-        __VarnekPGL_FileLog("%s : pDir(%s) = NULL", __func__, Shown(path));
-        return PGL_INVALID_DIR_HANDLE;
+        return FILE_FAIL(PGL_INVALID_DIR_HANDLE, "%s : pDir(%s) = NULL", __func__, Shown(path));
     }
     return dir;
 }
@@ -242,16 +235,14 @@ BOOL VarnekPGL_CloseDir(void *hDir) {
 
 BOOL __VarnekPGL_ReadDir(void *hDir, PglDirEntry *entry) {
     if (entry == nullptr) {
-        __VarnekPGL_FileLog("%s : pEntry == NULL", __func__);
-        return FALSE;
+        return FILE_FAIL(FALSE, "%s : pEntry == NULL", __func__);
     }
     DIR *dir = DirOf(hDir);
     const struct dirent64 *next = dir != nullptr ? readdir64(dir) : nullptr;
     if (next == nullptr || next->d_reclen < 1 || next->d_reclen > 256) {
         entry->type = 0;
-        __VarnekPGL_FileLog("%s : return FALSE pDir = 0x%x", __func__,
-                            ShownHandle(reinterpret_cast<intptr_t>(hDir)));
-        return FALSE;
+        return FILE_FAIL(FALSE, "%s : return FALSE pDir = 0x%x", __func__,
+                         ShownHandle(reinterpret_cast<intptr_t>(hDir)));
     }
     const size_t length = strnlen(next->d_name, next->d_reclen);
     memcpy(entry->name, next->d_name, length);
@@ -262,8 +253,7 @@ BOOL __VarnekPGL_ReadDir(void *hDir, PglDirEntry *entry) {
 
 BOOL VarnekPGL_ReadDir(void *hDir, PglDirEntryInfo *info) {
     if (info == nullptr) {
-        __VarnekPGL_FileLog("%s : pEntry == NULL", __func__);
-        return FALSE;
+        return FILE_FAIL(FALSE, "%s : pEntry == NULL", __func__);
     }
     info->type = 0;
     PglDirEntry entry = {};
@@ -294,8 +284,7 @@ BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttributes *attr) 
     }
     struct stat64 status = {};
     if (path == nullptr || stat64(path, &status) != 0) {
-        __VarnekPGL_FileLog("%s : failed...%s", __func__, Shown(path));
-        return FALSE;
+        return FILE_FAIL(FALSE, "%s : failed...%s", __func__, Shown(path));
     }
     *attr = {};
     attr->size = static_cast<uint32_t>(status.st_size);
@@ -375,13 +364,12 @@ int32_t RunOnTwo(const char *operation, bool mayRun, const char *command, const 
     if (mayRun && line.Add(command).AddPath(source).Add(between).AddPath(destination).Run() == 0) {
         return 0;
     }
-    __VarnekPGL_FileLog("%s : fail src = %s dest = %s", operation, Shown(source),
-                        Shown(destination));
-    return -1;
+    return FILE_FAIL(-1, "%s : fail src = %s dest = %s", operation, Shown(source),
+                     Shown(destination));
 }
 
-// Whether a copy may run. The shell empties the destination before it reads the source, so if the
-// source could not be read, or were the destination itself, the destination would lose its content.
+// Whether copying loses nothing. The shell empties the destination before it reads the source, so
+// the destination's content would be gone if the source could not be read or were the same file.
 bool MayCopy(const char *source, const char *destination) {
     struct stat64 from = {};
     struct stat64 to = {};

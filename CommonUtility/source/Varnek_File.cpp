@@ -43,8 +43,7 @@ void __VarnekPGL_FileLog(const char *format, ...) {
 
 PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags) {
     if (IsTooLong(path)) {
-        __VarnekPGL_FileLog("%s : file path(%s) length over max size", __func__, path);
-        return -1;
+        return FILE_FAIL(-1, "%s : file path(%s) length over max size", __func__, path);
     }
     const char *const mode = (flags & PGL_FILE_MODE_APPEND) != 0      ? "a"
                              : (flags & PGL_FILE_MODE_CREATE_RW) != 0 ? "w+"
@@ -56,8 +55,7 @@ PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags) {
     }
     FILE *stream = path != nullptr ? fopen(path, mode) : nullptr;
     if (stream == nullptr) {
-        __VarnekPGL_FileLog("%s : NULL file pointer. szFilePath=[%s]", __func__, Shown(path));
-        return -1;
+        return FILE_FAIL(-1, "%s : NULL file pointer. szFilePath=[%s]", __func__, Shown(path));
     }
     return reinterpret_cast<PglFileHandle>(stream);
 }
@@ -66,12 +64,10 @@ PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags) {
 __attribute__((noinline)) int32_t VarnekPGL_CloseFile(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
     if (stream == nullptr) {
-        __VarnekPGL_FileLog("%s : NULL file pointer", __func__);
-        return -1;
+        return FILE_FAIL(-1, "%s : NULL file pointer", __func__);
     }
     if (fclose(stream) != 0) {
-        __VarnekPGL_FileLog("%s : fail hFile = 0x%x", __func__, ShownHandle(hFile));
-        return -1;
+        return FILE_FAIL(-1, "%s : fail hFile = 0x%x", __func__, ShownHandle(hFile));
     }
     return 0;
 }
@@ -79,16 +75,14 @@ __attribute__((noinline)) int32_t VarnekPGL_CloseFile(PglFileHandle hFile) {
 int32_t VarnekPGL_SeekFile(PglFileHandle hFile, int32_t offset, uint32_t base) {
     FILE *stream = StreamOf(hFile);
     if (stream == nullptr) {
-        __VarnekPGL_FileLog("%s : NULL file pointer", __func__);
-        return 0;
+        return FILE_FAIL(0, "%s : NULL file pointer", __func__);
     }
     if (base >= kSeekBases) {
-        __VarnekPGL_FileLog("%s : Invalid Seek base! base=%d", __func__, static_cast<int>(base));
-        return VARNEK_FILE_INVALID_BASE;
+        return FILE_FAIL(VARNEK_FILE_INVALID_BASE, "%s : Invalid Seek base! base=%d", __func__,
+                         static_cast<int>(base));
     }
     if (fseek(stream, offset, static_cast<int>(base)) < 0) {
-        __VarnekPGL_FileLog("%s : fail handle = 0x%x", __func__, ShownHandle(hFile));
-        return -1;
+        return FILE_FAIL(-1, "%s : fail handle = 0x%x", __func__, ShownHandle(hFile));
     }
     return 0;
 }
@@ -96,8 +90,7 @@ int32_t VarnekPGL_SeekFile(PglFileHandle hFile, int32_t offset, uint32_t base) {
 int32_t VarnekPGL_TellFile(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
     if (stream == nullptr) {
-        __VarnekPGL_FileLog("%s : NULL file pointer", __func__);
-        return -1;
+        return FILE_FAIL(-1, "%s : NULL file pointer", __func__);
     }
     // A position beyond 32 bits, such as the "end" of a directory, counts as no position.
     const int64_t position = ftell(stream);
@@ -107,12 +100,10 @@ int32_t VarnekPGL_TellFile(PglFileHandle hFile) {
 int32_t VarnekPGL_FlushFile(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
     if (stream == nullptr) {
-        __VarnekPGL_FileLog("%s : NULL file pointer", __func__);
-        return -1;
+        return FILE_FAIL(-1, "%s : NULL file pointer", __func__);
     }
     if (fflush(stream) != 0) {
-        __VarnekPGL_FileLog("%s : fail", __func__);
-        return -1;
+        return FILE_FAIL(-1, "%s : fail", __func__);
     }
     return 0;
 }
@@ -120,12 +111,10 @@ int32_t VarnekPGL_FlushFile(PglFileHandle hFile) {
 uint32_t VarnekPGL_ReadFileByHandle(PglFileHandle hFile, void *buffer, uint32_t length) {
     FILE *stream = StreamOf(hFile);
     if (stream == nullptr) {
-        __VarnekPGL_FileLog("%s : NULL file pointer", __func__);
-        return 0;
+        return FILE_FAIL(0, "%s : NULL file pointer", __func__);
     }
     if (buffer == nullptr && length > 0) {
-        __VarnekPGL_FileLog("%s : NULL buffer", __func__);
-        return 0;
+        return FILE_FAIL(0, "%s : NULL buffer", __func__);
     }
     return static_cast<uint32_t>(fread(buffer, 1, length, stream));
 }
@@ -133,12 +122,10 @@ uint32_t VarnekPGL_ReadFileByHandle(PglFileHandle hFile, void *buffer, uint32_t 
 uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer, uint32_t length) {
     FILE *stream = StreamOf(hFile);
     if (stream == nullptr) {
-        __VarnekPGL_FileLog("%s : NULL file pointer", __func__);
-        return 0;
+        return FILE_FAIL(0, "%s : NULL file pointer", __func__);
     }
     if (buffer == nullptr && length > 0) {
-        __VarnekPGL_FileLog("%s : NULL buffer", __func__);
-        return 0;
+        return FILE_FAIL(0, "%s : NULL buffer", __func__);
     }
     return static_cast<uint32_t>(fwrite(buffer, 1, length, stream));
 }
@@ -146,7 +133,7 @@ uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer, ui
 int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
     const int32_t position = VarnekPGL_TellFile(hFile);
-    // The seek makes the bytes written so far count, which a full medium refuses, and ends the
+    // Seeking makes the bytes written so far count, unless the medium is full, and ends the
     // end-of-file state, so that a reader can follow a file that grows.
     if (stream != nullptr && SizeOfRegularFile(stream) >= 0 &&
         VarnekPGL_SeekFile(hFile, 0, SEEK_CUR) == 0) {
@@ -184,8 +171,7 @@ int32_t VarnekPGL_ReadFile(const char *path, void *buffer, uint32_t length) {
 int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uint32_t length) {
     if (buffer == nullptr && length > 0) {
         // Refused here, because the open below would empty the file.
-        __VarnekPGL_FileLog("%s : NULL buffer", __func__);
-        return 0;
+        return FILE_FAIL(0, "%s : NULL buffer", __func__);
     }
     const PglFileHandle file = OpenWhole(__func__, path, PGL_FILE_MODE_WRITE);
     if (file == -1) {
@@ -202,8 +188,7 @@ int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uint32_t lengt
 int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t length) {
     if (buffer == nullptr && length > 0) {
         // Refused here, because the open below would create the file.
-        __VarnekPGL_FileLog("%s : NULL buffer", __func__);
-        return -1;
+        return FILE_FAIL(-1, "%s : NULL buffer", __func__);
     }
     const PglFileHandle file = OpenWhole(__func__, path, PGL_FILE_MODE_APPEND);
     if (file == -1) {
@@ -218,16 +203,14 @@ int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t leng
     if (written == length) {
         written = 0;
     }
-    __VarnekPGL_FileLog("%s : name = %s: Fail! write size = %d, desired size = %d", __func__, path,
-                        static_cast<int>(written), static_cast<int>(length));
-    return -1;
+    return FILE_FAIL(-1, "%s : name = %s: Fail! write size = %d, desired size = %d", __func__, path,
+                     static_cast<int>(written), static_cast<int>(length));
 }
 
 int32_t VarnekPGL_GetFileSize(const char *path) {
     const PglFileHandle file = VarnekPGL_OpenFile(path, PGL_FILE_MODE_READ);
     if (file == -1) {
-        __VarnekPGL_FileLog("%s fail =[%s]", __func__, Shown(path));
-        return 0;
+        return FILE_FAIL(0, "%s fail =[%s]", __func__, Shown(path));
     }
     if (VarnekPGL_SeekFile(file, 0, SEEK_END) != 0) {
         __VarnekPGL_FileLog("%s : File Seeking Fail!! file path=[%s]", __func__, path);
@@ -245,8 +228,7 @@ int32_t VarnekPGL_GetFileSize(const char *path) {
 BOOL VarnekPGL_CheckFile(const char *path) {
     const PglFileHandle file = VarnekPGL_OpenFile(path, PGL_FILE_MODE_READ);
     if (file == -1) {
-        __VarnekPGL_FileLog("%s : fail %s", __func__, Shown(path));
-        return FALSE;
+        return FILE_FAIL(FALSE, "%s : fail %s", __func__, Shown(path));
     }
     VarnekPGL_CloseFile(file);
     return TRUE;
@@ -254,8 +236,7 @@ BOOL VarnekPGL_CheckFile(const char *path) {
 
 int32_t VarnekPGL_DeleteFile(const char *path) {
     if (path == nullptr || remove(path) != 0) {
-        __VarnekPGL_FileLog("%s : remove File[] Fail", __func__);
-        return -1;
+        return FILE_FAIL(-1, "%s : remove File[] Fail", __func__);
     }
     return 0;
 }

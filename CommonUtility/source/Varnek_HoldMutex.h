@@ -6,8 +6,8 @@
 #include "Varnek_Semaphore.h"
 
 // Holds a named mutex until the end of the scope or until Release, as if by VarnekPGL_AcquireMutex
-// and VarnekPGL_ReleaseMutex. These two do what the short road here cannot, and so they write the
-// lines of a failure: both lines, because the release is attempted even if nothing is held.
+// and VarnekPGL_ReleaseMutex. Where the short road here fails, these two are called, both of them,
+// and write the lines of the failure.
 class HoldMutex {
   public:
     static constexpr int32_t kNoMutex = -1;
@@ -37,7 +37,7 @@ class HoldMutex {
     }
     // Needs no second lookup, because a held mutex cannot be deleted.
     void Release() {
-        if (tried_ && (held_ == nullptr || pthread_mutex_unlock(held_) != 0)) {
+        if (held_ != nullptr ? pthread_mutex_unlock(held_) != 0 : tried_) {
             VarnekPGL_ReleaseMutex(hMutex_);
         }
         tried_ = false;

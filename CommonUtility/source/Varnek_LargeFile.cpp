@@ -7,8 +7,9 @@
 #include "Varnek_Storage.h"
 #include "Varnek_Support.h"
 
-// Logs a failure of this family, with its marker in front.
-#define LARGE_FILE_LOG(format, ...) __VarnekPGL_FileLog("[FULLSEG_64BIT_FILE]" format, __VA_ARGS__)
+// Logs a failure of this family, with its marker in front, and evaluates to the result.
+#define LARGE_FILE_FAIL(result, format, ...) \
+    FILE_FAIL(result, "[FULLSEG_64BIT_FILE]" format, __VA_ARGS__)
 
 namespace {
 
@@ -41,16 +42,16 @@ int32_t VarnekPGL_OpenFile64Bits(const char *path, int32_t flags) {
     // The umask decides who else may use the data; it is never executable.
     const int fd = path != nullptr ? open(path, access | O_LARGEFILE, 0666) : -1;
     if (fd < 0) {
-        LARGE_FILE_LOG("VarnekPGL_OpenFile64Bits: Invalid Hndl: %d Filename : [%s]", fd,
-                       Shown(path));
+        return LARGE_FILE_FAIL(fd, "VarnekPGL_OpenFile64Bits: Invalid Hndl: %d Filename : [%s]", fd,
+                               Shown(path));
     }
     return fd;
 }
 
 int32_t VarnekPGL_CloseFile64Bits(int32_t hFile) {
     if (hFile < 0) {
-        LARGE_FILE_LOG("VarnekPGL_CloseFile64Bits: Close Failure Invalid Hndl : %d", hFile);
-        return -1;
+        return LARGE_FILE_FAIL(-1, "VarnekPGL_CloseFile64Bits: Close Failure Invalid Hndl : %d",
+                               hFile);
     }
     close(hFile);
     return 0;
@@ -58,16 +59,16 @@ int32_t VarnekPGL_CloseFile64Bits(int32_t hFile) {
 
 int32_t VarnekPGL_ReadFileByHandle64Bits(int32_t hFile, void *buffer, uint32_t length) {
     if (hFile < 0) {
-        LARGE_FILE_LOG("VarnekPGL_ReadFileByHandle64Bits: Read Failure Invalid Hndl : %d", hFile);
-        return 0;
+        return LARGE_FILE_FAIL(
+            0, "VarnekPGL_ReadFileByHandle64Bits: Read Failure Invalid Hndl : %d", hFile);
     }
     return static_cast<int32_t>(read(hFile, buffer, length));
 }
 
 int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer, uint32_t length) {
     if (hFile < 0) {
-        LARGE_FILE_LOG("VarnekPGL_WriteFileByHandle64Bits: Write Failure Invalid Hndl : %d", hFile);
-        return 0;
+        return LARGE_FILE_FAIL(
+            0, "VarnekPGL_WriteFileByHandle64Bits: Write Failure Invalid Hndl : %d", hFile);
     }
     const ssize_t written = write(hFile, buffer, length);
     if (written >= 0 && static_cast<size_t>(written) == length) {
@@ -75,10 +76,10 @@ int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer, uin
     }
     // A short write sets no errno, so the value of an earlier call must not be reported.
     const int error = written < 0 ? errno : 0;
-    LARGE_FILE_LOG(
-        "VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : %d, Size : [ "
-        "%u %u ] %s ",
-        hFile, length, static_cast<unsigned>(written), ErrorText(error));
+    const int32_t result = LARGE_FILE_FAIL(
+        static_cast<int32_t>(written),
+        "VarnekPGL_WriteFileByHandle64Bits: Write Failure Hndl : %d, Size : [ %u %u ] %s ", hFile,
+        length, static_cast<unsigned>(written), ErrorText(error));
     switch (error) {
         case EFBIG:
             return VARNEK_FILE_TOO_LARGE;
@@ -88,19 +89,18 @@ int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *buffer, uin
         case ENOSPC:
             return VARNEK_FILE_MEDIUM_FULL;
         default:
-            return static_cast<int32_t>(written);
+            return result;
     }
 }
 
 int32_t VarnekPGL_SeekFile64Bits(int32_t hFile, int64_t offset, uint32_t base) {
     if (base >= kSeekBases) {
-        LARGE_FILE_LOG(" VarnekPGL_SeekFile64Bits Invalid Seek base! base=[%d]",
-                       static_cast<int>(base));
-        return VARNEK_FILE_INVALID_BASE;
+        return LARGE_FILE_FAIL(VARNEK_FILE_INVALID_BASE,
+                               " VarnekPGL_SeekFile64Bits Invalid Seek base! base=[%d]",
+                               static_cast<int>(base));
     }
     if (hFile < 0) {
-        LARGE_FILE_LOG("VarnekPGL_FSeek64Bits: Seek Failure Invalid Hndl : %d", hFile);
-        return -1;
+        return LARGE_FILE_FAIL(-1, "VarnekPGL_FSeek64Bits: Seek Failure Invalid Hndl : %d", hFile);
     }
     lseek64(hFile, offset, static_cast<int>(base));
     return 0;
@@ -108,16 +108,16 @@ int32_t VarnekPGL_SeekFile64Bits(int32_t hFile, int64_t offset, uint32_t base) {
 
 int64_t VarnekPGL_TellFile64Bits(int32_t hFile) {
     if (hFile < 0) {
-        LARGE_FILE_LOG("VarnekPGL_TellFile64Bits: Tell Failure Invalid Hndl : %d", hFile);
-        return 0;
+        return LARGE_FILE_FAIL(0, "VarnekPGL_TellFile64Bits: Tell Failure Invalid Hndl : %d",
+                               hFile);
     }
     return lseek64(hFile, 0, SEEK_CUR);
 }
 
 int32_t VarnekPGL_FlushFile64Bits(int32_t hFile) {
     if (hFile < 0) {
-        LARGE_FILE_LOG("VarnekPGL_FlushFile64Bits: Flush Failure Invalid Hndl : %d", hFile);
-        return -1;
+        return LARGE_FILE_FAIL(-1, "VarnekPGL_FlushFile64Bits: Flush Failure Invalid Hndl : %d",
+                               hFile);
     }
     fsync(hFile);
     return 0;

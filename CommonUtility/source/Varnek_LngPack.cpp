@@ -1,6 +1,6 @@
-// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. The direct conversion
-// from Latin-15 to UTF-8 cannot differ from the two steps, because its table is built from theirs.
-// The decoder and the computation of its output size agree, because both use CharLength.
+// Text conversion: Latin-15 bytes to 16-bit units, units to UTF-8 and back. Converting Latin-15
+// directly to UTF-8 cannot differ from the two steps, because its table is built from theirs. The
+// decoder needs as much room as was computed for it, because both use CharLength.
 #include "Varnek_LngPack.h"
 
 #include <limits.h>

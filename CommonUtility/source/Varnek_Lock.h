@@ -16,8 +16,8 @@
 #define VARNEK_GUARDED_BY(lock) VARNEK_THREAD_SAFETY(guarded_by(lock))
 #define VARNEK_REQUIRES(lock) VARNEK_THREAD_SAFETY(requires_capability(lock))
 
-// A lock in static storage. It is zero at the start, which means unlocked on every target. It is
-// never destroyed.
+// A lock in static storage, never destroyed. All zero, as at the start, is unlocked on every
+// target.
 struct VARNEK_THREAD_SAFETY(capability("mutex")) Lock {
     pthread_mutex_t mutex;
 
@@ -26,7 +26,7 @@ struct VARNEK_THREAD_SAFETY(capability("mutex")) Lock {
 };
 
 // Holds a lock until the end of the scope, or until Release, which callers use before a trace or a
-// callback. After a release the lock may be acquired again.
+// callback. After that it may be acquired again.
 class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
   public:
     explicit Hold(Lock &lock) VARNEK_THREAD_SAFETY(acquire_capability(lock)) : lock_(lock) {

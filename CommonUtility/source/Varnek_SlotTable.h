@@ -82,7 +82,7 @@ class SlotTable {
         return nullptr;
     }
 
-    // The handle that the next publication gives out.
+    // The handle that Publish gives out next.
     int32_t NextHandle() const { return given_ + 1; }
 
     // Makes a free slot visible under a name of at most 31 characters. The slot's Info must be
@@ -97,8 +97,8 @@ class SlotTable {
         return handle;
     }
 
-    // Makes the slot invisible; its name stays until the next publication. Returns the number of
-    // slots that remain in use.
+    // Makes the slot invisible; its name stays until the slot is published again. Returns the
+    // number of slots that remain in use.
     int32_t Withdraw(Slot *slot) {
         slot->handle.store(kFree, std::memory_order_relaxed);
         return count_.fetch_sub(1, std::memory_order_relaxed) - 1;
@@ -153,19 +153,19 @@ class SlotTable {
         return true;
     }
 
-    // Returns the handle of a slot if this is its name, kFree if not. The comparison before
-    // the first read of the handle, like that of the last word in FindByName, is only a filter,
-    // which saves the barriers below where nothing matches. It cannot miss a name whose creation
-    // happened before the lookup, because it reads the words of that creation or, if the object is
-    // being replaced meanwhile, later ones.
+    // Returns the handle of a slot if this is its name, kFree if not. Comparing before the handle
+    // is read, like comparing the last word in FindByName, is only a filter, which saves the
+    // barriers below where nothing matches. It cannot miss a name that was published before the
+    // lookup, because it reads the words stored then or, if the object is being replaced, later
+    // ones.
     //
     // The rest is a sequence lock whose sequence number, the handle, cannot repeat. If both reads
-    // return the same handle, the words in between belong to it:
-    // - They are not older. The first read acquires what Publish released, and the words were
-    //   stored before that.
-    // - They are not newer. A newer word was stored after the release fence in StoreName, and so
-    //   after the handle was withdrawn. If this reads such a word, its acquire fence synchronises
-    //   with that fence, and the second read does not find the handle any more.
+    // return the same handle, the words read in between belong to it:
+    // - They are not older, because the first read acquires what Publish released, and the words
+    //   were stored before that.
+    // - They are not newer. A newer word is stored after the release fence in StoreName, which
+    //   comes after the handle is withdrawn. Whoever reads such a word has an acquire fence that
+    //   synchronises with that fence, so the second read no longer finds the handle.
     __attribute__((noinline)) int32_t HandleOfName(size_t slot, const PackedName &wanted) const {
         if (!HasWords(slot, wanted)) {
             return kFree;

@@ -16,6 +16,9 @@
 // 1023 characters. Preserves errno.
 void __VarnekPGL_FileLog(const char *format, ...) __attribute__((format(printf, 1, 2)));
 
+// Logs a failure and evaluates to the result. The caller writes the `return`.
+#define FILE_FAIL(result, ...) (__VarnekPGL_FileLog(__VA_ARGS__), (result))
+
 constexpr uint32_t kSeekBases = 3;  // SEEK_SET 0, SEEK_CUR 1, SEEK_END 2
 
 inline bool IsTooLong(const char *path) {

@@ -198,8 +198,7 @@ int StartThread(pthread_t *linuxThread, int32_t priority, uint32_t stackSize,
 }
 
 // Fills the record at `slot` and starts its thread; the guard is held. The record becomes visible
-// only when its thread exists. So the next creation can use the handle of a failed one, which no
-// other thread has seen.
+// only when its thread exists, so a handle that could not be used goes to the next thread created.
 int32_t StartRecord(Threads::Slot *slot, const char *szThreadName, int32_t priority,
                     uint32_t stackSize, void *(*function)(void *), void *argument) {
     RunningThread *const block = TakeBlock();
@@ -285,7 +284,7 @@ struct Self {
 };
 
 // Returns kInvalidHandle in a thread whose record has been removed, and in one that the registry
-// has not started, which has no value under the key. Inlined, since each receive begins with it.
+// has not started, which has no value under the key. Inlined, since receiving begins with it.
 inline __attribute__((always_inline)) Self FindSelf() {
     TRACE_LOW_QUICK("***** VarnekPGL_GetCurrentThread : curPthreadId = [%d]",
                     static_cast<int>(pthread_self()));
@@ -353,7 +352,9 @@ inline __attribute__((always_inline)) BOOL Send(int32_t hThread, const THREAD_MS
     if (message == nullptr) {
         return VARNEK_FAIL(FALSE, "***** %s: message is NULL", operation);
     }
-    Threads::Slot *const slot = gThreadInfoArr.Find(hThread);
+    // Relaxed, because the queue has a lock: its owner was stored under it before the handle was
+    // published, so whoever has read the handle finds that owner or a later one.
+    Threads::Slot *const slot = gThreadInfoArr.Find(hThread, std::memory_order_relaxed);
     if (slot == nullptr) {
         return VARNEK_FAIL(FALSE, "***** %s. Can't find thread info. thread = [%d]", operation,
                            hThread);

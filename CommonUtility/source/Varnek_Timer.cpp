@@ -1,8 +1,8 @@
 // The timer service. One lock guards the table and every OS call for a slot; it is never held
-// during a callback. The system delivers an expiry on a thread of its own, perhaps late, and drops
-// it if the timer is armed again first. So a start that has expired but not called back becomes an
-// owed start when the next one comes, and a second OS timer, which only delivers what is owed,
-// expires at once. Any delivery calls back for each start that is due.
+// during a callback. When a timer expires, the system calls on a thread of its own, perhaps late,
+// or not at all if the timer is armed again first. So a start that has expired but not called back
+// becomes an owed start when the next one comes, and a second OS timer, which serves owed starts
+// only, expires at once. Whichever timer calls, each start that is due is called back.
 #include "Varnek_Timer.h"
 
 #include <signal.h>
@@ -36,7 +36,7 @@ struct TIMER_MGR_INFO {
     bool bTimerCreated;
     bool bAwaited;  // the last start has neither called back nor been cancelled
     bool isOwedTimerCreated;
-    OwedStart *owed;  // oldest first; until it is empty, a delivery of the second timer is to come
+    OwedStart *owed;  // oldest first; while there is one, a call of the second timer is to come
 };
 
 Lock gTimerArrLock;
@@ -121,7 +121,7 @@ void Clear(TIMER_MGR_INFO *info) {
     *info = {};
 }
 
-// The OS timer service calls this on one of its threads at each expiry of either timer.
+// The OS calls this on one of its threads whenever either timer has expired.
 void TimerCallbackEntry(sigval value) {
     const uint32_t timer = static_cast<uint32_t>(value.sival_int);
     TRACE_MID("Timer Callback: Timer=[%d]", static_cast<int>(timer));
@@ -158,10 +158,10 @@ int MakeTimer(uint32_t timer, timer_t *timerId) {
     return timer_create(CLOCK_REALTIME, &event, timerId);
 }
 
-// Makes the last start, which has expired, an owed start, and lets the second timer deliver it. The
-// second timer is not armed again while an earlier delivery of it is to come, since that would drop
-// the delivery. Returns false, after a line, if the system or the memory does not permit it; the
-// last start then keeps its place, and its delivery.
+// Makes the last start, which has expired, an owed start, and lets the second timer call for it.
+// The second timer is not armed again while a call of it is to come, since that would cancel the
+// call. Returns false, after a line, when the system or memory forbids it; the last start then
+// stays where it is, and will be called back from there.
 bool OweLastStart(uint32_t timer, TIMER_MGR_INFO *info) {
     if (!info->isOwedTimerCreated) {
         const int result = MakeTimer(timer, &info->owedTimerId);
@@ -265,7 +265,7 @@ BOOL VarnekPGL_StartTimer(uint32_t timer, uint32_t timeout, TimerCallbackFunc ca
         info->bTimerCreated = false;
         return FALSE;
     }
-    // Even if the timer expires now, the delivery waits for the lock and finds these values.
+    // Even if the timer expires now, its call waits for the lock and finds these values.
     info->pfnCallback = callback;
     info->pUserData = userData;
     info->bAwaited = true;

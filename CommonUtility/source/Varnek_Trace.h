@@ -6,10 +6,10 @@
 
 #include "Varnek_Debug.h"
 
-// The traces that are enabled: the bits of the enabled levels and modules, none of them when the
-// output is off, and flags in bits that neither uses. A load of the debug configuration writes this
-// word. Before the first load every bit is set, because nothing is known to be off. A trace needs
-// no other data, so every access is relaxed.
+// What is enabled: the bits of the enabled levels and modules, none of them when the output is off,
+// and flags in bits that neither uses. Loading the debug configuration writes this word; until then
+// every bit is set, because nothing is known to be off. A trace needs no other data, so every
+// access is relaxed.
 constexpr uint32_t kOutputOn = 0x02000000u;
 constexpr uint32_t kOwnLowOn = 0x04000000u;  // the level Low and this library's module
 constexpr uint32_t kNotLoaded = 0x08000000u;

@@ -55,9 +55,17 @@ uint32_t After(uint32_t word) {
            kCrc<zeros + 1>.word[word >> 16 & 0xFF] ^ kCrc<zeros>.word[word >> 24];
 }
 
-// Reads the whole file into a block that the caller frees. Returns null, after a trace, on failure.
-unsigned char *ReadWhole(const char *path, int32_t size) {
-    char *data = ReadWholeFile(path, size);
+// Reads a whole file of at least `least` bytes into a block that the caller frees. Returns null,
+// after a trace, on failure.
+unsigned char *ReadWhole(const char *operation, const char *path, int32_t least, int32_t *size) {
+    *size = VarnekPGL_GetFileSize(path);
+    if (*size < least) {
+        VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_DSMCC_DC,
+                     "%s: Invalid File! file path=[%s], fileSize=[%d]\n", operation, Shown(path),
+                     *size);
+        return nullptr;
+    }
+    char *data = ReadWholeFile(path, *size);
     if (data == nullptr) {
         VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_DSMCC_DC, "File Reading Fail!\n");
     }
@@ -105,14 +113,8 @@ BOOL VarnekUtil_CheckSectionCRC32(const unsigned char *section) {
 }
 
 BOOL VarnekUtil_CheckFileCRC32(const char *path) {
-    const int32_t size = VarnekPGL_GetFileSize(path);
-    if (size < kMinPayload + kTrailer) {
-        VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_DSMCC_DC,
-                     "VarnekUtil_CheckFileCRC32: Invalid File! file path=[%s], fileSize=[%d]\n",
-                     Shown(path), size);
-        return FALSE;
-    }
-    unsigned char *buffer = ReadWhole(path, size);
+    int32_t size = 0;
+    unsigned char *buffer = ReadWhole(__func__, path, kMinPayload + kTrailer, &size);
     if (buffer == nullptr) {
         return FALSE;
     }
@@ -125,14 +127,8 @@ BOOL VarnekUtil_CheckFileCRC32(const char *path) {
 }
 
 BOOL VarnekUtil_AppendCRC32ToFile(const char *path) {
-    const int32_t size = VarnekPGL_GetFileSize(path);
-    if (size < kMinPayload) {
-        VARNEK_TRACE(VARNEK_LEVEL_ERROR | VARNEK_MODULE_DSMCC_DC,
-                     "VarnekUtil_AppendCRC32ToFile: Invalid File! file path=[%s], fileSize=[%d]\n",
-                     Shown(path), size);
-        return FALSE;
-    }
-    unsigned char *buffer = ReadWhole(path, size);
+    int32_t size = 0;
+    unsigned char *buffer = ReadWhole(__func__, path, kMinPayload, &size);
     if (buffer == nullptr) {
         return FALSE;
     }
