@@ -2,28 +2,13 @@
 
 #include <pthread.h>
 #include <sched.h>
-#include <semaphore.h>
 
 #include <random>
 
-#include "Varnek_Debug.h"
 #include "Varnek_File.h"
-#include "Varnek_Thread.h"
+#include "Varnek_Tasking.h"
 
 namespace bench {
-
-namespace {
-
-sem_t done;
-
-void *RunAll(void *) {
-    PinTo(0);
-    benchmark::RunSpecifiedBenchmarks();
-    sem_post(&done);
-    return nullptr;
-}
-
-}  // namespace
 
 int Main(int argc, char **argv, void (*registerAll)(), const char *config) {
     benchmark::Initialize(&argc, argv);
@@ -39,19 +24,13 @@ int Main(int argc, char **argv, void (*registerAll)(), const char *config) {
     }
     VarnekPGL_InitializeDebug();
     registerAll();
-    sem_init(&done, 0, 0);
-    if (VarnekPGL_CreateThread("bench", 1, 1024 * 1024, RunAll, nullptr) == -1) {
-        std::fprintf(stderr, "no thread for the benchmarks\n");
-        return 1;
-    }
-    while (sem_wait(&done) != 0) {
-    }
+    varnek::Thread thread("bench", 1024 * 1024, [] {
+        PinTo(0);
+        benchmark::RunSpecifiedBenchmarks();
+    });
+    const bool ran = thread && thread.Join();
     VarnekPGL_DeleteFile(path);
-    return 0;
-}
-
-void AddMissing(const std::string &name) {
-    Add(name, [](benchmark::State &state) { state.SkipWithError("not installed"); });
+    return ran ? 0 : 1;
 }
 
 std::vector<unsigned char> Noise(size_t size) {

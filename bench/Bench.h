@@ -1,5 +1,6 @@
-// Functions that the benchmarks share. Each program measures one area. A benchmark has the name
-// ROW:CONTENDER, and script/bench compares the contenders of a row. Times are wall-clock times.
+// What the benchmarks share. Each program measures one area. A benchmark is called ROW:CONTENDER,
+// and script/bench compares the contenders of a row; one whose library was not installed at build
+// time is left out.
 #ifndef VARNEK_BENCH_H
 #define VARNEK_BENCH_H
 
@@ -14,28 +15,25 @@
 
 namespace bench {
 
-// Runs an area's benchmarks in a thread of the library, so that they can receive messages. The
-// first thread sleeps. With a second thread, the process does not skip atomics. `config` is the
-// content of the debug configuration during the run; with an empty one nothing is traced.
+// Runs an area's benchmarks in a thread of the library, so that they can receive messages, while
+// the first thread sleeps: in a process that never had a second thread, the C library skips
+// atomics. `config` becomes the trace configuration; an empty one traces nothing.
 int Main(int argc, char **argv, void (*registerAll)(), const char *config = "");
 
-// Registers a contender that is a function. All contenders are measured in the same way.
+// Registers a contender, which is a function of a benchmark::State.
 template <typename Function>
 benchmark::internal::Benchmark *Add(const std::string &name, Function function) {
     // NOLINTNEXTLINE(readability-redundant-string-cstr): Debian 12's version takes no std::string
     return benchmark::RegisterBenchmark(name.c_str(), std::move(function))->UseRealTime();
 }
 
-// Registers a contender that was not installed at build time, so that its row says so.
-void AddMissing(const std::string &name);
-
-// Returns random bytes that are the same in each run.
+// Returns random bytes, the same ones in every run.
 std::vector<unsigned char> Noise(size_t size);
 
-// Binds the calling thread to a core, counted from 0. If there is only one core, it uses that one.
+// Binds the calling thread to a core, counted from 0; if there is only one, to that one.
 void PinTo(int core);
 
-// Reports in the row that a benchmark cannot continue.
+// Makes the row report why a benchmark cannot go on, unless `holds`, which it returns.
 inline bool Require(benchmark::State &state, bool holds, const char *what) {
     if (!holds) {
         state.SkipWithError(what);

@@ -3,36 +3,39 @@
 #include "Varnek_CBitInputStream.h"
 
 #ifdef HAVE_GSTREAMER
-// Calls the library's functions, as callers in other languages and with unusual widths do, instead
-// of the inlined ones.
+// Calls the library's functions instead of the inlined ones, as callers in other languages and with
+// unusual widths do.
 #define GST_BIT_READER_DISABLE_INLINES
 #include <gst/base/gstbitreader.h>
 #endif
 
 namespace {
 
-template <int... counts>
-struct Fields {};
-using Psi = Fields<8, 1, 1, 2, 12, 16, 2, 5, 1, 8, 8, 3, 13, 4, 12>;
-constexpr size_t kRound = 12;           // bytes of these fields
+constexpr size_t kRound = 12;           // bytes of the fields below
 constexpr size_t kBytes = 80 * kRound;  // 1200 fields
 
-// Reads fields one after the other, with widths that the compiler knows, as a parser does. Returns
-// 0 when a read fails.
+// Reads rounds of fields with widths that the compiler knows, as a parser does. Returns 0 if a read
+// fails.
 template <typename Reader, int... counts>
-uint32_t ReadAll(Reader *reader, size_t size, Fields<counts...>) {
+uint32_t ReadFields(const unsigned char *data) {
+    Reader reader(data);
     uint32_t sum = 0;
-    for (size_t at = 0; at < size; at += kRound) {
-        ((sum = sum * 31 + reader->template Read<counts>()), ...);
+    for (size_t at = 0; at < kBytes; at += kRound) {
+        ((sum = sum * 31 + reader.template Read<counts>()), ...);
     }
-    return reader->Succeeded() ? sum : 0;
+    return reader.Succeeded() ? sum : 0;
+}
+
+template <typename Reader>
+uint32_t ReadAll(const unsigned char *data) {
+    return ReadFields<Reader, 8, 1, 1, 2, 12, 16, 2, 5, 1, 8, 8, 3, 13, 4, 12>(data);
 }
 
 class OurReader {
   public:
-    OurReader(const unsigned char *data, size_t size)
+    explicit OurReader(const unsigned char *data)
         // The stream borrows the bytes and only reads them.
-        : stream_(const_cast<unsigned char *>(data), static_cast<unsigned int>(size), 0) {}
+        : stream_(const_cast<unsigned char *>(data), kBytes, 0) {}
     template <int count>
     uint32_t Read() {
         if constexpr (count == 1) {
@@ -53,9 +56,7 @@ class OurReader {
 #ifdef HAVE_GSTREAMER
 class GstReader {
   public:
-    GstReader(const unsigned char *data, size_t size) {
-        gst_bit_reader_init(&reader_, data, static_cast<guint>(size));
-    }
+    explicit GstReader(const unsigned char *data) { gst_bit_reader_init(&reader_, data, kBytes); }
     template <int count>
     uint32_t Read() {
         guint32 value = 0;
@@ -71,37 +72,22 @@ class GstReader {
 #endif
 
 template <typename Reader>
-uint32_t ReadWith(const unsigned char *data, size_t size) {
-    Reader reader(data, size);
-    return ReadAll(&reader, size, Psi());
-}
-
-void Register(const std::string &name, size_t size,
-              uint32_t (*read)(const unsigned char *, size_t)) {
-    bench::Add(name, [size, read](benchmark::State &state) {
-        const std::vector<unsigned char> data = bench::Noise(size);
-        if (!bench::Require(state,
-                            read(data.data(), size) == ReadWith<OurReader>(data.data(), size),
-                            "other fields than ours")) {
-            return;
-        }
-        for (auto _ : state) {
-            benchmark::DoNotOptimize(read(data.data(), size));
-        }
-    });
+void Run(benchmark::State &state) {
+    const std::vector<unsigned char> data = bench::Noise(kBytes);
+    const bool same = ReadAll<Reader>(data.data()) == ReadAll<OurReader>(data.data());
+    if (!bench::Require(state, same, "other fields than ours")) {
+        return;
+    }
+    for (auto _ : state) {
+        benchmark::DoNotOptimize(ReadAll<Reader>(data.data()));
+    }
 }
 
 void RegisterAll() {
-    Register("bits:ours", kBytes, ReadWith<OurReader>);
+    bench::Add("bits:ours", Run<OurReader>);
 #ifdef HAVE_GSTREAMER
-    Register("bits:gstreamer", kBytes, ReadWith<GstReader>);
-#else
-    bench::AddMissing("bits:gstreamer");
+    bench::Add("bits:gstreamer", Run<GstReader>);
 #endif
-    for (const size_t rounds : {1u, 100u, 341u}) {
-        const size_t size = rounds * kRound;
-        Register("grow_bits/" + std::to_string(size) + ":ours", size, ReadWith<OurReader>);
-    }
 }
 
 }  // namespace

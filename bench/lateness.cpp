@@ -16,6 +16,7 @@
 namespace {
 
 constexpr uint32_t kMilliseconds = 5;
+constexpr itimerspec kTime = {{}, {0, kMilliseconds * 1000000L}};
 
 int64_t Now() {
     timespec now = {};
@@ -23,105 +24,58 @@ int64_t Now() {
     return now.tv_sec * int64_t{1000000000} + now.tv_nsec;
 }
 
-itimerspec After(uint32_t milliseconds) {
-    itimerspec time = {};
-    time.it_value.tv_nsec = static_cast<long>(milliseconds) * 1000000;
-    return time;
+// Where a callback notes the time of its call.
+sem_t arrived;
+int64_t arrival = 0;
+
+void Arrive() {
+    arrival = Now();
+    sem_post(&arrived);
 }
 
-// Here a callback stores the time of its call.
-struct Arrival {
-    Arrival() { sem_init(&arrived, 0, 0); }
-    ~Arrival() { sem_destroy(&arrived); }
-    Arrival(const Arrival &) = delete;
-    Arrival &operator=(const Arrival &) = delete;
-
-    void Arrive() {
-        at = Now();
-        sem_post(&arrived);
+int64_t WaitForArrival() {
+    while (sem_wait(&arrived) != 0) {
     }
-    int64_t Wait() {
-        while (sem_wait(&arrived) != 0) {
-        }
-        return at;
-    }
+    return arrival;
+}
 
-    sem_t arrived = {};
-    int64_t at = 0;
-};
+// A contender starts a timer, waits for it, and returns the nanoseconds that this took.
 
-class Ours {
-  public:
-    Ours() : timer_(static_cast<uint32_t>(VarnekPGL_CreateTimer("lateness"))) {}
-    ~Ours() { VarnekPGL_DeleteTimer(timer_); }
-    Ours(const Ours &) = delete;
-    Ours &operator=(const Ours &) = delete;
+int64_t Ours() {
+    static const auto timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("lateness"));
+    const int64_t start = Now();
+    VarnekPGL_StartTimer(
+        timer, kMilliseconds, [](uint32_t, void *) { Arrive(); }, nullptr);
+    return WaitForArrival() - start;
+}
 
-    int64_t Measure() {
-        const int64_t start = Now();
-        VarnekPGL_StartTimer(
-            timer_, kMilliseconds,
-            [](uint32_t, void *arrival) { static_cast<Arrival *>(arrival)->Arrive(); }, &arrival_);
-        return arrival_.Wait() - start;
-    }
-
-  private:
-    const uint32_t timer_;
-    Arrival arrival_;
-};
-
-class Raw {
-  public:
-    Raw() {
+int64_t Raw() {
+    static const timer_t timer = [] {
         sigevent event = {};
         event.sigev_notify = SIGEV_THREAD;
-        event.sigev_value.sival_ptr = &arrival_;
-        event.sigev_notify_function = [](sigval value) {
-            static_cast<Arrival *>(value.sival_ptr)->Arrive();
-        };
-        timer_create(CLOCK_REALTIME, &event, &timer_);
-    }
-    ~Raw() { timer_delete(timer_); }
-    Raw(const Raw &) = delete;
-    Raw &operator=(const Raw &) = delete;
+        event.sigev_notify_function = [](sigval) { Arrive(); };
+        timer_t created = {};
+        timer_create(CLOCK_REALTIME, &event, &created);
+        return created;
+    }();
+    const int64_t start = Now();
+    timer_settime(timer, 0, &kTime, nullptr);
+    return WaitForArrival() - start;
+}
 
-    int64_t Measure() {
-        const itimerspec time = After(kMilliseconds);
-        const int64_t start = Now();
-        timer_settime(timer_, 0, &time, nullptr);
-        return arrival_.Wait() - start;
-    }
-
-  private:
-    timer_t timer_ = {};
-    Arrival arrival_;
-};
-
-class Descriptor {
-  public:
-    Descriptor() = default;
-    ~Descriptor() { close(descriptor_); }
-    Descriptor(const Descriptor &) = delete;
-    Descriptor &operator=(const Descriptor &) = delete;
-
-    int64_t Measure() {
-        const itimerspec time = After(kMilliseconds);
-        const int64_t start = Now();
-        timerfd_settime(descriptor_, 0, &time, nullptr);
-        uint64_t expiries = 0;
-        return read(descriptor_, &expiries, sizeof expiries) > 0 ? Now() - start : 0;
-    }
-
-  private:
-    const int descriptor_ = timerfd_create(CLOCK_REALTIME, TFD_CLOEXEC);
-};
+int64_t Descriptor() {
+    static const int descriptor = timerfd_create(CLOCK_REALTIME, TFD_CLOEXEC);
+    const int64_t start = Now();
+    timerfd_settime(descriptor, 0, &kTime, nullptr);
+    uint64_t expiries = 0;
+    return read(descriptor, &expiries, sizeof expiries) > 0 ? Now() - start : 0;
+}
 
 // Keeps every core busy during its lifetime.
 class Load {
   public:
-    explicit Load(bool on) {
-        const unsigned int cores = on ? std::thread::hardware_concurrency() : 0;
-        for (unsigned int i = 0; i < cores; i++) {
+    Load() {
+        for (unsigned int i = 0; i < std::thread::hardware_concurrency(); i++) {
             threads_.emplace_back([this] {
                 for (uint64_t turns = 0; !ends_.load(std::memory_order_relaxed); turns++) {
                     benchmark::DoNotOptimize(turns);
@@ -143,62 +97,47 @@ class Load {
     std::vector<std::thread> threads_;
 };
 
-struct Samples {
-    std::vector<int64_t> ours, raw, timerfd;
-};
-
-Samples Measure(bool busy, int count) {
-    const Load load(busy);
-    Samples samples;
-    Ours ours;
-    Raw raw;
-    Descriptor timerfd;
-    constexpr int64_t kAsked = int64_t{kMilliseconds} * 1000000;
+// Measures one round, and prints its results in Google Benchmark's format.
+void Round(const char *state, int count) {
+    struct {
+        const char *name;
+        int64_t (*measure)();
+        std::vector<int64_t> late;
+    } contenders[] = {{"ours", Ours, {}}, {"raw", Raw, {}}, {"timerfd", Descriptor, {}}};
     for (int i = 0; i < count; i++) {
-        // The contenders change their order, because the first one finds the thread of the timer
-        // service asleep for longer.
-        if (i % 2 == 0) {
-            samples.ours.push_back(ours.Measure() - kAsked);
+        for (auto &contender : contenders) {
+            contender.late.push_back(contender.measure() - kTime.it_value.tv_nsec);
         }
-        samples.raw.push_back(raw.Measure() - kAsked);
-        if (i % 2 != 0) {
-            samples.ours.push_back(ours.Measure() - kAsked);
-        }
-        samples.timerfd.push_back(timerfd.Measure() - kAsked);
+        // The first two take turns, because the first one finds the thread of the system's timers
+        // asleep for longer.
+        std::swap(contenders[0], contenders[1]);
     }
-    return samples;
-}
-
-void Print(const std::string &row, const char *contender, std::vector<int64_t> *samples,
-           size_t percent) {
-    const size_t at = (samples->size() - 1) * percent / 100;
-    std::nth_element(samples->begin(), samples->begin() + static_cast<std::ptrdiff_t>(at),
-                     samples->end());
-    static bool first = true;
-    std::printf(
-        "%s\n{\"run_type\": \"iteration\", \"name\": \"%s_p%zu:%s\", \"real_time\": %lld, "
-        "\"time_unit\": \"ns\"}",
-        first ? "" : ",", row.c_str(), percent, contender, static_cast<long long>((*samples)[at]));
-    first = false;
+    for (auto &contender : contenders) {
+        std::sort(contender.late.begin(), contender.late.end());
+        for (const size_t percent : {50u, 99u}) {
+            static const char *separator = "";
+            const int64_t late = contender.late[(contender.late.size() - 1) * percent / 100];
+            std::printf(
+                "%s\n{\"run_type\": \"iteration\", \"name\": \"lateness/%s_p%zu:%s\", "
+                "\"real_time\": %lld, \"time_unit\": \"ns\"}",
+                separator, state, percent, contender.name, static_cast<long long>(late));
+            separator = ",";
+        }
+    }
 }
 
 }  // namespace
 
-// lateness ROUNDS COUNT: prints the results in Google Benchmark's format.
+// lateness ROUNDS COUNT
 int main(int argc, char **argv) {
     const int rounds = argc > 1 ? std::atoi(argv[1]) : 1;
     const int count = argc > 2 ? std::atoi(argv[2]) : 100;
+    sem_init(&arrived, 0, 0);
     std::printf("{\"benchmarks\": [");
     for (int round = 0; round < rounds; round++) {
-        for (const bool busy : {false, true}) {
-            const std::string row = busy ? "lateness/busy" : "lateness/idle";
-            Samples samples = Measure(busy, count);
-            for (const size_t percent : {50u, 99u}) {
-                Print(row, "ours", &samples.ours, percent);
-                Print(row, "raw", &samples.raw, percent);
-                Print(row, "timerfd", &samples.timerfd, percent);
-            }
-        }
+        Round("idle", count);
+        const Load load;
+        Round("busy", count);
     }
     std::printf("\n]}\n");
     return 0;

@@ -1,45 +1,30 @@
-// Uses mutexes and semaphores of a full table by handle, in one thread, and in two threads at the
-// same time with unrelated objects.
+// Uses mutexes and semaphores by handle and by name, in a full table and as the only one, and two
+// mutexes by two threads at the same time.
 #include <pthread.h>
 #include <semaphore.h>
 
-#include <memory>
+#include <deque>
 
 #include "Bench.h"
-#include "Varnek_Semaphore.h"
+#include "Varnek_Tasking.h"
 
 namespace {
 
-constexpr int kSlots = 39;  // the thread registry uses one of the 40 mutexes
+constexpr int kFull = 39;  // the thread registry has the first of the 40 mutexes
 
-// Has `count` objects of a family, in the slots from 0 on.
-class Table {
-  public:
-    Table(bool semaphores, int count) : semaphores_(semaphores) {
-        for (int i = 0; i < count; i++) {
-            const std::string name = "bench" + std::to_string(i);
-            handles_.push_back(semaphores ? VarnekPGL_CreateSemaphore(name.c_str(), 1)
-                                          : VarnekPGL_CreateMutex(name.c_str()));
-        }
+std::string Name(int number) {
+    return "bench" + std::to_string(number);
+}
+
+// Makes `count` objects, in consecutive slots.
+template <typename Object, typename... Units>
+std::deque<Object> Make(int count, Units... units) {
+    std::deque<Object> objects;
+    for (int i = 0; i < count; i++) {
+        objects.emplace_back(Name(i), varnek::Existing::kReplace, units...);
     }
-    ~Table() {
-        for (const int32_t handle : handles_) {
-            if (semaphores_) {
-                VarnekPGL_DeleteSemaphore(handle);
-            } else {
-                VarnekPGL_DeleteMutex(handle);
-            }
-        }
-    }
-    Table(const Table &) = delete;
-    Table &operator=(const Table &) = delete;
-
-    int32_t operator[](int slot) const { return handles_[static_cast<size_t>(slot)]; }
-
-  private:
-    const bool semaphores_;
-    std::vector<int32_t> handles_;
-};
+    return objects;
+}
 
 void AcquireRelease(benchmark::State &state, int32_t handle) {
     for (auto _ : state) {
@@ -60,25 +45,11 @@ void SignalWait(benchmark::State &state, int32_t handle) {
     }
 }
 
-// One slot of a table with `fill` objects.
-void RegisterSlot(const std::string &name, bool semaphores, int fill, int slot) {
-    bench::Add(name, [semaphores, fill, slot](benchmark::State &state) {
-        const Table table(semaphores, fill);
-        (semaphores ? SignalWait : AcquireRelease)(state, table[slot]);
-    });
-}
-
-// Two threads, each with its own core and mutex.
-void RegisterTwo(const std::string &name, int slotA, int slotB) {
-    static std::unique_ptr<Table> table;
-    bench::Add(name,
-               [slotA, slotB](benchmark::State &state) {
-                   bench::PinTo(state.thread_index());
-                   AcquireRelease(state, (*table)[state.thread_index() == 0 ? slotA : slotB]);
-               })
-        ->Setup([](const benchmark::State &) { table = std::make_unique<Table>(false, kSlots); })
-        ->Teardown([](const benchmark::State &) { table.reset(); })
-        ->Threads(2);
+// Uses a mutex of the calling thread's own. Those of two threads are in adjacent slots.
+void OwnMutex(benchmark::State &state) {
+    bench::PinTo(state.thread_index());
+    const varnek::Mutex mutex(Name(state.thread_index()), varnek::Existing::kReplace);
+    AcquireRelease(state, mutex.Handle());
 }
 
 void BareMutex(benchmark::State &state) {
@@ -99,32 +70,27 @@ void BareSemaphore(benchmark::State &state) {
     sem_destroy(&semaphore);
 }
 
-// Looks up the mutex in `slot` of a table with `fill` objects.
-void RegisterByName(const std::string &name, int fill, int slot) {
-    bench::Add(name, [fill, slot](benchmark::State &state) {
-        const Table table(false, fill);
-        const std::string mutex = "bench" + std::to_string(slot);
-        for (auto _ : state) {
-            benchmark::DoNotOptimize(VarnekPGL_GetMutexByName(mutex.c_str()));
-        }
-    });
-}
-
 void RegisterAll() {
-    // The thread registry's mutex is in the first slot.
-    RegisterByName("byname:ours", kSlots, 29);
-    RegisterSlot("mutex/last:ours", false, kSlots, kSlots - 1);
-    bench::Add("mutex/last:bare", BareMutex);
-    RegisterSlot("semaphore/last:ours", true, kSlots, kSlots - 1);
-    bench::Add("semaphore/last:bare", BareSemaphore);
-    RegisterTwo("mutex/two:ours", 0, 1);
-    RegisterSlot("mutex/two:onethread", false, kSlots, 0);
-    for (const int fill : {1, 10, kSlots}) {
-        const std::string count = std::to_string(fill);
-        RegisterSlot("grow_mutex/" + count + ":ours", false, fill, fill - 1);
-        RegisterSlot("grow_semaphore/" + count + ":ours", true, fill, fill - 1);
-        RegisterByName("grow_byname/" + count + ":ours", fill, fill - 1);
+    for (const int count : {kFull, 1}) {
+        const std::string contender = count == kFull ? ":ours" : ":alone";
+        bench::Add("byname" + contender, [count](benchmark::State &state) {
+            const auto mutexes = Make<varnek::Mutex>(count);
+            const std::string name = Name(count == kFull ? 29 : 0);
+            for (auto _ : state) {
+                benchmark::DoNotOptimize(VarnekPGL_GetMutexByName(name.c_str()));
+            }
+        });
+        bench::Add("mutex/last" + contender, [count](benchmark::State &state) {
+            AcquireRelease(state, Make<varnek::Mutex>(count).back().Handle());
+        });
+        bench::Add("semaphore/last" + contender, [count](benchmark::State &state) {
+            SignalWait(state, Make<varnek::Semaphore>(count, 1u).back().Handle());
+        });
     }
+    bench::Add("mutex/last:bare", BareMutex);
+    bench::Add("semaphore/last:bare", BareSemaphore);
+    bench::Add("mutex/two:ours", OwnMutex)->Threads(2);
+    bench::Add("mutex/two:onethread", OwnMutex);
 }
 
 }  // namespace

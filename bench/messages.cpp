@@ -1,14 +1,11 @@
-// Messages of 40 bytes, copied in and out: within a thread, one way between two threads, and back
-// and forth.
+// Messages of 40 bytes, copied in and out: within a thread, one way to another thread, and there
+// and back.
 #include <pthread.h>
 #include <semaphore.h>
 #include <string.h>
 
-#include <memory>
-#include <thread>
-
 #include "Bench.h"
-#include "Varnek_Thread.h"
+#include "Varnek_Tasking.h"
 
 #ifdef HAVE_GLIB
 #include <glib.h>
@@ -18,12 +15,12 @@ namespace {
 
 constexpr int kBatch = 1000;  // messages between two synchronisations of the threads
 
-// A contender is a queue. Any thread may call Send. Only the thread that `Owner` made the owner of
-// the queue calls Receive, which waits.
+// A contender is a queue. Any thread may send. Only the thread that owns the queue receives, which
+// waits for a message.
 
 class Ours {
   public:
-    void Own() { handle_ = VarnekPGL_GetCurrentThread(); }
+    void GiveTo(int32_t handle) { handle_ = handle; }
     bool Send(const THREAD_MSG &message) {
         return VarnekPGL_SendMessage(handle_, &message) != FALSE;
     }
@@ -36,7 +33,7 @@ class Ours {
     int32_t handle_ = -1;
 };
 
-// A block and a node for each message, a list, a mutex and a semaphore.
+// Two blocks of memory for each message, a list, a mutex and a semaphore.
 class Bare {
   public:
     Bare() { sem_init(&count_, 0, 0); }
@@ -44,7 +41,7 @@ class Bare {
     Bare(const Bare &) = delete;
     Bare &operator=(const Bare &) = delete;
 
-    void Own() {}
+    void GiveTo(int32_t) {}
     bool Send(const THREAD_MSG &message) {
         void *block = malloc(sizeof message);
         Node *node = static_cast<Node *>(malloc(sizeof *node));
@@ -97,7 +94,7 @@ class GLib {
     GLib(const GLib &) = delete;
     GLib &operator=(const GLib &) = delete;
 
-    void Own() {}
+    void GiveTo(int32_t) {}
     bool Send(const THREAD_MSG &message) {
         void *block = g_malloc(sizeof message);
         memcpy(block, &message, sizeof message);
@@ -116,12 +113,13 @@ class GLib {
 };
 #endif
 
-template <typename Queue>
+// Sends to the own queue and receives, while `waiting` other messages are in the queue.
+template <typename Queue, int waiting = 0>
 void SameThread(benchmark::State &state) {
     Queue queue;
-    queue.Own();
+    queue.GiveTo(VarnekPGL_GetCurrentThread());
     THREAD_MSG message = {};
-    for (int64_t i = 0; i < state.range(0); i++) {
+    for (int i = 0; i < waiting; i++) {
         queue.Send(message);
     }
     for (auto _ : state) {
@@ -130,77 +128,52 @@ void SameThread(benchmark::State &state) {
             break;
         }
     }
-    for (int64_t i = 0; i < state.range(0); i++) {
+    for (int i = 0; i < waiting; i++) {
         queue.Receive(&message);
     }
 }
 
-// A thread of the library that answers messages: with `echo` every one, otherwise the last one of a
-// batch. The first byte of a message says whether it is the last message of the benchmark.
+// A thread on its own core that answers every so many messages, until the first byte of one says
+// that it is the last.
 template <typename Queue>
-class Partner {
-  public:
-    Partner(bool echo, int core) : echo_(echo), core_(core) {
-        sem_init(&ready_, 0, 0);
-        sem_init(&ended_, 0, 0);
-        back_.Own();
-        handle_ = VarnekPGL_CreateThread("partner", 1, 1024 * 1024, Run, this);
-        Wait(&ready_);
+struct Partner {
+    Partner(int core, int every)
+        : thread("partner", 1024 * 1024, &Partner::Answer, this, core, every) {
+        there.GiveTo(thread.Handle());
+        back.GiveTo(VarnekPGL_GetCurrentThread());
     }
     ~Partner() {
-        THREAD_MSG message = {};
-        message.data[0] = 1;
-        there_.Send(message);
-        Wait(&ended_);
-        VarnekPGL_DeleteThread(handle_);
-        sem_destroy(&ready_);
-        sem_destroy(&ended_);
+        THREAD_MSG last = {};
+        last.data[0] = 1;
+        there.Send(last);
     }
     Partner(const Partner &) = delete;
     Partner &operator=(const Partner &) = delete;
 
-    Queue &There() { return there_; }
-    Queue &Back() { return back_; }
-
-  private:
-    static void Wait(sem_t *semaphore) {
-        while (sem_wait(semaphore) != 0) {
-        }
-    }
-    static void *Run(void *self) {
-        static_cast<Partner *>(self)->Answer();
-        return nullptr;
-    }
-    void Answer() {
-        bench::PinTo(core_);
-        there_.Own();
-        sem_post(&ready_);
+    void Answer(int core, int every) {
+        bench::PinTo(core);
         THREAD_MSG message = {};
-        for (int i = 0; there_.Receive(&message) && message.data[0] == 0;) {
-            if (echo_ || ++i % kBatch == 0) {
-                back_.Send(message);
+        for (int i = 1; there.Receive(&message) && message.data[0] == 0; i++) {
+            if (i % every == 0) {
+                back.Send(message);
             }
         }
-        sem_post(&ended_);
     }
 
-    Queue there_, back_;
-    sem_t ready_ = {}, ended_ = {};
-    const bool echo_;
-    const int core_;
-    int32_t handle_ = -1;
+    Queue there, back;
+    varnek::Thread thread;
 };
 
 template <typename Queue>
 void OneWay(benchmark::State &state) {
     bench::PinTo(0);
-    Partner<Queue> partner(false, 1);
+    Partner<Queue> partner(1, kBatch);
     THREAD_MSG message = {};
     for (auto _ : state) {
         for (int i = 0; i < kBatch; i++) {
-            partner.There().Send(message);
+            partner.there.Send(message);
         }
-        partner.Back().Receive(&message);
+        partner.back.Receive(&message);
     }
     state.SetItemsProcessed(state.iterations() * kBatch);
 }
@@ -209,17 +182,17 @@ void OneWay(benchmark::State &state) {
 template <typename Queue, int core>
 void PingPong(benchmark::State &state) {
     bench::PinTo(0);
-    Partner<Queue> partner(true, core);
+    Partner<Queue> partner(core, 1);
     THREAD_MSG message = {};
     for (auto _ : state) {
-        partner.There().Send(message);
-        partner.Back().Receive(&message);
+        partner.there.Send(message);
+        partner.back.Receive(&message);
     }
 }
 
 template <typename Queue>
 void Register(const std::string &contender) {
-    bench::Add("message/same:" + contender, SameThread<Queue>)->Arg(0);
+    bench::Add("message/same:" + contender, SameThread<Queue>);
     bench::Add("message/oneway:" + contender, OneWay<Queue>);
     bench::Add("message/pingpong1:" + contender, PingPong<Queue, 0>);
     bench::Add("message/pingpong2:" + contender, PingPong<Queue, 1>);
@@ -230,14 +203,9 @@ void RegisterAll() {
     Register<Bare>("bare");
 #ifdef HAVE_GLIB
     Register<GLib>("gasync");
-#else
-    for (const char *row : {"same", "oneway", "pingpong1", "pingpong2"}) {
-        bench::AddMissing(std::string("message/") + row + ":gasync");
-    }
 #endif
-    for (const int64_t length : {1, 10000, 1000000}) {
-        bench::Add("grow_queue/" + std::to_string(length) + ":ours", SameThread<Ours>)->Arg(length);
-    }
+    bench::Add("message/queued:ours", SameThread<Ours, 1000000>);
+    bench::Add("message/queued:empty", SameThread<Ours>);
 }
 
 }  // namespace

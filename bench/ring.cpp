@@ -1,19 +1,15 @@
 // Moves packets of 188 bytes through a byte ring, in one thread and from one thread to another.
-#include <pthread.h>
 #include <sched.h>
 #include <string.h>
 
+#include <algorithm>
 #include <array>
 #include <atomic>
-#include <memory>
+#include <mutex>
 #include <thread>
 
 #include "Bench.h"
 #include "Varnek_CRingBuffer.h"
-
-#ifdef HAVE_JACK
-#include <jack/ringbuffer.h>
-#endif
 
 namespace {
 
@@ -32,22 +28,11 @@ class Ours {
     VarnekCRingBuffer ring_{kSize};
 };
 
-class Lock {
-  public:
-    explicit Lock(pthread_mutex_t *mutex) : mutex_(mutex) { pthread_mutex_lock(mutex_); }
-    ~Lock() { pthread_mutex_unlock(mutex_); }
-    Lock(const Lock &) = delete;
-    Lock &operator=(const Lock &) = delete;
-
-  private:
-    pthread_mutex_t *mutex_;
-};
-
 // Two copies and a mutex.
 class Bare {
   public:
     bool Write(const Packet &packet) {
-        const Lock lock(&mutex_);
+        const std::lock_guard<std::mutex> hold(mutex_);
         if (used_ + packet.size() > bytes_.size()) {
             return false;
         }
@@ -59,7 +44,7 @@ class Bare {
         return true;
     }
     bool Read(Packet *packet) {
-        const Lock lock(&mutex_);
+        const std::lock_guard<std::mutex> hold(mutex_);
         if (used_ < packet->size()) {
             return false;
         }
@@ -72,38 +57,10 @@ class Bare {
     }
 
   private:
-    pthread_mutex_t mutex_ = PTHREAD_MUTEX_INITIALIZER;
+    std::mutex mutex_;
     std::vector<unsigned char> bytes_ = std::vector<unsigned char>(kSize);
     size_t write_ = 0, read_ = 0, used_ = 0;
 };
-
-#ifdef HAVE_JACK
-class Jack {
-  public:
-    Jack() = default;
-    ~Jack() { jack_ringbuffer_free(ring_); }
-    Jack(const Jack &) = delete;
-    Jack &operator=(const Jack &) = delete;
-
-    bool Write(const Packet &packet) {
-        if (jack_ringbuffer_write_space(ring_) < packet.size()) {
-            return false;
-        }
-        jack_ringbuffer_write(ring_, reinterpret_cast<const char *>(packet.data()), packet.size());
-        return true;
-    }
-    bool Read(Packet *packet) {
-        if (jack_ringbuffer_read_space(ring_) < packet->size()) {
-            return false;
-        }
-        jack_ringbuffer_read(ring_, reinterpret_cast<char *>(packet->data()), packet->size());
-        return true;
-    }
-
-  private:
-    jack_ringbuffer_t *ring_ = jack_ringbuffer_create(kSize);
-};
-#endif
 
 // Calls `once` until it succeeds, and lets the other side run in between.
 template <typename Try>
@@ -135,22 +92,15 @@ void TwoThreads(benchmark::State &state) {
     Ring ring;
     std::atomic<int64_t> wanted{0};
     std::atomic<int64_t> taken{0};
-    std::thread reader([&ring, &wanted, &taken] {
+    std::atomic<bool> ends{false};
+    std::thread reader([&] {
         bench::PinTo(1);
         Packet out = {};
-        for (int64_t done = 0;;) {
-            const int64_t until = wanted.load(std::memory_order_acquire);
-            if (until < 0) {
-                return;
+        for (int64_t done = 0; !ends.load(std::memory_order_relaxed); sched_yield()) {
+            for (; done < wanted.load(std::memory_order_relaxed); done++) {
+                Insist([&] { return ring.Read(&out); });
             }
-            if (done == until) {
-                sched_yield();
-                continue;
-            }
-            for (; done < until; done++) {
-                Insist([&ring, &out] { return ring.Read(&out); });
-            }
-            taken.store(done, std::memory_order_release);
+            taken.store(done, std::memory_order_relaxed);
         }
     });
     bench::PinTo(0);
@@ -158,14 +108,14 @@ void TwoThreads(benchmark::State &state) {
     int64_t sent = 0;
     for (auto _ : state) {
         sent += kBatch;
-        wanted.store(sent, std::memory_order_release);
+        wanted.store(sent, std::memory_order_relaxed);
         for (int i = 0; i < kBatch; i++) {
-            Insist([&ring, &in] { return ring.Write(in); });
+            Insist([&] { return ring.Write(in); });
         }
-        Insist([&taken, sent] { return taken.load(std::memory_order_acquire) == sent; });
+        Insist([&] { return taken.load(std::memory_order_relaxed) == sent; });
     }
     state.SetItemsProcessed(state.iterations() * kBatch);
-    wanted.store(-1, std::memory_order_release);
+    ends.store(true, std::memory_order_relaxed);
     reader.join();
 }
 
@@ -178,12 +128,6 @@ void Register(const std::string &contender) {
 void RegisterAll() {
     Register<Ours>("ours");
     Register<Bare>("bare");
-#ifdef HAVE_JACK
-    Register<Jack>("jack");
-#else
-    bench::AddMissing("ring/one:jack");
-    bench::AddMissing("ring/two:jack");
-#endif
 }
 
 }  // namespace

@@ -1,4 +1,4 @@
-// Converts seconds to a calendar record and back, for days that the branch predictor cannot learn.
+// Converts seconds to a calendar record and back, on days that the branch predictor cannot learn.
 #include <chrono>
 
 #include "Bench.h"
@@ -46,7 +46,7 @@ uint32_t FromRecordByChrono(const VarnekCDateTime &record) {
     return static_cast<uint32_t>(time.time_since_epoch().count());
 }
 
-// Creates the records in advance, so that only the conversion back is measured.
+// Makes the records in advance, so that only converting them back is measured.
 template <typename Convert>
 void RunBack(benchmark::State &state, Convert convert) {
     constexpr size_t kCount = 512;

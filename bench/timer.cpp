@@ -1,4 +1,4 @@
-// Starts a timer and cancels it.
+// Starts a timer and cancels it before it expires.
 #include <signal.h>
 #include <time.h>
 
@@ -7,11 +7,10 @@
 
 namespace {
 
-constexpr uint32_t kTimeout = 60000;  // never reached
+constexpr uint32_t kTimeout = 60000;
 
 void Ours(benchmark::State &state) {
-    const int32_t handle = VarnekPGL_CreateTimer("bench");
-    const uint32_t timer = static_cast<uint32_t>(handle);
+    const auto timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("bench"));
     for (auto _ : state) {
         if (VarnekPGL_StartTimer(
                 timer, kTimeout, [](uint32_t, void *) {}, nullptr) == FALSE ||
@@ -23,8 +22,8 @@ void Ours(benchmark::State &state) {
     VarnekPGL_DeleteTimer(timer);
 }
 
-// Arms and disarms a timer of the system. With `asks` it first asks each time whether the timer is
-// armed, as the library has to.
+// Arms and disarms a system timer, and with `asks` first asks each time whether the timer is armed,
+// as the library has to.
 template <bool asks>
 void Raw(benchmark::State &state) {
     sigevent event = {};

@@ -1,4 +1,4 @@
-// Writes a trace whose level is off, and one to a log function that discards it.
+// Traces at a level that is off, and into a log function that discards the line.
 #include <dlfcn.h>
 #include <stdarg.h>
 #include <string.h>
@@ -13,7 +13,7 @@
 #include <spdlog/spdlog.h>
 #endif
 
-// Replaces the log function of the platform.
+// Replaces the platform's log function.
 extern "C" __attribute__((visibility("default"))) int __android_log_write(int, const char *,
                                                                           const char *text) {
     benchmark::DoNotOptimize(text);
@@ -25,24 +25,12 @@ namespace {
 constexpr uint32_t kOff = VARNEK_LEVEL_LOW | VARNEK_MODULE_COMMON;
 constexpr uint32_t kOn = VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON;
 
-void OursOff(benchmark::State &state) {
+// Traces with a new number each time.
+template <typename Trace>
+void Run(benchmark::State &state, Trace trace) {
     int i = 0;
     for (auto _ : state) {
-        VARNEK_TRACE(kOff, "section of table %d on pid %d", ++i, 18);
-    }
-}
-
-void OursOn(benchmark::State &state) {
-    int i = 0;
-    for (auto _ : state) {
-        VARNEK_TRACE(kOn, "section of table %d on pid %d", ++i, 18);
-    }
-}
-
-void BareOff(benchmark::State &state) {
-    int i = 0;
-    for (auto _ : state) {
-        BareTrace(kOff, "section of table %d on pid %d", ++i, 18);
+        trace(++i);
     }
 }
 
@@ -55,17 +43,10 @@ __attribute__((noinline, format(printf, 1, 2))) void Format(const char *format, 
     benchmark::DoNotOptimize(line);
 }
 
-void BareOn(benchmark::State &state) {
-    int i = 0;
-    for (auto _ : state) {
-        Format("[%c][%s-%4d] section of table %d on pid %d", 'E', "trace.cpp", __LINE__, ++i, 18);
-    }
-}
-
 #ifdef HAVE_ANDROID_LOG
 using AndroidPrint = int (*)(int, const char *, const char *, ...);
 
-// Loads the library at run time, because this program and the stand-in define symbols of the same
+// Loads the library at run time, because this program and the stand-in define symbols with the same
 // names.
 AndroidPrint LoadAndroidPrint() {
     void *library = dlopen(HAVE_ANDROID_LOG, RTLD_NOW | RTLD_LOCAL | RTLD_DEEPBIND);
@@ -84,62 +65,55 @@ AndroidPrint LoadAndroidPrint() {
 void AndroidOff(benchmark::State &state) {
     static const AndroidPrint print = LoadAndroidPrint();
     constexpr int kVerbose = 2;
-    if (!bench::Require(state, print != nullptr, "cannot be loaded") ||
-        !bench::Require(state, print(kVerbose, "SBTVD_COM", "%d", 1) <= 0, "is not filtered")) {
-        return;
-    }
-    int i = 0;
-    for (auto _ : state) {
-        print(kVerbose, "SBTVD_COM", "section of table %d on pid %d", ++i, 18);
+    if (bench::Require(state, print != nullptr, "cannot be loaded") &&
+        bench::Require(state, print(kVerbose, "SBTVD_COM", "%d", 1) <= 0, "is not filtered")) {
+        Run(state,
+            [](int i) { print(kVerbose, "SBTVD_COM", "section of table %d on pid %d", i, 18); });
     }
 }
 #endif
 
 #ifdef HAVE_SPDLOG
-spdlog::logger &Spdlog() {
-    static const std::shared_ptr<spdlog::logger> logger = [] {
-        auto made = std::make_shared<spdlog::logger>(
-            "SBTVD_COM", std::make_shared<spdlog::sinks::null_sink_mt>());
-        made->set_level(spdlog::level::err);
-        return made;
-    }();
-    return *logger;
-}
-
 // The null sink drops the message before a line is composed, so only the text is formatted.
 void SpdlogOn(benchmark::State &state) {
-    spdlog::logger &logger = Spdlog();
-    int i = 0;
-    for (auto _ : state) {
-        logger.error("section of table {} on pid {}", ++i, 18);
-    }
+    spdlog::logger logger("SBTVD_COM", std::make_shared<spdlog::sinks::null_sink_mt>());
+    logger.set_level(spdlog::level::err);
+    Run(state, [&logger](int i) { logger.error("section of table {} on pid {}", i, 18); });
+}
+#endif
+
+// Traces that are off, in each of `threads` threads.
+void RegisterOff(const std::string &row, int threads) {
+    const auto add = [&row, threads](const char *contender, auto run) {
+        bench::Add(row + contender, [run](benchmark::State &state) {
+            bench::PinTo(state.thread_index());
+            run(state);
+        })->Threads(threads);
+    };
+    add("ours", [](benchmark::State &state) {
+        Run(state, [](int i) { VARNEK_TRACE(kOff, "section of table %d on pid %d", i, 18); });
+    });
+    add("bare", [](benchmark::State &state) {
+        Run(state, [](int i) { BareTrace(kOff, "section of table %d on pid %d", i, 18); });
+    });
+#ifdef HAVE_ANDROID_LOG
+    add("liblog", AndroidOff);
+#endif
 }
 
-#endif
-
 void RegisterAll() {
-    for (const int threads : {1, 2}) {
-        const std::string row = threads == 1 ? "trace_off/one:" : "trace_off/two:";
-        const auto add = [threads, &row](const char *contender, void (*run)(benchmark::State &)) {
-            bench::Add(row + contender, [run](benchmark::State &state) {
-                bench::PinTo(state.thread_index());
-                run(state);
-            })->Threads(threads);
-        };
-        add("ours", OursOff);
-        add("bare", BareOff);
-#ifdef HAVE_ANDROID_LOG
-        add("liblog", AndroidOff);
-#else
-        bench::AddMissing(row + "liblog");
-#endif
-    }
-    bench::Add("trace_on:ours", OursOn);
-    bench::Add("trace_on:bare", BareOn);
+    RegisterOff("trace_off/one:", 1);
+    RegisterOff("trace_off/two:", 2);
+    bench::Add("trace_on:ours", [](benchmark::State &state) {
+        Run(state, [](int i) { VARNEK_TRACE(kOn, "section of table %d on pid %d", i, 18); });
+    });
+    bench::Add("trace_on:bare", [](benchmark::State &state) {
+        Run(state, [](int i) {
+            Format("[%c][%s-%4d] section of table %d on pid %d", 'E', "trace.cpp", __LINE__, i, 18);
+        });
+    });
 #ifdef HAVE_SPDLOG
     bench::Add("trace_on:spdlog", SpdlogOn);
-#else
-    bench::AddMissing("trace_on:spdlog");
 #endif
 }
 

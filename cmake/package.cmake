@@ -25,12 +25,18 @@ install(FILES LICENSE DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT license)
 # The directories are those of the source tree, so that the links between the documents work.
 install(FILES README.md CHANGELOG.md SECURITY.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
 install(DIRECTORY docs examples DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev
-        FILES_MATCHING PATTERN *.md PATTERN *.svg PATTERN *.cpp PATTERN *.h)
+        FILES_MATCHING PATTERN *.md PATTERN *.svg PATTERN *.cpp PATTERN *.h PATTERN *.inc)
 install(FILES CONTRIBUTING.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
 install(DIRECTORY CommonUtility/include DESTINATION ${CMAKE_INSTALL_DOCDIR}/CommonUtility COMPONENT dev)
 install(DIRECTORY defaults DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
 install(FILES platform/README.md platform/varnek_platform.h DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform COMPONENT dev)
 install(FILES platform/host/features.txt DESTINATION ${CMAKE_INSTALL_DOCDIR}/platform/host COMPONENT dev)
+
+if(TARGET receiver)
+    install(TARGETS receiver DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT receiver)
+    install(FILES ${CMAKE_BINARY_DIR}/examples/receiver/receiver.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1
+            COMPONENT receiver)
+endif()
 
 # Debian packages; script/package builds them with the preset package.
 if(VARNEK_DEBIAN)

@@ -1,7 +1,6 @@
-// The functions that the library uses of its platform in addition to the C library; README.md is
-// the contract. The library includes this header where it calls the functions, and the stand-ins
-// include it where they define them. So the compiler checks calls and definitions against one
-// declaration. Private; plain C.
+// What the library uses of its platform besides the C library; README.md is the contract. Both the
+// library and the stand-ins include this header, so that the compiler checks calls and definitions
+// against one declaration. Private; plain C.
 #ifndef VARNEK_PLATFORM_H
 #define VARNEK_PLATFORM_H
 
@@ -9,7 +8,7 @@
 extern "C" {
 #endif
 
-// The priorities of the device's log that the library uses.
+// The log's priorities that the library uses.
 enum VarnekLogPriority {
     VARNEK_LOG_VERBOSE = 2,
     VARNEK_LOG_DEBUG = 3,
@@ -21,8 +20,8 @@ enum VarnekLogPriority {
 // Writes one entry to the device's log (liblog).
 int __android_log_write(int priority, const char *tag, const char *text);
 
-// Returns the text value of a platform feature; null or `defaultValue` when there is no such
-// feature (libvellnativefeature).
+// Returns the text value of a platform feature; null or `defaultValue` if there is no such feature
+// (libvellnativefeature).
 const char *VellNativeFeature_getStringWithDefault(const char *key, const char *defaultValue);
 
 #ifdef __cplusplus

@@ -1,6 +1,5 @@
-"""Converts abidw's description of the library (stdin) to a readable record of its binary interface:
-functions and globals with their types, then every type that these refer to, with sizes and offsets in
-bytes."""
+"""Turns abidw's description of the library (stdin) into a readable record of its binary interface: functions and globals
+with their types, and then every type that these refer to, with sizes and offsets in bytes."""
 
 import subprocess
 import sys
@@ -29,7 +28,7 @@ def returned(function):
 
 
 def name(type_id):
-    """Returns the type as it is written in a declaration, and records the types that it refers to."""
+    """Returns the type as a declaration has it, and records the types that it refers to."""
     node = by_id[type_id]
     if node.tag == "pointer-type-def":
         target = by_id[node.get("type-id")]
@@ -58,7 +57,7 @@ def name(type_id):
 def describe(node):
     own = node.get("name")
     if node.tag == "typedef-decl":
-        # A name of the C library's own is another one in the next release.
+        # The C library's own names change between releases.
         base = by_id[node.get("type-id")]
         while base.tag == "typedef-decl" and base.get("name").startswith("__"):
             base = by_id[base.get("type-id")]
@@ -81,14 +80,14 @@ readable = dict(zip(symbols, subprocess.run(["c++filt"], input="\n".join(symbols
                                             stdout=subprocess.PIPE).stdout.split("\n")))
 exports = set()
 for node in root.iter():
-    # A C function that another source calls may appear as a declaration only.
+    # A C function that another source calls may only be declared.
     symbol = node.get("elf-symbol-id") or node.get("name")
     if symbol not in readable:
         continue
     if node.tag == "var-decl":
         exports.add(f"{name(node.get('type-id'))} {readable[symbol]}")
     elif node.tag == "function-decl":
-        if readable[symbol] == symbol:  # the name of a C function does not encode its parameters
+        if readable[symbol] == symbol:  # a C function, whose name does not encode its parameters
             exports.add(f"{returned(node)} {symbol}({parameters(node)})")
         else:
             parameters(node)

@@ -1,10 +1,10 @@
-"""Defines what is measured, with the peers and the goals, and measures it: times on a PC, counts of what the ARM build
-executes under the emulator. script/bench builds the programs and describes the options."""
+"""Defines the rows with their peers and goals, and measures them: times on a PC, counts of what the ARM build executes
+under the emulator. script/bench builds the programs and describes the options."""
 import datetime
 import json
 import os
 import platform
-import resource
+import shutil
 import statistics
 import subprocess
 import sys
@@ -14,7 +14,8 @@ from typing import NamedTuple
 
 
 class Peer(NamedTuple):
-    """What a row is compared with. The peer named 'bare' is no product but the least code that does the same work."""
+    """What a row is compared with: another library, the library in another state, or, as 'bare', the least code that does
+    the same work."""
     name: str
     title: str
     goal: float | None = None  # our time on a PC divided by the peer's, at most
@@ -25,9 +26,9 @@ class Row(NamedTuple):
     area: str  # the program bench_AREA measures it
     title: str
     peers: tuple = ()
-    device: tuple | None = None  # instructions and barriers of an operation on ARM, at most; without it only timed
-    turns: int = 4096  # operations of which a count is the average
-    wall: bool = False  # it waits for another thread or a timer, so that wall-clock time counts
+    device: tuple | None = None  # instructions and barriers on ARM, at most; a row without it is only timed
+    turns: int = 4096  # a count is the average of so many operations
+    wall: bool = False  # wall-clock time counts, because the operation waits for another thread or a timer
 
 
 MESSAGE_LIST = 'mallocs, list, locks'
@@ -37,12 +38,15 @@ ROWS = [
     Row('trace_off/two', 'trace', 'trace that is off, two threads',
         (Peer('liblog', 'liblog, filtered'), Peer('bare', 'masked call'))),
     Row('trace_on', 'trace', 'trace into nothing', (Peer('spdlog', 'spdlog, null sink', 1.0), Peer('bare', 'vsnprintf'))),
-    Row('mutex/last', 'locks', 'mutex acquire + release by handle', (Peer('bare', 'pthread mutex', 1.6),), (140, 4)),
+    Row('mutex/last', 'locks', 'mutex acquire + release by handle',
+        (Peer('alone', 'the only mutex', 1.1), Peer('bare', 'pthread mutex', 1.6)), (140, 4)),
     Row('mutex/two', 'locks', 'the same, two threads, adjacent slots', (Peer('onethread', 'one thread', 1.5),)),
-    Row('semaphore/last', 'locks', 'semaphore signal + wait', (Peer('bare', 'sem_post, sem_wait', 3.0),), (170, 4)),
-    Row('byname', 'locks', 'mutex by name, 31st of 40', (), (450, 4)),
+    Row('semaphore/last', 'locks', 'semaphore signal + wait',
+        (Peer('alone', 'the only semaphore', 1.1), Peer('bare', 'sem_post, sem_wait', 3.0)), (170, 4)),
+    Row('byname', 'locks', 'mutex by name, 31st of 40', (Peer('alone', 'the only mutex'),), (450, 4)),
     Row('message/same', 'messages', 'send + receive, same thread',
         (Peer('gasync', 'GAsyncQueue', 1.1), Peer('bare', MESSAGE_LIST, 2.0)), (900, 20)),
+    Row('message/queued', 'messages', 'send + receive behind 1000000 messages', (Peer('empty', 'empty queue', 1.2),)),
     Row('message/oneway', 'messages', 'message, one way',
         (Peer('gasync', 'GAsyncQueue', 0.9), Peer('bare', MESSAGE_LIST, 2.0)), wall=True),
     Row('message/pingpong1', 'messages', 'ping-pong on one core',
@@ -52,10 +56,8 @@ ROWS = [
     Row('crc/12', 'crc', 'CRC-32, 12 bytes', (Peer('av_crc', 'av_crc', 1.1),), (100, 0)),
     Row('crc/184', 'crc', 'CRC-32, 184 bytes', (Peer('av_crc', 'av_crc', 0.55),), (930, 0)),
     Row('crc/4096', 'crc', 'CRC-32, 4096 bytes', (Peer('av_crc', 'av_crc', 0.55),), (19400, 0), turns=512),
-    Row('ring/one', 'ring', 'ring, 188 bytes in and out',
-        (Peer('jack', 'JACK, no lock'), Peer('bare', 'memcpy, mutex', 1.8)), (520, 8)),
-    Row('ring/two', 'ring', 'ring, 188 bytes, two threads',
-        (Peer('jack', 'JACK, no lock'), Peer('bare', 'memcpy, mutex')), wall=True),
+    Row('ring/one', 'ring', 'ring, 188 bytes in and out', (Peer('bare', 'memcpy, mutex', 1.8),), (520, 8)),
+    Row('ring/two', 'ring', 'ring, 188 bytes, two threads', (Peer('bare', 'memcpy, mutex'),), wall=True),
     Row('bits', 'bits', '1200 bit fields of PSI', (Peer('gstreamer', 'gst_bit_reader', 0.8),), (38000, 0), turns=512),
     Row('text/32', 'text', 'Latin-15 to UTF-8, 32 bytes', (Peer('iconv', 'iconv', 0.7),), (800, 0)),
     Row('text/4096', 'text', 'Latin-15 to UTF-8, 4096 bytes', (Peer('iconv', 'iconv', 0.5),), (33000, 8), turns=512),
@@ -69,17 +71,6 @@ ROWS = [
     Row('receiver', 'receiver', 'receiver, 512 MiB',
         (Peer('ffprobe', 'ffprobe, all packets', 1.0), Peer('programs', 'ffprobe, first programs', 1.0),
          Peer('bare', 'plain reading')), wall=True),
-]
-
-# How the cost grows: what is counted, the rows NAME/SIZE, the contender, and whether the time is divided by the size.
-GROWTH = [
-    ('mutex acquire + release, by objects in the table', 'grow_mutex', 'ours', False),
-    ('semaphore signal + wait', 'grow_semaphore', 'ours', False),
-    ('mutex by name, the last one', 'grow_byname', 'ours', False),
-    ('send + receive, by messages in the queue', 'grow_queue', 'ours', False),
-    ('a byte of Latin-15 to UTF-8, by bytes', 'grow_text', 'ours', True),
-    ('a byte of CRC-32', 'grow_crc', 'ours', True),
-    ('a byte of bit fields', 'grow_bits', 'ours', True),
 ]
 
 PC, ARM, CLANG = Path('build/release'), Path('build/arm'), Path('build/arm-clang')
@@ -185,15 +176,13 @@ def measure_receiver(megabytes, runs):
                 file.write(sample)
         for _ in range(runs):
             for contender, command in contenders.items():
-                result = {'run_type': 'iteration', 'name': f'receiver:{contender}', 'time_unit': 's'}
+                if not shutil.which(command[0]):
+                    continue
                 start = time.monotonic()
-                try:
-                    subprocess.run(command, check=True, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
-                                   stderr=subprocess.DEVNULL)
-                    result['real_time'] = time.monotonic() - start
-                except FileNotFoundError:
-                    result |= {'error_occurred': True, 'error_message': 'not installed'}
-                results.append(result)
+                subprocess.run(command, check=True, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
+                               stderr=subprocess.DEVNULL)
+                results.append({'run_type': 'iteration', 'name': f'receiver:{contender}', 'time_unit': 's',
+                                'real_time': time.monotonic() - start})
     finally:
         stream.unlink(missing_ok=True)
     (RESULTS / 'receiver.json').write_text(json.dumps({'benchmarks': results}))
@@ -233,7 +222,7 @@ def time_table(figures, rows):
         for peer in row.peers:
             theirs = figures.of(row, peer.name)
             ratio = statistics.median(ours) / statistics.median(theirs) if theirs else None
-            cost = shown(statistics.median(theirs)) if theirs else figures.errors.get((row.name, peer.name), 'not measured')
+            cost = shown(statistics.median(theirs)) if theirs else figures.errors.get((row.name, peer.name), 'not installed')
             judged = peer.goal is not None and ratio is not None
             lines.append((*compared(peer, cost, ratio), f'<= {peer.goal}' if peer.goal else '',
                           ('met' if round(ratio, 2) <= peer.goal else 'MISSED') if judged else ''))
@@ -246,24 +235,12 @@ def score(table):
     return f'{verdicts.count("met")} goals met, {verdicts.count("MISSED")} missed'
 
 
-def growth(figures):
-    for title, name, contender, per in GROWTH:
-        points = {}
-        for (row, who), samples in figures.cpu.items():
-            if who == contender and row.startswith(name + '/'):
-                size = int(row.split('/')[1])
-                points[size] = statistics.median(samples) / (size if per else 1)
-        yield title, ', '.join(f'{shown(ns)} at {size}' for size, ns in sorted(points.items()))
-
-
 def print_times(prefixes, brief=False):
     run_programs(prefixes, brief)
     figures = Figures()
     table = list(blocks(time_table(figures, chosen(prefixes))))
     printed([TIME_HEAD, *table])
     print(score(table))
-    if not prefixes:
-        printed(list(growth(figures)))
 
 
 def record_times():
@@ -276,7 +253,6 @@ def record_times():
         f'Measured on {datetime.date.today().isoformat()}: {next(models, platform.machine())}, {os.cpu_count()} cores, '
         f'Linux {platform.release().split("-")[0]}, {output_of("g++", "--version").splitlines()[0]}.',
         f'{score(table)}.', '', *marked_down(TIME_HEAD, *table)])
-    into_page('growth', marked_down(('operation', 'median time'), *growth(figures)))
 
 
 # Counts ---------------------------------------------------------------------------------------------
@@ -290,16 +266,14 @@ def build_plugin():
 
 def count(row, contender, library=ARM):
     """Returns what an operation executes on average between the marks of a run, or why there is no count."""
-    out = TOP / 'count.txt'
-    out.unlink(missing_ok=True)
     paths = [library.absolute() / 'lib', *(PEERS / top / 'lib/arm-linux-gnueabihf' for top in ('usr', '.'))]
     run = subprocess.run(
-        ['setarch', '-R', 'qemu-arm', '-plugin', f'{TOP}/count.so,out={out}', '-L', '/usr/arm-linux-gnueabihf',
+        ['setarch', '-R', 'qemu-arm', '-plugin', TOP / 'count.so', '-L', '/usr/arm-linux-gnueabihf',
          ARM / 'bin' / f'bench_{row.area}', f'{row.name}:{contender}', str(row.turns)],
         env={'PATH': os.environ['PATH'], 'LD_LIBRARY_PATH': ':'.join(map(str, paths))},
-        stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True, check=False)
-    if run.returncode == 0 and out.exists():
-        return tuple(round(int(executed) / row.turns) for executed in out.read_text().split())
+        stdin=subprocess.DEVNULL, capture_output=True, text=True, check=False)
+    if run.returncode == 0:
+        return tuple(round(int(executed) / row.turns) for executed in run.stdout.split())
     if contender == 'ours':
         sys.exit(f'{row.name} could not be counted: {run.stderr}')
     return run.stderr.strip()

@@ -1,5 +1,5 @@
-# Functions that the scripts share. All scripts run from the top of the tree, in one locale. They write the output of
-# the tools that they call to build/log/, and show it only when a tool fails.
+# What the scripts share. They run at the top of the tree, in one locale, and write the output of the tools that they
+# call to build/log/, showing it only when a tool fails.
 # shellcheck shell=bash
 cd -P -- "$(dirname -- "${BASH_SOURCE[0]}")/.." || exit
 export LC_ALL=C.UTF-8
@@ -11,8 +11,7 @@ die() {
     exit 1
 }
 
-# quietly NAME COMMAND...: runs a command with its output in build/log/NAME.log, and shows the end of
-# the log when the command fails.
+# quietly NAME COMMAND...: runs a command with its output in build/log/NAME.log, and shows the end if that fails.
 quietly() {
     local log=build/log/$1.log status=0
     shift
@@ -23,8 +22,8 @@ quietly() {
     die "'$1' failed with status $status; its output is in $log"
 }
 
-# build PRESET [TARGET...]: configures and builds. If the build directory was copied from another place, it is removed
-# first, because CMake refuses such a cache.
+# build PRESET [TARGET...]: configures and builds, in a new directory if the old one was copied from elsewhere, because
+# CMake refuses its cache.
 build() {
     local preset=$1
     shift
@@ -36,7 +35,7 @@ build() {
     quietly "build-$preset" cmake --build --preset "$preset" -j "$(nproc)" --target "$@"
 }
 
-# judges TOOL VERSION: whether this system has the version whose findings count, Debian 12's; says so if it does not.
+# judges TOOL VERSION: whether this system has the version whose findings count, Debian 12's; if not, says so.
 judges() {
     local version
     version=$("$1" --version | sed -nE '/version/ { s/.*version:? ([0-9.]+).*/\1/p; q }')
@@ -46,7 +45,7 @@ judges() {
     }
 }
 
-# find_code PATTERN...: lists our files that match, each followed by a NUL.
+# find_code PATTERN...: lists our files whose names match, each followed by a NUL.
 find_code() {
     local names=(-name "$1")
     shift
@@ -54,10 +53,10 @@ find_code() {
     find . \( -path './build*' -o -path ./.git \) -prune -o -type f \( "${names[@]}" \) -print0
 }
 
-# without_comments FILE: prints the file without empty lines and lines that begin with '#'.
+# without_comments FILE: prints the file without empty lines and comments.
 without_comments() { grep -vE '^(#|$)' "$1"; }
 
-# readme TEXT: prints the first block of README.md that contains TEXT, without its fences.
+# readme TEXT: prints the first block of README.md that contains TEXT.
 readme() {
     local block
     block=$(awk -v text="$1" '/^```/ { if (found) exit; inside = !inside; block = ""; next }
@@ -67,8 +66,8 @@ readme() {
     printf '%s\n' "$block"
 }
 
-# block PAGE HEAD: prints the page's blocks whose opening fence has this text.
+# block PAGE HEAD: prints the blocks of a page whose fence says HEAD.
 block() { awk -v head="\`\`\`$2" '$0 == "```" { inside = 0 } inside; $0 == head { inside = 1 }' "$1"; }
 
-# log_of FILE: prints a log in logcat's format without dates, times, processes and threads.
+# log_of FILE: prints a log without dates, times, processes and threads.
 log_of() { sed -E 's/^[0-9-]+ [0-9:.]+ +[0-9]+ +[0-9]+ //' "$1"; }

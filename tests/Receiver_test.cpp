@@ -14,6 +14,7 @@
 
 #include "BroadcastText.h"
 #include "BroadcastTime.h"
+#include "CommandLine.h"
 #include "Paragraphs.h"
 #include "Varnek_Version.h"
 #include "support/Families.h"
@@ -24,33 +25,45 @@ namespace receiver {
 namespace {
 
 using namespace streamwriter;
-using ::testing::ElementsAre;
+using ::testing::AllOf, ::testing::ElementsAre, ::testing::EndsWith, ::testing::HasSubstr, ::testing::StartsWith;
 
-struct Result {
-    int status;
-    std::string out, err;
-};
+using Arguments = std::vector<std::string>;
 
-Result RunProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
-    std::setlocale(LC_CTYPE, "C.UTF-8");
-    setenv("COLUMNS", "80", 1);
-    Result result;
-    result.out = Written([&](std::FILE *out) {
-        result.err = Written([&](std::FILE *err) { result.status = RunReceiver(arguments, {out, err, stop}); });
-    });
-    return result;
+std::string RunProgram(const Arguments &arguments) {
+    return Written([&](std::FILE *out) { RunReceiver(arguments, {out, stderr}); });
 }
 
 class Receiver : public VarnekTest {
   protected:
-    // Runs the program and notes its status, its errors and the beginning of its output.
-    Result NoteProgram(const std::vector<std::string> &arguments, const std::atomic<bool> *stop = nullptr) {
-        const Result result = RunProgram(arguments, stop);
-        Note(::testing::PrintToString(arguments) + " = " + std::to_string(result.status) + "\n" + result.err);
-        Note(result.out.substr(0, 450) + "\n");
-        return result;
+    Receiver() {
+        std::setlocale(LC_CTYPE, "C.UTF-8");
+        setenv("COLUMNS", "80", 1);
+    }
+
+    // Runs the program, and notes its status and its messages.
+    void NoteProgram(const Arguments &arguments, std::FILE *out) {
+        int status = -1;
+        const std::string err = Written([&](std::FILE *file) { status = RunReceiver(arguments, {out, file}); });
+        Note(::testing::PrintToString(arguments) + " = " + std::to_string(status) + "\n" + err);
+    }
+    // Returns the output too, and notes it up to its first empty line, unless it is JSON.
+    std::string NoteProgram(const Arguments &arguments) {
+        const std::string out = Written([&](std::FILE *file) { NoteProgram(arguments, file); });
+        Note(out[0] == '{' ? "" : out.substr(0, (out + '\n').find("\n\n") + 1));
+        return out;
     }
 };
+
+// Returns the lines of a text that another one does not have.
+std::string NewLines(const std::string &text, const std::string &other) {
+    std::string lines;
+    for (size_t at = 0, end = 0; at < text.size(); at = end) {
+        end = std::min(text.find('\n', at), text.size() - 1) + 1;
+        const std::string line = text.substr(at, end - at);
+        lines += ("\n" + other).find("\n" + line) == std::string::npos ? line : "";
+    }
+    return lines;
+}
 
 Bytes Fill(size_t size, unsigned char value) { return Bytes(size, value); }
 
@@ -411,9 +424,10 @@ TEST_F(Receiver, KeepsTheCurrentTables) {
           {0x10, MakeSection(0x40, 9, {0xFF, 0xFF, 0x40, 200, 'n'}, {1, 1})},
           {0x14, {0x70, 0x70, 3, 0xC0, 0x79, 0x12}}}},
     };
+    const std::string nothing = ToJson(ReadSections({}));
     for (const auto &c : cases) {
         const std::string json = ToJson(ReadSections(c.sections));
-        Note(std::string(c.name) + ":\n" + json.substr(json.find("  \"sections\"")));
+        Note(std::string(c.name) + ":\n" + NewLines(json.substr(json.find("  \"sections\"")), nothing));
     }
 }
 
@@ -441,16 +455,32 @@ TEST_F(Receiver, ReadsTheSample) {
     Report report = ReadStream(sample);
     Note(ToJson(report));
     EXPECT_EQ(ToJson(report), ToJson(ReadStream(sample, 1)));
-    Note(ToSummary(report, 80));
+    const std::string summary = ToSummary(report, 80);
+    Note(summary);
     for (const uint8_t region : {uint8_t{4}, uint8_t{5}}) {  // the sample has only the first
         report.settings.region = region;
-        const std::string summary = ToSummary(report, 80);
-        Note("Region " + std::to_string(region) + ":\n" + summary.substr(0, summary.find("\nCounters")));
+        Note("Region " + std::to_string(region) + ":\n" + NewLines(ToSummary(report, 80), summary));
     }
 }
 
+TEST_F(Receiver, ListsTheFirstOrAll) {
+    Bytes events;
+    for (unsigned id = 0; id < 13; ++id) {
+        events = events + At(id, static_cast<int>(id), {});
+    }
+    StreamWriter writer;
+    writer.SendSections(0x12, {MakeEit(0x50, 1, 1, events), OneEvent(0x60, 5, 1, 20, "elsewhere")});
+    for (uint16_t pid = 0x200; pid < 0x219; ++pid) {
+        writer.Send(pid, {{}, kPayload});
+    }
+    Report report = ReadStream(writer.Stream());
+    const std::string first = ToSummary(report, 80);
+    report.settings.all = true;
+    const std::string all = ToSummary(report, 80);
+    Note(NewLines(first, all) + "All:\n" + NewLines(all, first));
+}
+
 TEST_F(Receiver, BreaksLines) {
-    std::setlocale(LC_CTYPE, "C.UTF-8");
     const std::pair<std::string, std::string> cases[] = {
         {"", "lead\n"},
         {"one\ntwo", "lead  one two\n"},
@@ -477,8 +507,9 @@ TEST_F(Receiver, AnswersEveryInput) {
     const Bytes accident = Fill(9000, 0x11) + Numbered(0, 5, Fill(4, 0)) + Fill(9000, 0x11);
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
     Show("receiver " + std::to_string(VARNEK_VERSION_MAJOR), "receiver MAJOR");
+    Show(std::string(300, 'x'), "LONG");
     Show(TestFile("sample.ts"), "SAMPLE");
-    const std::vector<std::string> cases[] = {
+    const Arguments cases[] = {
         {},
         {"--nonsense", Path("text")},
         {Path("text"), Path("text")},
@@ -492,36 +523,76 @@ TEST_F(Receiver, AnswersEveryInput) {
         {Path("")},
         {Path("text")},
         {Path("accident")},
-        {Path("cut.ts"), "--json"},
         {"--", Path("-dash")},
         {"--all", "--region", "5", TestFile("sample.ts")},
     };
-    for (const std::vector<std::string> &arguments : cases) {
+    for (const Arguments &arguments : cases) {
         NoteProgram(arguments);
     }
-    std::FILE *full = std::fopen("/dev/full", "w");
-    ASSERT_NE(full, nullptr);
-    EXPECT_EQ(RunReceiver({TestFile("sample.ts")}, {full, stderr}), 1);
-    EXPECT_EQ(RunReceiver({"--help"}, {full, stderr}), 1);
-    EXPECT_EQ(RunReceiver({"--version"}, {full, stderr}), 1);
-    std::fclose(full);
+    EXPECT_EQ(NoteProgram({Path("cut.ts"), "--json"}), ToJson(ReadStream(Raw(SampleText().substr(0, 100000)))));
+    const std::pair<const char *, const char *> outputs[] = {{"/dev/full", "w"}, {"/dev/null", "r"}};  // or closed
+    for (const auto &[path, mode] : outputs) {
+        std::FILE *out = std::fopen(path, mode);
+        for (const Arguments &arguments : {cases[5], cases[6], Arguments{TestFile("sample.ts")}}) {
+            Note(std::string(path) + ": ");
+            NoteProgram(arguments, out);
+        }
+        std::fclose(out);
+    }
+}
+
+// A terminal of a number of columns, which passes on what is written to it.
+struct Terminal {
+    explicit Terminal(unsigned short columns) {
+        termios raw{};
+        cfmakeraw(&raw);
+        cfsetspeed(&raw, B9600);
+        const winsize size{24, columns, 0, 0};
+        EXPECT_EQ(openpty(&user, &program, nullptr, &raw, &size), 0);
+        file = fdopen(program, "w");
+    }
+    // Closes the program's end, and returns what is left to read.
+    std::string Finish() const {
+        std::fclose(file);
+        std::string text;
+        for (char byte = 0; read(user, &byte, 1) == 1;) {
+            text += byte;
+        }
+        close(user);
+        return text;
+    }
+    int user = -1, program = -1;
+    std::FILE *file;
+};
+
+TEST_F(Receiver, FitsTheTerminal) {
+    const struct {
+        const char *columns;
+        unsigned short out, err;  // 0 if the terminal does not know
+        size_t width;
+    } cases[] = {{nullptr, 0, 0, 80}, {nullptr, 0, 60, 60}, {nullptr, 50, 60, 50}, {"70", 50, 60, 70},
+                 {"0", 50, 60, 50},   {"x", 0, 0, 80},      {"100", 0, 0, 100},    {"9", 0, 0, 40}};
+    for (const auto &c : cases) {
+        c.columns == nullptr ? unsetenv("COLUMNS") : setenv("COLUMNS", c.columns, 1);
+        const Terminal out(c.out), err(c.err);
+        RunReceiver({"--help"}, {out.file, err.file});
+        EXPECT_EQ(out.Finish(), Written([&](std::FILE *file) { WriteHelp(file, c.width); }))
+            << "COLUMNS " << c.columns << ", out " << c.out << ", err " << c.err;
+        EXPECT_EQ(err.Finish(), "");
+    }
 }
 
 // One end of a terminal reads the bytes that the other end wrote, and then an error, since the other end is closed.
 TEST_F(Receiver, ReportsAReadError) {
-    int input = -1, terminal = -1;
-    termios raw{};
-    cfmakeraw(&raw);
-    cfsetspeed(&raw, B9600);
-    ASSERT_EQ(openpty(&input, &terminal, nullptr, &raw, nullptr), 0);
+    const Terminal terminal(0);
     const Bytes packets = Numbered(0, 10);
-    ASSERT_EQ(write(terminal, packets.data(), packets.size()), static_cast<ssize_t>(packets.size()));
-    close(terminal);
-    ASSERT_EQ(dup2(input, STDIN_FILENO), STDIN_FILENO);
+    ASSERT_EQ(write(terminal.program, packets.data(), packets.size()), static_cast<ssize_t>(packets.size()));
+    std::fclose(terminal.file);
+    ASSERT_EQ(dup2(terminal.user, STDIN_FILENO), STDIN_FILENO);
     NoteProgram({"-"});
 }
 
-// No program writes to the pipe, and the user gives up half a second later.
+// No program writes to the pipe, and the user, who sees this, gives up half a second later.
 TEST_F(Receiver, StopsWhileItWaits) {
     ASSERT_EQ(mkfifo(Path("pipe").c_str(), 0600), 0);
     std::atomic<bool> stop{false};
@@ -529,20 +600,27 @@ TEST_F(Receiver, StopsWhileItWaits) {
         std::this_thread::sleep_for(std::chrono::milliseconds(500));
         stop = true;
     });
-    NoteProgram({Path("pipe")}, &stop);
+    const Terminal err(80);
+    EXPECT_THAT(Written([&](std::FILE *out) {
+                    EXPECT_EQ(RunReceiver({Path("pipe")}, {out, err.file, &stop}), 130);
+                }),
+                StartsWith("Stream    0 packets\n"));
     user.join();
+    EXPECT_THAT(err.Finish(), AllOf(HasSubstr("pipe: waiting for a program that writes to this pipe\n\r0 MB\r"),
+                                    EndsWith("\r0 MB\r\r    \r")));
 }
 
 // Fills the registry of a family, and frees a place for each run until a run has all that it needs.
 TEST_F(Receiver, FreesItsObjects) {
     Show(TestFile("sample.ts"), "SAMPLE");
-    const std::string expected = RunProgram({"--json", TestFile("sample.ts")}).out;
+    // The first run lets the library make the mutex of its threads.
+    const std::string expected = RunProgram({"--json", TestFile("sample.ts")});
     for (const Family &family : kFamilies) {
         std::vector<int32_t> fillers = family.Fill();
         for (bool enough = false; !enough; fillers.pop_back()) {
-            const Result result = NoteProgram({"--json", TestFile("sample.ts")});
-            enough = result.status == 0;
-            EXPECT_EQ(result.out, enough ? expected : "");
+            const std::string out = NoteProgram({"--json", TestFile("sample.ts")});
+            enough = !out.empty();
+            EXPECT_EQ(out, enough ? expected : "");
             Note("There was room for " + std::to_string(family.Room()) + " " + family.name + ".\n");
             ASSERT_FALSE(fillers.empty());
             family.remove(fillers.back());
@@ -560,13 +638,11 @@ TEST_F(Receiver, Captures) {
     NoteProgram({"--capture", captured, Path("text")});
     EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "a run without packets wrote a capture";
 
-    const Result first = NoteProgram({"--json", "--quiet", "--capture", captured, TestFile("sample.ts")});
-    EXPECT_LT(ReadAll(captured).size(), SampleText().size());
-    const Result again = NoteProgram({"--json", captured});
-    const auto tables = [](const Result &result) {
-        return result.out.substr(result.out.find("\"transport_stream_id\""));
-    };
+    const auto tables = [](const std::string &json) { return json.substr(json.find("\"transport_stream_id\"")); };
+    const std::string first = NoteProgram({"--json", "--quiet", "--capture", captured, TestFile("sample.ts")});
+    const std::string again = NoteProgram({"--json", captured});
     EXPECT_EQ(tables(again), tables(first));
+    Note(again.substr(0, again.find("  \"pids\"")));
 
     NoteProgram({"--capture", captured, captured});  // a stream is not overwritten
     NoteProgram({"--capture", Path(""), captured});
@@ -583,7 +659,7 @@ TEST_F(Receiver, SurvivesDamage) {
             stream.replace(random() % (stream.size() - 2000), length, 1, static_cast<char>(random()));
         }
         WriteAll(Path("damaged.ts"), stream);
-        ASSERT_EQ(RunProgram({"--json", Path("damaged.ts")}).out, ToJson(ReadStream(Raw(stream), 1 + random() % 9000)));
+        ASSERT_EQ(RunProgram({"--json", Path("damaged.ts")}), ToJson(ReadStream(Raw(stream), 1 + random() % 9000)));
     }
 }
 

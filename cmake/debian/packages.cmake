@@ -1,4 +1,5 @@
-# Debian packages: the library, its debug information, the PC stand-ins that it loads, and the development files.
+# Debian packages: the library, its debug information, the PC stand-ins that it loads, the development files, and the
+# example receiver.
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_NAME libvarnekutils-ltn)
 set(CPACK_PACKAGE_VENDOR "")
@@ -7,7 +8,7 @@ set(CPACK_PACKAGE_CONTACT "varnekutils_ltn maintainers <maintainers@users.norepl
 set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
 set(CPACK_STRIP_FILES ON)
 set(CPACK_DEB_COMPONENT_INSTALL ON)
-set(CPACK_COMPONENTS_ALL library debug standins dev)
+set(CPACK_COMPONENTS_ALL library debug standins dev receiver)
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_PACKAGE_PRIORITY optional)
 set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
@@ -40,12 +41,20 @@ package(dev libvarnekutils-ltn-dev libdevel "development files of libvarnekutils
 This package has the headers, package files for CMake and pkg-config,
 commented defaults, helpers for gdb, ThreadSanitizer and valgrind, the guide,
 the reference and the examples.")
+package(receiver libvarnekutils-ltn-receiver utils "show the contents of ISDB-Tb and DVB transport streams
+The program receiver reads a transport stream with libvarnekutils-ltn, and
+shows services, events, errors and PIDs as text or JSON. Its source is an
+example in libvarnekutils-ltn-dev.")
 set(CPACK_DEBIAN_LIBRARY_PACKAGE_DEPENDS "libvarnekutils-ltn-standins (= ${PROJECT_VERSION})")
 set(CPACK_DEBIAN_DEBUG_PACKAGE_DEPENDS "libvarnekutils-ltn (= ${PROJECT_VERSION})")
+set(CPACK_DEBIAN_RECEIVER_PACKAGE_DEPENDS "libvarnekutils-ltn (= ${PROJECT_VERSION})")
 set(CPACK_DEBIAN_DEV_PACKAGE_DEPENDS "libvarnekutils-ltn (= ${PROJECT_VERSION}), libc6-dev")
 
 configure_file(cmake/debian/changelog.in changelog @ONLY)
 execute_process(COMMAND gzip -9nf ${CMAKE_CURRENT_BINARY_DIR}/changelog COMMAND_ERROR_IS_FATAL ANY)
+install(CODE "
+    execute_process(COMMAND gzip -9nf \$ENV{DESTDIR}/usr/${CMAKE_INSTALL_MANDIR}/man1/receiver.1 COMMAND_ERROR_IS_FATAL ANY)"
+    COMPONENT receiver)
 
 # gdb finds the debug information of a stripped library by its build id. CPack's own packages for it have wrong checksums
 # and no copyright.

@@ -4,8 +4,7 @@
 //   counter    counts ticks, sends Show to the display, waits for Shown, and starts the timer again
 //   display    prints, and answers with Shown; a Quit ends it
 //
-// The threads find each other by name. All waits have a limit, so the program ends whatever goes
-// wrong.
+// The threads find each other by name. Every wait has a limit, so the program always ends.
 #include <cstdio>
 
 #include "Varnek_Tasking.h"
@@ -32,10 +31,9 @@ bool SendTo(const char *szThreadName, const Content &content) {
     return varnek::Send(VarnekPGL_GetThreadByName(szThreadName), content);
 }
 
-// Sets `isComplete` after the last round.
+// Says in `isComplete` whether all rounds took place.
 void Count(varnek::Timer *pace, bool *isComplete) {
-    // The callable only sends a message. It must not keep the timer service waiting, and a message
-    // needs no lock.
+    // It only sends a message, which needs no lock, because the timer service must not wait for it.
     const auto tick = [] { SendTo(kCounter, {Content::kTick, 0}); };
     Content content = {Content::kShown, 0};
     int32_t round = 0;

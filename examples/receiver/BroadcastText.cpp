@@ -1,5 +1,5 @@
-// The library converts the characters. This file handles the selector of the character table, the
-// control functions, and characters that the conversions do not support.
+// The library converts characters; this file handles the selector of their table, control
+// functions, and characters that those conversions do not support.
 #include "BroadcastText.h"
 
 #include <algorithm>
@@ -20,7 +20,7 @@ constexpr unsigned char kSelectUnicode = 0x11;
 constexpr unsigned char kSelectUtf8 = 0x15;
 constexpr unsigned char kSelectEncoding = 0x1F;  // the encoding's number follows in one byte
 
-// Returns the size of a DVB selector; 0 when the text begins with anything else.
+// Returns the size of a DVB selector; 0 if the text begins with none.
 size_t SelectorSize(const std::string &text) {
     const unsigned char first = static_cast<unsigned char>(text[0]);
     if (first == kSelectNumbered || first == kSelectEncoding) {
@@ -52,43 +52,42 @@ bool IsControl(char c) {
     return (static_cast<unsigned char>(c) & 0x7F) < 0x20;
 }
 
-// Returns the bytes of a control function of ISDB with its parameters. A parameter ends at the
-// first byte that is outside the range of its intermediate bytes, and is cut short by a byte that
-// cannot belong to it.
+// Returns the number of bytes of a control function of ISDB with its parameters. Each of these is a
+// printable byte behind any intermediate bytes; a byte that cannot be one cuts the function short.
 size_t ControlSize(const std::string &text, size_t at) {
     static const struct {
-        unsigned char control;
-        unsigned char least, most;  // of intermediate bytes; none if the first one is larger
+        const char *controls;
         int parameters;
+        unsigned char most;  // the largest intermediate byte; the least is 0x20
     } kWithParameters[] = {
-        {0x16, 1, 0, 1},       {0x19, 1, 0, 1},       {0x1D, 1, 0, 1},  // PAPF, SS2, SS3
-        {0x1B, 0x20, 0x2F, 1}, {0x1C, 1, 0, 2},                         // ESC, APS
-        {0x8B, 1, 0, 1},       {0x90, 0x20, 0x20, 1}, {0x91, 1, 0, 1},  // SZX, COL, FLC
-        {0x92, 0x20, 0x20, 1}, {0x93, 1, 0, 1},       {0x94, 1, 0, 1},  // CDC, POL, WMM
-        {0x97, 1, 0, 1},       {0x98, 1, 0, 1},                         // HLC, RPC
-        {0x9B, 0x20, 0x3F, 1}, {0x9D, 0x20, 0x3F, 1},                   // CSI, TIME
+        {"\x16\x19\x1D\x8B\x91\x93\x94\x97\x98", 1, 0},  // PAPF SS2 SS3 SZX FLC POL WMM HLC RPC
+        {"\x1C", 2, 0},                                  // APS
+        {"\x90\x92", 1, 0x20},                           // COL CDC
+        {"\x1B", 1, 0x2F},                               // ESC
+        {"\x9B\x9D", 1, 0x3F},                           // CSI TIME
     };
-    const auto byte = [&](size_t i) {
-        return i < text.size() ? static_cast<unsigned char>(text[i]) : 0;
-    };
-    if (byte(at) == 0x95) {  // MACRO, whose definition ends with another one
+    if (text[at] == '\x95') {  // MACRO, whose definition ends with another one
         const size_t end = text.find("\x95\x4F", at);
         return end == std::string::npos ? 2 : end + 2 - at;
     }
-    size_t size = 1;
+    const auto is_within = [&](size_t i, unsigned char most) {
+        return i < text.size() && text[i] >= 0x20 && static_cast<unsigned char>(text[i]) <= most;
+    };
+    size_t end = at + 1;
     for (const auto &row : kWithParameters) {
-        for (int left = row.control == byte(at) ? row.parameters : 0; left > 0; --left) {
-            while (byte(at + size) >= row.least && byte(at + size) <= row.most) {
-                ++size;
+        const bool found = text[at] != 0 && std::strchr(row.controls, text[at]) != nullptr;
+        for (int left = found ? row.parameters : 0; left > 0; --left) {
+            while (is_within(end, row.most)) {
+                ++end;
             }
-            size += byte(at + size) >= 0x20 && byte(at + size) < 0x7F ? 1u : 0u;
+            end += is_within(end, 0x7E) ? 1u : 0u;
         }
     }
-    return size;
+    return end - at;
 }
 
-// Converts the text between two control functions at a time, because the library's conversion drops
-// the line breaks too.
+// Converts the text between control functions piece by piece, because the library's conversion
+// drops line breaks too.
 std::string FromLatin15(const std::string &text, bool dvb) {
     std::string result;
     for (size_t at = 0; at < text.size();) {
@@ -172,9 +171,8 @@ std::string FromUnicode(const std::string &text) {
     return FromUnits(units);
 }
 
-// Returns the number of bytes of the first character of a UTF-8 text.
-//   valid    out: whether it is well-formed
-//   returns  for a malformed one, the number of bytes that could begin a character, at least 1
+// Returns the number of bytes of the first character of a UTF-8 text, or of what could begin one.
+//   valid  out: whether the character is well-formed
 size_t MeasureCharacter(const unsigned char *text, size_t size, bool &valid) {
     const unsigned char lead = text[0];
     const size_t length = lead < 0x80 ? 1 : lead < 0xC2 ? 0 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
@@ -193,8 +191,8 @@ size_t MeasureCharacter(const unsigned char *text, size_t size, bool &valid) {
     return count;
 }
 
-// Replaces malformed characters and those of four bytes with U+FFFD. The library's conversion does
-// not support them and would return other letters.
+// Replaces malformed characters and those of four bytes, which the library's conversion would turn
+// into other letters, with U+FFFD.
 std::string ReplaceMalformed(const std::string &text) {
     std::string result;
     for (size_t i = 0; i < text.size();) {

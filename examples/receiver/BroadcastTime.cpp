@@ -1,5 +1,5 @@
-// The calendar rule is that of EN 300 468, annex C, in integers. Factors of 100 and 10000 replace
-// the decimal fractions of its constants.
+// The calendar rule is that of EN 300 468, annex C, with factors of 100 and 10000 instead of the
+// decimal fractions of its constants.
 #include "BroadcastTime.h"
 
 #include "Names.h"
@@ -10,7 +10,7 @@ namespace {
 constexpr int kDaySeconds = 24 * 3600;
 constexpr int kFirstDay = 15079;  // 1900-03-01
 
-// Decodes two decimal digits; -1 when one is above 9.
+// Decodes two decimal digits; -1 if one is above 9.
 int DecodeBcdByte(uint32_t byte) {
     const int tens = static_cast<int>((byte >> 4) & 0x0F);
     const int units = static_cast<int>(byte & 0x0F);

@@ -13,16 +13,15 @@ namespace receiver {
 using DateTime = int64_t;
 
 // Decodes a time of day or a duration: six decimal digits hhmmss.
-//   returns  seconds; nothing for a digit above 9, and for 60 or more minutes or seconds. This
-//            includes all ones, which mean that the time is not known
+//   returns  seconds; nothing for what is no time, such as all ones, which mean "not known"
 std::optional<int> DecodeBcdTime(uint32_t bcd);
 
 // Decodes a day and a time of day.
-//   returns  nothing for a time that DecodeBcdTime refuses, for a time of 24 hours or more, and for
-//            days before 1900-03-01, the first day of the calendar rule that broadcasting uses
+//   returns  nothing for what is no time of day, and before 1900-03-01, where the calendar rule of
+//            broadcasting begins
 std::optional<DateTime> DecodeDateTime(uint16_t mjd, uint32_t bcd);
 
-// Return "YYYY-MM-DD hh:mm:ss" and "hh:mm:ss"; empty when the time is not known.
+// Return "YYYY-MM-DD hh:mm:ss" and "hh:mm:ss"; empty for nothing.
 std::string ToText(const std::optional<DateTime> &time);
 std::string ToText(const std::optional<int> &seconds);
 

@@ -14,16 +14,10 @@ namespace {
 constexpr size_t kBlockSize = 256 * kPacketSize;
 
 const char *Explain(int32_t result) {
-    switch (result) {
-        case VARNEK_FILE_MEDIUM_FULL:
-            return "no space is left";
-        case VARNEK_FILE_TOO_LARGE:
-            return "the file would become too large";
-        case VARNEK_FILE_DEVICE_FAILURE:
-            return "the device failed";
-        default:
-            return "it could not be written";
-    }
+    return result == VARNEK_FILE_MEDIUM_FULL      ? "no space is left"
+           : result == VARNEK_FILE_TOO_LARGE      ? "the file would become too large"
+           : result == VARNEK_FILE_DEVICE_FAILURE ? "the device failed"
+                                                  : "it could not be written";
 }
 
 }  // namespace
@@ -60,7 +54,7 @@ void Capture::Finish() {
 
 void Capture::Write() {
     if (!empty_) {
-        // The library's open never truncates, so this does. Devices and pipes have no length.
+        // The library's open never truncates. Devices and pipes have no length.
         if (ftruncate(file_, 0) != 0 && errno != EINVAL) {
             failure_ = "the old content could not be removed";
             return;

@@ -9,7 +9,7 @@
 
 namespace receiver {
 
-// One thread writes to it; when that thread has finished, another one may ask for the result.
+// One thread writes to it; once that has finished, another may ask for the result.
 class Capture {
   public:
     Capture() = default;
@@ -17,9 +17,8 @@ class Capture {
     Capture &operator=(const Capture &) = delete;
     ~Capture();
 
-    // Opens the file, and creates it if necessary. Its old content stays until there is something
-    // to write.
-    //   returns  false when it cannot be written
+    // Opens or creates the file, whose old content stays until there is something to write.
+    //   returns  false if it cannot be written
     bool Open(const std::string &path);
     bool IsOpen() const { return file_ >= 0; }
 

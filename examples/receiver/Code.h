@@ -11,14 +11,14 @@ namespace receiver {
 class Code {
   public:
     constexpr Code() = default;
-    // Takes the bytes of a descriptor; bytes that cannot be a code give an empty one.
+    // Takes the bytes of a descriptor, which give an empty code if they cannot be one.
     explicit constexpr Code(uint32_t bytes) {
         if (MayBeOfCode(bytes >> 16) && MayBeOfCode(bytes >> 8) && MayBeOfCode(bytes)) {
             bytes_ = bytes;
         }
     }
 
-    // Takes a text, which is a code if it has three characters.
+    // Takes a text, which is no code unless it has three characters.
     static constexpr Code Of(const char *text) {
         uint32_t bytes = 0;
         int length = 0;

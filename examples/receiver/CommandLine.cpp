@@ -1,9 +1,10 @@
-// Each option is a row of one table, which both the parser and the help use.
+// Each option is a row of one table, which the parser, the help and the manual page share.
 #include "CommandLine.h"
 
 #include <algorithm>
 #include <cstdlib>
 #include <iterator>
+#include <string_view>
 
 #include "Paragraphs.h"
 
@@ -39,21 +40,12 @@ std::string Set(Options &options, const std::string & /*none*/) {
 
 constexpr struct {
     const char *name;
-    const char *value;  // null for an option without one
+    std::string_view value;  // empty for an option without one
     Setter set;
     const char *help;
 } kOptions[] = {
-    {"--json", nullptr, Set<&Options::json>, "show everything as one JSON object"},
-    {"--all", nullptr, Set<&Options::all>, "list every event and every PID"},
-    {"--region", "N", SetRegion,
-     "show local times of this region if the nation has several; the default is the first one"},
-    {"--capture", "FILE", SetCapture,
-     "write the packets that carry tables to a file; if the capture switch of the configuration is "
-     "on, the default is the stream's name with \".capture\""},
-    {"--quiet", nullptr, Set<&Options::quiet>, "show no progress line"},
-    {"--log", nullptr, Set<&Options::log>, "write the library's log to stderr, not to its file"},
-    {"--version", nullptr, Set<&Options::version>, "show the version"},
-    {"--help", nullptr, Set<&Options::help>, "show this help"},
+#define OPTION(...) {__VA_ARGS__},
+#include "Options.inc"
 };
 
 // Parses the option at `i`, and its value if it has one.
@@ -65,7 +57,7 @@ std::string TakeOption(const std::vector<std::string> &arguments, size_t &i, Opt
     if (option == std::end(kOptions)) {
         return "unknown option " + name;
     }
-    if (option->value == nullptr) {
+    if (option->value.empty()) {
         return option->set(options, "");
     }
     if (i + 1 == arguments.size()) {
@@ -107,14 +99,10 @@ std::string ParseArguments(const std::vector<std::string> &arguments, Options &o
 void WriteHelp(std::FILE *out, size_t width) {
     Paragraphs text(out, width);
     text.Add("usage: ", "receiver [OPTION...] FILE");
-    text.Add(
-        "  ",
-        "Reads a transport stream and shows its services, events and counters. If FILE is \"-\", "
-        "it reads standard input.");
+    text.Add("  ", RECEIVER_ABOUT);
     for (const auto &option : kOptions) {
-        std::string lead = std::string("  ") + option.name;
-        lead += option.value != nullptr ? std::string(" ") + option.value : "";
-        text.Add(Padded(lead, 18), option.help);
+        text.Add(Padded("  " + std::string(option.name) + ' ' + std::string(option.value), 18),
+                 option.help);
     }
 }
 

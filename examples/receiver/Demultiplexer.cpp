@@ -1,5 +1,5 @@
-// Packet header, continuity, section assembly and CRC, in this order. The PMT PIDs are read from
-// the PAT here rather than in the table parser, so that no packet in between is missed.
+// Packet header, continuity, section assembly and CRC, in this order. PAT and PMTs are read here as
+// well as in the table parser, so that no packet after them is missed.
 #include "Demultiplexer.h"
 
 #include <cstring>
@@ -46,7 +46,7 @@ struct Demultiplexer::Header {
 
 Demultiplexer::Demultiplexer(Handler handler) : handler_(std::move(handler)), pids_(kPidCount) {
     for (const uint16_t pid : kTablePids) {
-        AddUse(pid);
+        ++pids_[pid].table_uses;
     }
 }
 
@@ -126,8 +126,8 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
     return header;
 }
 
-// Says how a packet follows the previous one of its PID. Only a packet with a payload increments
-// the counter. Such a packet may be sent twice, and a counter may jump if the packet announces it.
+// Says how a packet follows the one before it on its PID. Only packets with a payload count. They
+// may be sent twice, and a counter may jump if the packet announces it.
 Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header, PidState &state) {
     const int last = std::exchange(state.last, header.counter);
     const bool repeatable = std::exchange(state.repeatable, header.has_payload);
@@ -210,7 +210,7 @@ void Demultiplexer::FollowNames(const unsigned char *section, size_t size) {
         }
     }
     for (const Program &program : naming.programs) {
-        AddUse(program.pmt_pid);
+        ++pids_[program.pmt_pid].table_uses;
     }
     Forget(key);
     namings_[key] = std::move(naming);
@@ -247,10 +247,6 @@ void Demultiplexer::Forget(uint32_t key) {
             Forget(kPmtKey + program.service_id);
         }
     }
-}
-
-void Demultiplexer::AddUse(uint16_t pid) {
-    ++pids_[pid].table_uses;
 }
 
 void Demultiplexer::RemoveUse(uint16_t pid) {

@@ -1,4 +1,4 @@
-// Follows the packets of every PID and extracts the sections of the tables. The tables are on fixed
+// Follows the packets of every PID and extracts the sections of the tables, which are on fixed
 // PIDs, on the PMT PIDs that the PAT names at that point of the stream, and on the AIT PIDs that
 // the PMTs name. Until there is a PAT, PMTs are found on any PID.
 #ifndef RECEIVER_DEMULTIPLEXER_H
@@ -25,7 +25,7 @@ struct PidCounters {
 
 struct DemultiplexerCounters {
     uint64_t continuity_errors = 0;
-    uint64_t transport_errors = 0;       // packets that the demodulator marked; they are ignored
+    uint64_t transport_errors = 0;       // packets that the demodulator marked; ignored
     uint64_t scrambled = 0;              // packets
     uint64_t good = 0;                   // complete sections with a correct CRC, or without one
     uint64_t bad_crc = 0;                // complete sections with a wrong CRC
@@ -69,7 +69,6 @@ class Demultiplexer {
     bool MayBePmt(const Header &header, const unsigned char *packet, PidState &state) const;
     void OnSection(uint16_t pid, bool claimed, const unsigned char *section, size_t size);
     void FollowNames(const unsigned char *section, size_t size);
-    void AddUse(uint16_t pid);
     void RemoveUse(uint16_t pid);
     void Forget(uint32_t key);
 

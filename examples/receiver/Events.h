@@ -48,7 +48,7 @@ struct EventSection {  // the place of a section among all EIT sections
 // Keeps the latest content of each section. An event that its section no longer has is gone.
 class EventTable {
   public:
-    // Far more than a week of every service needs. The limit bounds the memory for hostile streams.
+    // Far more than a week of every service needs, and a bound on what a hostile stream takes.
     static constexpr size_t kMostEvents = 65536;
     static constexpr size_t kMostBytes = 16 << 20;  // of the events' texts and lists
 
@@ -62,9 +62,9 @@ class EventTable {
 
     using Key = std::pair<uint16_t, uint16_t>;  // service_id, event_id
 
-    // Joins what the sections say about each event. The table of present and following events is
-    // nearer to the truth than a schedule, and otherwise the section that came last. Tables
-    // describe an event in different detail, so the others supply what that section leaves out.
+    // Joins what the sections say about each event. Present and following are nearer to the truth
+    // than a schedule, and otherwise the section that came last. The others supply what that one
+    // leaves out, because tables describe an event in different detail.
     std::map<Key, Event> Joined() const;
 
   private:

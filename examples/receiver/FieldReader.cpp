@@ -1,5 +1,4 @@
-// Each read first subtracts its bits from those that the reader has left, and then reads the
-// stream.
+// Each read claims its bits before it reads the stream.
 #include "FieldReader.h"
 
 namespace receiver {

@@ -1,6 +1,6 @@
 // Reads fields from borrowed bytes with the library's bit stream. A reader knows where its fields
-// end, so a length in the stream can never make it read outside the section. It remembers whether
-// every read so far was inside.
+// end, so no length in a stream makes it read outside the section, and remembers whether every read
+// so far was inside.
 #ifndef RECEIVER_FIELDREADER_H
 #define RECEIVER_FIELDREADER_H
 
@@ -17,7 +17,7 @@ class FieldReader {
     // The bytes must outlive the reader and all readers entered from it.
     FieldReader(const unsigned char *bytes, size_t size);
 
-    // Returns the next `bits` bits. When fewer are left, returns 0, and Ok() is false from then on.
+    // Returns the next `bits` bits. If fewer are left, returns 0, and Ok() is false from then on.
     uint8_t U8(int bits = 8);
     uint16_t U16(int bits = 16);
     uint32_t U32(int bits = 32);
@@ -25,9 +25,9 @@ class FieldReader {
     // Returns the next `count` bytes, from a byte boundary; empty when fewer are left.
     std::string Bytes(int count);
 
-    // Returns a reader for the next `count` bytes, which this one skips. When fewer are left, the
-    // new reader gets those, and this one is no longer Ok(). So loops end, and complete entries
-    // before that are still used.
+    // Returns a reader for the next `count` bytes, which this one skips. If fewer are left, the new
+    // reader gets those, and this one is no longer Ok(), so the entries before the overrun are
+    // used.
     FieldReader Enter(int count);
 
     bool Ok() const { return success_ != 0; }

@@ -1,5 +1,5 @@
-// Each function writes a part of the report: some members of the outermost object, or an array.
-#include "JsonReport.h"
+// Each function writes some members of the outermost object, or an array.
+#include "Report.h"
 
 #include "JsonWriter.h"
 #include "Names.h"
@@ -98,12 +98,11 @@ void WriteComponent(const Component &component, JsonWriter &json) {
 void WriteServices(const std::map<uint16_t, Service> &services, JsonWriter &json) {
     json.BeginArray("services");
     for (const auto &[id, service] : services) {
-        const ServiceInfo *info = service.info;
         json.BeginObject(nullptr);
         json.Number("id", id);
-        json.Text("name", info != nullptr ? info->name : "");
-        json.Text("provider", info != nullptr ? info->provider : "");
-        json.Number("type", info != nullptr ? info->type : std::nullopt);
+        json.Text("name", service.info.name);
+        json.Text("provider", service.info.provider);
+        json.Number("type", service.info.type);
         json.Boolean("one_seg", service.one_seg);
         json.Number("pmt_pid", service.pmt_pid);
         json.Number("pcr_pid", service.map != nullptr ? service.map->pcr_pid : std::nullopt);
@@ -169,7 +168,7 @@ void WriteJson(const Report &report, std::FILE *out) {
     WriteServices(services, json);
     json.Number("components_left_out", Number(model.components_left_out));
     json.BeginArray("events");
-    for (const ListedEvent &event : ListEvents(model)) {
+    for (const ListedEvent &event : ListEvents(model, true)) {
         WriteEvent(event, clock, json);
     }
     json.EndArray();

@@ -3,6 +3,8 @@
 
 #include <cinttypes>
 
+#include "Names.h"
+
 namespace receiver {
 
 void JsonWriter::Text(const char *key, const std::string &value) {
@@ -10,28 +12,14 @@ void JsonWriter::Text(const char *key, const std::string &value) {
     Quote(value);
 }
 
-void JsonWriter::Number(const char *key, int64_t value) {
-    Member(key);
-    std::fprintf(out_, "%" PRId64, value);
-}
-
 void JsonWriter::Thousandths(const char *key, const std::optional<int64_t> &value) {
-    if (!value) {
-        Null(key);
-        return;
-    }
-    Member(key);
-    std::fprintf(out_, "%" PRId64 ".%03d", *value / 1000, static_cast<int>(*value % 1000));
+    Literal(key, value ? Format("%" PRId64 ".%03d", *value / 1000, static_cast<int>(*value % 1000))
+                       : "null");
 }
 
-void JsonWriter::Boolean(const char *key, bool value) {
+void JsonWriter::Literal(const char *key, const std::string &text) {
     Member(key);
-    std::fputs(value ? "true" : "false", out_);
-}
-
-void JsonWriter::Null(const char *key) {
-    Member(key);
-    std::fputs("null", out_);
+    std::fputs(text.c_str(), out_);
 }
 
 void JsonWriter::Begin(const char *key, char open) {

@@ -1,5 +1,5 @@
 // Writes JSON text (RFC 8259) to a file. Each member of the outermost object gets a line, and so
-// does each element of an array in it. Deeper levels stay on the same line.
+// does each element of an array in it.
 #ifndef RECEIVER_JSONWRITER_H
 #define RECEIVER_JSONWRITER_H
 
@@ -21,15 +21,11 @@ class JsonWriter {
     void EndArray() { End(']'); }
     // Text must be well-formed UTF-8.
     void Text(const char *key, const std::string &value);
-    void Number(const char *key, int64_t value);
-    void Boolean(const char *key, bool value);
+    void Boolean(const char *key, bool value) { Literal(key, value ? "true" : "false"); }
+    void Number(const char *key, int64_t value) { Literal(key, std::to_string(value)); }
     template <typename Integer>
     void Number(const char *key, const std::optional<Integer> &value) {
-        if (value) {
-            Number(key, int64_t{*value});
-        } else {
-            Null(key);
-        }
+        Literal(key, value ? std::to_string(*value) : "null");
     }
     // Writes a number that is counted in thousandths.
     void Thousandths(const char *key, const std::optional<int64_t> &value);
@@ -38,7 +34,7 @@ class JsonWriter {
     void Begin(const char *key, char open);
     void End(char close);
     void Member(const char *key);
-    void Null(const char *key);
+    void Literal(const char *key, const std::string &text);
     void NewLine();
     void Quote(const std::string &text);
     bool OwnLines() const;

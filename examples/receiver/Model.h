@@ -1,6 +1,5 @@
-// The content of a stream's tables. The parser fills it, and the report shows it. It contains only
-// tables that apply now and to this stream. Events of other streams are stored separately. Times
-// are those of the stream, not converted.
+// The content of a stream's tables, as far as they apply now and to this stream. The parser fills
+// it, and the report shows it. Times are those of the stream, not converted.
 #ifndef RECEIVER_MODEL_H
 #define RECEIVER_MODEL_H
 
@@ -35,7 +34,7 @@ struct Component {  // a PMT entry
 
     // Whether it carries application information tables.
     bool IsAit() const {
-        return stream_type == 0x05 &&
+        return stream_type == kStreamPrivateSections &&
                (descriptor == kDescriptorApplicationSignalling ||
                 (descriptor == kDescriptorDataComponent && data_component_id == kDataAit));
     }
@@ -78,8 +77,8 @@ struct LocalOffset {
     int next_minutes;  // from then on
 };
 
-// A table of numbered sections. A section replaces the earlier one with its number. So repetitions
-// change nothing, and a new version replaces the old one section by section.
+// A table of numbered sections, each of which replaces the earlier one with its number. So a new
+// version replaces the old one section by section.
 template <typename Content>
 class Sections {
   public:
@@ -112,8 +111,7 @@ struct Model {
     size_t components = 0;                // in all PMTs
     uint64_t components_left_out = 0;     // because there was no room
     EventTable events;
-    EventTable other_events;  // of other transport streams; separate, so that they leave room for
-                              // this one's
+    EventTable other_events;  // of other streams, apart so that they leave room for this one's
 };
 
 }  // namespace receiver

@@ -1,228 +1,94 @@
-// The tables of codes and words come first, followed by the functions that search them. Codes
-// without a word are shown as numbers.
+// Each table is a text of entries "|code name|", with the code in two or more hexadecimal digits.
+// Codes that have no name are shown as numbers.
 #include "Names.h"
 
-#include <algorithm>
 #include <cstdarg>
 #include <cstdio>
-#include <iterator>
+#include <utility>
 
 #include "TransportStream.h"
 
 namespace receiver {
 namespace {
 
-struct Word {
-    uint16_t value;
-    const char *text;
-};
+constexpr char kPids[] =
+    "|00 PAT|01 CAT|10 NIT|11 SDT|12 EIT|14 TDT and TOT|23 SDTT|24 BIT|25 NBIT|26 EIT, portable|"
+    "27 EIT, one-seg|28 SDTT, one-seg|29 CDT|1FFF null packets|";
 
-constexpr Word kPids[] = {
-    {kPidPat, "PAT"},
-    {kPidCat, "CAT"},
-    {kPidNit, "NIT"},
-    {kPidSdt, "SDT"},
-    {kPidEit, "EIT"},
-    {kPidTime, "TDT and TOT"},
-    {kPidSdtt, "SDTT"},
-    {kPidBit, "BIT"},
-    {kPidNbit, "NBIT"},
-    {kPidEitMobile, "EIT, portable"},
-    {kPidEitOneSeg, "EIT, one-seg"},
-    {kPidSdttOneSeg, "SDTT, one-seg"},
-    {kPidCdt, "CDT"},
-    {kPidNull, "null packets"},
-};
+constexpr char kTables[] =
+    "|00 PAT|01 CAT|02 PMT|03 TSDT|3B DSM-CC|3C DSM-CC|3D DSM-CC|40 NIT|41 NIT other|42 SDT|"
+    "46 SDT other|4A BAT|4E EIT p/f|4F EIT p/f other|70 TDT|71 RST|72 ST|73 TOT|74 AIT|C3 SDTT|"
+    "C4 BIT|C5 NBIT|C6 NBIT reference|C7 LDT|C8 CDT|";
 
-constexpr Word kTables[] = {
-    {0x00, "PAT"},
-    {0x01, "CAT"},
-    {0x02, "PMT"},
-    {0x03, "TSDT"},
-    {0x3C, "DSM-CC"},
-    {0x3B, "DSM-CC"},
-    {0x3D, "DSM-CC"},
-    {0x40, "NIT"},
-    {0x41, "NIT other"},
-    {0x42, "SDT"},
-    {0x46, "SDT other"},
-    {0x4A, "BAT"},
-    {0x4E, "EIT p/f"},
-    {0x4F, "EIT p/f other"},
-    {0x70, "TDT"},
-    {0x71, "RST"},
-    {0x72, "ST"},
-    {0x73, "TOT"},
-    {0x74, "AIT"},
-    {0xC3, "SDTT"},
-    {0xC4, "BIT"},
-    {0xC5, "NBIT"},
-    {0xC6, "NBIT reference"},
-    {0xC7, "LDT"},
-    {0xC8, "CDT"},
-};
+constexpr char kServiceTypes[] =
+    "|01 television|02 radio|03 teletext|04 near-video-on-demand reference|"
+    "05 near-video-on-demand|06 mosaic|07 FM radio|08 system renewability|0A radio|0B mosaic|"
+    "0C data|0E RCS map|0F RCS forward link|10 DVB MHP|11 HD television|16 television|"
+    "17 near-video-on-demand|18 near-video-on-demand reference|19 HD television|"
+    "1A HD near-video-on-demand|1B HD near-video-on-demand reference|1C 3D HD television|"
+    "1D 3D HD near-video-on-demand|1E 3D HD near-video-on-demand reference|1F HEVC television|"
+    "20 HEVC UHD television|A1 special video|A2 special audio|A3 special data|A4 engineering|"
+    "A5 promotion video|A6 promotion audio|A7 promotion data|A8 data for storage beforehand|"
+    "A9 data for storage only|AA bookmark list|AB server-type simultaneous|AC independent file|"
+    "C0 data|";
 
-constexpr Word kServiceTypes[] = {
-    {0x01, "television"},
-    {0x02, "radio"},
-    {0x03, "teletext"},
-    {0x04, "near-video-on-demand reference"},
-    {0x05, "near-video-on-demand"},
-    {0x06, "mosaic"},
-    {0x07, "FM radio"},
-    {0x08, "system renewability"},
-    {0x0A, "radio"},
-    {0x0B, "mosaic"},
-    {0x0C, "data"},
-    {0x0E, "RCS map"},
-    {0x0F, "RCS forward link"},
-    {0x10, "DVB MHP"},
-    {0x11, "HD television"},
-    {0x16, "television"},
-    {0x17, "near-video-on-demand"},
-    {0x18, "near-video-on-demand reference"},
-    {0x19, "HD television"},
-    {0x1A, "HD near-video-on-demand"},
-    {0x1B, "HD near-video-on-demand reference"},
-    {0x1C, "3D HD television"},
-    {0x1D, "3D HD near-video-on-demand"},
-    {0x1E, "3D HD near-video-on-demand reference"},
-    {0x1F, "HEVC television"},
-    {0x20, "HEVC UHD television"},
-    {0xA1, "special video"},
-    {0xA2, "special audio"},
-    {0xA3, "special data"},
-    {0xA4, "engineering"},
-    {0xA5, "promotion video"},
-    {0xA6, "promotion audio"},
-    {0xA7, "promotion data"},
-    {0xA8, "data for storage beforehand"},
-    {0xA9, "data for storage only"},
-    {0xAA, "bookmark list"},
-    {0xAB, "server-type simultaneous"},
-    {0xAC, "independent file"},
-    {0xC0, "data"},
-};
-
-constexpr Word kStreamTypes[] = {
-    {0x01, "MPEG-1 video"},
-    {0x02, "MPEG-2 video"},
-    {0x03, "MPEG-1 audio"},
-    {0x04, "MPEG-2 audio"},
-    {0x05, "private sections"},
-    {0x06, "private data"},
-    {0x07, "MHEG"},
-    {0x08, "DSM-CC"},
-    {0x09, "H.222.1"},
-    {0x0A, "DSM-CC type A"},
-    {0x0B, "DSM-CC type B"},
-    {0x0C, "DSM-CC type C"},
-    {0x0D, "DSM-CC type D"},
-    {0x0E, "auxiliary data"},
-    {0x0F, "AAC audio (ADTS)"},
-    {0x10, "MPEG-4 video"},
-    {0x11, "AAC audio (LATM)"},
-    {0x12, "MPEG-4 systems"},
-    {0x13, "MPEG-4 systems sections"},
-    {0x14, "synchronised download"},
-    {0x15, "metadata"},
-    {0x16, "metadata sections"},
-    {0x17, "metadata in a data carousel"},
-    {0x18, "metadata in an object carousel"},
-    {0x19, "metadata in a synchronised download"},
-    {0x1A, "IPMP"},
-    {0x1B, "H.264 video"},
-    {0x1C, "MPEG-4 raw audio"},
-    {0x1D, "MPEG-4 text"},
-    {0x1E, "auxiliary video"},
-    {0x1F, "SVC video"},
-    {0x20, "MVC video"},
-    {0x21, "JPEG 2000 video"},
-    {0x22, "MPEG-2 video, second view"},
-    {0x23, "H.264 video, second view"},
-    {0x24, "HEVC video"},
-    {0x25, "HEVC video, temporal layer"},
-    {0x26, "MVC depth video"},
-    {0x27, "timeline and external media"},
-    {0x28, "HEVC video, enhancement"},
-    {0x29, "HEVC video, temporal enhancement"},
-    {0x2A, "HEVC video, enhancement"},
-    {0x2B, "HEVC video, temporal enhancement"},
-    {0x2C, "green access units"},
-    {0x2D, "MPEG-H audio"},
-    {0x2E, "MPEG-H audio, auxiliary"},
-    {0x2F, "quality access units"},
-    {0x30, "media orchestration"},
-    {0x31, "HEVC video, tiles"},
-    {0x32, "JPEG XS video"},
-    {0x33, "VVC video"},
-    {0x34, "VVC video, temporal layer"},
-    {0x35, "EVC video"},
-    {0x36, "LCEVC video"},
-    {0x7F, "IPMP"},
-    {0x81, "AC-3 audio"},
-    {0x87, "E-AC-3 audio"},
-};
+constexpr char kStreamTypes[] =
+    "|01 MPEG-1 video|02 MPEG-2 video|03 MPEG-1 audio|04 MPEG-2 audio|05 private sections|"
+    "06 private data|07 MHEG|08 DSM-CC|09 H.222.1|0A DSM-CC type A|0B DSM-CC type B|"
+    "0C DSM-CC type C|0D DSM-CC type D|0E auxiliary data|0F AAC audio (ADTS)|10 MPEG-4 video|"
+    "11 AAC audio (LATM)|12 MPEG-4 systems|13 MPEG-4 systems sections|14 synchronised download|"
+    "15 metadata|16 metadata sections|17 metadata in a data carousel|"
+    "18 metadata in an object carousel|19 metadata in a synchronised download|1A IPMP|"
+    "1B H.264 video|1C MPEG-4 raw audio|1D MPEG-4 text|1E auxiliary video|1F SVC video|"
+    "20 MVC video|21 JPEG 2000 video|22 MPEG-2 video, second view|23 H.264 video, second view|"
+    "24 HEVC video|25 HEVC video, temporal layer|26 MVC depth video|"
+    "27 timeline and external media|28 HEVC video, enhancement|"
+    "29 HEVC video, temporal enhancement|2A HEVC video, enhancement|"
+    "2B HEVC video, temporal enhancement|2C green access units|2D MPEG-H audio|"
+    "2E MPEG-H audio, auxiliary|2F quality access units|30 media orchestration|"
+    "31 HEVC video, tiles|32 JPEG XS video|33 VVC video|34 VVC video, temporal layer|35 EVC video|"
+    "36 LCEVC video|7F IPMP|81 AC-3 audio|87 E-AC-3 audio|";
 
 // The tag of a descriptor defines the kind of private data and sections.
-constexpr Word kPrivateData[] = {
-    {0x56, "teletext"},     {0x59, "subtitles"}, {0x6A, "AC-3 audio"}, {0x6F, "AIT"},
-    {0x7A, "E-AC-3 audio"}, {0x7B, "DTS audio"}, {0x7C, "AAC audio"},
-};
+constexpr char kPrivateData[] =
+    "|56 teletext|59 subtitles|6A AC-3 audio|6F AIT|7A E-AC-3 audio|7B DTS audio|7C AAC audio|";
 
-constexpr Word kDataComponents[] = {
-    {0x0007, "BML"},   {kDataCaptions, "captions"},       {0x000C, "BML"},
-    {0x000D, "BML"},   {kDataCaptionsOneSeg, "captions"}, {0x00A0, "Ginga"},
-    {kDataAit, "AIT"},
-};
+constexpr char kDataComponents[] = "|07 BML|08 captions|0C BML|0D BML|12 captions|A0 Ginga|A3 AIT|";
 
-constexpr Word kAudioTypes[] = {
-    {1, "clean effects"},
-    {2, "hearing impaired"},
-    {3, "audio description"},
-};
+constexpr char kAudioTypes[] = "|01 clean effects|02 hearing impaired|03 audio description|";
 
-constexpr Word kBrazilianGenres[] = {
-    {0x0, "news"},        {0x1, "sports"},          {0x2, "education"}, {0x3, "telenovela"},
-    {0x4, "miniseries"},  {0x5, "series"},          {0x6, "variety"},   {0x7, "reality show"},
-    {0x8, "information"}, {0x9, "comedy"},          {0xA, "children"},  {0xB, "erotic"},
-    {0xC, "film"},        {0xD, "draws and sales"}, {0xE, "debate"},    {0xF, "other"},
-};
+constexpr char kBrazilianGenres[] =
+    "|00 news|01 sports|02 education|03 telenovela|04 miniseries|05 series|06 variety|"
+    "07 reality show|08 information|09 comedy|0A children|0B erotic|0C film|0D draws and sales|"
+    "0E debate|0F other|";
 
-constexpr Word kDvbGenres[] = {
-    {0x1, "film or drama"}, {0x2, "news"},    {0x3, "show"},    {0x4, "sports"},
-    {0x5, "children"},      {0x6, "music"},   {0x7, "arts"},    {0x8, "politics or economics"},
-    {0x9, "education"},     {0xA, "leisure"}, {0xB, "special"},
-};
+constexpr char kDvbGenres[] =
+    "|01 film or drama|02 news|03 show|04 sports|05 children|06 music|07 arts|"
+    "08 politics or economics|09 education|0A leisure|0B special|";
 
-constexpr Word kBrazilianAges[] = {
-    {1, "all ages"}, {2, "from 10"}, {3, "from 12"}, {4, "from 14"}, {5, "from 16"}, {6, "from 18"},
-};
+constexpr char kBrazilianAges[] =
+    "|01 all ages|02 from 10|03 from 12|04 from 14|05 from 16|06 from 18|";
 
-constexpr Word kBrazilianContents[] = {{0x10, "drugs"}, {0x20, "violence"}, {0x40, "sex"}};
+constexpr char kBrazilianContents[] = "|10 drugs|20 violence|40 sex|";
 
-// The nations with ISDB-T.
-constexpr struct {
-    const char *language;
-    const char *nations;
-} kLanguages[] = {
+// The nations with ISDB-T, by the language of their events.
+constexpr std::pair<const char *, const char *> kLanguages[] = {
     {"por", "BRA AGO"},
     {"spa", "ARG BOL CHL CRI ECU GTM HND NIC PER PRY SLV URY VEN"},
     {"jpn", "JPN"},
     {"fil", "PHL"},
 };
 
-template <size_t Count>
-const char *Find(const Word (&words)[Count], uint16_t value) {
-    const auto found = std::find_if(std::begin(words), std::end(words),
-                                    [value](const Word &word) { return word.value == value; });
-    return found == std::end(words) ? nullptr : found->text;
+// Returns the name of a code; empty if the table has none.
+std::string Find(const std::string &table, unsigned code) {
+    const std::string key = Format("|%02X ", code);
+    const size_t found = table.find(key);
+    const size_t name = found + key.size();
+    return found == std::string::npos ? "" : table.substr(name, table.find('|', name) - name);
 }
 
-std::string OrNumber(const char *word, const char *format, unsigned value) {
-    char number[40];
-    std::snprintf(number, sizeof number, "%s 0x%02X", format, value);
-    return word != nullptr ? word : number;
+std::string OrNumber(const std::string &name, const char *kind, unsigned code) {
+    return name.empty() ? Format("%s 0x%02X", kind, code) : name;
 }
 
 }  // namespace
@@ -237,16 +103,15 @@ std::string Format(const char *format, ...) {
 }
 
 std::string NameOfPid(uint16_t pid) {
-    const char *name = Find(kPids, pid);
-    return name != nullptr ? name : "";
+    return Find(kPids, pid);
 }
 
 std::string NameOfTable(uint8_t table_id) {
-    if (table_id >= 0x50 && table_id <= 0x6F) {
-        return table_id < 0x60 ? "EIT schedule" : "EIT schedule other";
+    if (table_id >= kTableEitActualSchedule && table_id <= kTableEitLast) {
+        return table_id < kTableEitOtherSchedule ? "EIT schedule" : "EIT schedule other";
     }
-    const char *name = Find(kTables, table_id);
-    return name != nullptr ? name : "private";
+    const std::string name = Find(kTables, table_id);
+    return name.empty() ? "private" : name;
 }
 
 std::string NameOfServiceType(uint8_t type) {
@@ -254,36 +119,33 @@ std::string NameOfServiceType(uint8_t type) {
 }
 
 std::string RoleOfComponent(const Component &component) {
-    const bool data = component.descriptor == kDescriptorDataComponent;
     const uint16_t id = component.data_component_id;
-    if (data && (id == kDataCaptions || id == kDataCaptionsOneSeg)) {
+    if (component.descriptor == kDescriptorDataComponent &&
+        (id == kDataCaptions || id == kDataCaptionsOneSeg)) {
         const uint8_t tag = component.tag.value_or(0);
         return (tag & 0xF8) == 0x38 || tag == 0x88 ? "superimposed text" : "captions";
     }
-    const char *audio = Find(kAudioTypes, component.audio_type);
-    return component.IsAit() ? "AIT" : audio != nullptr ? audio : "";
+    return component.IsAit() ? "AIT" : Find(kAudioTypes, component.audio_type);
 }
 
 std::string NameOfComponent(const Component &component) {
-    const bool is_private = component.stream_type == 0x05 || component.stream_type == 0x06;
-    const char *by_descriptor = is_private ? Find(kPrivateData, component.descriptor) : nullptr;
-    std::string name = OrNumber(
-        by_descriptor != nullptr ? by_descriptor : Find(kStreamTypes, component.stream_type),
-        "stream type", component.stream_type);
+    const uint8_t type = component.stream_type;
+    const bool is_private = type == kStreamPrivateSections || type == kStreamPrivateData;
+    std::string name = is_private ? Find(kPrivateData, component.descriptor) : "";
+    name = OrNumber(name.empty() ? Find(kStreamTypes, type) : name, "stream type", type);
     if (component.descriptor == kDescriptorDataComponent) {
         const uint16_t id = component.data_component_id;
-        const std::string role = RoleOfComponent(component);
-        const std::string data = role == "superimposed text"
-                                     ? role
-                                     : OrNumber(Find(kDataComponents, id), "data component", id);
+        std::string data = RoleOfComponent(component);
+        if (data != "superimposed text") {
+            data = OrNumber(Find(kDataComponents, id), "data component", id);
+        }
         name = is_private ? data : name + " (" + data + ")";
     }
     for (const Code &language : component.languages) {
         name += language.IsEmpty() ? "" : " " + language.Text();
     }
-    const char *audio = Find(kAudioTypes, component.audio_type);
-    name += audio != nullptr ? std::string(" (") + audio + ")" : "";
-    return name;
+    const std::string audio = Find(kAudioTypes, component.audio_type);
+    return audio.empty() ? name : name + " (" + audio + ")";
 }
 
 std::string NameOfGuardInterval(uint8_t code) {
@@ -291,37 +153,30 @@ std::string NameOfGuardInterval(uint8_t code) {
 }
 
 std::string NameOfGenre(uint8_t genre, const Code &nation) {
-    const uint16_t first = genre >> 4;
-    const char *name = nullptr;
-    if (nation == kBrazil) {
-        name = Find(kBrazilianGenres, first);
-    } else if (LanguageOf(nation).IsEmpty()) {
-        name = Find(kDvbGenres, first);
-    }
-    return OrNumber(name, "genre", genre);
+    const bool is_dvb = LanguageOf(nation).IsEmpty();
+    const char *const table = nation == kBrazil ? kBrazilianGenres : is_dvb ? kDvbGenres : "";
+    return OrNumber(Find(table, genre >> 4), "genre", genre);
 }
 
 std::string NameOfRating(const Rating &rating) {
-    if (rating.country == kBrazil) {
-        const char *age = Find(kBrazilianAges, rating.value & 0x0F);
-        std::string name = OrNumber(age, "rating", rating.value);
-        for (const Word &content : kBrazilianContents) {
-            name += (age != nullptr && (rating.value & content.value) != 0)
-                        ? std::string(", ") + content.text
-                        : "";
-        }
-        return name;
+    const uint8_t value = rating.value;
+    if (!(rating.country == kBrazil)) {
+        return OrNumber(value > 0 && value < 0x10 ? "from " + std::to_string(value + 3) : "",
+                        "rating", value);
     }
-    const bool is_age = rating.value > 0 && rating.value < 0x10;
-    return is_age ? "from " + std::to_string(rating.value + 3)
-                  : OrNumber(nullptr, "rating", rating.value);
+    const std::string age = Find(kBrazilianAges, value & 0x0F);
+    std::string name = OrNumber(age, "rating", value);
+    for (const unsigned content : {0x10u, 0x20u, 0x40u}) {
+        name +=
+            age.empty() || (value & content) == 0 ? "" : ", " + Find(kBrazilianContents, content);
+    }
+    return name;
 }
 
 Code LanguageOf(const Code &nation) {
-    for (const auto &entry : kLanguages) {
-        if (!nation.IsEmpty() &&
-            std::string(entry.nations).find(nation.Text()) != std::string::npos) {
-            return Code::Of(entry.language);
+    for (const auto &[language, nations] : kLanguages) {
+        if (!nation.IsEmpty() && std::string(nations).find(nation.Text()) != std::string::npos) {
+            return Code::Of(language);
         }
     }
     return {};

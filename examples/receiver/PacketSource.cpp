@@ -1,6 +1,5 @@
-// The source has two states. When locked, it expects the next sync byte at the end of each packet.
-// When searching, it goes byte by byte, with a limited look-ahead. Both states only move forward,
-// so any input takes linear time.
+// When locked, the source expects a sync byte at the end of each packet; when searching, it goes
+// byte by byte, with a limited look-ahead. Both only move forward, so any input takes linear time.
 #include "PacketSource.h"
 
 #include <algorithm>
@@ -17,9 +16,8 @@ constexpr size_t kLargestDistance = 204;
 
 // The number of consecutive sync bytes that is taken for a start of packets. Few are enough at the
 // first byte of a stream, and at the packet distance already in use, so that short runs of packets
-// between losses count. Elsewhere it takes more, and also valid packet headers, because many other
-// files contain this byte at regular distances. More than seven would miss streams in datagrams,
-// which have seven packets after a header.
+// between losses count. Elsewhere it takes more, and valid packet headers, because many other files
+// have this byte at regular distances. More than seven would miss datagrams of seven packets.
 constexpr size_t kSyncsToFind = 5;
 constexpr size_t kSyncsToResume = 3;
 constexpr size_t kLookAhead = (kSyncsToFind - 1) * kLargestDistance + 4;
@@ -31,8 +29,7 @@ constexpr size_t Lead(size_t distance) {
 
 }  // namespace
 
-// Consecutive packets are passed on without a copy. Only a packet that spans two blocks is
-// assembled first.
+// Only a packet that spans two blocks is copied before it is passed on.
 void PacketSource::Feed(const unsigned char *bytes, size_t count) {
     counters_.bytes += count;
     if (locked_ && !pending_.empty()) {
@@ -118,9 +115,8 @@ bool PacketSource::Search(bool at_end) {
     return false;
 }
 
-// The look-ahead contains all sync bytes that are required, except near the end of the stream.
-// There the remaining ones are enough; but at least three are required if there is no other sign of
-// packets.
+// The look-ahead contains all sync bytes that are required, except near the end of the stream,
+// where the remaining ones are enough, or three if there is no other sign of packets.
 bool PacketSource::StartsPackets(size_t at, size_t distance) const {
     const uint64_t offset = pending_offset_ + at;
     const size_t room = pending_.size() - at;

@@ -1,6 +1,5 @@
-// Finds the packets in a stream of bytes. Packets have 188 bytes, 192 (with a four-byte time stamp
-// in front) or 204 (with 16 parity bytes at the end). The distance of the sync bytes gives the
-// size.
+// Finds the packets in a stream of bytes: of 188, of 192 with a four-byte time stamp in front, or
+// of 204 with 16 parity bytes at the end. The distance of the sync bytes tells which.
 #ifndef RECEIVER_PACKETSOURCE_H
 #define RECEIVER_PACKETSOURCE_H
 
@@ -18,9 +17,9 @@ struct PacketCounters {
     unsigned packet_size = 0;  // distance of the sync bytes, 0 until packets were found
 };
 
-// The input is blocks of bytes of any size; the output is complete packets in order. The source
-// buffers about a thousand bytes at most. After a loss it continues at the first sync byte that is
-// followed by several others at the packet distance. No byte belongs to two packets.
+// Turns blocks of bytes of any size into complete packets in order, and buffers about a thousand
+// bytes at most. After a loss it continues at the first sync byte that is followed by several
+// others at the packet distance. No byte belongs to two packets.
 class PacketSource {
   public:
     // Called with consecutive packets of 188 bytes, which are valid during the call.
@@ -29,7 +28,7 @@ class PacketSource {
     explicit PacketSource(Handler handler) : handler_(std::move(handler)) {}
 
     void Feed(const unsigned char *bytes, size_t count);
-    // Processes the bytes that are still buffered, at the end of the stream.
+    // Processes what is still buffered at the end of the stream.
     void Finish();
 
     const PacketCounters &Counters() const { return counters_; }

@@ -24,11 +24,10 @@ class Paragraphs {
     Paragraphs(std::FILE *out, size_t width);
 
     // Writes `text` after `lead`, which is narrower than the minimum width. Lines break at spaces,
-    // or inside a word that is longer than a line. Further lines are indented to the start of the
-    // text. Line breaks in the text count as spaces.
+    // or inside a word longer than a line, and are indented to the start of the text. Line breaks
+    // in the text count as spaces.
     void Add(const std::string &lead, const std::string &text);
-    // Writes items in the same way, with commas between them. An item that fits a line is not
-    // broken.
+    // Writes items with commas between them, and breaks none that fits a line.
     void AddList(const std::string &lead, const std::vector<std::string> &items);
     void AddEmptyLine() { std::fputc('\n', out_); }
 

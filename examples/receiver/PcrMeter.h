@@ -8,16 +8,16 @@
 
 namespace receiver {
 
-// The time and the packets between the clock references of one PID. Intervals in which the clock
-// jumps do not count.
+// The time and the packets between the clock references of one PID, without intervals in which the
+// clock jumps.
 struct PcrSpan {
     uint64_t ticks = 0;    // of 27 MHz
     uint64_t packets = 0;  // of the whole stream
 };
 
-// Each PID with a clock is measured separately, because the programs of a stream may have different
-// clocks. A reference counts once the next one confirms it. So a damaged reference is dropped, and
-// the interval around it still counts.
+// Measures each PID by itself, because the programs of a stream may have different clocks. A
+// reference counts once the next one confirms it, so a damaged one is dropped while the interval
+// around it still counts.
 class PcrMeter {
   public:
     // Adds a clock reference.

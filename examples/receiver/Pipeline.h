@@ -19,9 +19,8 @@ struct PipelineOptions {
     Code language;                            // of an event's texts, if it has several
 };
 
-// Reads an open file to its end, in bounded memory. When it returns, the threads and their objects
-// no longer exist, also on failure. The objects have fixed names, so a process may run one call at
-// a time.
+// Reads an open file to its end, in bounded memory. The threads and their objects are gone when it
+// returns, also on failure. They have fixed names, so a process may run one call at a time.
 //   report    out: the result; its settings do not change
 //   returns   empty, or the name of an object that could not be created; then nothing was read
 std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report &report);

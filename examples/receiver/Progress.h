@@ -1,4 +1,4 @@
-// The progress line of a long reading.
+// The progress line of a long reading, such as "37 % of 2147 MB, 412.5 MB/s, 4 s left".
 #ifndef RECEIVER_PROGRESS_H
 #define RECEIVER_PROGRESS_H
 
@@ -9,18 +9,13 @@
 
 namespace receiver {
 
-// Returns "37 % of 2147 MB, 412.5 MB/s, 4 s left", without parts that are not known yet.
-//   done, size  bytes; a size of 0 is not known
-//   seconds     since the start
-std::string DescribeProgress(uint64_t done, uint64_t size, double seconds);
-
-// A terminal line that each update overwrites. The clock starts when the object is created.
+// A line that each update overwrites. Its clock starts when the object is created.
 class ProgressLine {
   public:
+    // Without a terminal it shows nothing. A size of 0 is not known.
     ProgressLine(std::FILE *terminal, uint64_t size) : terminal_(terminal), size_(size) {}
 
     void Show(uint64_t done);
-    // Clears the line.
     void Erase();
 
   private:

@@ -12,12 +12,10 @@
 
 #include "BroadcastText.h"
 #include "CommandLine.h"
-#include "JsonReport.h"
 #include "Names.h"
 #include "Paragraphs.h"
 #include "Pipeline.h"
 #include "StreamFile.h"
-#include "Summary.h"
 #include "Varnek_Config.h"
 
 namespace receiver {
@@ -40,18 +38,18 @@ std::string FindFault(const Report &report, int read_error) {
     const PacketCounters &packets = report.packets;
     const std::string bytes = std::to_string(packets.bytes) + " bytes";
     if (packets.packets == 0) {
-        if (read_error != 0) {
-            return "read failed: " + SystemText(read_error);
-        }
-        return packets.bytes == 0 ? "is empty" : "no transport stream packets in " + bytes;
+        return read_error != 0      ? "read failed: " + SystemText(read_error)
+               : packets.bytes == 0 ? "is empty"
+                                    : "no transport stream packets in " + bytes;
     }
-    return IsHardlyStream(report)
+    const bool few = packets.packets * packets.packet_size < packets.bytes / 2;
+    return few && report.sections.good == 0
                ? "hardly a transport stream: " + std::to_string(packets.packets) + " packets in " +
                      bytes
                : "";
 }
 
-// Gets the library's configuration: from the file if there is one, otherwise its initial values.
+// Gets the library's configuration, which has initial values without a file.
 Settings LoadSettings(const Options &options) {
     VarnekCfg_LoadConfigFile();
     Settings settings;
@@ -63,8 +61,8 @@ Settings LoadSettings(const Options &options) {
     return settings;
 }
 
-// Opens the capture that the options or the configuration ask for, if any. Standard input has no
-// path, so there the configuration alone opens no capture.
+// Opens the capture that the options ask for, or else the configuration, which opens none beside
+// standard input.
 //   returns  empty, or an error message
 std::string OpenCapture(const Options &options, const StreamFile &file, Capture &capture) {
     std::string path = options.capture;
@@ -102,7 +100,7 @@ size_t LineWidth(std::FILE *out, std::FILE *err) {
     return Paragraphs::kUsualWidth;
 }
 
-// Redirects descriptor 2 to a file, or to nowhere when the file cannot be opened.
+// Redirects descriptor 2 to a file, or to nowhere if the file cannot be opened.
 void DivertLog(const char *path) {
     constexpr int kFlags = O_WRONLY | O_CREAT | O_TRUNC | O_APPEND | O_CLOEXEC;
     int log = open(path, kFlags, 0666);
@@ -121,12 +119,6 @@ bool IsStopped(const Surroundings &surroundings) {
 
 bool IsWritten(std::FILE *out) {
     return std::fflush(out) == 0 && std::ferror(out) == 0;
-}
-
-// Says why a stream cannot be opened. The library refuses some without a system call, and then
-// errno is 0.
-std::string OpenFailure() {
-    return "cannot be opened" + (errno != 0 ? ": " + SystemText(errno) : "");
 }
 
 // Answers --help and --version. Returns the exit status.
@@ -161,7 +153,9 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
     StreamFile file;
     errno = 0;
     if (!file.Open(options.path) && !IsStopped(surroundings)) {
-        return Fail(err, options.path, OpenFailure());
+        // The library refuses some names without a system call.
+        return Fail(err, options.path,
+                    "cannot be opened" + (errno != 0 ? ": " + SystemText(errno) : ""));
     }
     if (file.IsQuietPipe() && !options.quiet) {
         std::fprintf(err, "receiver: %s: waiting for a program that writes to this pipe\n",
@@ -188,8 +182,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
         return Fail(err, options.path, fault);
     }
     if (surroundings.stop != nullptr) {
-        // The reading is over. From here on Ctrl-C ends the program. The handler would only
-        // interrupt a write of the result.
+        // From here on Ctrl-C ends the program, as there is no reading for the handler to end.
         std::signal(SIGINT, SIG_DFL);
     }
     if (options.json) {

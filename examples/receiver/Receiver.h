@@ -13,16 +13,13 @@ struct Surroundings {
     std::FILE *out;                           // for the summary or the JSON
     std::FILE *err;                           // for messages and the progress line
     const std::atomic<bool> *stop = nullptr;  // ends the reading early when set; null for never
-    // On a PC the library logs to descriptor 2. Unless the user asks for the log, that descriptor
-    // is redirected to this file, so `err` must use another descriptor. With null it is not
-    // redirected.
+    // On a PC the library logs to descriptor 2. Unless the user asks for the log, it is redirected
+    // to this file, so `err` must use another descriptor. With null it stays.
     const char *log_path = nullptr;
 };
 
 // Runs the program with its arguments, without the program's name.
-//   returns  the exit status: 0 when a stream was read; 1 when nothing could be read or written,
-//            the file is not a stream, or the reading or the capture ended early; 2 for a wrong
-//            command line; 130 when it was stopped
+//   returns  the exit status, which the manual page explains
 int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &surroundings);
 
 }  // namespace receiver

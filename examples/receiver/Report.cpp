@@ -14,11 +14,6 @@ constexpr int kBrasiliaMinutes = -180;  // from UTC, all year round
 
 }  // namespace
 
-bool IsHardlyStream(const Report &report) {
-    const PacketCounters &packets = report.packets;
-    return report.sections.good == 0 && packets.packets * packets.packet_size < packets.bytes / 2;
-}
-
 std::optional<int64_t> DurationOf(const Report &report) {
     const uint64_t ticks = report.sections.clock.ticks;
     return ticks == 0 ? std::nullopt : std::optional<int64_t>(ticks / (uint64_t{27} * 1000));
@@ -42,7 +37,7 @@ std::map<uint16_t, Service> JoinServices(const Model &model) {
     }
     for (const auto &section : model.sdt) {
         for (const ServiceInfo &info : section.second) {
-            services[info.service_id].info = &info;
+            services[info.service_id].info = info;
         }
     }
     for (const auto &[id, map] : model.pmts) {
@@ -88,14 +83,15 @@ bool IsEmergency(const Model &model, const std::map<uint16_t, Service> &services
            });
 }
 
-std::vector<ListedEvent> ListEvents(const Model &model) {
+std::vector<ListedEvent> ListEvents(const Model &model, bool others) {
     std::vector<ListedEvent> events;
     const auto own = model.events.Joined();
     events.reserve(own.size());
     for (const auto &[key, event] : own) {
         events.push_back({key.first, event, false});
     }
-    for (const auto &[key, event] : model.other_events.Joined()) {
+    const auto foreign = others ? model.other_events.Joined() : decltype(own)();
+    for (const auto &[key, event] : foreign) {
         if (own.count(key) == 0) {
             events.push_back({key.first, event, true});
         }

@@ -1,9 +1,11 @@
 // The result of a reading: services joined from their tables, events in order, times in UTC and
-// local time. Both the summary and the JSON object show it.
+// local time. The summary and the JSON object show it.
 #ifndef RECEIVER_REPORT_H
 #define RECEIVER_REPORT_H
 
+#include <cstddef>
 #include <cstdint>
+#include <cstdio>
 #include <map>
 #include <optional>
 #include <string>
@@ -15,7 +17,7 @@
 
 namespace receiver {
 
-// The receiver's settings: the library's configuration, and the region that the user names.
+// The library's configuration and the user's choices.
 struct Settings {
     int standard_type = 2;
     std::string nation = "BRA";
@@ -31,27 +33,22 @@ struct Report {
     Model model;
 };
 
-// Whether so few of the bytes are packets that the file is not a transport stream.
-bool IsHardlyStream(const Report &report);
-
-// Return the duration in milliseconds and the bit rate in bits per second, from the clock
-// references.
+// Return milliseconds and bits per second, by the clock references.
 std::optional<int64_t> DurationOf(const Report &report);
 std::optional<int64_t> BitRateOf(const Report &report);
 
 struct Service {
     std::optional<uint16_t> pmt_pid;
-    const ServiceInfo *info = nullptr;  // null without an SDT entry
-    const ProgramMap *map = nullptr;    // null without a PMT
+    ServiceInfo info{};               // empty without an SDT entry
+    const ProgramMap *map = nullptr;  // of the model; null without a PMT
     bool one_seg = false;
 };
 
-// Joins the services that the PAT or the SDT names, by service_id. They point into the model. A PMT
-// counts only if it came on the PID that the PAT names. In a stream without a PAT, which one-seg
-// reception may give, every PMT names its service.
+// Joins the services that the PAT or the SDT names, by service_id. A PMT counts only on the PID
+// that the PAT names; without a PAT, as in one-seg reception, every PMT names its service.
 std::map<uint16_t, Service> JoinServices(const Model &model);
 
-// Finds the entry of this stream in the NIT; null without one. Without a PAT it is the only entry.
+// Finds this stream's entry in the NIT, or without a PAT the only entry; null for none.
 const NetworkStream *FindOwnStream(const Model &model);
 
 // Whether the NIT or the PMT of a service signals an emergency warning.
@@ -63,27 +60,25 @@ struct ListedEvent {
     bool other_stream;
 };
 
-// Lists all events by start; events whose start is not known come last. If both this and another
-// stream describe an event, only the description of this stream is listed.
-std::vector<ListedEvent> ListEvents(const Model &model);
+// Lists the events by start, those whose start is not known last. With `others`, these include the
+// events of other streams that this stream does not describe itself.
+std::vector<ListedEvent> ListEvents(const Model &model, bool others);
 
-// Converts the stream's times. In Brazil they are the official time of Brasilia, and local offsets
-// are relative to that; elsewhere they are UTC.
+// Converts the stream's times, which are in UTC except in Brazil, where they and the local offsets
+// are relative to the official time of Brasilia.
 class StreamClock {
   public:
     explicit StreamClock(const Report &report);
 
-    // The nation whose rules the stream follows. It is the receiver's nation if the TOT names it or
-    // names none, otherwise the first nation in the TOT. It is empty for a DVB stream whose TOT
-    // names none.
+    // The nation whose rules the stream follows: the receiver's if the TOT names it or none,
+    // otherwise the first in the TOT; empty for a DVB stream whose TOT names none.
     const Code &Nation() const { return nation_; }
 
-    // The offset for local times: that of the receiver's nation and region. If there is none and
-    // the user names no region, it is the first offset. Null for none.
+    // The offset for local times: that of the receiver's nation and region, or the first one if the
+    // user names no region. Null for none.
     const LocalOffset *Offset() const { return offset_; }
 
-    // These convert a time of the stream, and return nothing when it is not known. The local time
-    // uses the offset that applies at that time.
+    // Convert a time of the stream, the latter by the offset that applies at that time.
     std::optional<DateTime> Utc(const std::optional<DateTime> &time) const;
     std::optional<DateTime> Local(const std::optional<DateTime> &time) const;
 
@@ -94,6 +89,14 @@ class StreamClock {
     Code nation_;
     const LocalOffset *offset_ = nullptr;
 };
+
+// Writes a report for people, in lines of at most `width` columns.
+void WriteSummary(const Report &report, size_t width, std::FILE *out);
+
+// Writes a report for programs: one JSON object (RFC 8259) and a line feed. It writes piece by
+// piece, so a large object needs no more memory. What the stream does not contain is null for a
+// number, and empty for a text or a time.
+void WriteJson(const Report &report, std::FILE *out);
 
 }  // namespace receiver
 

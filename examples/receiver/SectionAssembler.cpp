@@ -1,5 +1,5 @@
-// A section begins only where a pointer_field says, or directly after another section in the same
-// packet. After anything that does not fit, the assembler waits for the next such place.
+// A section begins where a pointer_field says, or directly after another in the same packet. After
+// anything that does not fit, the assembler waits for the next such place.
 #include "SectionAssembler.h"
 
 #include <algorithm>
@@ -12,8 +12,8 @@ namespace {
 constexpr unsigned char kStuffing = 0xFF;
 constexpr size_t kHeaderSize = 3;
 
-// Returns the largest section_length that a table may have. Sections of program tables and most
-// service information have at most 1024 bytes, event tables and private ones 4096.
+// Returns the largest section_length of a table. Sections of program tables and most service
+// information have at most 1024 bytes, those of events and private tables 4096.
 uint16_t LargestLength(unsigned char table_id) {
     const bool program_table = table_id <= 0x03;
     const bool service_table = table_id >= 0x40 && table_id <= 0x4D;

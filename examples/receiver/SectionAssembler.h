@@ -11,14 +11,13 @@ namespace receiver {
 
 class SectionAssembler {
   public:
-    // Called with a complete section, section_length + 3 bytes from its table_id on, which is valid
-    // during the call. Its CRC has not been checked.
+    // Called with a complete section, which is valid during the call. Its CRC is not checked.
     using Handler = std::function<void(const unsigned char *section, size_t size)>;
 
-    // Processes the payload of the PID's next packet. `unit_start` is the packet's
-    // payload_unit_start_indicator; it means that the payload begins with a pointer_field.
-    //   returns  the number of abandoned sections: those that the next section cut short, or whose
-    //            length their table does not allow
+    // Processes the payload of the PID's next packet; with `unit_start`, the packet's
+    // payload_unit_start_indicator, it begins with a pointer_field.
+    //   returns  the number of abandoned sections, which the next one cut short or which are too
+    //            long for their table
     int Push(const unsigned char *payload, size_t size, bool unit_start, const Handler &handler);
 
     // Drops the unfinished section, because a packet is missing.
@@ -30,8 +29,7 @@ class SectionAssembler {
                               const Handler &handler, int &given_up);
     const unsigned char *Fill(const unsigned char *from, const unsigned char *end, size_t size);
 
-    std::vector<unsigned char>
-        section_;  // the bytes of the unfinished section so far; empty for none
+    std::vector<unsigned char> section_;  // unfinished; empty for none
 };
 
 }  // namespace receiver

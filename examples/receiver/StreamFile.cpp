@@ -1,5 +1,5 @@
-// A read may wait, for example on a quiet pipe. It checks regularly whether it should stop, because
-// a signal may interrupt another thread instead of this one.
+// A read that waits, as on a quiet pipe, checks regularly whether it should stop, because a signal
+// may interrupt another thread instead.
 #include "StreamFile.h"
 
 #include <fcntl.h>

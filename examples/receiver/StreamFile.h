@@ -1,5 +1,4 @@
-// The receiver's input, a file or standard input. It is read with the library's operations for
-// large files.
+// The receiver's input, a file or standard input, read with the library's calls for large files.
 #ifndef RECEIVER_STREAMFILE_H
 #define RECEIVER_STREAMFILE_H
 
@@ -18,21 +17,20 @@ class StreamFile {
     ~StreamFile();
 
     // Opens a file, once; "-" is standard input.
-    //   returns  false when it cannot be opened; errno says why
+    //   returns  false if it cannot be opened; errno says why
     bool Open(const std::string &path);
 
-    // Waits briefly for the first bytes of a named pipe.
-    //   returns  whether none came; false for other files
+    // Waits briefly for a named pipe, and returns whether no bytes came.
     bool IsQuietPipe() const;
 
-    // Waits for bytes until `stop` is set; with null it waits forever.
+    // Waits for bytes, or until `stop` is set unless it is null.
     //   returns  the bytes read; 0 at the end, on an error, and when it was stopped
     size_t Read(unsigned char *buffer, size_t size, const std::atomic<bool> *stop);
 
-    // Returns the number of the error that ended the reading; 0 for none.
+    // Returns the errno that ended the reading; 0 for none.
     int Error() const { return error_; }
 
-    //   returns  the size in bytes; 0 when it is not known
+    // Returns the size in bytes; 0 if it is not known.
     uint64_t Size() const;
 
     // Whether this path names the same file.

@@ -1,8 +1,8 @@
-// Joins the parts of a report and writes them for people, with the names in the stream and with
-// words for codes.
-#include "Summary.h"
+// Writes a report for people, with the stream's own names and with words for codes.
+#include "Report.h"
 
 #include <algorithm>
+#include <cinttypes>
 #include <map>
 #include <utility>
 #include <vector>
@@ -20,46 +20,34 @@ constexpr size_t kWidestName = 24;  // of a column of service names
 
 using Services = std::map<uint16_t, Service>;
 
-unsigned long long Printable(uint64_t value) {
-    return value;
-}
-
 std::string NameOrDash(const std::string &name) {
     return name.empty() ? "-" : name;
 }
 
 std::string NameOf(const Services &services, uint16_t service_id) {
     const auto found = services.find(service_id);
-    const ServiceInfo *info = found != services.end() ? found->second.info : nullptr;
-    return info != nullptr ? info->name : "";
+    return found != services.end() ? found->second.info.name : "";
 }
 
-// Puts a comma in front of a text that is not empty.
-std::string Further(const std::string &text) {
-    return text.empty() ? "" : ", " + text;
-}
-
+// Joins the texts that are not empty.
 std::string Joined(const std::vector<std::string> &texts) {
     std::string joined;
     for (const std::string &text : texts) {
-        joined += joined.empty() ? text : Further(text);
+        joined += (joined.empty() || text.empty() ? "" : ", ") + text;
     }
     return joined;
 }
 
 void AddStream(const Report &report, Paragraphs &out) {
     const Model &model = report.model;
-    std::string text;
-    if (model.transport_stream_id) {
-        text = Format("transport stream 0x%04X, ", *model.transport_stream_id);
-    }
-    text += Format("%llu packets", Printable(report.packets.packets));
-    if (report.packets.packets != 0) {
-        text += Format(" of %u bytes", report.packets.packet_size);
-    }
+    const PacketCounters &packets = report.packets;
     const std::optional<int64_t> duration = DurationOf(report);
     const std::optional<int64_t> bit_rate = BitRateOf(report);
-    out.Add("Stream    ", text);
+    const auto &id = model.transport_stream_id;
+    out.Add("Stream    ",
+            (id ? Format("transport stream 0x%04X, ", *id) : "") +
+                Format("%" PRIu64 " packets", packets.packets) +
+                (packets.packets != 0 ? Format(" of %u bytes", packets.packet_size) : ""));
     if (duration && bit_rate) {
         out.Add("Duration  ",
                 Format("%.1f s at %.3f Mbit/s, by the clock reference",
@@ -92,7 +80,7 @@ void AddClock(const Model &model, const StreamClock &clock, Paragraphs &out) {
     const std::optional<DateTime> local = clock.Local(model.time);
     std::string text = utc ? ToText(utc) + " UTC" : "-";
     for (const LocalOffset &offset : model.local_offsets) {
-        text += Further(offset.country.Text());
+        text = Joined({text, offset.country.Text()});
         text += offset.region != 0 ? Format(" region %d ", offset.region) : " ";
         text += clock.OffsetText(offset.minutes);
     }
@@ -108,22 +96,17 @@ void AddServices(const Services &services, Paragraphs &out) {
     }
     width = std::min(width, kWidestName);
     for (const auto &[id, service] : services) {
-        std::string text = Padded(NameOrDash(NameOf(services, id)), width);
-        std::vector<std::string> items;
-        if (service.info != nullptr && service.info->type) {
-            items.push_back(NameOfServiceType(*service.info->type));
-        }
-        items.emplace_back(service.one_seg ? "one-seg" : "");
-        items.push_back(service.info != nullptr ? service.info->provider : "");
-        const std::string joined = Joined(items);
-        text += joined.empty() ? "" : "  " + joined;
-        text += service.pmt_pid ? Format("  (PMT 0x%04X)", *service.pmt_pid) : "  (not in the PAT)";
-        out.Add(Format("  0x%04X  ", id), text);
+        const ServiceInfo &info = service.info;
+        const std::string facts = Joined({info.type ? NameOfServiceType(*info.type) : "",
+                                          service.one_seg ? "one-seg" : "", info.provider});
+        out.Add(Format("  0x%04X  ", id),
+                Padded(NameOrDash(info.name), width) + (facts.empty() ? "" : "  " + facts) +
+                    (service.pmt_pid ? Format("  (PMT 0x%04X)", *service.pmt_pid)
+                                     : "  (not in the PAT)"));
         if (service.map == nullptr) {
             continue;
         }
         std::vector<std::string> components;
-        components.reserve(service.map->components.size());
         for (const Component &component : service.map->components) {
             components.push_back(Format("0x%04X ", component.pid) + NameOfComponent(component));
         }
@@ -132,12 +115,9 @@ void AddServices(const Services &services, Paragraphs &out) {
     }
 }
 
-// Whether an event is over at this time; false when that is not known.
+// Whether an event is over at this time, as far as the stream says.
 bool IsOver(const Event &event, const std::optional<DateTime> &now) {
-    if (!now || !event.start || !event.duration) {
-        return false;
-    }
-    return *now >= *event.start + *event.duration;
+    return now && event.start && event.duration && *now >= *event.start + *event.duration;
 }
 
 // Returns the genre and the nation's own rating, in parentheses.
@@ -157,16 +137,11 @@ std::string DescribeContent(const Event &event, const Code &nation) {
     return items.empty() ? "" : " (" + Joined(items) + ")";
 }
 
-// Lists this stream's events: current and future ones first, past ones last.
+// Lists events, the past ones last.
 void AddEvents(const Report &report, const Services &services, const StreamClock &clock,
                Paragraphs &out) {
     const Model &model = report.model;
-    std::vector<ListedEvent> events = ListEvents(model);
-    events.erase(std::remove_if(events.begin(), events.end(),
-                                [&](const ListedEvent &event) {
-                                    return event.other_stream && !report.settings.all;
-                                }),
-                 events.end());
+    std::vector<ListedEvent> events = ListEvents(model, report.settings.all);
     const auto over = std::stable_partition(
         events.begin(), events.end(),
         [&](const ListedEvent &event) { return !IsOver(event.event, model.time); });
@@ -199,8 +174,8 @@ void AddEvents(const Report &report, const Services &services, const StreamClock
         out.Add("  ", Format("and %zu more", events.size() - shown));
     }
     if (model.events.LeftOut() != 0) {
-        out.Add("  ", Format("%llu times an event was left out for lack of room",
-                             Printable(model.events.LeftOut())));
+        out.Add("  ", std::to_string(model.events.LeftOut()) +
+                          " times an event was left out for lack of room");
     }
 }
 
@@ -220,7 +195,7 @@ void AddCounters(const Report &report, Paragraphs &out) {
     out.AddEmptyLine();
     out.Add("", "Counters");
     for (const auto &counter : counters) {
-        out.Add("  ", Format("%-24s %9llu", counter.name, Printable(counter.value)));
+        out.Add("  ", Format("%-24s %9" PRIu64, counter.name, counter.value));
     }
 }
 
@@ -284,8 +259,8 @@ void AddPids(const Report &report, const Services &services, Paragraphs &out) {
         const double share =
             100.0 * static_cast<double>(own.packets) / static_cast<double>(report.packets.packets);
         out.Add(Format("  0x%04X  ", pids[i]),
-                Format("%9llu  %6.2f %%  %6llu  ", Printable(own.packets), share,
-                       Printable(own.continuity_errors)) +
+                Format("%9" PRIu64 "  %6.2f %%  %6" PRIu64 "  ", own.packets, share,
+                       own.continuity_errors) +
                     (found != names.end() ? found->second : NameOfPid(pids[i])));
     }
     if (pids.size() > shown) {

@@ -1,5 +1,5 @@
-// Each table has a function. It reads the fixed fields, and then the loops, with readers that end
-// with the loop.
+// Each table has a function that reads the fixed fields, and then the loops with readers of their
+// own.
 #include "Tables.h"
 
 #include <algorithm>
@@ -42,13 +42,18 @@ bool Contains(const uint8_t (&tags)[Count], uint8_t tag) {
     return std::find(std::begin(tags), std::end(tags), tag) != std::end(tags);
 }
 
+// Enters a loop behind four other bits and its 12-bit length.
+FieldReader EnterLoop(FieldReader &fields) {
+    fields.Skip(4);
+    return fields.Enter(fields.U16(12));
+}
+
 // Calls `visit(tag, body)` for each complete descriptor of a loop.
 template <typename Visit>
 void ForEachDescriptor(FieldReader loop, Visit visit) {
     while (loop.BytesLeft() >= 2) {
         const uint8_t tag = loop.U8();
-        const uint8_t length = loop.U8();
-        FieldReader body = loop.Enter(length);
+        FieldReader body = loop.Enter(loop.U8());
         if (!loop.Ok()) {
             return;
         }
@@ -94,8 +99,7 @@ bool ReadsAsEmergency(FieldReader &body) {
         body.Skip(16);
         const bool started = body.U8(1) != 0;
         body.Skip(7);
-        const uint8_t length = body.U8();
-        body.Enter(length);
+        body.Enter(body.U8());
         if (started && body.Ok()) {
             return true;
         }
@@ -273,9 +277,7 @@ ProgramMap ParsePmt(FieldReader &fields) {
     fields.Skip(3);
     const uint16_t pcr_pid = fields.U16(13);
     map.pcr_pid = pcr_pid != kPidNull ? std::optional(pcr_pid) : std::nullopt;
-    fields.Skip(4);
-    const uint16_t info_length = fields.U16(12);
-    ForEachDescriptor(fields.Enter(info_length), [&](uint8_t tag, FieldReader &body) {
+    ForEachDescriptor(EnterLoop(fields), [&](uint8_t tag, FieldReader &body) {
         map.emergency = map.emergency || (tag == kDescriptorEmergency && ReadsAsEmergency(body));
     });
     while (fields.BytesLeft() >= 5) {
@@ -283,9 +285,7 @@ ProgramMap ParsePmt(FieldReader &fields) {
         component.stream_type = fields.U8();
         fields.Skip(3);
         component.pid = fields.U16(13);
-        fields.Skip(4);
-        const uint16_t length = fields.U16(12);
-        ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
+        ForEachDescriptor(EnterLoop(fields), [&](uint8_t tag, FieldReader &body) {
             ReadComponentDescriptor(tag, body, component);
         });
         map.components.push_back(component);
@@ -310,24 +310,19 @@ void TableParser::OnPmt(uint16_t pid, const SectionHeader &header, FieldReader &
 void TableParser::OnNit(const SectionHeader &header, FieldReader &fields) {
     model_.network_id = header.extension;
     NetworkSection section{};
-    fields.Skip(4);
-    const uint16_t length = fields.U16(12);
-    ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
+    ForEachDescriptor(EnterLoop(fields), [&](uint8_t tag, FieldReader &body) {
         if (tag == kDescriptorNetworkName) {
             model_.network_name = ToUtf8(body.Bytes(body.BytesLeft()));
         } else if (tag == kDescriptorEmergency) {
             section.emergency = ReadsAsEmergency(body);
         }
     });
-    fields.Skip(4);
-    const uint16_t streams_length = fields.U16(12);
-    FieldReader streams = fields.Enter(streams_length);
+    FieldReader streams = EnterLoop(fields);
     while (streams.BytesLeft() >= 6) {
         NetworkStream stream{};
         stream.transport_stream_id = streams.U16();
-        streams.Skip(16 + 4);
-        const uint16_t stream_length = streams.U16(12);
-        ForEachDescriptor(streams.Enter(stream_length), [&](uint8_t tag, FieldReader &body) {
+        streams.Skip(16);
+        ForEachDescriptor(EnterLoop(streams), [&](uint8_t tag, FieldReader &body) {
             ReadStreamDescriptor(tag, body, stream);
         });
         section.streams.push_back(std::move(stream));
@@ -341,15 +336,13 @@ void TableParser::OnSdt(const SectionHeader &header, FieldReader &fields) {
     while (fields.BytesLeft() >= 5) {
         ServiceInfo service{};
         service.service_id = fields.U16();
-        fields.Skip(12);
-        const uint16_t length = fields.U16(12);
-        ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
-            if (tag != kDescriptorService) {
-                return;
+        fields.Skip(8);
+        ForEachDescriptor(EnterLoop(fields), [&](uint8_t tag, FieldReader &body) {
+            if (tag == kDescriptorService) {
+                service.type = body.U8();
+                service.provider = ToUtf8(body.Bytes(body.U8()));
+                service.name = ToUtf8(body.Bytes(body.U8()));
             }
-            service.type = body.U8();
-            service.provider = ToUtf8(body.Bytes(body.U8()));
-            service.name = ToUtf8(body.Bytes(body.U8()));
         });
         services.push_back(std::move(service));
     }
@@ -378,10 +371,8 @@ Event TableParser::ReadEvent(FieldReader &fields) const {
     event.id = fields.U16();
     event.start = ReadDateTime(fields);
     event.duration = DecodeBcdTime(fields.U32(24));
-    fields.Skip(4);
-    const uint16_t length = fields.U16(12);
     ExtendedText extended;
-    ForEachDescriptor(fields.Enter(length), [&](uint8_t tag, FieldReader &body) {
+    ForEachDescriptor(EnterLoop(fields), [&](uint8_t tag, FieldReader &body) {
         if (tag == kDescriptorShortEvent) {
             ReadShortEvent(body, language_, event);
         } else if (tag == kDescriptorExtendedEvent) {

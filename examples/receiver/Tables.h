@@ -32,12 +32,11 @@ ProgramMap ParsePmt(FieldReader &fields);
 //   returns  false when the section does not apply now, or is too short
 bool ReadHeader(FieldReader &fields, SectionHeader &header);
 
-// Fills a model from sections, in the order of their arrival. Unknown sections and tables are
-// ignored. A loop that claims to be longer than its section ends with the section.
+// Fills a model from sections, in the order of their arrival. Unknown tables are ignored. A loop
+// that claims to be longer than its section ends with the section.
 class TableParser {
   public:
-    // The model must outlive the parser.
-    //   language  selects one of an event's texts in several languages; otherwise the first is used
+    // The model must outlive the parser. `language` is preferred for an event's texts.
     explicit TableParser(Model &model, Code language = {}) : model_(model), language_(language) {}
 
     // Parses a complete section with a correct CRC, or without one.

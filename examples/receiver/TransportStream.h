@@ -17,26 +17,20 @@ inline uint16_t PidOf(const unsigned char *packet) {
 }
 
 constexpr uint16_t kPidPat = 0x0000;
-constexpr uint16_t kPidCat = 0x0001;  // conditional access
 constexpr uint16_t kPidNit = 0x0010;
 constexpr uint16_t kPidSdt = 0x0011;
 constexpr uint16_t kPidEit = 0x0012;
 constexpr uint16_t kPidTime = 0x0014;
-constexpr uint16_t kPidSdtt = 0x0023;        // software downloads
-constexpr uint16_t kPidBit = 0x0024;         // broadcaster information
-constexpr uint16_t kPidNbit = 0x0025;        // information of networks and boards
-constexpr uint16_t kPidEitMobile = 0x0026;   // events of portable reception
-constexpr uint16_t kPidEitOneSeg = 0x0027;   // the same, of one segment
-constexpr uint16_t kPidSdttOneSeg = 0x0028;  // software downloads within one segment
-constexpr uint16_t kPidCdt = 0x0029;         // common data, such as logos
-constexpr uint16_t kPidOneSegPmt = 0x1FC8;   // PMTs of one-seg services, to 0x1FCF
+constexpr uint16_t kPidEitMobile = 0x0026;  // events of portable reception
+constexpr uint16_t kPidEitOneSeg = 0x0027;  // the same, of one segment
+constexpr uint16_t kPidOneSegPmt = 0x1FC8;  // PMTs of one-seg services, to 0x1FCF
 constexpr uint16_t kPidNull = 0x1FFF;
 
-// Sections are assembled on all of these PIDs; unknown tables are only counted.
-constexpr uint16_t kTablePids[] = {
-    kPidPat, kPidCat,  kPidNit,       kPidSdt,       kPidEit,        kPidTime, kPidSdtt,
-    kPidBit, kPidNbit, kPidEitMobile, kPidEitOneSeg, kPidSdttOneSeg, kPidCdt,
-};
+// Sections are assembled on all of these PIDs. Those of CAT, SDTT, BIT, NBIT, one-seg SDTT and CDT
+// are only counted.
+constexpr uint16_t kTablePids[] = {kPidPat,       0x0001, kPidNit, kPidSdt, kPidEit,
+                                   kPidTime,      0x0023, 0x0024,  0x0025,  kPidEitMobile,
+                                   kPidEitOneSeg, 0x0028, 0x0029};
 
 constexpr uint8_t kTablePat = 0x00;
 constexpr uint8_t kTablePmt = 0x02;
@@ -50,6 +44,8 @@ constexpr uint8_t kTableEitLast = 0x6F;
 constexpr uint8_t kTableTdt = 0x70;
 constexpr uint8_t kTableTot = 0x73;
 
+constexpr uint8_t kStreamPrivateSections = 0x05;  // stream_type
+constexpr uint8_t kStreamPrivateData = 0x06;
 constexpr uint8_t kDescriptorApplicationSignalling = 0x6F;
 constexpr uint8_t kDescriptorDataComponent = 0xFD;
 constexpr uint16_t kDataCaptions = 0x0008;

@@ -12,13 +12,12 @@ namespace {
 std::atomic<bool> gStop{false};
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler sets it");
 
-// The first Ctrl-C ends the reading, and the result so far is shown. The second one ends the
-// program.
+// The first Ctrl-C ends the reading, and the result so far is shown. The second ends the program.
 void OnInterrupt(int /*signal*/) {
     gStop = true;
 }
 
-// Does not set SA_RESTART, so that the signal also ends a wait for the other end of a pipe.
+// Without SA_RESTART, so that the signal also ends a wait for the other end of a pipe.
 void CatchInterrupt() {
     struct sigaction action = {};
     action.sa_handler = OnInterrupt;
@@ -26,8 +25,8 @@ void CatchInterrupt() {
     sigaction(SIGINT, &action, nullptr);
 }
 
-// If a standard descriptor is closed, the next file that is opened would get its number. This opens
-// /dev/null under that number instead, for the opposite direction, so that reads and writes fail.
+// Opens /dev/null in place of closed standard descriptors, whose numbers other files would get, and
+// for the opposite direction, so that reads and writes fail.
 void TakeStandardDescriptors() {
     for (int descriptor = STDIN_FILENO; descriptor <= STDERR_FILENO; ++descriptor) {
         if (fcntl(descriptor, F_GETFD) < 0) {
@@ -36,8 +35,7 @@ void TakeStandardDescriptors() {
     }
 }
 
-// Opens the destination of stderr under another descriptor, because descriptor 2 is redirected for
-// the log.
+// Opens the destination of stderr again, because descriptor 2 is redirected for the log.
 std::FILE *OpenMessages() {
     const int descriptor = fcntl(STDERR_FILENO, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
     std::FILE *messages = descriptor < 0 ? nullptr : fdopen(descriptor, "w");

@@ -1,5 +1,5 @@
-// Writes tables, sections and packets of a transport stream, for the sample program, and for tests
-// and fuzz targets that generate streams.
+// Writes tables, sections and packets of a transport stream, for the sample, tests and fuzz
+// targets.
 #ifndef SAMPLESTREAM_STREAMWRITER_H
 #define SAMPLESTREAM_STREAMWRITER_H
 
@@ -15,26 +15,24 @@ using Bytes = std::vector<unsigned char>;
 
 Bytes operator+(Bytes left, const Bytes &right);
 
-// Return a field; a value that is too large is truncated to its width.
+// Return a field, with the low bits of a value that is too large for it.
 Bytes U8(unsigned value);
 Bytes U16(unsigned value);
 Bytes U24(unsigned value);
 // Return the bytes of a text, and the same after their number.
 Bytes Raw(const std::string &text);
 Bytes Counted(const std::string &text);
-// Return a time of day or a duration as six decimal digits, and a day with the seconds since its
-// start.
+// Return a time of day or a duration as six decimal digits, and a day with a time in seconds.
 Bytes Bcd(int seconds);
 Bytes MakeDateTime(unsigned mjd, int seconds);
-// Return a descriptor, and a loop after its 12-bit length, with `flags` in the four bits above it.
+// Return a descriptor, and a loop behind its 12-bit length, with `flags` in the four bits above.
 Bytes Descriptor(unsigned tag, const Bytes &body);
 Bytes Loop(unsigned flags, const Bytes &content);
 
 // Completes a section, whose bytes 1 and 2 contain the flags, with its length and its CRC.
 Bytes Seal(Bytes section);
 
-// The position of a section in its table. `version` is a byte with reserved bits, version_number
-// and current_next_indicator.
+// The place of a section in its table, and the byte with version_number and current_next_indicator.
 struct Place {
     unsigned number = 0;
     unsigned last = 0;
@@ -71,8 +69,9 @@ constexpr unsigned kAdaptation = 0x0020;
 constexpr unsigned kPayload = 0x0010;
 
 // Returns a packet of 188 bytes.
-//   content  the bytes after the header: an adaptation field with its length if the flags announce
-//            one, and then the payload; it is padded with 0xFF
+//   content  what follows the header: an adaptation field with its length if the flags announce
+//   one,
+//            and then the payload; it is padded with 0xFF
 Bytes MakePacket(uint16_t pid, unsigned counter, const Bytes &content, unsigned flags = kPayload);
 
 // The content of a packet, with the header flags that it needs.
@@ -84,7 +83,7 @@ struct Content {
 // Packs sections without gaps into as few packets as possible.
 std::vector<Content> SplitSections(const std::vector<Bytes> &sections);
 
-// A stream that grows packet by packet. It increments the continuity counter of each PID.
+// A stream that grows packet by packet, with a continuity counter for each PID.
 class StreamWriter {
   public:
     void Send(uint16_t pid, const Content &content);

@@ -125,7 +125,7 @@ Bytes OwnSdt(unsigned number, uint16_t service, const std::string &name) {
                    {number, 1, 0xC5});
 }
 
-// Lists the makers of a programme in two descriptors; the second one continues the first one.
+// Lists the makers of a programme in two descriptors, the second of which continues the first.
 Bytes Credits() {
     const Bytes first = Counted("Dire\xE7\xE3o") + Counted("B\xE1rbara Le\xE3o");
     const Bytes second = Counted("") + Counted(" e J\xFAlio Ara\xFAjo");
@@ -151,7 +151,7 @@ Bytes Entry(const Programme &programme, unsigned running) {
                      descriptors, running << 1);
 }
 
-// Returns a section for the present event and one for the following event at the time `now`.
+// Returns sections for the event that is present at the time `now` and for the one that follows.
 std::vector<Bytes> PresentFollowing(uint16_t service, int now) {
     const bool own = service != kOtherService;
     std::vector<Bytes> sections;
@@ -180,8 +180,7 @@ Bytes Schedule(uint16_t service) {
                    entries + MakeEvent(0x01FF, U16(0xFFFF) + not_known, not_known, {}));
 }
 
-// Returns the time, with the offsets of two regions from Brazil's official time: none and minus one
-// hour.
+// Returns the time, with two regions' offsets from Brazil's official time: none and minus one hour.
 Bytes OwnTot(int now) {
     return MakeTot(MakeDateTime(kDay, now),
                    MakeLocalOffset("BRA", 3, 0) + MakeLocalOffset("BRA", 4, -1));
@@ -206,56 +205,50 @@ Bytes Empty(unsigned table) {
 class Multiplex {
   public:
     // Queues sections, without gaps between them, in as few packets as possible.
-    void Queue(uint16_t pid, const std::vector<Bytes> &sections);
-    // Writes `packets` packets. At most every third one is a queued packet; the others are filler.
-    void Run(int packets);
+    void Queue(uint16_t pid, const std::vector<Bytes> &sections) {
+        for (Content &content : SplitSections(sections)) {
+            queue_.emplace_back(pid, std::move(content));
+        }
+    }
+
+    // Writes packets, of which at most every third is a queued one; the others are filler.
+    void Run(int packets) {
+        for (int slot = 0; slot < packets; ++slot) {
+            if (slot % 3 == 0 && !queue_.empty()) {
+                writer_.Send(queue_.front().first, queue_.front().second);
+                queue_.pop_front();
+            } else {
+                SendFiller(slot);
+            }
+        }
+    }
+
     const Bytes &Stream() const { return writer_.Stream(); }
 
   private:
-    void SendFiller(int slot);
+    // Writes packets for video, audio, captions and the carousel, of which only headers differ.
+    void SendFiller(int slot) {
+        constexpr uint16_t kPids[] = {kPidVideo, kPidVideo,       kPidAudio, kPidVideo,
+                                      kPidVideo, kPidOneSegVideo, kPidNull,  kPidVideo,
+                                      kPidAudio, kPidOneSegAudio, kPidVideo, kPidCarousel};
+        const uint16_t pid =
+            slot == 50 ? kPidCaptions : kPids[static_cast<size_t>(slot) % std::size(kPids)];
+        Content content{{}, kPayload};
+        if ((pid == kPidVideo || pid == kPidOneSegVideo) && slot % 5 == 0) {
+            const uint64_t clock = Stream().size() / kPacketSize * kPcrTicks;
+            const auto base =
+                static_cast<unsigned>(clock / 300);  // 20 seconds take 21 of its 33 bits
+            content.flags |= kAdaptation;
+            content.bytes = Bytes{7, 0x10} + U16(base >> 17) + U16(base >> 1) +
+                            U16((base & 1) << 15 | 0x7E00 | static_cast<unsigned>(clock % 300));
+        }
+        content.bytes.resize(kPacketSize - 4, static_cast<unsigned char>(slot));
+        writer_.Send(pid, content);
+    }
 
     StreamWriter writer_;
     std::deque<std::pair<uint16_t, Content>> queue_;
 };
-
-void Multiplex::Queue(uint16_t pid, const std::vector<Bytes> &sections) {
-    for (Content &content : SplitSections(sections)) {
-        queue_.emplace_back(pid, std::move(content));
-    }
-}
-
-void Multiplex::Run(int packets) {
-    for (int slot = 0; slot < packets; ++slot) {
-        if (slot % 3 == 0 && !queue_.empty()) {
-            writer_.Send(queue_.front().first, queue_.front().second);
-            queue_.pop_front();
-        } else {
-            SendFiller(slot);
-        }
-    }
-}
-
-// Writes the packets for video, audio, captions and the carousel, which differ in their headers
-// only.
-void Multiplex::SendFiller(int slot) {
-    constexpr uint16_t kPids[] = {kPidVideo, kPidVideo,       kPidAudio, kPidVideo,
-                                  kPidVideo, kPidOneSegVideo, kPidNull,  kPidVideo,
-                                  kPidAudio, kPidOneSegAudio, kPidVideo, kPidCarousel};
-    const uint16_t pid =
-        slot == 50 ? kPidCaptions : kPids[static_cast<size_t>(slot) % std::size(kPids)];
-    Content content{{}, kPayload};
-    if ((pid == kPidVideo || pid == kPidOneSegVideo) && slot % 5 == 0) {
-        const uint64_t clock = Stream().size() / kPacketSize * kPcrTicks;
-        const uint64_t base = clock / 300;
-        content.flags |= kAdaptation;
-        content.bytes = Bytes{7, 0x10} + U16(static_cast<unsigned>(base >> 17)) +
-                        U16(static_cast<unsigned>(base >> 1)) +
-                        U16(static_cast<unsigned>(base & 1) << 15 | 0x7E00 |
-                            static_cast<unsigned>(clock % 300));
-    }
-    content.bytes.resize(kPacketSize - 4, static_cast<unsigned char>(slot));
-    writer_.Send(pid, content);
-}
 
 Bytes MakeStream() {
     Bytes damaged = OwnSdt(0, kFullSegService, "TV Ip\xEA danificada");

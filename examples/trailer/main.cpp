@@ -1,6 +1,6 @@
-// trailer FILE: appends the CRC-32 of a file to it; data carousels are stored in this format.
-// trailer --check FILE: checks whether a file ends in its CRC-32; exits with 1 when it does not.
-// The file may have any size, because it is read in pieces.
+// trailer FILE: appends the CRC-32 of a file to it, which is how data carousels are stored.
+// trailer --check FILE: exits with 1 unless a file ends in its CRC-32.
+// Files may have any size, because they are read in pieces.
 #include <algorithm>
 #include <cstdio>
 #include <cstring>
@@ -14,7 +14,7 @@ namespace {
 constexpr int32_t kPiece = 64 * 1024;
 constexpr int32_t kSmallest = 4;  // of a piece and of a file
 
-// Extends a CRC over the next piece of the data. Changes the piece's first four bytes.
+// Extends a CRC over the next piece of the data, whose first four bytes it changes.
 uint32_t GoOn(uint32_t crc, unsigned char *piece, int32_t length) {
     for (int i = 0; i < 4; ++i) {
         piece[i] ^= static_cast<unsigned char>(~crc >> (24 - 8 * i));
@@ -42,7 +42,7 @@ bool Measure(int32_t hFile, uint32_t &crc) {
     std::vector<unsigned char> piece(kPiece);
     crc = 0xFFFFFFFF;  // the register before the first byte
     while (left > 0) {
-        // The rest after this piece is empty or has at least the size of the smallest piece.
+        // What is left after this piece is empty or no smaller than the smallest piece.
         const bool tail = left > kPiece && left < kPiece + kSmallest;
         const auto length =
             static_cast<int32_t>(std::min<int64_t>(left, tail ? kPiece - kSmallest : kPiece));

@@ -1,4 +1,4 @@
-// The array operators of the device's library. The NDK's static C++ runtime keeps them in one
+// The array operators of the device's library. Those of the NDK's static C++ runtime are in one
 // object with the operators that throw, and would bring its unwinder and demangler along.
 #include <stdlib.h>
 
@@ -18,7 +18,7 @@ void operator delete[](void *block) noexcept {
     free(block);
 }
 
-// What the compiler calls where it knows the size.
+// Called where the compiler knows the size.
 void operator delete[](void *block, size_t) noexcept {
     free(block);
 }

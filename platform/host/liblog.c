@@ -15,9 +15,8 @@ static char PriorityLetter(int priority) {
     return letters[known ? priority : 0];
 }
 
-// Writes one log entry and returns the number of bytes that were written, or -1. As in logcat, each
-// line of the text gets the header. Each line is written with one write(), so that lines of several
-// threads do not mix.
+// Writes one log entry and returns how many bytes it wrote, or -1. As in logcat, each line of the
+// text gets the header. Each line is one write(), so that the lines of several threads do not mix.
 int __android_log_write(int priority, const char *tag, const char *text) {
     struct timespec now;
     struct tm local;

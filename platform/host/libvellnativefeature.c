@@ -1,5 +1,5 @@
-// Stand-in for the device's feature store: KEY=value lines of one text file, which a process reads
-// once. If a key occurs twice, the first line counts.
+// Stand-in for the device's feature store: a text file of KEY=value lines, which a process reads
+// once, and in which the first line of a key counts.
 #include <pthread.h>
 #include <stdio.h>
 #include <string.h>
@@ -8,7 +8,7 @@
 
 enum { STORE_SIZE = 65536 };
 
-// The content of the file, with a terminator in place of every line end and after the last line.
+// The file's content, with a terminator for every line end and after the last line.
 static char gStore[STORE_SIZE];
 static size_t gStoreLength = 0;
 static pthread_once_t gStoreLoaded = PTHREAD_ONCE_INIT;
@@ -27,8 +27,7 @@ static void LoadStore(void) {
     }
 }
 
-// Returns the text value of a feature, or the given default when the store does not have it. The
-// value stays valid and unchanged. Thread-safe.
+// Thread-safe. A value stays valid and unchanged.
 const char *VellNativeFeature_getStringWithDefault(const char *key, const char *defaultValue) {
     pthread_once(&gStoreLoaded, LoadStore);
     const size_t keyLength = key != NULL ? strlen(key) : 0;

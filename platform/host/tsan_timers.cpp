@@ -1,7 +1,7 @@
-// POSIX timers with thread notification, built on ordinary threads. ThreadSanitizer cannot handle
-// the C library's timers, so a program that runs under it compiles this file, which replaces the
-// timer_ functions. Each timer has a thread. Times are relative and timers expire once, because
-// varnekutils_ltn uses them in this way only.
+// POSIX timers with thread notification on ordinary threads, one for each timer. A program that
+// runs under ThreadSanitizer, which cannot handle the C library's timers, compiles this file to
+// replace the timer_ functions. Times are relative and timers expire once, since varnekutils_ltn
+// uses no others.
 #include <signal.h>
 #include <time.h>
 
@@ -23,7 +23,7 @@ struct Timer {
     bool deleted = false;
     Clock::time_point due;
 
-    // Each expiry calls back on a new thread, as in the system.
+    // Each expiry calls back on a new thread, as the system's does.
     void Run() {
         std::unique_lock<std::mutex> guard(lock);
         while (!deleted) {

@@ -9,11 +9,10 @@
 #include <string>
 
 #include "Demultiplexer.h"
-#include "JsonReport.h"
 #include "Names.h"
 #include "PacketSource.h"
+#include "Report.h"
 #include "StreamWriter.h"
-#include "Summary.h"
 #include "Tables.h"
 
 namespace receiver {

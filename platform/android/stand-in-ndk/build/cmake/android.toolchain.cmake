@@ -1,6 +1,6 @@
-# Replaces an NDK if there is none: clang for Android's ARM target, with the headers of Debian's cross C library and
-# with import libraries that contain only the symbols that the library may use on the device (../../make builds
-# them). It tests the Android part of the build, but not bionic's headers.
+# Replaces a missing NDK: clang for Android's ARM target, with the headers of Debian's cross C library and with import
+# libraries that have only the symbols that the library may use on the device (../../make builds them). It tests the
+# Android part of the build, but not bionic's headers.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR armv7-a)
 set(ANDROID TRUE)
@@ -20,7 +20,7 @@ set(CMAKE_TRY_COMPILE_TARGET_TYPE STATIC_LIBRARY)
 set(headers /usr/arm-linux-gnueabihf/include)
 file(GLOB cxx_headers ${headers}/c++/*)
 list(GET cxx_headers -1 cxx_headers)
-# The headers support only the hard-float variant. The macro satisfies them and does not change the code.
+# The headers support only hard float. The macro satisfies them without changing the code.
 set(CMAKE_C_FLAGS_INIT "-mthumb -nostdlibinc -D__ARM_PCS_VFP -isystem ${headers}")
 set(CMAKE_CXX_FLAGS_INIT "-mthumb -nostdlibinc -D__ARM_PCS_VFP -isystem ${cxx_headers} \
 -isystem ${cxx_headers}/arm-linux-gnueabihf -isystem ${headers}")
