@@ -2,9 +2,10 @@
 /// The tasking calls as C++17 objects, with or without exceptions and RTTI. C sees the C calls.
 /// Objects cannot be moved; any thread may use them. What a thread did before Send, Signal, unlock
 /// or starting a thread or timer is visible after the Receive, Wait or lock that follows, or in the
-/// callable; what a callable did, after Join. The C calls log failures. An object that could not be
-/// made, perhaps because its name (which is copied) is too long or has a NUL, is false, and its
-/// functions fail. Callables are copied, as by std::bind; an exception from one ends the program.
+/// callable; what a callable did, after Join. An object that could not be made, perhaps because its
+/// name (which is copied) is too long or has a NUL, is false, and its functions fail. Callables are
+/// copied, as by std::bind; an exception from one ends the program. Never unload a module that uses
+/// them: threads and timers end in its code (-Wl,-z,nodelete).
 /// @see [Guide: tasking](docs/guide/tasking.md)
 #ifndef VARNEK_TASKING_H
 #define VARNEK_TASKING_H
@@ -30,8 +31,8 @@ namespace varnek {
 /// How a wait ended. Without a limit it goes on after a POSIX signal. kGone: the calling thread has
 /// no record, or there is no such semaphore.
 enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
-/// What becomes of an object that has the name already: kReplace deletes it, unless it is a held
-/// mutex, and owns the new one; kUse uses it, or makes one, and never deletes it.
+/// What becomes of an object that has the name: kReplace deletes it, unless it is a held mutex, and
+/// owns the new one; kUse never deletes, and finds or makes it in one step per shared library only.
 enum class Existing { kReplace, kUse };
 /// Milliseconds from any std::chrono duration, rounded up and kept within 0 and 49 days; only
 /// None() is for ever. Waits go by the wall clock; timers and Join do not.
@@ -42,9 +43,8 @@ class Limit {
     constexpr Limit(std::chrono::duration<Rep, Period> time) {
         const double exact = std::chrono::duration<double, std::milli>(time).count();
         if (exact < milliseconds_) {
-            const auto waited = exact > 0 ? time : time.zero();
-            const auto rounded = std::chrono::ceil<std::chrono::milliseconds>(waited);
-            milliseconds_ = static_cast<uint32_t>(rounded.count());
+            milliseconds_ = exact > 0 ? static_cast<uint32_t>(exact) : 0;
+            milliseconds_ += exact > milliseconds_;
         }
     }
     static constexpr Limit None() { return {}; }                             ///< for ever
@@ -132,9 +132,8 @@ struct Calls {
         };
         std::unique_lock<std::mutex> hold(shared.lock);
         const std::chrono::milliseconds time(limit.Milliseconds());
-        const bool done = shared.ended.wait_for(hold, time, isDone);
-        hold.unlock();
-        return done || (limit.IsNone() && Wait(limit));
+        return limit.IsNone() ? (shared.ended.wait(hold, isDone), true)
+                              : shared.ended.wait_for(hold, time, isDone);
     }
 };
 
@@ -151,12 +150,11 @@ class Own {
     }
     ~Own() { (void)(isOwned_ && *this && kDelete(handle_)); }
     Own(const Own &) = delete;
-    Own &operator=(const Own &) = delete;
     explicit operator bool() const { return handle_ != -1; }
     int32_t Handle() const { return handle_; }
 
   private:
-    bool isOwned_;
+    const bool isOwned_;  // const, so that nothing assigns an owner
     int32_t handle_ = -1;
 };
 template <typename Wait, typename IsGone>
@@ -250,15 +248,18 @@ class Thread {
         };
         calls_.Add(start, std::forward<Callable>(callable)...);
     }
-    ~Thread() { (void)(RemoveRecord() && calls_.Wait(Limit::None())); }
+    ~Thread() { (void)(Remove() && calls_.Wait(Limit::None())); }
     explicit operator bool() const { return handle_ != -1; }  ///< whether it has a record
     int32_t Handle() const { return handle_; }                ///< to send to; -1 for none
     /// Waits until the callable, which must not call this, has returned, and then removes the
-    /// record. Returns false on a time-out.
-    bool Join(Limit limit = Limit::None()) { return calls_.Wait(limit) && RemoveRecord(); }
+    /// record. Returns false on a time-out, and true if there is no thread.
+    bool Join(Limit limit = Limit::None()) { return calls_.Wait(limit) && Remove(); }
 
   private:
-    bool RemoveRecord() { return (*this && VarnekPGL_DeleteThread(handle_.exchange(-1))), true; }
+    bool Remove() {
+        const int32_t handle = handle_.exchange(-1);
+        return (handle != -1 && VarnekPGL_DeleteThread(handle)), true;
+    }
     detail::Calls calls_;
     std::atomic<int32_t> handle_{-1};
 };
@@ -272,18 +273,16 @@ class Timer {
     explicit Timer(std::string_view name)
         : handle_(static_cast<uint32_t>(VarnekPGL_CreateTimer(detail::Name(name).c_str()))) {}
     ~Timer() {
-        calls_.Drop([&](bool) { return *this && VarnekPGL_DeleteTimer(handle_.exchange(kNone)); });
+        calls_.Drop([&](bool) { return *this && VarnekPGL_DeleteTimer(handle_.exchange(-1u)); });
         calls_.Wait(Limit::None());
     }
-    explicit operator bool() const { return handle_ != kNone; }  ///< whether it was created
+    explicit operator bool() const { return handle_ != -1u; }  ///< whether it was created
     /// Starts the timer for at least a millisecond; false if it is armed. A callable may call this.
     template <typename... Callable>
     [[nodiscard]] bool Start(Limit delay, Callable &&...callable) {
-        const auto start = [this, time = std::max(delay.Milliseconds(), 1u)](void *call) {
-            const auto expire = [](uint32_t, void *expired) { detail::Calls::Run(expired); };
-            return VarnekPGL_StartTimer(handle_, time, expire, call) != FALSE;
-        };
-        return calls_.Add(start, std::forward<Callable>(callable)...);
+        const uint32_t ms = std::max(delay.Milliseconds(), 1u);
+        const auto arm = [&](void *call) { return VarnekPGL_StartTimer(handle_, ms, run_, call); };
+        return calls_.Add(arm, std::forward<Callable>(callable)...);
     }
     /// Drops the starts whose callables have not begun. Returns whether there was one.
     bool Cancel() {
@@ -291,7 +290,8 @@ class Timer {
     }
     bool IsActive() const { return VarnekPGL_IsTimerActive(handle_) != FALSE; }  ///< armed
   private:
-    static constexpr uint32_t kNone = UINT32_MAX;
+    // From the shared library that made calls_, because another one may have its own Shared.
+    void (*const run_)(uint32_t, void *) = [](uint32_t, void *call) { detail::Calls::Run(call); };
     detail::Calls calls_;
     std::atomic<uint32_t> handle_;
 };
