@@ -1,4 +1,4 @@
-// Reads bit fields as a parser of PSI sections does, from 960 bytes.
+// Reads bit fields as a PSI parser does, from 960 bytes.
 #include "Bench.h"
 #include "Varnek_CBitInputStream.h"
 

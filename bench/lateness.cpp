@@ -1,4 +1,4 @@
-// Measures how late a timer of 5 ms calls back, on an idle machine and with every core busy. The
+// Measures how late a 5 ms timer calls back, on an idle machine and with every core busy. The
 // contenders alternate. Each round gives the median and the 99th percentile of its deliveries.
 #include <semaphore.h>
 #include <signal.h>
@@ -108,7 +108,7 @@ void Round(const char *state, int count) {
         for (auto &contender : contenders) {
             contender.late.push_back(contender.measure() - kTime.it_value.tv_nsec);
         }
-        // The first two take turns, because the first one finds the thread of the system's timers
+        // The first two take turns, because whichever goes first finds the system's timer thread
         // asleep for longer.
         std::swap(contenders[0], contenders[1]);
     }

@@ -15,7 +15,7 @@ namespace {
 
 constexpr int kBatch = 1000;  // messages between two synchronisations of the threads
 
-// A contender is a queue. Any thread may send. Only the thread that owns the queue receives, which
+// A contender is a queue. Any thread may send; only the thread that owns the queue receives, and
 // waits for a message.
 
 class Ours {

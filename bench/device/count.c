@@ -34,10 +34,9 @@ enum Kind { INSTRUCTION, BARRIER, EXCLUSIVE, KINDS, MARK = KINDS };
 // time.
 static uint64_t executed[KINDS], atMark[2][KINDS];
 
-// Instructions of four bytes, as the word that they are in memory: in Thumb-2 the first halfword is
-// the lower one. The emulator does not say which encoding a program uses. That does not matter: a
-// word that matches in one encoding is, in the other one, a call or a coprocessor store that no
-// compiler generates.
+// Four-byte instructions as words in memory; in Thumb-2 the first halfword is the lower one. The
+// emulator does not say which encoding a program uses, but it need not: a word that matches in one
+// encoding is, in the other, a call or a coprocessor store that no compiler generates.
 #define THUMB(word) ((word) << 16 | (word) >> 16)
 static const struct {
     enum Kind kind;
