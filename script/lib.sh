@@ -40,7 +40,7 @@ judges() {
     local version
     version=$("$1" --version | sed -nE '/version/ { s/.*version:? ([0-9.]+).*/\1/p; q }')
     [[ $version. == "$2".* ]] || {
-        say "$1 $version does not judge here: only $2 does, so the code is not checked with it"
+        say "Skipping $1 $version, because only the findings of $1 $2 count"
         return 1
     }
 }

@@ -74,7 +74,7 @@ install(CODE [[
     file(CHMOD ${file} PERMISSIONS OWNER_READ OWNER_WRITE GROUP_READ WORLD_READ)]]
     COMPONENT debug)
 
-# The reference, which script/docs has built before.
+# The reference, which script/docs has built.
 install(DIRECTORY build/docs/html DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT dev)
 install(CODE "
     file(CREATE_LINK ../../common-licenses/Apache-2.0
@@ -90,7 +90,7 @@ cmake_path(GET VARNEK_FEATURE_FILE PARENT_PATH feature_dir)
 install(FILES defaults/debug_ltn.ini DESTINATION ${VARNEK_SYSTEM_DIR} COMPONENT library)
 install(FILES platform/host/features.txt DESTINATION ${feature_dir} COMPONENT standins)
 install(CODE "file(MAKE_DIRECTORY \"\$ENV{DESTDIR}${VARNEK_DATA_DIR}\")" COMPONENT library)
-# The settings without their comments, which a load would report as unknown lines.
+# The settings without their comments, which loading would report as unknown lines.
 file(STRINGS defaults/Varnek_Config.cfg settings REGEX "^[^#]")
 list(JOIN settings "\n" settings)
 set(control ${CMAKE_CURRENT_BINARY_DIR}/debian)
