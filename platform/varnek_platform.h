@@ -8,7 +8,7 @@
 extern "C" {
 #endif
 
-// The log's priorities that the library uses.
+// The log priorities that the library uses.
 enum VarnekLogPriority {
     VARNEK_LOG_VERBOSE = 2,
     VARNEK_LOG_DEBUG = 3,

@@ -31,9 +31,9 @@ bool SendTo(const char *szThreadName, const Content &content) {
     return varnek::Send(VarnekPGL_GetThreadByName(szThreadName), content);
 }
 
-// Says in `isComplete` whether all rounds took place.
+// Sets `isComplete` to whether all rounds took place.
 void Count(varnek::Timer *pace, bool *isComplete) {
-    // It only sends a message, which needs no lock, because the timer service must not wait for it.
+    // Runs on a thread of the timer service, which must not wait, so it only sends a message.
     const auto tick = [] { SendTo(kCounter, {Content::kTick, 0}); };
     Content content = {Content::kShown, 0};
     int32_t round = 0;

@@ -113,7 +113,7 @@ bool IsBreak(unsigned short unit) {
     return unit == kCarriageReturn || unit == kLineFeed || unit == kDvbControls + kDvbBreak;
 }
 
-// Whether a unit is a control character, also one of those that broadcasting has from U+E080 on.
+// Whether a unit is a control character, including those that broadcasting has from U+E080 on.
 bool IsUnprintable(unsigned short unit) {
     return unit < 0x20 || (unit >= 0x7F && unit < 0xA0) || (unit >= 0xE080 && unit < 0xE0A0);
 }

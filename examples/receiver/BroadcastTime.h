@@ -13,11 +13,11 @@ namespace receiver {
 using DateTime = int64_t;
 
 // Decodes a time of day or a duration: six decimal digits hhmmss.
-//   returns  seconds; nothing for what is no time, such as all ones, which mean "not known"
+//   returns  seconds; nothing if it is not a time, such as all ones, which mean "not known"
 std::optional<int> DecodeBcdTime(uint32_t bcd);
 
 // Decodes a day and a time of day.
-//   returns  nothing for what is no time of day, and before 1900-03-01, where the calendar rule of
+//   returns  nothing if it is not a time of day or is before 1900-03-01, where the calendar rule of
 //            broadcasting begins
 std::optional<DateTime> DecodeDateTime(uint16_t mjd, uint32_t bcd);
 

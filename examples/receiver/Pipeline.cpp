@@ -145,7 +145,7 @@ void Parse(Pipeline *pipeline) {
 }  // namespace
 
 std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report &report) {
-    // The size is asked before the reader exists, because only one thread may use the file.
+    // The size is asked for before the reader exists, because only one thread may use the file.
     ProgressLine line(options.progress, file.Size());
     Pipeline pipeline{file, options, report};
     if (!pipeline.blocks || !pipeline.sections) {

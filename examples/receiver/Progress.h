@@ -1,4 +1,4 @@
-// The progress line of a long reading, such as "37 % of 2147 MB, 412.5 MB/s, 4 s left".
+// The progress line while reading a long stream, such as "37 % of 2147 MB, 412.5 MB/s, 4 s left".
 #ifndef RECEIVER_PROGRESS_H
 #define RECEIVER_PROGRESS_H
 
@@ -12,7 +12,7 @@ namespace receiver {
 // A line that each update overwrites. Its clock starts when the object is created.
 class ProgressLine {
   public:
-    // Without a terminal it shows nothing. A size of 0 is not known.
+    // Without a terminal it shows nothing. A size of 0 means that it is not known.
     ProgressLine(std::FILE *terminal, uint64_t size) : terminal_(terminal), size_(size) {}
 
     void Show(uint64_t done);

@@ -61,8 +61,8 @@ Settings LoadSettings(const Options &options) {
     return settings;
 }
 
-// Opens the capture that the options ask for, or else the configuration, which opens none beside
-// standard input.
+// Opens the capture that the options or else the configuration asks for; for standard input only
+// the options can.
 //   returns  empty, or an error message
 std::string OpenCapture(const Options &options, const StreamFile &file, Capture &capture) {
     std::string path = options.capture;
@@ -182,7 +182,7 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
         return Fail(err, options.path, fault);
     }
     if (surroundings.stop != nullptr) {
-        // From here on Ctrl-C ends the program, as there is no reading for the handler to end.
+        // From here on Ctrl-C ends the program, because the handler could only stop the reading.
         std::signal(SIGINT, SIG_DFL);
     }
     if (options.json) {

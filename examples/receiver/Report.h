@@ -1,4 +1,4 @@
-// The result of a reading: services joined from their tables, events in order, times in UTC and
+// What a stream contained: services joined from their tables, events in order, times in UTC and
 // local time. The summary and the JSON object show it.
 #ifndef RECEIVER_REPORT_H
 #define RECEIVER_REPORT_H
@@ -93,9 +93,8 @@ class StreamClock {
 // Writes a report for people, in lines of at most `width` columns.
 void WriteSummary(const Report &report, size_t width, std::FILE *out);
 
-// Writes a report for programs: one JSON object (RFC 8259) and a line feed. It writes piece by
-// piece, so a large object needs no more memory. What the stream does not contain is null for a
-// number, and empty for a text or a time.
+// Writes a report for programs: one JSON object (RFC 8259) and a line feed, as README.md describes.
+// It writes piece by piece, so a large object needs no more memory.
 void WriteJson(const Report &report, std::FILE *out);
 
 }  // namespace receiver

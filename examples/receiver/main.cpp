@@ -12,7 +12,7 @@ namespace {
 std::atomic<bool> gStop{false};
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler sets it");
 
-// The first Ctrl-C ends the reading, and the result so far is shown. The second ends the program.
+// The first Ctrl-C ends the reading and shows the result so far; the second ends the program.
 void OnInterrupt(int /*signal*/) {
     gStop = true;
 }

@@ -69,9 +69,8 @@ constexpr unsigned kAdaptation = 0x0020;
 constexpr unsigned kPayload = 0x0010;
 
 // Returns a packet of 188 bytes.
-//   content  what follows the header: an adaptation field with its length if the flags announce
-//   one,
-//            and then the payload; it is padded with 0xFF
+//   content  what follows the header, padded with 0xFF: if the flags announce one, an adaptation
+//            field with its length, and then the payload
 Bytes MakePacket(uint16_t pid, unsigned counter, const Bytes &content, unsigned flags = kPayload);
 
 // The content of a packet, with the header flags that it needs.

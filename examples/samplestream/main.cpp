@@ -180,7 +180,7 @@ Bytes Schedule(uint16_t service) {
                    entries + MakeEvent(0x01FF, U16(0xFFFF) + not_known, not_known, {}));
 }
 
-// Returns the time, with two regions' offsets from Brazil's official time: none and minus one hour.
+// Returns the time, with two regions' offsets from Brazil's official time: zero and minus one hour.
 Bytes OwnTot(int now) {
     return MakeTot(MakeDateTime(kDay, now),
                    MakeLocalOffset("BRA", 3, 0) + MakeLocalOffset("BRA", 4, -1));

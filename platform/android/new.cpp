@@ -1,4 +1,4 @@
-// The array operators of the device's library. Those of the NDK's static C++ runtime are in one
+// The array operators for the device's library. Those in the NDK's static C++ runtime share an
 // object with the operators that throw, and would bring its unwinder and demangler along.
 #include <stdlib.h>
 
