@@ -481,7 +481,13 @@ TEST_F(FaultAlone, ConfigurationsSurviveEachFailingCall) {
     };
     Force("settings", saveAndLoad);
     std::filesystem::create_hard_link(kSettingsFile, Path("second name"));
-    Force("settings in place", [&] { return WriteAll(kSettingsFile, std::string(400, '\n')), saveAndLoad(); });
+    Force("settings in place", [&] {
+        const std::string old(400, '\n');
+        WriteAll(kSettingsFile, old);
+        VarnekCfg_SaveConfigFile();
+        const std::string text = ReadAll(kSettingsFile);
+        return text == old ? "the old text" : std::to_string(text.size()) + " bytes";
+    });
     Force("debug configuration", [] { return VarnekPGL_InitializeDebug(), std::string("loaded"); });
     FailCall("malloc", 1, ENOMEM);
     NOTE(VarnekCfg_LoadConfigFile)();

@@ -13,12 +13,14 @@
 #include <thread>
 
 #include "Varnek_CRingBuffer.h"
-#include "Varnek_Debug.h"
+#include "Varnek_Tasking.h"
 #include "support/Check.h"
 #include "support/Families.h"
 #include "support/Platform.h"
 
 namespace {
+
+using namespace std::chrono_literals;
 
 constexpr int kThreads = 8;
 constexpr int kUnits = 3;  // of the shared semaphore
@@ -37,14 +39,7 @@ struct Message {
     int32_t urgent;  // or the record that receives it
     char filled[24];
 };
-
-template <typename To, typename From>
-To As(const From &from) {
-    static_assert(sizeof(To) == sizeof from);
-    To to;
-    memcpy(&to, &from, sizeof to);
-    return to;
-}
+static_assert(sizeof(Message) == sizeof(THREAD_MSG));
 
 // What one thread did and saw. Other threads use only the atomics and the ring.
 struct Worker {
@@ -52,7 +47,7 @@ struct Worker {
     int32_t handle;
     std::mt19937 random;
     int64_t sent[kThreads], received[kThreads], urgentSent, urgentReceived;
-    int64_t peeked, locks, starts, shortLived, written, read, operations, passed;
+    int64_t locks, starts, shortLived, written, read, operations, passed;
     int32_t latest[kThreads];  // the last record of each other worker that it sent to
     std::atomic<int64_t> fired, ended, taken;
     std::mutex timerLock;
@@ -87,21 +82,21 @@ void Send(Worker &me) {
     const BOOL urgent = me.Below(8) == 0 ? TRUE : FALSE;
     Message message{urgent ? ++me.urgentSent : ++me.sent[to], me.index, urgent, {}};
     memset(message.filled, static_cast<char>(message.number), sizeof message.filled);
-    const auto out = As<THREAD_MSG>(message);
-    CHECK((urgent ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage)(gWorkers[to].handle, &out) == TRUE);
+    CHECK(varnek::Send(gWorkers[to].handle, message, urgent ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage));
 }
 
+// Takes a message if there is one. Receiving skips the permits that peeking has left behind.
 bool Receive(Worker &me, bool peek) {
-    THREAD_MSG in;
-    int32_t left = -1;
-    if ((peek ? VarnekPGL_PeekMessage(&in, &left) : VarnekPGL_ReceiveMessage(0, &in, &left)) != TRUE) {
+    Message message;
+    int32_t left = 0;
+    const bool found = peek ? VarnekPGL_PeekMessage(reinterpret_cast<THREAD_MSG *>(&message), &left) == TRUE
+                            : varnek::Receive(message, 0ms) == varnek::Outcome::kSuccess;
+    if (!found) {
         return false;
     }
-    const auto message = As<Message>(in);
     char expected[sizeof message.filled];
     memset(expected, static_cast<char>(message.number), sizeof expected);
     CHECK(left >= 0 && memcmp(message.filled, expected, sizeof expected) == 0);
-    me.peeked += peek ? 1 : 0;
     if (message.urgent) {
         ++me.urgentReceived;
     } else {
@@ -215,11 +210,9 @@ void *ReceiveAll(void *argument) {
     Worker &parent = *static_cast<Worker *>(argument);
     const int32_t self = VarnekPGL_GetCurrentThread();
     int64_t next[kThreads] = {};
-    THREAD_MSG in;
-    int32_t count = 0;
+    Message message;
     // A removed thread has no handle. It may have been removed before it asks for it.
-    while (self != -1 && VarnekPGL_ReceiveMessage(WAIT_FOREVER, &in, &count) == TRUE) {
-        const auto message = As<Message>(in);
+    while (self != -1 && varnek::Receive(message) == varnek::Outcome::kSuccess) {
         CHECK(message.urgent == self && message.number == next[message.from]++);
         ++parent.taken;
     }
@@ -253,8 +246,7 @@ void UseOthers(Worker &me) {
     }
     me.latest[other.index] = thread;
     Message message{0, me.index, thread, {}};
-    for (auto out = As<THREAD_MSG>(message); VarnekPGL_SendMessage(thread, &out) == TRUE && ++message.number < 2000;) {
-        out = As<THREAD_MSG>(message);
+    while (varnek::Send(thread, message) && ++message.number < 2000) {
     }
     me.passed += message.number;
 }
@@ -294,9 +286,7 @@ void *Work(void *argument) {
     while (gSenders > 0) {
         std::this_thread::yield();
     }
-    // Each peeked message leaves a signal behind, which ends a receive without a message.
-    for (int64_t empty = 0; empty <= me.peeked;) {
-        empty += Receive(me, false) ? 0 : 1;
+    while (Receive(me, false)) {
     }
     --gRunning;
     return nullptr;

@@ -121,6 +121,7 @@ class VarnekTest : public ::testing::Test {
     // must equal tests/expected/SUITE.TEST.txt. A run with VARNEK_WRITE_EXPECTED in its environment writes that file.
     void Note(const std::string &text) { transcript_ += text; }
     void Note(const std::string &call, const std::string &result);
+    bool notesLow_ = true;  // whether the lines of level Low are noted, which other tests may show already
 
     // Replaces a text that differs from run to run by `name` in the transcript. The system's handles are always hidden,
     // and its errors have their names instead of its numbers and words.
