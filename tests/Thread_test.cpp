@@ -62,20 +62,17 @@ TEST_F(Thread, FailuresHaveTheirLineAndResult) {
 
 TEST_F(Thread, ADuplicateTakesTheRecord) {
     const int32_t old = VarnekPGL_CreateThread("same", 1, 0, Nothing, nullptr);
-    const THREAD_MSG message = Message('m');
-    EXPECT_TRUE(VarnekPGL_SendMessage(old, &message));
-    EXPECT_TRUE(VarnekPGL_SendMessage(old, &message));
+    EXPECT_TRUE(varnek::Send(old, 'm') && varnek::Send(old, 'm'));
     NOTE(VarnekPGL_CreateThread)("same", 1, 0, Nothing, nullptr);
-    EXPECT_FALSE(VarnekPGL_SendMessage(old, &message));
-    VarnekPGL_SendMessage(old + 1, &message);
+    EXPECT_FALSE(varnek::Send(old, 'm'));
+    EXPECT_TRUE(varnek::Send(old + 1, 'm'));
     NOTE(VarnekPGL_DeleteThread)(old + 1);
 }
 
 TEST_F(Thread, AWaitersRecordIsReplacedInAFullTable) {
     const auto wait = [](void *) -> void * {
-        THREAD_MSG message;
-        int32_t count = 0;
-        VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count);
+        int32_t number = 0;
+        EXPECT_EQ(varnek::Receive(number), varnek::Outcome::kGone);
         return nullptr;
     };
     int32_t last = 0;
@@ -95,9 +92,8 @@ TEST_F(Thread, AThreadFindsItselfFirstOfAll) {
     std::atomic<int> missed{0};
     for (int i = 0; i < 2000; i++) {
         varnek::Thread worker("worker", kStack, [&missed, i] {
-            const THREAD_MSG message = {};
             const int32_t byName = VarnekPGL_GetThreadByName("worker");
-            missed += byName == -1 || byName != VarnekPGL_GetCurrentThread() || !VarnekPGL_SendMessage(i + 1, &message);
+            missed += byName == -1 || byName != VarnekPGL_GetCurrentThread() || !varnek::Send(i + 1, 'm');
         });
         worker.Join();
     }
@@ -270,7 +266,6 @@ TEST_F(MessageQueue, UrgentMessagesOvertake) {
 
 TEST_F(MessageQueue, APeekLeavesASignalBehind) {
     varnek::Thread worker("worker", kStack, [] {
-        const THREAD_MSG sent = Message('m');
         THREAD_MSG message;
         int32_t count = -1;
         EXPECT_FALSE(VarnekPGL_PeekMessage(&message, &count));
@@ -279,7 +274,7 @@ TEST_F(MessageQueue, APeekLeavesASignalBehind) {
         EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_PeekMessage: Msg is NULL",
                                               "***** VarnekPGL_PeekMessage: message or count is NULL",
                                               "***** VarnekPGL_ReceiveMessage: message or count is NULL"));
-        EXPECT_TRUE(VarnekPGL_SendMessage(VarnekPGL_GetCurrentThread(), &sent));
+        EXPECT_TRUE(varnek::Send(VarnekPGL_GetCurrentThread(), Message('m')));
         EXPECT_TRUE(VarnekPGL_PeekMessage(&message, &count));
         EXPECT_EQ(message.data[39], 'm');
         EXPECT_EQ(count, 0);
@@ -318,8 +313,7 @@ TEST_F(MessageQueue, ARemovalWakesTheWaiterAndNothingIsDestroyedUnderIt) {
         EXPECT_TRUE(VarnekPGL_DeleteThread(handle));
         const int32_t next = VarnekPGL_CreateThread("next", 1, 0, Nothing, nullptr);
         EXPECT_EQ(next, handle + 1);
-        const THREAD_MSG message = Message('n');
-        EXPECT_TRUE(VarnekPGL_SendMessage(next, &message)) << "the next record gets no message";
+        EXPECT_TRUE(varnek::Send(next, 'n')) << "the next record gets no message";
         worker.Join();
         TakeLog();
         VarnekPGL_DeleteThread(next);
@@ -334,20 +328,17 @@ TEST_F(MessageQueue, ALogFunctionMaySendAndReceiveBeforeTheWait) {
             return;
         }
         inside = true;
-        const THREAD_MSG sent = Message('s');
-        THREAD_MSG received;
-        int32_t count = -1;
-        for (int i = 0; i < 2; i++) {
-            EXPECT_TRUE(VarnekPGL_SendMessage(VarnekPGL_GetCurrentThread(), &sent));
+        int number = 0;
+        for (const int each : {1, 2}) {
+            EXPECT_TRUE(varnek::Send(VarnekPGL_GetCurrentThread(), each));
         }
-        EXPECT_TRUE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &received, &count));
+        EXPECT_EQ(varnek::Receive(number), varnek::Outcome::kSuccess);
         inside = false;
     };
     varnek::Thread("worker", kStack, [] {
-        THREAD_MSG message = Message('m');
-        int32_t count = -1;
-        EXPECT_TRUE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count));
-        EXPECT_EQ(message.data[0], 's');
+        int number = 0;
+        EXPECT_EQ(varnek::Receive(number), varnek::Outcome::kSuccess);
+        EXPECT_EQ(number, 2);
     }).Join();
     gLogHook = nullptr;
 }
