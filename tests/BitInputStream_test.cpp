@@ -7,8 +7,7 @@
 
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using ::testing::ElementsAre, ::testing::IsEmpty;
 
 class BitInputStream : public VarnekTest {};
 

@@ -13,8 +13,7 @@
 
 namespace {
 
-using ::testing::IsEmpty;
-using ::testing::SizeIs;
+using ::testing::IsEmpty, ::testing::SizeIs;
 
 class RingBuffer : public VarnekTest {
   protected:

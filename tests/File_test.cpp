@@ -7,9 +7,7 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
-#include <map>
 #include <optional>
-#include <thread>
 
 #include "support/VarnekTest.h"
 
@@ -17,8 +15,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using ::testing::ElementsAre, ::testing::IsEmpty;
 
 constexpr int32_t kCreate = PGL_FILE_MODE_CREATE_RW, kRead = PGL_FILE_MODE_READ, kWrite = PGL_FILE_MODE_WRITE,
                   kAppend = PGL_FILE_MODE_APPEND;
@@ -93,7 +90,7 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_WriteFileByHandle)(writer, nullptr, 1);
     NOTE(VarnekPGL_ReadFileByHandle)(writer, nullptr, 1);
     EXPECT_EQ(VarnekPGL_ReadFileByHandle(writer, buffer, 8), 0u);
-    NOTE(VarnekPGL_GetFileSizeByHandle)(0);
+    EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(0), -1);
     NOTE(VarnekPGL_CheckFile)(none);
     NOTE(VarnekPGL_DeleteFile)(none);
     NOTE(VarnekPGL_WriteFile)(Path("w"), nullptr, 1);
@@ -274,7 +271,7 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_CheckDir)(none);
     NOTE(__VarnekPGL_ReadDir)(nullptr, nullptr);
     NOTE(VarnekPGL_ReadDir)(nullptr, nullptr);
-    NOTE(VarnekPGL_ReadDir)(PGL_INVALID_DIR_HANDLE, &info);
+    EXPECT_FALSE(VarnekPGL_ReadDir(PGL_INVALID_DIR_HANDLE, &info));
     EXPECT_FALSE(VarnekPGL_FmGetFileAttributes(none.c_str(), nullptr));
     NOTE(VarnekPGL_FmGetFileAttributes)(none, &attributes);
     EXPECT_EQ(VarnekPGL_DeleteDirEx(""), -1);

@@ -109,11 +109,11 @@ TEST_F(LngPack, FailuresAreNamed) {
     char *text = nullptr;
     NOTE(WmConvertLatin15Code2PCode)(nullptr, 4, "a");
     NOTE(WmConvertLatin15Code2PCode)(units, 4, "12345");
-    NOTE(WmConvertLatin15Code2PCode)(units, 5, "12345");
+    EXPECT_EQ(WmConvertLatin15Code2PCode(units, 5, "12345"), TRUE);
     NOTE(__WmLngUnicode2UTF)(nullptr, abc, 3);
     NOTE(__WmLngUnicode2UTF)(bytes, nullptr, 3);
     NOTE(__WmLngUnicode2UTF)(bytes, abc, 0);
-    NOTE(WmConvertPCode2UTF)(bytes, abc, 0);
+    EXPECT_EQ(WmConvertPCode2UTF(bytes, abc, 0), TRUE);
     EXPECT_STREQ(bytes, "");
     NOTE(WmConvert2LCode)(bytes, nullptr);
     TakeLog();
@@ -125,9 +125,9 @@ TEST_F(LngPack, FailuresAreNamed) {
     NOTE(WmConvertUTF2PCode)(units, 8, nullptr, 1);
     NOTE(WmConvertUTF2PCode)(units, 4, "abc", 3);
     NOTE(WmConvertUTF2PCode)(units, 6, "abc", 3);
-    NOTE(WmConvertUTF2PCode)(units, 0, "abc", 0);
+    EXPECT_EQ(WmConvertUTF2PCode(units, 0, "abc", 0), TRUE);
     EXPECT_EQ(units[0], 0);
-    NOTE(__WmLngStrlenByByte)("abc", 0);
+    EXPECT_EQ(__WmLngStrlenByByte("abc", 0), 2);
     NOTE(VarnekPGL_ConvertLatin15toUTF8)(&text, nullptr, 1);
 }
 

@@ -1,6 +1,4 @@
 // What the families of named objects share: registries of limited size, and handles that never come back.
-#include <algorithm>
-
 #include "../CommonUtility/source/Varnek_SlotTable.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"
@@ -16,7 +14,10 @@ TEST_F(NamedObjects, AFullRegistryOfEachFamilyHasRoomAfterARemoval) {
         Noting(std::string(family.name) + ": create", family.create)("one more");
         EXPECT_TRUE(family.remove(handles[7]));
         handles[7] = family.create("one more");
-        Note(std::to_string(handles.size()) + " " + family.name + ", the last " + std::to_string(handles[7]) + "\n");
+        const int32_t again = family.create("one more");
+        Note(std::to_string(handles.size()) + " " + family.name + ", the last " + std::to_string(handles[7]) +
+             ", with the same name " + std::to_string(again) + "\n");
+        handles.push_back(again);
         std::for_each(handles.begin(), handles.end(), family.remove);
     }
 }

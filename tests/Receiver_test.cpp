@@ -3,7 +3,6 @@
 #include "Receiver.h"
 
 #include <fcntl.h>
-#include <gtest/gtest.h>
 #include <pty.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
@@ -11,7 +10,6 @@
 
 #include <ctime>
 #include <limits>
-#include <random>
 
 #include "BroadcastText.h"
 #include "BroadcastTime.h"
@@ -529,13 +527,13 @@ TEST_F(Receiver, AnswersEveryInput) {
         {Path("")},
         {Path("text")},
         {Path("accident")},
-        {"--", Path("-dash")},
         {"--json", "--all", "--region", "5", TestFile("sample.ts")},
     };
     for (const Arguments &arguments : cases) {
         NoteProgram(arguments);
     }
     EXPECT_EQ(NoteProgram({Path("cut.ts"), "--json"}), ToJson(ReadStream(Raw(SampleText().substr(0, 100000)))));
+    EXPECT_EQ(NoteProgram({"--json", "--", Path("-dash")}), ToJson(ReadStream(Raw(long_stream))));
     const std::pair<const char *, const char *> outputs[] = {{"/dev/full", "w"}, {"/dev/null", "r"}};  // or closed
     for (const auto &[path, mode] : outputs) {
         std::FILE *out = std::fopen(path, mode);
@@ -630,10 +628,12 @@ TEST_F(Receiver, FreesItsObjects) {
     for (const Family &family : kFamilies) {
         std::vector<int32_t> fillers = family.Fill();
         for (bool enough = false; !enough; fillers.pop_back()) {
+            const size_t room = family.Room();
+            Note("With room for " + std::to_string(room) + " " + family.name + ": ");
             const std::string out = NoteProgram({"--json", TestFile("sample.ts")});
             enough = !out.empty();
             EXPECT_EQ(out, enough ? expected : "");
-            Note("There was room for " + std::to_string(family.Room()) + " " + family.name + ".\n");
+            EXPECT_EQ(family.Room(), room) << "the run left objects behind";
             ASSERT_FALSE(fillers.empty());
             family.remove(fillers.back());
         }
@@ -647,7 +647,7 @@ TEST_F(Receiver, Captures) {
     const std::string captured = Path("captured.ts");
     WriteAll(captured, std::string(1000000, 'x'));
     WriteAll(Path("text"), std::string(9999, 'x'));
-    NoteProgram({"--capture", captured, Path("text")});
+    RunProgram({"--capture", captured, Path("text")});
     EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "a run without packets wrote a capture";
 
     const std::string first = NoteProgram({"--json", "--quiet", "--capture", captured, TestFile("sample.ts")});

@@ -1,8 +1,5 @@
 #include <semaphore.h>
 
-#include <chrono>
-#include <thread>
-
 #include "../CommonUtility/source/Varnek_Clock.h"
 #include "Varnek_Semaphore.h"
 #include "support/VarnekTest.h"

@@ -2,12 +2,7 @@
 #include <sched.h>
 #include <sys/prctl.h>
 
-#include <algorithm>
-#include <atomic>
-#include <chrono>
-#include <functional>
 #include <future>
-#include <thread>
 
 #include "Varnek_Tasking.h"
 #include "support/Families.h"
@@ -15,8 +10,7 @@
 
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using ::testing::ElementsAre, ::testing::IsEmpty;
 
 THREAD_MSG Message(char text) {
     THREAD_MSG message;
@@ -67,25 +61,6 @@ TEST_F(Thread, ADuplicateTakesTheRecord) {
     EXPECT_FALSE(varnek::Send(old, 'm'));
     EXPECT_TRUE(varnek::Send(old + 1, 'm'));
     NOTE(VarnekPGL_DeleteThread)(old + 1);
-}
-
-TEST_F(Thread, AWaitersRecordIsReplacedInAFullTable) {
-    const auto wait = [](void *) -> void * {
-        int32_t number = 0;
-        EXPECT_EQ(varnek::Receive(number), varnek::Outcome::kGone);
-        return nullptr;
-    };
-    int32_t last = 0;
-    for (int i = 0, handle; (handle = VarnekPGL_CreateThread(std::to_string(i).c_str(), 1, 65536, wait, nullptr)) != -1;
-         i++) {
-        last = handle;
-    }
-    for (int i = 1; i <= 200; i++) {
-        ASSERT_EQ(VarnekPGL_CreateThread("7", 1, 65536, wait, nullptr), last + i);
-    }
-    for (int i = 0; i < last; i++) {
-        EXPECT_TRUE(VarnekPGL_DeleteThread(VarnekPGL_GetThreadByName(std::to_string(i).c_str())));
-    }
 }
 
 TEST_F(Thread, AThreadFindsItselfFirstOfAll) {

@@ -7,15 +7,12 @@
 #include <array>
 #include <cstring>
 #include <ctime>
-#include <random>
 
 #include "support/VarnekTest.h"
 
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
-using ::testing::SizeIs;
+using ::testing::ElementsAre, ::testing::IsEmpty, ::testing::SizeIs;
 
 time_t gNow = -1;  // the clock's time if a test set it, or else -1
 

@@ -3,10 +3,6 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
-#include <atomic>
-#include <chrono>
-#include <thread>
-
 #include "support/VarnekTest.h"
 
 namespace {

@@ -7,9 +7,7 @@
 
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::SizeIs;
-using ::testing::StartsWith;
+using ::testing::ElementsAre, ::testing::SizeIs, ::testing::StartsWith;
 
 class Util : public VarnekTest {};
 

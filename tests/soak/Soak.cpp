@@ -21,6 +21,7 @@
 namespace {
 
 using namespace std::chrono_literals;
+using Clock = std::chrono::system_clock;
 
 constexpr int kThreads = 8;
 constexpr int kUnits = 3;  // of the shared semaphore
@@ -136,21 +137,17 @@ void UseOwnObjects(Worker &me) {
 
 // One start of a timer. It outlives a late callback.
 struct Start {
-    std::atomic<int64_t> due, timer;  // as the worker counts its timers
+    std::atomic<Clock::time_point> due;
+    std::atomic<int64_t> timer;  // as the worker counts its timers
     Worker *worker;
 };
 Start gStarts[kThreads][1024];
-
-int64_t Microseconds() {
-    return std::chrono::duration_cast<std::chrono::microseconds>(std::chrono::system_clock::now().time_since_epoch())
-        .count();
-}
 
 // It is never called before its start is due. Half of the callbacks use their own timer, but not after its deletion:
 // the handle may belong to another worker's timer by then.
 void OnTimer(uint32_t timer, void *userData) {
     const Start &start = *static_cast<Start *>(userData);
-    CHECK(Microseconds() >= start.due);
+    CHECK(Clock::now() >= start.due.load());
     Worker &worker = *start.worker;
     const int64_t nth = ++worker.fired;
     const std::lock_guard<std::mutex> guard(worker.timerLock);
@@ -170,7 +167,7 @@ void UseTimer(Worker &me) {
         Start &start = gStarts[me.index][me.starts++ % 1024];
         start.worker = &me;
         start.timer = me.timers;
-        start.due = Microseconds() + int64_t{timeout} * 1000;
+        start.due = Clock::now() + std::chrono::milliseconds(timeout);
         CHECK(VarnekPGL_StartTimer(handle, timeout, OnTimer, &start) == TRUE || !mine);
         std::this_thread::sleep_for(std::chrono::microseconds(900 + me.Below(200)));
         VarnekPGL_CancelTimer(handle);

@@ -1,4 +1,5 @@
 // The tests' fixture, which captures what the library writes to the Android log and gives each test its own folder.
+// The tests count on what this header includes.
 #ifndef VARNEK_TESTS_SUPPORT_VARNEKTEST_H
 #define VARNEK_TESTS_SUPPORT_VARNEKTEST_H
 
