@@ -15,7 +15,7 @@ namespace {
 
 class ConfigAlone : public VarnekTest {
   protected:
-    // Loads this content, saves the settings and returns the saved file.
+    // Loads this content, saves the settings and returns what was saved.
     static std::string Reloaded(const std::string &content) {
         WriteAll(kSettingsFile, content);
         VarnekCfg_LoadConfigFile();
@@ -242,7 +242,7 @@ TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
         }
         EXPECT_TRUE(isWhole(ReadAll(kSettingsFile)));
     }
-    // So is a draft that an earlier process with this id left behind.
+    // Drafts are removed, even one that an earlier process with this id left behind.
     WriteAll(VARNEK_DATA_DIR "Varnek_Config.new." + std::to_string(getpid()) + ".57", "left");
     save('a');
     for (const auto &entry : std::filesystem::directory_iterator(VARNEK_DATA_DIR)) {

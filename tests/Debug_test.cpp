@@ -13,7 +13,7 @@ using ::testing::ElementsAre, ::testing::IsEmpty, ::testing::StartsWith;
 
 constexpr uint32_t kErrorOfCommon = VARNEK_LEVEL_ERROR | VARNEK_MODULE_COMMON;
 
-// Starts from a process that has not traced yet and from empty directories.
+// Begins in a process that has not traced yet, with empty directories.
 class DebugAlone : public VarnekTest {
   protected:
     void SetUp() override {
@@ -53,7 +53,7 @@ TEST_F(DebugAlone, EveryLevelAndModuleHasItsPriorityAndTag) {
     StartClean();
     VarnekPGL_InitializeDebug();
     TakeLog();
-    // Each module with one or several levels; then masks without a known level or module, which trace nothing.
+    // Each module with one level or several, then masks without a known level or module, which trace nothing.
     const uint32_t error = VARNEK_LEVEL_ERROR, common = VARNEK_MODULE_COMMON;
     for (const uint32_t mask :
          {error | common, VARNEK_LEVEL_HIGH | VARNEK_MODULE_JNI, VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL,

@@ -1,4 +1,4 @@
-// Failing calls of the C library: each has its result and its lines, and leaves nothing behind.
+// Makes calls of the C library fail: each failure has its result and its lines, and leaves nothing behind.
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -32,7 +32,7 @@ constexpr uint32_t kStack = 256 * 1024;
 
 class Fault : public VarnekTest {
   protected:
-    // Returns the results of several calls, in their order.
+    // Joins the results of several calls.
     std::string Results(std::initializer_list<int64_t> results) const {
         std::string text;
         for (const int64_t result : results) {
@@ -133,7 +133,7 @@ TEST_F(Fault, APostThatFailsLetsTheNextWakeTheOwner) {
         }
         left.set_value(count);
     });
-    // Until the owner waits.
+    // Nothing is posted, so nothing fails, until the owner waits.
     do {
         VarnekPGL_MSleep(1);
         FailCall("sem_post", 1, EOVERFLOW);
@@ -262,7 +262,7 @@ TEST_F(FaultAlone, ASaveReplacesAFileThatAnotherHasJustReplacedAndFollowsNoPlant
 }
 
 TEST_F(Fault, ObjectsSurviveEachFailingCall) {
-    // No thread ends, so that each new one needs a semaphore of its own.
+    // No thread ends, so each new one needs a semaphore of its own.
     const auto stay = [](void *) -> void * { return VarnekPGL_MSleep(600000), nullptr; };
     const int32_t sink = VarnekPGL_CreateThread("sink", 1, 65536, stay, nullptr);
     Force("mutex", [this, last = VarnekPGL_CreateMutex("last")]() mutable {

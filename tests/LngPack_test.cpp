@@ -37,7 +37,7 @@ TEST_F(LngPack, Latin15BecomesUtf8) {
     EXPECT_STREQ(text, "€€€€");
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4", UINT32_MAX), TRUE);
     EXPECT_STREQ(text, "€");
-    // A character of two bytes and one that is left out, at each place of a run of ASCII.
+    // A character of two bytes and one that is left out, at each place in a run of ASCII.
     for (size_t at = 0; at < 20; ++at) {
         std::string latin(22, 'a'), utf8(20, 'a');
         latin.replace(at, 2, "\xE9\x1B");

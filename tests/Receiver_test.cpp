@@ -1,5 +1,5 @@
-// The example receiver: each stage on made packets and sections, then the whole program on the sample stream, on
-// damaged streams and on inputs that it refuses.
+// The example receiver: first each stage, with packets and sections made here, then the whole program on the sample
+// stream, on damaged streams and on inputs that it refuses.
 #include "Receiver.h"
 
 #include <fcntl.h>
@@ -39,13 +39,13 @@ class Receiver : public VarnekTest {
         setenv("COLUMNS", "80", 1);
     }
 
-    // Runs the program, and notes its status and its messages.
+    // Runs the program and notes its status and messages.
     void NoteProgram(const Arguments &arguments, std::FILE *out) {
         int status = -1;
         const std::string err = Written([&](std::FILE *file) { status = RunReceiver(arguments, {out, file}); });
         Note(::testing::PrintToString(arguments) + " = " + std::to_string(status) + "\n" + err);
     }
-    // Returns the output too, and notes it up to its first empty line, unless it is JSON.
+    // Also returns the output, and notes it up to the first empty line, unless it is JSON.
     std::string NoteProgram(const Arguments &arguments) {
         const std::string out = Written([&](std::FILE *file) { NoteProgram(arguments, file); });
         Note(out[0] == '{' ? "" : out.substr(0, (out + '\n').find("\n\n") + 1));
@@ -53,7 +53,7 @@ class Receiver : public VarnekTest {
     }
 };
 
-// Returns the lines of a text that another one does not have.
+// Returns the lines of a text that are not in another one.
 std::string NewLines(const std::string &text, const std::string &other) {
     std::string lines;
     for (size_t at = 0, end = 0; at < text.size(); at = end) {
@@ -75,7 +75,7 @@ Bytes Fill(size_t size, unsigned char value) { return Bytes(size, value); }
 
 unsigned char Low(size_t value) { return static_cast<unsigned char>(value); }
 
-// Makes packets whose number is in their counter and in their payload.
+// Makes packets that are numbered in their counters and payloads.
 Bytes Numbered(size_t first, size_t count, const Bytes &lead = {}, const Bytes &trail = {}) {
     Bytes out;
     for (size_t i = first; i < first + count; ++i) {
@@ -247,7 +247,7 @@ TEST_F(Receiver, AssemblesSections) {
 }
 
 TEST_F(Receiver, DecodesTimes) {
-    // Compares with the system's calendar, up to 2038 where its seconds have 32 bits.
+    // The system's calendar ends in 2038 where its seconds have 32 bits.
     constexpr int64_t last = std::min<int64_t>(65535, 40587 + std::numeric_limits<time_t>::max() / 86400);
     for (unsigned mjd = 40587; mjd <= last; ++mjd) {
         const time_t day = static_cast<time_t>(mjd - 40587) * 86400;
@@ -298,8 +298,8 @@ TEST_F(Receiver, DecodesTexts) {
     }
 }
 
-// Reads sections in the order given, each in packets of its own. The first packet of a section comes before the further
-// packets of the section before it.
+// Reads sections in the order given, each in packets of its own. A section's first packet overtakes the rest of the
+// section before it.
 Report ReadSections(const std::vector<std::pair<uint16_t, Bytes>> &sections) {
     StreamWriter writer;
     std::pair<uint16_t, std::vector<Content>> rest;
@@ -315,7 +315,7 @@ Report ReadSections(const std::vector<std::pair<uint16_t, Bytes>> &sections) {
     return ReadStream(writer.Stream());
 }
 
-// Makes an event of one hour on 1993-10-13.
+// Makes an event that lasts an hour on 1993-10-13.
 Bytes At(unsigned id, int hour, const Bytes &descriptors) {
     return MakeEvent(id, MakeDateTime(0xC079, hour * 3600), Bcd(3600), descriptors);
 }
@@ -433,7 +433,7 @@ TEST_F(Receiver, KeepsTheCurrentTables) {
     }
 }
 
-// A table of events limits their number and the length of their texts.
+// A table of events limits how many there are and how long their texts are.
 TEST_F(Receiver, LimitsEvents) {
     EventTable few, long_ones;
     Event event;
@@ -545,7 +545,7 @@ TEST_F(Receiver, AnswersEveryInput) {
     }
 }
 
-// A terminal of a number of columns, which passes on what is written to it.
+// A terminal with so many columns, which passes on what is written to it.
 struct Terminal {
     explicit Terminal(unsigned short columns) {
         termios raw{};
@@ -556,7 +556,7 @@ struct Terminal {
             file = fdopen(program, "w");
         }
     }
-    // Closes the program's end, and returns what is left to read.
+    // Closes the program's end and returns what is left to read.
     std::string Finish() const {
         std::fclose(file);
         std::string text;
@@ -602,7 +602,7 @@ TEST_F(Receiver, ReportsAReadError) {
     NoteProgram({"-"});
 }
 
-// No program writes to the pipe, and the user, who sees this, gives up half a second later.
+// No program writes to the pipe, so the user gives up after half a second.
 TEST_F(Receiver, StopsWhileItWaits) {
     ASSERT_EQ(mkfifo(Path("pipe").c_str(), 0600), 0);
     std::atomic<bool> stop{false};
@@ -620,10 +620,10 @@ TEST_F(Receiver, StopsWhileItWaits) {
                                     EndsWith("\r0 MB\r\r    \r")));
 }
 
-// Fills the registry of a family, and frees a place for each run until a run has all that it needs.
+// Fills a family's registry, then frees one place after each run until a run has all it needs.
 TEST_F(Receiver, FreesItsObjects) {
     Show(TestFile("sample.ts"), "SAMPLE");
-    // The first run lets the library make the mutex of its threads.
+    // During the first run the library creates the mutex that guards its threads.
     const std::string expected = RunProgram({"--json", TestFile("sample.ts")});
     for (const Family &family : kFamilies) {
         std::vector<int32_t> fillers = family.Fill();
@@ -641,7 +641,7 @@ TEST_F(Receiver, FreesItsObjects) {
     }
 }
 
-// A capture has the packets that the tables come from. It is a stream with the same tables.
+// A capture has the packets that carry tables, so it is a stream with the same tables.
 TEST_F(Receiver, Captures) {
     Show(TestFile("sample.ts"), "SAMPLE");
     const std::string captured = Path("captured.ts");
@@ -661,7 +661,7 @@ TEST_F(Receiver, Captures) {
     EXPECT_EQ(NoteProgram({"--json", "--capture", "/dev/full", TestFile("sample.ts")}), first) << "it read no further";
 }
 
-// On a damaged stream too, the program's threads give the report that one thread gives.
+// Even if the stream is damaged, the program's threads report what a single thread does.
 TEST_F(Receiver, SurvivesDamage) {
     std::mt19937 random(20240615);
     for (int round = 0; round < 15; ++round) {

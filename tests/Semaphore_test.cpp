@@ -24,7 +24,7 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
     EXPECT_EQ(VarnekPGL_GetMutexByName("one"), -1);
     EXPECT_EQ(VarnekPGL_CreateMutex("one"), 3);
     NOTE(VarnekPGL_CreateMutex)("one");
-    // Handles that share a place among the lookup's hints.
+    // So many that some share a place among the hints for looking them up.
     for (int handle = 5; handle < 300; handle++) {
         EXPECT_EQ(VarnekPGL_CreateMutex("again"), handle);
     }

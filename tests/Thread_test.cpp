@@ -138,7 +138,7 @@ TEST_F(Thread, ALogFunctionGetsNoThreadWhileItsOwnCallMakesTheGuard) {
 }
 
 TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
-    // Every thread has time to find that there is no guard yet.
+    // The pause lets every thread find that there is no guard yet.
     gLogHook = [](const LogLine &line) {
         if (line.text.find("START : __Varnek_create_mutex") != std::string::npos) {
             std::this_thread::sleep_for(std::chrono::milliseconds(20));
@@ -156,7 +156,7 @@ TEST_F(Thread, FirstCreationsAtOnceMakeOneGuard) {
 
 #if defined(__OPTIMIZE__) && !defined(VARNEK_SANITIZED)
 
-// Measures the bytes of its stack that a thread uses for `work`, including the log function of this program.
+// Returns how many bytes of stack `work` uses, including those of this program's log function.
 size_t StackOf(void (*work)()) {
     constexpr size_t kSize = 262144;
     static char stack[kSize] __attribute__((aligned(4096)));

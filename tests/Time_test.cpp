@@ -1,4 +1,4 @@
-// Compares the calendar with the C library's, spans and comparisons with their definition, and reads a clock that the
+// Compares the calendar with the C library's, spans and comparisons with their definitions, and reads a clock that the
 // tests set.
 #include "Varnek_Time.h"
 

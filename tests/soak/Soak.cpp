@@ -1,6 +1,6 @@
-// Eight threads use the library at random as the modules of a running stack do, for as many seconds as the first
-// argument gives. Each operation's result is compared with what the threads know of each other. At the end no message,
-// no trace and no place in a table is missing.
+// Eight threads use the library at random, as the modules of a running stack do, for as many seconds as the first
+// argument says. They compare each result with what they know of each other, and in the end no message, no trace and
+// no place in a table may be missing.
 #include <sys/resource.h>
 
 #include <atomic>
@@ -33,7 +33,7 @@ std::atomic<int64_t> gTraces{0}, gLines{0};
 int32_t gMutex, gSemaphore;
 int64_t gGuarded = 0;
 
-// The content of a message. `number` counts the messages from one thread to another one.
+// What a message carries. `number` counts the messages from one thread to another.
 struct Message {
     int64_t number;
     int32_t from;
@@ -61,14 +61,14 @@ struct Worker {
 };
 Worker gWorkers[kThreads];
 
-// The maker of each handle, by the handle's last bits: the handle and, in three bits, the worker.
+// Who made each handle, found by the handle's last bits: the handle and, in three bits, the worker.
 std::atomic<int64_t> gMakers[3][4096];
 
 void SetMaker(int family, int32_t handle, const Worker &maker) {
     CHECK(handle > 0 && gMakers[family][handle % 4096].exchange(int64_t{handle} * 8 + maker.index) / 8 != handle);
 }
 
-// The handle that another thread's name has at the moment, or -1. It is never the handle of another name.
+// Returns the handle that another thread's name has at the moment, or -1, but never the handle of another name.
 int32_t LookUp(int family, int32_t (*find)(const char *), const Worker &maker, char kind) {
     const int32_t handle = find(maker.Name(kind).c_str());
     if (handle != -1) {
@@ -135,7 +135,7 @@ void UseOwnObjects(Worker &me) {
     CHECK(VarnekPGL_GetMutexByName(name.c_str()) == -1 && VarnekPGL_AcquireMutex(mutex) == FALSE);
 }
 
-// One start of a timer. It outlives a late callback.
+// One start of a timer, kept for callbacks that come late.
 struct Start {
     std::atomic<Clock::time_point> due;
     std::atomic<int64_t> timer;  // as the worker counts its timers
@@ -143,8 +143,8 @@ struct Start {
 };
 Start gStarts[kThreads][1024];
 
-// It is never called before its start is due. Half of the callbacks use their own timer, but not after its deletion:
-// the handle may belong to another worker's timer by then.
+// Must not be called before its start is due. Half of the callbacks use their own timer, unless it has been deleted,
+// because its handle may belong to another worker's timer by then.
 void OnTimer(uint32_t timer, void *userData) {
     const Start &start = *static_cast<Start *>(userData);
     CHECK(Clock::now() >= start.due.load());
@@ -162,7 +162,7 @@ void UseTimer(Worker &me) {
     CHECK(timer >= 0 && VarnekPGL_GetTimerByName(name.c_str()) == timer);
     const uint32_t handle = static_cast<uint32_t>(timer);
     const bool mine = me.index % 2 != 0;
-    // Short starts may be expiring while they are cancelled.
+    // The short ones may be expiring while they are cancelled.
     for (uint32_t timeout : {1u, 20u, 1u + static_cast<uint32_t>(me.Below(3))}) {
         Start &start = gStarts[me.index][me.starts++ % 1024];
         start.worker = &me;
@@ -202,13 +202,13 @@ void UseRing(Worker &me) {
     CHECK(own.GetDistance() == 0);
 }
 
-// Receives until its record is gone. Each message was sent to this record, and they come in order.
+// Receives until its record is gone. Every message must have been sent to this record, and come in order.
 void *ReceiveAll(void *argument) {
     Worker &parent = *static_cast<Worker *>(argument);
     const int32_t self = VarnekPGL_GetCurrentThread();
     int64_t next[kThreads] = {};
     Message message;
-    // A removed thread has no handle. It may have been removed before it asks for it.
+    // The thread has no handle if its record was removed before it could ask.
     while (self != -1 && varnek::Receive(message) == varnek::Outcome::kSuccess) {
         CHECK(message.urgent == self && message.number == next[message.from]++);
         ++parent.taken;
@@ -255,8 +255,8 @@ void Trace(Worker &me) {
     VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_GINGA, "soak %d%*c", me.index, 900, '.');
 }
 
-// Half of the time all threads act as modules do. The other half is a storm: half of the threads only create and
-// delete, and the others only look for these objects.
+// Half of the time, all threads act as modules do. The rest is a storm, in which half of the threads only create and
+// delete, while the others look for those objects.
 void *Work(void *argument) {
     Worker &me = *static_cast<Worker *>(argument);
     while (gReady == 0) {
@@ -289,7 +289,7 @@ void *Work(void *argument) {
     return nullptr;
 }
 
-// Describes the room in each registry beside the living objects.
+// Says how many more objects each registry has room for.
 std::string RoomInTables() {
     std::string room;
     for (const Family &family : kFamilies) {

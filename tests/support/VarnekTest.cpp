@@ -90,7 +90,7 @@ void VarnekTest::Note(const std::string &call, const std::string &result) {
             text += std::regex_replace(line.Body(), std::regex("\n"), "\\n") + "\n";
         }
     }
-    // A letter that is repeated very often is followed by the number.
+    // A letter that is repeated many times is shown once, with the number.
     for (size_t at = 0; at < text.size(); ++at) {
         const char letter = text[at];
         const size_t count = std::min(text.find_first_not_of(letter, at), text.size()) - at;
