@@ -87,6 +87,13 @@ void RegisterAll() {
             SignalWait(state, Make<varnek::Semaphore>(count, 1u).back().Handle());
         });
     }
+    bench::Add("mutex/scoped:calls", OwnMutex);
+    bench::Add("mutex/scoped:ours", [](benchmark::State &state) {
+        varnek::Mutex mutex(Name(0), varnek::Existing::kReplace);
+        for (auto _ : state) {
+            const std::lock_guard<varnek::Mutex> hold(mutex);
+        }
+    });
     bench::Add("mutex/last:bare", BareMutex);
     bench::Add("semaphore/last:bare", BareSemaphore);
     bench::Add("mutex/two:ours", OwnMutex)->Threads(2);

@@ -33,6 +33,19 @@ class Ours {
     int32_t handle_ = -1;
 };
 
+// The same calls through the C++ layer.
+class Typed {
+  public:
+    void GiveTo(int32_t handle) { handle_ = handle; }
+    bool Send(const THREAD_MSG &message) { return varnek::Send(handle_, message); }
+    bool Receive(THREAD_MSG *message) {
+        return varnek::Receive(*message) == varnek::Outcome::kSuccess;
+    }
+
+  private:
+    int32_t handle_ = -1;
+};
+
 // Two blocks of memory for each message, a list, a mutex and a semaphore.
 class Bare {
   public:
@@ -206,6 +219,8 @@ void RegisterAll() {
 #endif
     bench::Add("message/queued:ours", SameThread<Ours, 1000000>);
     bench::Add("message/queued:empty", SameThread<Ours>);
+    bench::Add("message/typed:ours", SameThread<Typed>);
+    bench::Add("message/typed:calls", SameThread<Ours>);
 }
 
 }  // namespace

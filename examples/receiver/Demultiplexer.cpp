@@ -203,7 +203,8 @@ void Demultiplexer::FollowNames(const unsigned char *section, size_t size) {
     if (is_pat) {
         ParsePat(section, size, header, naming.programs);
     } else {
-        for (const Component &component : ParsePmt(fields).components) {
+        const ProgramMap map = ParsePmt(fields);
+        for (const Component &component : map.components) {
             if (component.IsAit()) {
                 naming.programs.push_back({header.extension, component.pid});
             }
