@@ -1,4 +1,4 @@
-// What a bit stream logs and owns, and one without a source. fuzz/bit_stream.cpp compares the operations with a model.
+// What a bit stream logs and owns, and how one without a source behaves. fuzz/bit_stream.cpp compares it with a model.
 #include "Varnek_CBitInputStream.h"
 
 #include <memory>
@@ -7,8 +7,7 @@
 
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using ::testing::ElementsAre, ::testing::IsEmpty;
 
 class BitInputStream : public VarnekTest {};
 

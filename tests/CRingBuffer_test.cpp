@@ -13,8 +13,7 @@
 
 namespace {
 
-using ::testing::IsEmpty;
-using ::testing::SizeIs;
+using ::testing::IsEmpty, ::testing::SizeIs;
 
 class RingBuffer : public VarnekTest {
   protected:
@@ -74,8 +73,8 @@ TEST_F(RingBuffer, EveryRefusalHasItsLine) {
     Noting("Flush", [&] { return ring.Flush(); })();
     reset(0);
     reset(8);
-    // States that no operation leaves behind: an overflow, an underflow within a lap and, where the loop counts wrap
-    // around, over laps, and one lap too many. The distances are those before, after writing and after reading.
+    // States that no operation leaves behind: an overflow, an underflow within a lap, one over laps where the loop
+    // counts wrap around, and one lap too many. The distances are those at first, after writing and after reading.
     const struct {
         int w, r, wl, rl, distance, written, read;
     } states[] = {{3, 2, 1, 0, 112, 0, 0},

@@ -4,7 +4,6 @@
 #include <cstring>
 #include <memory>
 #include <optional>
-#include <random>
 
 #include "support/VarnekTest.h"
 

@@ -1,7 +1,6 @@
 // Loading well-formed and hostile configuration files, saving, and where the nation comes from.
 #include "Varnek_Config.h"
 
-#include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -9,7 +8,6 @@
 #include <array>
 #include <cstring>
 #include <filesystem>
-#include <functional>
 
 #include "support/VarnekTest.h"
 
@@ -17,12 +15,16 @@ namespace {
 
 class ConfigAlone : public VarnekTest {
   protected:
-    // Loads this content, saves the settings and returns the saved file.
+    // Loads this content, saves the settings and returns what was saved.
     static std::string Reloaded(const std::string &content) {
         WriteAll(kSettingsFile, content);
         VarnekCfg_LoadConfigFile();
         VarnekCfg_SaveConfigFile();
         return ReadAll(kSettingsFile);
+    }
+    void SetArea(const std::string &name) {
+        memset(info_.currentAreaName, 0, sizeof info_.currentAreaName);
+        name.copy(info_.currentAreaName, sizeof info_.currentAreaName - 1);
     }
     VarnekConfigInfo &info_ = *VarnekCfg_GetConfigInfo();
 };
@@ -102,7 +104,8 @@ TEST_F(ConfigAlone, AnUnreadableFileLeavesTheSettings) {
     };
     for (const auto &make : makers) {
         make();
-        NOTE(VarnekCfg_LoadConfigFile)();
+        VarnekCfg_LoadConfigFile();
+        EXPECT_EQ(TakeBodies().back(), "  VarnekCfg_LoadConfigFile : Cannot Read Config File!");
         EXPECT_EQ(info_.cprmPlayerDelay, 68);
         std::filesystem::remove(kSettingsFile);
     }
@@ -172,10 +175,6 @@ TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
 }
 
 TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
-    const auto area = [this](char letter, size_t length) {
-        memset(info_.currentAreaName, 0, sizeof info_.currentAreaName);
-        memset(info_.currentAreaName, letter, length);
-    };
     const auto saveLimited = [](rlim_t size) {
         const FileSizeLimit limit(size);
         VarnekCfg_SaveConfigFile();
@@ -185,13 +184,13 @@ TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
             for (rlim_t limit = 0; limit < 260; limit += 13) {
                 std::filesystem::remove(kSettingsFile);
                 std::filesystem::remove(Path("second name"));
-                area('a', oldLength);
+                SetArea(std::string(oldLength, 'a'));
                 VarnekCfg_SaveConfigFile();
                 const std::string before = ReadAll(kSettingsFile);
                 if (inPlace) {
                     std::filesystem::create_hard_link(kSettingsFile, Path("second name"));
                 }
-                area('b', 50);
+                SetArea(std::string(50, 'b'));
                 saveLimited(limit);
                 const std::string after = File(std::string(50, 'b'), 2, 0, 0, 68, "");
                 EXPECT_EQ(ReadAll(kSettingsFile), limit < after.size() ? before : after) << limit;
@@ -207,14 +206,13 @@ TEST_F(ConfigAlone, AMediumThatIsFullLeavesTheOldText) {
 TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
     WriteAll(kDebugFile, "# off");
     VarnekPGL_InitializeDebug();
-    const auto save = [this](char letter) {
-        memset(info_.currentAreaName, 0, sizeof info_.currentAreaName);
-        memset(info_.currentAreaName, letter, static_cast<size_t>(letter - 'a' + 1) * 10);
+    const auto areaOf = [](char letter) { return std::string(static_cast<size_t>(letter - 'a' + 1) * 10, letter); };
+    const auto save = [&](char letter) {
+        SetArea(areaOf(letter));
         VarnekCfg_SaveConfigFile();
     };
-    const auto isWhole = [](const std::string &text) {
-        const char letter = text[strlen("CONFIG_CURRENTAREANAME=")];
-        return text == File(std::string(static_cast<size_t>(letter - 'a' + 1) * 10, letter), 2, 0, 0, 68, "");
+    const auto isWhole = [&](const std::string &text) {
+        return text == File(areaOf(text[strlen("CONFIG_CURRENTAREANAME=")]), 2, 0, 0, 68, "");
     };
     const auto fork2 = [](const auto &work) {
         std::array<pid_t, 2> children;
@@ -244,7 +242,7 @@ TEST_F(ConfigAlone, SavesAtOnceThatAreKilledLeaveEitherText) {
         }
         EXPECT_TRUE(isWhole(ReadAll(kSettingsFile)));
     }
-    // So is a draft that an earlier process with this id left behind.
+    // Drafts are removed, even one that an earlier process with this id left behind.
     WriteAll(VARNEK_DATA_DIR "Varnek_Config.new." + std::to_string(getpid()) + ".57", "left");
     save('a');
     for (const auto &entry : std::filesystem::directory_iterator(VARNEK_DATA_DIR)) {

@@ -37,7 +37,7 @@ TEST_F(LngPack, Latin15BecomesUtf8) {
     EXPECT_STREQ(text, "€€€€");
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4", UINT32_MAX), TRUE);
     EXPECT_STREQ(text, "€");
-    // A character of two bytes and one that is left out, at each place of a run of ASCII.
+    // A character of two bytes and one that is left out, at each place in a run of ASCII.
     for (size_t at = 0; at < 20; ++at) {
         std::string latin(22, 'a'), utf8(20, 'a');
         latin.replace(at, 2, "\xE9\x1B");
@@ -109,11 +109,11 @@ TEST_F(LngPack, FailuresAreNamed) {
     char *text = nullptr;
     NOTE(WmConvertLatin15Code2PCode)(nullptr, 4, "a");
     NOTE(WmConvertLatin15Code2PCode)(units, 4, "12345");
-    NOTE(WmConvertLatin15Code2PCode)(units, 5, "12345");
+    EXPECT_EQ(WmConvertLatin15Code2PCode(units, 5, "12345"), TRUE);
     NOTE(__WmLngUnicode2UTF)(nullptr, abc, 3);
     NOTE(__WmLngUnicode2UTF)(bytes, nullptr, 3);
     NOTE(__WmLngUnicode2UTF)(bytes, abc, 0);
-    NOTE(WmConvertPCode2UTF)(bytes, abc, 0);
+    EXPECT_EQ(WmConvertPCode2UTF(bytes, abc, 0), TRUE);
     EXPECT_STREQ(bytes, "");
     NOTE(WmConvert2LCode)(bytes, nullptr);
     TakeLog();
@@ -125,9 +125,9 @@ TEST_F(LngPack, FailuresAreNamed) {
     NOTE(WmConvertUTF2PCode)(units, 8, nullptr, 1);
     NOTE(WmConvertUTF2PCode)(units, 4, "abc", 3);
     NOTE(WmConvertUTF2PCode)(units, 6, "abc", 3);
-    NOTE(WmConvertUTF2PCode)(units, 0, "abc", 0);
+    EXPECT_EQ(WmConvertUTF2PCode(units, 0, "abc", 0), TRUE);
     EXPECT_EQ(units[0], 0);
-    NOTE(__WmLngStrlenByByte)("abc", 0);
+    EXPECT_EQ(__WmLngStrlenByByte("abc", 0), 2);
     NOTE(VarnekPGL_ConvertLatin15toUTF8)(&text, nullptr, 1);
 }
 

@@ -1,4 +1,4 @@
-// Compares the calendar with the C library's, spans and comparisons with their definition, and reads a clock that the
+// Compares the calendar with the C library's, spans and comparisons with their definitions, and reads a clock that the
 // tests set.
 #include "Varnek_Time.h"
 
@@ -7,15 +7,12 @@
 #include <array>
 #include <cstring>
 #include <ctime>
-#include <random>
 
 #include "support/VarnekTest.h"
 
 namespace {
 
-using ::testing::ElementsAre;
-using ::testing::IsEmpty;
-using ::testing::SizeIs;
+using ::testing::ElementsAre, ::testing::IsEmpty, ::testing::SizeIs;
 
 time_t gNow = -1;  // the clock's time if a test set it, or else -1
 

@@ -3,10 +3,6 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
-#include <atomic>
-#include <chrono>
-#include <thread>
-
 #include "support/VarnekTest.h"
 
 namespace {
@@ -14,7 +10,7 @@ namespace {
 using ::testing::IsEmpty;
 using Clock = std::chrono::steady_clock;
 
-// The traces of a callback.
+// What a callback has seen.
 struct Expiries {
     std::atomic<int> count{0};
     std::atomic<uint32_t> timer{99};
@@ -101,7 +97,7 @@ TEST_F(Timer, ACancelledStartNeverCallsBack) {
 TEST_F(Timer, EachStartCallsBackOnceHoweverLateItsDelivery) {
     VarnekPGL_CreateTimer("timer");
     for (const bool cancelled : {false, true}) {
-        // The first delivery waits for the second start.
+        // The first delivery is held up until the second start has been made.
         static std::atomic<int> deliveries;
         static std::atomic<bool> held;
         deliveries = 0;

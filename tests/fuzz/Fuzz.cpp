@@ -8,7 +8,7 @@
 extern "C" int LLVMFuzzerInitialize(int *argc, char ***argv);
 extern "C" const char *__asan_default_options();
 
-// Freed memory waits in a small quarantine. Blocks are small here, and cold memory costs a third of a run.
+// A small quarantine for freed memory, because a large one, which is always cold, takes a third of a run.
 const char *__asan_default_options() { return "quarantine_size_mb=1:malloc_context_size=8"; }
 
 void WriteInPlace(const char *path, const std::string &content) {

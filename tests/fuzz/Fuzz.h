@@ -1,5 +1,5 @@
-// The fuzz targets' common parts: the input taken apart, and the library's files. Every trace is on, so that its
-// formatting is part of the run.
+// What the fuzz targets share: taking the input apart and writing the library's files. Every trace is on, so a run
+// also formats them all.
 #ifndef VARNEK_TESTS_FUZZ_FUZZ_H
 #define VARNEK_TESTS_FUZZ_FUZZ_H
 
@@ -29,7 +29,7 @@ class Input {
         const int byte = Byte();
         return byte != 128 ? (byte < 128 ? byte : byte - 256) : static_cast<int>(uint32_t{Byte()} << 24 | Byte());
     }
-    // Up to `limit` bytes, in a block of exactly their size, so that a sanitizer sees an access behind it.
+    // Up to `limit` bytes, in a block of exactly their size, so a sanitizer notices a read past them.
     template <typename Char = uint8_t>
     std::vector<Char> Bytes(size_t limit = SIZE_MAX) {
         const size_t count = left_ < limit ? left_ : limit;

@@ -1,5 +1,4 @@
-// Replaces libFuzzer where a target is one of the tests. Such a build may have another compiler, processor or
-// sanitizer.
+// Stands in for libFuzzer where a fuzz target is run as a test, whatever the compiler, processor or sanitizer.
 //   fuzz_TARGET CORPUS COUNT    runs the corpus, then COUNT inputs made of it, which are the same in each run
 #include <algorithm>
 #include <filesystem>
@@ -20,7 +19,7 @@ std::mt19937 gRandom(188);
 
 size_t Below(size_t limit) { return gRandom() % limit; }
 
-// Replaces a part by one of another input or by noise, and now and then changes several bytes.
+// Replaces a part with one of another input or with noise, and now and then changes several bytes.
 Bytes Mutated(Bytes input, const Bytes &other) {
     const size_t begin = Below(input.size() + 1);
     const size_t end = begin + Below(input.size() - begin + 1);
@@ -58,7 +57,7 @@ int main(int argc, char **argv) {
         corpus.emplace_back(std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>());
         Run(corpus.back());
     }
-    // Now and then an input joins the corpus, so that later ones move away from it.
+    // Now and then an input joins the corpus, so later ones stray further from it.
     for (int left = atoi(argv[2]); left > 0; --left) {
         Bytes input = Mutated(corpus[Below(corpus.size())], corpus[Below(corpus.size())]);
         Run(input);

@@ -95,7 +95,7 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     VarnekCBitInputStream stream(source.data(), static_cast<unsigned int>(source.size()), mode % 2);
     while (!input.Empty()) {
         const int kind = input.Below(10);
-        // The model takes a step for each bit. It knows no place beyond 32 bits, and no caller needs one.
+        // The model takes one step per bit, so counts stay small.
         const int count = input.Int() % 4096;
         if (kind == 9) {
             stream = VarnekCBitInputStream(stream);

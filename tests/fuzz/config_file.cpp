@@ -1,5 +1,5 @@
-// The configuration file: any text loads, and saving the loaded record and loading it again changes nothing. The text
-// of the feature store follows a 0.
+// The configuration file: any text loads, and saving the settings and loading them again changes nothing. After a 0
+// comes what the feature store says.
 #include <cstring>
 
 #include "Fuzz.h"

@@ -1,5 +1,5 @@
-// The debug configuration: with any text, the traces of some levels and some modules are on. The load's report shows as
-// many. A comment at the end changes nothing.
+// The debug configuration: any text turns on some levels and some modules, as many as the report of loading it shows,
+// and a comment at its end changes nothing.
 #include <cstring>
 #include <map>
 
@@ -20,7 +20,7 @@ void OnLog(int, const char *tag, const char *text) {
     }
 }
 
-// Loads a text, tries all traces, and counts those of each level and of each module that reach the log.
+// Loads a text, tries every trace, and counts for each level and each module how many reach the log.
 Masks Load(const std::string &text) {
     WriteInPlace(kDebugFile, text);
     gShown = 0;

@@ -1,7 +1,7 @@
 // The example receiver from bytes to JSON: one stream, fed whole and in pieces, gives one report, its counters add up,
 // its text is fit for JSON, and no line of the summary is too wide. An input whose first byte is even is a stream. Any
-// other input is a list of sections {PID, length, bytes}. They get their lengths and CRCs and are put into packets, so
-// that a run gets past these checks.
+// other input is a list of sections {PID, length, bytes}, which are given their lengths and CRCs and put into packets,
+// so that they pass those checks.
 #include <numeric>
 
 #include "BroadcastText.h"
@@ -33,7 +33,7 @@ Bytes StreamOf(Input &input) {
     return writer.Stream();
 }
 
-// Checks for well-formed UTF-8 without control characters other than line feeds. Such a text decodes to itself.
+// Whether a text is well-formed UTF-8 without control characters but line feeds, and so decodes to itself.
 bool IsText(const std::string &text) { return receiver::ToUtf8("\x15" + text) == text; }
 
 bool FitsWidth(const std::string &text, size_t width) {

@@ -1,4 +1,4 @@
-// The ring buffer: a sequence of operations, compared with a model of the bytes that were written last.
+// The ring buffer: a sequence of operations, compared with a model that keeps the bytes written last.
 #include <algorithm>
 #include <cstdio>
 #include <deque>
@@ -66,7 +66,7 @@ struct RingModel {
     }
 };
 
-// Zeroes the storage of an empty ring, since a seek makes bytes readable that were never written.
+// Zeroes the storage of an empty ring, since seeking makes bytes readable that were never written.
 void Zero(VarnekCRingBuffer &ring, int size) {
     const std::vector<unsigned char> zeros(static_cast<size_t>(size));
     CHECK(ring.Write(zeros.data(), size) == 0 && ring.Flush() == 0);

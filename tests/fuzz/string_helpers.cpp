@@ -1,4 +1,4 @@
-// The helpers on NUL-terminated strings, compared with the C and the C++ library. Texts are in blocks of exactly their
+// The helpers for NUL-terminated strings, compared with the C and C++ libraries. Texts are in blocks of exactly their
 // size.
 #include <algorithm>
 #include <cstring>

@@ -1,5 +1,5 @@
-// UTF-8 to units and back: the decoded units fit exactly the room that was asked for, and their encoding decodes to the
-// same units.
+// UTF-8 to units and back: the units need exactly the room that was announced, and encoding and decoding them again
+// changes nothing.
 #include <algorithm>
 
 #include "Fuzz.h"

@@ -1,6 +1,6 @@
-// Eight threads use the library at random as the modules of a running stack do, for as many seconds as the first
-// argument gives. Each operation's result is compared with what the threads know of each other. At the end no message,
-// no trace and no place in a table is missing.
+// Eight threads use the library at random, as the modules of a running stack do, for as many seconds as the first
+// argument says. They compare each result with what they know of each other, and in the end no message, no trace and
+// no place in a table may be missing.
 #include <sys/resource.h>
 
 #include <atomic>
@@ -13,12 +13,15 @@
 #include <thread>
 
 #include "Varnek_CRingBuffer.h"
-#include "Varnek_Debug.h"
+#include "Varnek_Tasking.h"
 #include "support/Check.h"
 #include "support/Families.h"
 #include "support/Platform.h"
 
 namespace {
+
+using namespace std::chrono_literals;
+using Clock = std::chrono::system_clock;
 
 constexpr int kThreads = 8;
 constexpr int kUnits = 3;  // of the shared semaphore
@@ -30,21 +33,14 @@ std::atomic<int64_t> gTraces{0}, gLines{0};
 int32_t gMutex, gSemaphore;
 int64_t gGuarded = 0;
 
-// The content of a message. `number` counts the messages from one thread to another one.
+// What a message carries. `number` counts the messages from one thread to another.
 struct Message {
     int64_t number;
     int32_t from;
     int32_t urgent;  // or the record that receives it
     char filled[24];
 };
-
-template <typename To, typename From>
-To As(const From &from) {
-    static_assert(sizeof(To) == sizeof from);
-    To to;
-    memcpy(&to, &from, sizeof to);
-    return to;
-}
+static_assert(sizeof(Message) == sizeof(THREAD_MSG));
 
 // What one thread did and saw. Other threads use only the atomics and the ring.
 struct Worker {
@@ -52,7 +48,7 @@ struct Worker {
     int32_t handle;
     std::mt19937 random;
     int64_t sent[kThreads], received[kThreads], urgentSent, urgentReceived;
-    int64_t peeked, locks, starts, shortLived, written, read, operations, passed;
+    int64_t locks, starts, shortLived, written, read, operations, passed;
     int32_t latest[kThreads];  // the last record of each other worker that it sent to
     std::atomic<int64_t> fired, ended, taken;
     std::mutex timerLock;
@@ -65,14 +61,14 @@ struct Worker {
 };
 Worker gWorkers[kThreads];
 
-// The maker of each handle, by the handle's last bits: the handle and, in three bits, the worker.
+// Who made each handle, found by the handle's last bits: the handle and, in three bits, the worker.
 std::atomic<int64_t> gMakers[3][4096];
 
 void SetMaker(int family, int32_t handle, const Worker &maker) {
     CHECK(handle > 0 && gMakers[family][handle % 4096].exchange(int64_t{handle} * 8 + maker.index) / 8 != handle);
 }
 
-// The handle that another thread's name has at the moment, or -1. It is never the handle of another name.
+// Returns the handle that another thread's name has at the moment, or -1, but never the handle of another name.
 int32_t LookUp(int family, int32_t (*find)(const char *), const Worker &maker, char kind) {
     const int32_t handle = find(maker.Name(kind).c_str());
     if (handle != -1) {
@@ -87,21 +83,21 @@ void Send(Worker &me) {
     const BOOL urgent = me.Below(8) == 0 ? TRUE : FALSE;
     Message message{urgent ? ++me.urgentSent : ++me.sent[to], me.index, urgent, {}};
     memset(message.filled, static_cast<char>(message.number), sizeof message.filled);
-    const auto out = As<THREAD_MSG>(message);
-    CHECK((urgent ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage)(gWorkers[to].handle, &out) == TRUE);
+    CHECK(varnek::Send(gWorkers[to].handle, message, urgent ? VarnekPGL_SendUrgentMessage : VarnekPGL_SendMessage));
 }
 
+// Takes a message if there is one. Receiving skips the permits that peeking has left behind.
 bool Receive(Worker &me, bool peek) {
-    THREAD_MSG in;
-    int32_t left = -1;
-    if ((peek ? VarnekPGL_PeekMessage(&in, &left) : VarnekPGL_ReceiveMessage(0, &in, &left)) != TRUE) {
+    Message message;
+    int32_t left = 0;
+    const bool found = peek ? VarnekPGL_PeekMessage(reinterpret_cast<THREAD_MSG *>(&message), &left) == TRUE
+                            : varnek::Receive(message, 0ms) == varnek::Outcome::kSuccess;
+    if (!found) {
         return false;
     }
-    const auto message = As<Message>(in);
     char expected[sizeof message.filled];
     memset(expected, static_cast<char>(message.number), sizeof expected);
     CHECK(left >= 0 && memcmp(message.filled, expected, sizeof expected) == 0);
-    me.peeked += peek ? 1 : 0;
     if (message.urgent) {
         ++me.urgentReceived;
     } else {
@@ -139,23 +135,19 @@ void UseOwnObjects(Worker &me) {
     CHECK(VarnekPGL_GetMutexByName(name.c_str()) == -1 && VarnekPGL_AcquireMutex(mutex) == FALSE);
 }
 
-// One start of a timer. It outlives a late callback.
+// One start of a timer, kept for callbacks that come late.
 struct Start {
-    std::atomic<int64_t> due, timer;  // as the worker counts its timers
+    std::atomic<Clock::time_point> due;
+    std::atomic<int64_t> timer;  // as the worker counts its timers
     Worker *worker;
 };
 Start gStarts[kThreads][1024];
 
-int64_t Microseconds() {
-    return std::chrono::duration_cast<std::chrono::microseconds>(std::chrono::system_clock::now().time_since_epoch())
-        .count();
-}
-
-// It is never called before its start is due. Half of the callbacks use their own timer, but not after its deletion:
-// the handle may belong to another worker's timer by then.
+// Must not be called before its start is due. Half of the callbacks use their own timer, unless it has been deleted,
+// because its handle may belong to another worker's timer by then.
 void OnTimer(uint32_t timer, void *userData) {
     const Start &start = *static_cast<Start *>(userData);
-    CHECK(Microseconds() >= start.due);
+    CHECK(Clock::now() >= start.due.load());
     Worker &worker = *start.worker;
     const int64_t nth = ++worker.fired;
     const std::lock_guard<std::mutex> guard(worker.timerLock);
@@ -170,12 +162,12 @@ void UseTimer(Worker &me) {
     CHECK(timer >= 0 && VarnekPGL_GetTimerByName(name.c_str()) == timer);
     const uint32_t handle = static_cast<uint32_t>(timer);
     const bool mine = me.index % 2 != 0;
-    // Short starts may be expiring while they are cancelled.
+    // The short ones may be expiring while they are cancelled.
     for (uint32_t timeout : {1u, 20u, 1u + static_cast<uint32_t>(me.Below(3))}) {
         Start &start = gStarts[me.index][me.starts++ % 1024];
         start.worker = &me;
         start.timer = me.timers;
-        start.due = Microseconds() + int64_t{timeout} * 1000;
+        start.due = Clock::now() + std::chrono::milliseconds(timeout);
         CHECK(VarnekPGL_StartTimer(handle, timeout, OnTimer, &start) == TRUE || !mine);
         std::this_thread::sleep_for(std::chrono::microseconds(900 + me.Below(200)));
         VarnekPGL_CancelTimer(handle);
@@ -210,16 +202,14 @@ void UseRing(Worker &me) {
     CHECK(own.GetDistance() == 0);
 }
 
-// Receives until its record is gone. Each message was sent to this record, and they come in order.
+// Receives until its record is gone. Every message must have been sent to this record, and come in order.
 void *ReceiveAll(void *argument) {
     Worker &parent = *static_cast<Worker *>(argument);
     const int32_t self = VarnekPGL_GetCurrentThread();
     int64_t next[kThreads] = {};
-    THREAD_MSG in;
-    int32_t count = 0;
-    // A removed thread has no handle. It may have been removed before it asks for it.
-    while (self != -1 && VarnekPGL_ReceiveMessage(WAIT_FOREVER, &in, &count) == TRUE) {
-        const auto message = As<Message>(in);
+    Message message;
+    // The thread has no handle if its record was removed before it could ask.
+    while (self != -1 && varnek::Receive(message) == varnek::Outcome::kSuccess) {
         CHECK(message.urgent == self && message.number == next[message.from]++);
         ++parent.taken;
     }
@@ -253,8 +243,7 @@ void UseOthers(Worker &me) {
     }
     me.latest[other.index] = thread;
     Message message{0, me.index, thread, {}};
-    for (auto out = As<THREAD_MSG>(message); VarnekPGL_SendMessage(thread, &out) == TRUE && ++message.number < 2000;) {
-        out = As<THREAD_MSG>(message);
+    while (varnek::Send(thread, message) && ++message.number < 2000) {
     }
     me.passed += message.number;
 }
@@ -266,8 +255,8 @@ void Trace(Worker &me) {
     VARNEK_TRACE(VARNEK_LEVEL_HIGH | VARNEK_MODULE_GINGA, "soak %d%*c", me.index, 900, '.');
 }
 
-// Half of the time all threads act as modules do. The other half is a storm: half of the threads only create and
-// delete, and the others only look for these objects.
+// Half of the time, all threads act as modules do. The rest is a storm, in which half of the threads only create and
+// delete, while the others look for those objects.
 void *Work(void *argument) {
     Worker &me = *static_cast<Worker *>(argument);
     while (gReady == 0) {
@@ -294,15 +283,13 @@ void *Work(void *argument) {
     while (gSenders > 0) {
         std::this_thread::yield();
     }
-    // Each peeked message leaves a signal behind, which ends a receive without a message.
-    for (int64_t empty = 0; empty <= me.peeked;) {
-        empty += Receive(me, false) ? 0 : 1;
+    while (Receive(me, false)) {
     }
     --gRunning;
     return nullptr;
 }
 
-// Describes the room in each registry beside the living objects.
+// Says how many more objects each registry has room for.
 std::string RoomInTables() {
     std::string room;
     for (const Family &family : kFamilies) {

@@ -44,7 +44,7 @@ Call &Find(const char *name) {
 std::atomic<int> gDrops{0};
 void (*gDeliver)(sigval value) = nullptr;
 
-// Routes the timer's deliveries through a function that can drop them.
+// Sends the timer's deliveries through a function that can drop them.
 sigevent *Droppable(sigevent *event) {
     gDeliver = event->sigev_notify_function;
     event->sigev_notify_function = [](sigval value) {
@@ -57,7 +57,7 @@ sigevent *Droppable(sigevent *event) {
     return event;
 }
 
-// Ends a wait with this error, or with a time-out at the moment of a signal.
+// Ends a wait with this error, or with a time-out at the moment when the semaphore is posted.
 int Missed(sem_t *semaphore, int error) {
     for (int units = 0; error == ETIMEDOUT && units == 0; sem_getvalue(semaphore, &units)) {
         usleep(100);
@@ -93,7 +93,7 @@ WRAP_POSIX(sem_init, (sem_t * s, int shared, unsigned value), s, shared, value)
 WRAP_POSIX(sem_destroy, (sem_t * s), s)
 WRAP_POSIX(sem_post, (sem_t * s), s)
 WRAP_POSIX(sem_wait, (sem_t * s), s)
-// When it is to time out, a signal comes just then.
+// If it is made to time out, it is posted at that very moment.
 WRAP(int, Missed(s, errno), sem_timedwait, (sem_t * s, const timespec *time), s, time)
 WRAP_POSIX(clock_gettime, (clockid_t clock, timespec *time), clock, time)
 WRAP_POSIX(timer_create, (clockid_t clock, sigevent *event, timer_t *id), clock, Droppable(event), id)
@@ -124,7 +124,7 @@ WRAP(char *, nullptr, strndup, (const char *text, size_t length), text, length)
 WRAP_POSIX(mkdir, (const char *path, mode_t mode), path, mode)
 WRAP(DIR *, nullptr, opendir, (const char *path), path)
 WRAP_POSIX(stat64, (const char *path, struct stat64 *info), path, info)
-// With the error 0 it succeeds, and the file has lost its name since.
+// With the error 0 it succeeds, but says that the file has lost its name since.
 WRAP(int, errno != 0 ? -1 : Nameless(__real_lstat64(p, s), s), lstat64, (const char *p, struct stat64 *s), p, s)
 WRAP_POSIX(openat, (int directory, const char *path, int flags, mode_t mode), directory, path, flags, mode)
 WRAP(DIR *, nullptr, fdopendir, (int fd), fd)

@@ -11,7 +11,7 @@ std::vector<const char *> FailingCalls();
 // returns the error. The others set errno and return null, 0 (fread, fwrite) or -1.
 void FailCall(const char *function, int nth, int error);
 
-// Whether the call that FailCall() asked for has not been made yet.
+// Returns whether the call that is to fail is still to come.
 bool IsStillToFail(const char *function);
 
 // Drops the system's next delivery of a timer's expiry; returns whether that has happened.

@@ -1,5 +1,5 @@
-// The platform of the tests, the fuzz targets and the soak. It replaces the device's log and feature store in a
-// program, and checks that each line meets the platform's contract.
+// Stands in for the device's log and feature store in tests, fuzz targets and the soak, and checks that each line keeps
+// to the platform's contract.
 #ifndef VARNEK_TESTS_SUPPORT_PLATFORM_H
 #define VARNEK_TESTS_SUPPORT_PLATFORM_H
 

@@ -20,7 +20,7 @@ namespace receiver {
 using streamwriter::Bytes;
 
 // Reads a stream in blocks of up to `block` bytes. Blocks, packets and sections are in memory of exactly their size, so
-// that the sanitizers see an access behind them.
+// a sanitizer notices a read past them.
 inline Report ReadStream(const Bytes &stream, size_t block = 4096) {
     Report report;
     TableParser parser(report.model, LanguageOf(kBrazil));

@@ -1,4 +1,4 @@
-// A ring's memory, with which a test makes a state that no operation leaves behind.
+// A ring's fields, so that a test can make a state that no operation leaves behind.
 #ifndef VARNEK_TESTS_SUPPORT_RINGFIELDS_H
 #define VARNEK_TESTS_SUPPORT_RINGFIELDS_H
 

@@ -12,6 +12,8 @@
 #include <mutex>
 #include <regex>
 
+#include "varnek_platform.h"
+
 std::atomic<void (*)(const LogLine &line)> gLogHook{nullptr};
 
 namespace {
@@ -83,12 +85,12 @@ void VarnekTest::SetUp() {
 void VarnekTest::Note(const std::string &call, const std::string &result) {
     std::string text = call + (result.empty() ? "\n" : " = " + result + "\n");
     for (const LogLine &line : TakeLog()) {
-        if (line.thread == syscall(SYS_gettid)) {
+        if (line.thread == syscall(SYS_gettid) && (notesLow_ || line.priority != VARNEK_LOG_VERBOSE)) {
             text += std::string("  ") + "??LMH?EP"[line.priority & 7] + " " + line.tag + " ";
             text += std::regex_replace(line.Body(), std::regex("\n"), "\\n") + "\n";
         }
     }
-    // A letter that is repeated very often is followed by the number.
+    // A letter that is repeated many times is shown once, with the number.
     for (size_t at = 0; at < text.size(); ++at) {
         const char letter = text[at];
         const size_t count = std::min(text.find_first_not_of(letter, at), text.size()) - at;
