@@ -57,7 +57,7 @@ TEST_F(RingBuffer, EveryRefusalHasItsLine) {
     const auto read = Noting("Read", [&](int count) { return ring.Read(bytes, count); });
     const auto reset = Noting("Reset", [&](int size) { return ring.Reset(size); });
     read(1);
-    write(5);
+    EXPECT_EQ(ring.Write(bytes, 5), 0);
     write(4);
     read(6);
     Noting("Seek", [&](int offset, int origin) { return ring.Seek(offset, origin); })(0, 3);

@@ -164,7 +164,8 @@ TEST_F(ConfigAlone, ASaveThatFailsIsTraced) {
     EXPECT_TRUE(std::filesystem::remove(kSettingsFile));
     WriteAll(kSettingsFile, "protected");
     chmod(kSettingsFile, 0444);
-    save("to a protected file");
+    VarnekCfg_SaveConfigFile();
+    EXPECT_EQ(TakeErrors().size(), 1u);
     EXPECT_EQ(ReadAll(kSettingsFile), "protected");
     std::filesystem::remove(kSettingsFile);
     const std::string data = std::filesystem::path(VARNEK_DATA_DIR).parent_path();

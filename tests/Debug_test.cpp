@@ -208,7 +208,8 @@ TEST_F(Trace, LeavesErrnoAloneAndReportsIt) {
 TEST_F(Trace, PanicNamesTheCallersPlace) {
     gszVarnekDbgFilePath = "x/Place.cpp";
     gVarnekDbgLineNum = 17;
-    NOTE(VarnekPGL_Panic)();
+    EXPECT_EQ(VarnekPGL_Panic(), TRUE);
+    EXPECT_EQ(TakeBodies("Varnek", 7), std::vector<std::string>{"#### [VarnekPanic]  File=[Place.cpp], line=[17]!\n"});
 }
 
 }  // namespace

@@ -91,7 +91,7 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_ReadFileByHandle)(writer, nullptr, 1);
     EXPECT_EQ(VarnekPGL_ReadFileByHandle(writer, buffer, 8), 0u);
     EXPECT_EQ(VarnekPGL_GetFileSizeByHandle(0), -1);
-    NOTE(VarnekPGL_CheckFile)(none);
+    EXPECT_EQ(VarnekPGL_CheckFile(none.c_str()), FALSE);
     NOTE(VarnekPGL_DeleteFile)(none);
     NOTE(VarnekPGL_WriteFile)(Path("w"), nullptr, 1);
     NOTE(VarnekPGL_AppendFile)(Path("w"), nullptr, 1);
@@ -267,7 +267,7 @@ TEST_F(Directory, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_MakeDir)(tooLong);
     NOTE(VarnekPGL_DeleteDirEx)(none + "/");
     NOTE(VarnekPGL_DeleteDirEx)(nullptr);
-    NOTE(VarnekPGL_ClearDir)(tooLong);
+    EXPECT_EQ(VarnekPGL_ClearDir(tooLong.c_str()), -1);
     NOTE(VarnekPGL_CheckDir)(none);
     NOTE(__VarnekPGL_ReadDir)(nullptr, nullptr);
     NOTE(VarnekPGL_ReadDir)(nullptr, nullptr);

@@ -534,13 +534,13 @@ TEST_F(Receiver, AnswersEveryInput) {
     }
     EXPECT_EQ(NoteProgram({Path("cut.ts"), "--json"}), ToJson(ReadStream(Raw(SampleText().substr(0, 100000)))));
     EXPECT_EQ(NoteProgram({"--json", "--", Path("-dash")}), ToJson(ReadStream(Raw(long_stream))));
-    const std::pair<const char *, const char *> outputs[] = {{"/dev/full", "w"}, {"/dev/null", "r"}};  // or closed
-    for (const auto &[path, mode] : outputs) {
+    const std::string sample = TestFile("sample.ts");
+    for (const auto &[path, mode, argument] : {std::tuple("/dev/full", "w", std::string("--version")),
+                                               {"/dev/full", "w", sample},
+                                               {"/dev/null", "r", sample}}) {  // cannot be written at all
         std::FILE *out = std::fopen(path, mode);
-        for (const Arguments &arguments : {Arguments{"--version"}, Arguments{TestFile("sample.ts")}}) {
-            Note(std::string(path) + ": ");
-            NoteProgram(arguments, out);
-        }
+        Note(path + std::string(": "));
+        NoteProgram({argument}, out);
         std::fclose(out);
     }
 }

@@ -66,11 +66,10 @@ TEST_F(Thread, ADuplicateTakesTheRecord) {
 TEST_F(Thread, AThreadFindsItselfFirstOfAll) {
     std::atomic<int> missed{0};
     for (int i = 0; i < 2000; i++) {
-        varnek::Thread worker("worker", kStack, [&missed, i] {
+        varnek::Thread("worker", kStack, [&missed, i] {
             const int32_t byName = VarnekPGL_GetThreadByName("worker");
             missed += byName == -1 || byName != VarnekPGL_GetCurrentThread() || !varnek::Send(i + 1, 'm');
-        });
-        worker.Join();
+        }).Join();
     }
     EXPECT_EQ(missed, 0);
 }
@@ -240,7 +239,7 @@ TEST_F(MessageQueue, UrgentMessagesOvertake) {
 }
 
 TEST_F(MessageQueue, APeekLeavesASignalBehind) {
-    varnek::Thread worker("worker", kStack, [] {
+    varnek::Thread("worker", kStack, [] {
         THREAD_MSG message;
         int32_t count = -1;
         EXPECT_FALSE(VarnekPGL_PeekMessage(&message, &count));
@@ -257,8 +256,7 @@ TEST_F(MessageQueue, APeekLeavesASignalBehind) {
         EXPECT_FALSE(VarnekPGL_ReceiveMessage(WAIT_FOREVER, &message, &count));
         EXPECT_THAT(TakeErrors(), ElementsAre("***** VarnekPGL_ReceiveMessage: Msg is NULL"));
         EXPECT_FALSE(VarnekPGL_ReceiveMessage(20, &message, &count));
-    });
-    worker.Join();
+    }).Join();
 }
 
 TEST_F(MessageQueue, FailuresHaveTheirLineAndResult) {
