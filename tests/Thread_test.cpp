@@ -316,30 +316,4 @@ TEST_F(MessageQueue, ALogFunctionMaySendAndReceiveBeforeTheWait) {
     gLogHook = nullptr;
 }
 
-// Each message is sent at about the moment when the first wait for it ends.
-TEST_F(MessageQueue, AMessageThatRacesWithATimeoutIsReceivedOnce) {
-    constexpr int kMessages = 500;
-    std::atomic<int> awaited{-1};
-    varnek::Thread receiver("receiver", kStack, [&awaited] {
-        int number = -1;
-        for (int expected = 0; expected < kMessages; ++expected) {
-            awaited = expected;
-            if (varnek::Receive(number, std::chrono::milliseconds(1)) == varnek::Outcome::kTimeout) {
-                ASSERT_EQ(varnek::Receive(number, std::chrono::minutes(1)), varnek::Outcome::kSuccess);
-            }
-            ASSERT_EQ(number, expected);
-        }
-        EXPECT_EQ(varnek::Receive(number, std::chrono::milliseconds(20)), varnek::Outcome::kTimeout) << number;
-    });
-    std::mt19937 random(1);
-    for (int number = 0; number < kMessages; ++number) {
-        ASSERT_TRUE(Eventually([&] { return awaited == number; }));
-        const auto due = std::chrono::steady_clock::now() + std::chrono::microseconds(850 + random() % 300);
-        while (std::chrono::steady_clock::now() < due) {
-        }
-        EXPECT_TRUE(varnek::Send(receiver.Handle(), number));
-    }
-    receiver.Join();
-}
-
 }  // namespace
