@@ -87,7 +87,13 @@ TEST_F(Timer, ACancelledStartNeverCallsBack) {
     const auto timer = static_cast<uint32_t>(VarnekPGL_CreateTimer("timer"));
     Expiries first, second;
     EXPECT_TRUE(VarnekPGL_StartTimer(timer, 30, CountExpiry, &first));
+    gLogHook = [](const LogLine &line) {  // by its last line, the family's lock is free
+        if (line.text.find("END: VarnekPGL_CancelTimer") != std::string::npos) {
+            EXPECT_FALSE(VarnekPGL_IsTimerActive(0));
+        }
+    };
     EXPECT_TRUE(VarnekPGL_CancelTimer(timer));
+    gLogHook = nullptr;
     EXPECT_TRUE(VarnekPGL_StartTimer(timer, 60, CountExpiry, &second));
     EXPECT_TRUE(Eventually([&] { return second.count == 1; }));
     EXPECT_EQ(first.count, 0);

@@ -41,18 +41,16 @@ Call &Find(const char *name) {
     abort();
 }
 
-std::atomic<int> gDrops{0};
+Call gDelivery("delivery");
 void (*gDeliver)(sigval value) = nullptr;
 
-// Sends the timer's deliveries through a function that can drop them.
+// Sends the timer's deliveries through a function that drops the one that is to fail.
 sigevent *Droppable(sigevent *event) {
     gDeliver = event->sigev_notify_function;
     event->sigev_notify_function = [](sigval value) {
-        if (gDrops > 0) {
-            --gDrops;
-            return;
+        if (!gDelivery.Fails()) {
+            gDeliver(value);
         }
-        gDeliver(value);
     };
     return event;
 }
@@ -168,9 +166,5 @@ void FailCall(const char *function, int nth, int error) {
     call.error = error;
     call.left = nth;
 }
-
-void DropDelivery() { gDrops = 1; }
-
-bool IsDeliveryDropped() { return gDrops == 0; }
 
 bool IsStillToFail(const char *function) { return Find(function).left > 0; }

@@ -8,14 +8,11 @@
 std::vector<const char *> FailingCalls();
 
 // Makes the n-th call of this function from now on fail with `error`: 1 is the next, 0 is none. A pthread function
-// returns the error. The others set errno and return null, 0 (fread, fwrite) or -1.
+// returns the error. The others set errno and return null, 0 (fread, fwrite) or -1. The function "delivery" is the
+// system's delivery of a timer's expiry, which is dropped.
 void FailCall(const char *function, int nth, int error);
 
 // Returns whether the call that is to fail is still to come.
 bool IsStillToFail(const char *function);
-
-// Drops the system's next delivery of a timer's expiry; returns whether that has happened.
-void DropDelivery();
-bool IsDeliveryDropped();
 
 #endif
