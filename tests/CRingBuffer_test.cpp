@@ -99,28 +99,6 @@ TEST_F(RingBuffer, EveryRefusalHasItsLine) {
     }
 }
 
-TEST_F(RingBuffer, LoopCountsWrapAround) {
-    VarnekCRingBuffer ring(8);
-    Fields state = FieldsOf(ring);
-    state.w = state.r = 6;
-    state.wl = state.rl = INT32_MAX;
-    SetFields(ring, state);
-    unsigned char bytes[8] = {1, 2, 3, 4};
-    EXPECT_EQ(ring.Write(bytes, 4), 0);
-    EXPECT_EQ(ring.GetSpaceReading(), 4);
-    EXPECT_EQ(ring.GetDistance(), 50);
-    EXPECT_EQ(ring.Read(bytes, 3), 0);
-    EXPECT_EQ(bytes[2], 3);
-    EXPECT_EQ(ring.GetSpaceWriting(), 7);
-    EXPECT_EQ(ring.Seek(6, SEEK_SET), 0) << "back into the lap before";
-    EXPECT_EQ(ring.GetSpaceReading(), 4);
-    EXPECT_EQ(ring.Seek(3, SEEK_CUR), 0);
-    EXPECT_EQ(ring.GetSpaceReading(), 1);
-    EXPECT_EQ(ring.Seek(3, SEEK_END), 0);
-    EXPECT_EQ(ring.Read(bytes, 3), 0);
-    EXPECT_EQ(bytes[0], 2);
-}
-
 TEST_F(RingBuffer, EachHasAMutexOfItsOwn) {
     {
         const VarnekCRingBuffer first(8), invalid(0), copy(first), second(8);
