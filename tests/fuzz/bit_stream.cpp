@@ -1,5 +1,6 @@
 // The bit stream: a sequence of operations on borrowed and copied bytes, compared with a model that moves single bits.
 #include <algorithm>
+#include <memory>
 
 #include "Fuzz.h"
 #include "Varnek_CBitInputStream.h"
@@ -9,7 +10,7 @@ namespace {
 struct BitStreamModel {
     explicit BitStreamModel(const std::vector<unsigned char> &source) : bytes(source) {}
 
-    const std::vector<unsigned char> bytes;
+    std::vector<unsigned char> bytes;
     const int size = static_cast<int>(bytes.size());
     int index = 0;     // of the current byte; `size` at the end of the stream
     int consumed = 0;  // bits of the current byte, as counted; after a rewind from inside a byte, `taken` is less
@@ -60,7 +61,8 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         return 0;
     }
     BitStreamModel model(source);
-    VarnekCBitInputStream stream(source.data(), static_cast<unsigned int>(source.size()), mode % 2);
+    const auto length = static_cast<unsigned int>(source.size());
+    auto stream = std::make_unique<VarnekCBitInputStream>(source.data(), length, mode % 2);
     while (!input.Empty()) {
         const int kind = input.Below(10);
         // The model takes one step per bit, so counts stay small.
@@ -69,27 +71,39 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         if (kind < 5) {
             const int largest[] = {1, 8 - model.consumed, 8, 16, 32};
             const uint32_t expected = model.Read(kind == 0 ? 1 : count, largest[kind], expectedFlag);
-            const uint32_t value = kind == 0   ? stream.ReadBit(flag)
-                                   : kind == 1 ? stream.GetBits(count, flag)
-                                   : kind == 2 ? stream.ReadByte(count, flag)
-                                   : kind == 3 ? stream.ReadShort(count, flag)
-                                               : stream.ReadInt(count, flag);
+            const uint32_t value = kind == 0   ? stream->ReadBit(flag)
+                                   : kind == 1 ? stream->GetBits(count, flag)
+                                   : kind == 2 ? stream->ReadByte(count, flag)
+                                   : kind == 3 ? stream->ReadShort(count, flag)
+                                               : stream->ReadInt(count, flag);
             CHECK(value == expected && flag == expectedFlag);
         } else if (kind == 5) {
             std::vector<unsigned char> bytes(static_cast<size_t>(std::max(count, 0))), expected = bytes;
-            CHECK(stream.GetByteArray(bytes.data(), count) == model.GetByteArray(expected, count));
+            CHECK(stream->GetByteArray(bytes.data(), count) == model.GetByteArray(expected, count));
             CHECK(bytes == expected);
         } else if (kind == 6) {
-            CHECK(stream.RewindBytes(count) == 0);
+            CHECK(stream->RewindBytes(count) == 0);
             model.Rewind(count);
         } else if (kind == 7) {
-            CHECK(stream.RwindToFirst() == 0);
+            CHECK(stream->RwindToFirst() == 0);
             model.index = model.consumed = model.taken = 0;
         } else if (kind == 8) {
-            stream.Skip(count);
+            stream->Skip(count);
             model.Take(count, expectedFlag);
-        } else {
-            stream = VarnekCBitInputStream(stream);
+        } else if (model.index != model.size - 1) {  // whose byte is loaded, so it could not change
+            // A copy owns its bytes if its source does.
+            auto copy = std::make_unique<VarnekCBitInputStream>(*stream);
+            if (count % 2 != 0) {
+                copy = std::make_unique<VarnekCBitInputStream>(source.data(), 1, 1);
+                *copy = *stream;
+                const VarnekCBitInputStream &same = *copy;
+                *copy = same;
+            }
+            stream = std::move(copy);
+            source.back() ^= 1;
+            if (mode % 2 == 0) {
+                model.bytes.back() ^= 1;
+            }
         }
     }
     return 0;

@@ -65,20 +65,17 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     CHECK(Sign(VarnekPGL_Strnicmp(exactA.data(), exactB.data(), radix)) ==
           Sign(strncasecmp(a.c_str(), b.c_str(), radix)));
 
-    std::string upper = a;
-    std::transform(upper.begin(), upper.end(), upper.begin(), toupper);
-    std::string lower = a;
-    std::transform(lower.begin(), lower.end(), lower.begin(), tolower);
-    std::vector<char> text = exactA;
-    CHECK(VarnekPGL_Strupr(text.data()) == upper);
-    CHECK(VarnekPGL_Strlwr(text.data()) == lower);
-
-    text = exactA;
+    const auto edited = [&exactA](auto edit) {
+        std::vector<char> text = exactA;
+        edit(text.data());
+        return std::string(text.data());
+    };
+    std::string upper = a, lower = a;
+    std::transform(a.begin(), a.end(), upper.begin(), toupper);
+    std::transform(a.begin(), a.end(), lower.begin(), tolower);
+    CHECK(edited(VarnekPGL_Strupr) == upper && edited(VarnekPGL_Strlwr) == lower);
     const std::string right = a.substr(0, a.find_last_not_of(kBlanks) + 1);
-    VarnekPGL_Strrtrim(text.data());
-    CHECK(text.data() == right);
-    text = exactA;
-    VarnekPGL_Strtrim(text.data());
-    CHECK(text.data() == right.substr(std::min(right.find_first_not_of(kBlanks), right.size())));
+    CHECK(edited(VarnekPGL_Strrtrim) == right);
+    CHECK(edited(VarnekPGL_Strtrim) == right.substr(std::min(right.find_first_not_of(kBlanks), right.size())));
     return 0;
 }
