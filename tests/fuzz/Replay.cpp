@@ -9,8 +9,6 @@
 
 #include "Fuzz.h"
 
-extern "C" int LLVMFuzzerInitialize(int *argc, char ***argv);
-
 namespace {
 
 std::mt19937 gRandom(188);

@@ -16,20 +16,14 @@ int Sign(int value) { return (value > 0) - (value < 0); }
 void CheckNumber(uint32_t value, uint32_t radix) {
     char text[33];
     CHECK(VarnekPGL_Itoa(value, text, radix) == text);
-    if (radix >= 2 && radix <= 16) {
-        CHECK(strtoull(text, nullptr, static_cast<int>(radix)) == value && strpbrk(text, "abcdef") == nullptr);
-    } else {
-        CHECK(text[0] == '\0');
-    }
+    const int base = static_cast<int>(radix);
+    CHECK(radix < 2 || radix > 16 ? text[0] == '\0' : strtoull(text, nullptr, base) == value);
+    CHECK(std::none_of(text, text + strlen(text), islower));
     const int32_t number = static_cast<int32_t>(value);
+    const int64_t expected = radix == 10 ? int64_t{number} : int64_t{value};
     CHECK(VarnekPGL_Ltoa(number, text, radix) == text);
-    if (radix >= 2 && radix <= 36) {
-        const int64_t expected = radix == 10 ? int64_t{number} : int64_t{value};
-        CHECK(strtoll(text, nullptr, static_cast<int>(radix)) == expected &&
-              strpbrk(text, "ABCDEFGHIJKLMNOPQRSTUVWXYZ") == nullptr);
-    } else {
-        CHECK(text[0] == '\0');
-    }
+    CHECK(radix < 2 || radix > 36 ? text[0] == '\0' : strtoll(text, nullptr, base) == expected);
+    CHECK(std::none_of(text, text + strlen(text), isupper));
 }
 
 void CheckPart(const std::string &source, const char *exact, int32_t start, int32_t count) {
