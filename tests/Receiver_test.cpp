@@ -10,6 +10,7 @@
 
 #include <ctime>
 #include <limits>
+#include <sstream>
 
 #include "BroadcastText.h"
 #include "BroadcastTime.h"
@@ -33,7 +34,9 @@ class Receiver : public VarnekTest {
     Receiver() {
         std::setlocale(LC_CTYPE, "C.UTF-8");
         setenv("COLUMNS", "80", 1);
+        Show(sample_, "SAMPLE");
     }
+    const std::string sample_ = TestFile("sample.ts");
 
     // Runs the program and notes its status and messages.
     void NoteProgram(const Arguments &arguments, std::FILE *out) {
@@ -52,10 +55,9 @@ class Receiver : public VarnekTest {
 // Returns the lines of a text that are not in another one.
 std::string NewLines(const std::string &text, const std::string &other) {
     std::string lines;
-    for (size_t at = 0, end = 0; at < text.size(); at = end) {
-        end = std::min(text.find('\n', at), text.size() - 1) + 1;
-        const std::string line = text.substr(at, end - at);
-        lines += ("\n" + other).find("\n" + line) == std::string::npos ? line : "";
+    std::istringstream stream(text);
+    for (std::string line; std::getline(stream, line);) {
+        lines += ("\n" + other).find("\n" + line + "\n") == std::string::npos ? line + "\n" : "";
     }
     return lines;
 }
@@ -80,8 +82,6 @@ Bytes Numbered(unsigned first, unsigned count, const Bytes &lead = {}, const Byt
     }
     return out;
 }
-
-std::string SampleText() { return ReadAll(TestFile("sample.ts")); }
 
 TEST_F(Receiver, FindsPacketsAmongOtherBytes) {
     std::mt19937 random(47);
@@ -442,7 +442,7 @@ TEST_F(Receiver, LimitsEvents) {
 }
 
 TEST_F(Receiver, ReadsTheSample) {
-    Report report = ReadStream(Raw(SampleText()));
+    Report report = ReadStream(Raw(ReadAll(sample_)));
     Note(ToJson(report));
     const std::string usual = ToSummary(report, 80);
     Note(usual);
@@ -490,7 +490,7 @@ TEST_F(Receiver, AnswersEveryInput) {
     std::mt19937 random(20240615);
     std::string damaged;  // more than fits between two threads
     for (size_t i = 0; i < 15; ++i) {
-        damaged += SampleText();
+        damaged += ReadAll(sample_);
         for (size_t damage = i * 20; damage > 0; --damage) {
             const size_t length = random() % 10 == 0 ? random() % 1000 : 1;
             damaged.replace(damaged.size() - 2000 - random() % 290000, length, 1, static_cast<char>(random()));
@@ -502,7 +502,6 @@ TEST_F(Receiver, AnswersEveryInput) {
     WriteAll(Path("accident"), std::string(accident.begin(), accident.end()));
     Show("receiver " + std::to_string(VARNEK_VERSION_MAJOR), "receiver MAJOR");
     Show(std::string(300, 'x'), "LONG");
-    Show(TestFile("sample.ts"), "SAMPLE");
     const Arguments cases[] = {
         {},
         {"--nonsense", Path("text")},
@@ -517,17 +516,16 @@ TEST_F(Receiver, AnswersEveryInput) {
         {Path("")},
         {Path("text")},
         {Path("accident")},
-        {"--json", "--all", "--region", "5", TestFile("sample.ts")},
+        {"--json", "--all", "--region", "5", sample_},
     };
     for (const Arguments &arguments : cases) {
         NoteProgram(arguments);
     }
     EXPECT_EQ(NoteProgram({"--json", "--", Path("-dash")}), ToJson(ReadStream(Raw(damaged))))
         << "the program's threads report what a single thread does";
-    const std::string sample = TestFile("sample.ts");
     for (const auto &[path, mode, argument] : {std::tuple("/dev/full", "w", std::string("--version")),
-                                               {"/dev/full", "w", sample},
-                                               {"/dev/null", "r", sample}}) {  // cannot be written at all
+                                               {"/dev/full", "w", sample_},
+                                               {"/dev/null", "r", sample_}}) {  // cannot be written at all
         std::FILE *out = std::fopen(path, mode);
         Note(path + std::string(": "));
         NoteProgram({argument}, out);
@@ -615,15 +613,14 @@ TEST_F(Receiver, StopsWhileItWaits) {
 
 // Fills a family's registry, then frees one place after each run until a run has all it needs.
 TEST_F(Receiver, FreesItsObjects) {
-    Show(TestFile("sample.ts"), "SAMPLE");
     // During the first run the library creates the mutex that guards its threads.
-    const std::string expected = NoteProgram({"--json", TestFile("sample.ts")});
+    const std::string expected = NoteProgram({"--json", sample_});
     for (const Family &family : kFamilies) {
         std::vector<int32_t> fillers = family.Fill();
         for (bool enough = false; !enough; fillers.pop_back()) {
             const size_t room = family.Room();
             Note("With room for " + std::to_string(room) + " " + family.name + ": ");
-            const std::string out = NoteProgram({"--json", TestFile("sample.ts")});
+            const std::string out = NoteProgram({"--json", sample_});
             enough = !out.empty();
             EXPECT_EQ(out, enough ? expected : "");
             EXPECT_EQ(family.Room(), room) << "the run left objects behind";
@@ -636,14 +633,13 @@ TEST_F(Receiver, FreesItsObjects) {
 
 // A capture has the packets that carry tables, so it is a stream with the same tables.
 TEST_F(Receiver, Captures) {
-    Show(TestFile("sample.ts"), "SAMPLE");
     const std::string captured = Path("captured.ts");
     WriteAll(captured, std::string(1000000, 'x'));
     WriteAll(Path("text"), std::string(9999, 'x'));
     NoteProgram({"--capture", captured, Path("text")});
     EXPECT_EQ(ReadAll(captured).size(), 1000000u) << "a run without packets wrote a capture";
 
-    const std::string first = NoteProgram({"--json", "--quiet", "--capture", captured, TestFile("sample.ts")});
+    const std::string first = NoteProgram({"--json", "--quiet", "--capture", captured, sample_});
     const std::string again = NoteProgram({"--json", captured});
     EXPECT_EQ(TablesOf(again), TablesOf(first));
     EXPECT_THAT(again,
@@ -651,7 +647,7 @@ TEST_F(Receiver, Captures) {
 
     NoteProgram({"--capture", captured, captured});  // a stream is not overwritten
     NoteProgram({"--capture", Path(""), captured});
-    EXPECT_EQ(NoteProgram({"--json", "--capture", "/dev/full", TestFile("sample.ts")}), first) << "it read no further";
+    EXPECT_EQ(NoteProgram({"--json", "--capture", "/dev/full", sample_}), first) << "it read no further";
 }
 
 }  // namespace
