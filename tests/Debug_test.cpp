@@ -111,6 +111,8 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
     const auto load = [] { return VarnekPGL_InitializeDebug(), Enabled(TakeBodies()); };
     WriteAll(kDebugFile, "");
     EXPECT_THAT(load(), ElementsAre("Debug Configuration File Doesn't exist!\n"));
+    WriteAll(kDebugFile, "#");
+    EXPECT_THAT(load(), IsEmpty());
     for (const bool directory : {true, false}) {
         std::filesystem::remove(kDebugFile);
         EXPECT_EQ(directory ? mkdir(kDebugFile, 0777) : mkfifo(kDebugFile, 0666), 0);

@@ -4,6 +4,7 @@
 
 #include <fcntl.h>
 #include <pty.h>
+#include <sys/ioctl.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -590,25 +591,29 @@ TEST_F(Receiver, ReportsAReadError) {
     NoteProgram({"-"});
 }
 
-// No program writes to the pipe, so the user gives up after half a second.
+// No program writes to the pipe, so the user gives up as soon as the terminal says so.
 TEST_F(Receiver, StopsWhileItWaits) {
     if (Terminal(0).file == nullptr) {
         GTEST_SKIP() << "this system has no terminals";
     }
     ASSERT_EQ(mkfifo(Path("pipe").c_str(), 0600), 0);
+    const std::string shown =
+        "receiver: " + Path("pipe") + ": waiting for a program that writes to this pipe\n\r0 MB\r";
+    const Terminal err(80);
     std::atomic<bool> stop{false};
     std::thread user([&] {
-        std::this_thread::sleep_for(std::chrono::milliseconds(500));
+        EXPECT_TRUE(Eventually([&] {
+            int size = 0;
+            return ioctl(err.user, FIONREAD, &size) == 0 && size >= static_cast<int>(shown.size());
+        }));
         stop = true;
     });
-    const Terminal err(80);
     EXPECT_THAT(Written([&](std::FILE *out) {
                     EXPECT_EQ(RunReceiver({Path("pipe")}, {out, err.file, &stop}), 130);
                 }),
                 StartsWith("Stream    0 packets\n"));
     user.join();
-    EXPECT_THAT(err.Finish(), AllOf(HasSubstr("pipe: waiting for a program that writes to this pipe\n\r0 MB\r"),
-                                    EndsWith("\r0 MB\r\r    \r")));
+    EXPECT_THAT(err.Finish(), AllOf(StartsWith(shown), EndsWith("\r0 MB\r\r    \r")));
 }
 
 // Fills a family's registry, then frees one place after each run until a run has all it needs.

@@ -184,12 +184,12 @@ TEST_F(Tasking, ATimersCallablesFindNothingThatIsGone) {
     EXPECT_FALSE(varnek::Timer("timer")) << "the name is in use";
     const auto start = std::chrono::steady_clock::now();
     EXPECT_TRUE(timer.Start(19999us, &Module::Add, &module, 1, module.life));
-    EXPECT_FALSE(timer.Start(1ms, &Module::Add, &module, 2, module.life)) << "it is armed";
     EXPECT_TRUE(Eventually([&] { return module.life.use_count() == 1; }));
     EXPECT_GE(std::chrono::steady_clock::now() - start, 19ms);
     EXPECT_FALSE(timer.Cancel()) << "no start is left";
     EXPECT_TRUE(timer.Start(1h, &Module::Add, &module, 2, module.life));
     EXPECT_TRUE(timer.IsActive());
+    EXPECT_FALSE(timer.Start(1ms, &Module::Add, &module, 2, module.life)) << "it is armed";
     EXPECT_TRUE(timer.Cancel());
     EXPECT_EQ(module.life.use_count(), 1);
     EXPECT_TRUE(timer.Start(-1s, [&] { EXPECT_TRUE(timer.Start(1ms, &Module::Add, &module, 4, module.life)); }));

@@ -316,32 +316,4 @@ TEST_F(MessageQueue, ALogFunctionMaySendAndReceiveBeforeTheWait) {
     gLogHook = nullptr;
 }
 
-// Every other wait ends at about the moment when the next message comes.
-TEST_F(MessageQueue, AMessageThatRacesWithATimeoutIsReceivedOnce) {
-    constexpr int kMessages = 1000;
-    varnek::Thread receiver("receiver", kStack, [] {
-        int timeouts = 0;
-        for (int expected = 0, number = -1; expected < kMessages;) {
-            const auto limit = std::chrono::milliseconds(expected % 2 == 0 ? 1 : 60000);
-            const varnek::Outcome outcome = varnek::Receive(number, limit);
-            if (outcome == varnek::Outcome::kTimeout) {
-                ++timeouts;
-            } else {
-                ASSERT_EQ(outcome, varnek::Outcome::kSuccess);
-                ASSERT_EQ(number, expected++);
-            }
-        }
-        THREAD_MSG message;
-        int32_t count = 0;
-        EXPECT_FALSE(VarnekPGL_ReceiveMessage(20, &message, &count)) << "a message or a permit came twice";
-        EXPECT_GT(timeouts, 0);
-    });
-    std::mt19937 random(1);
-    for (int number = 0; number < kMessages; ++number) {
-        std::this_thread::sleep_for(std::chrono::microseconds(900 + random() % 200));
-        EXPECT_TRUE(varnek::Send(receiver.Handle(), number));
-    }
-    receiver.Join();
-}
-
 }  // namespace
