@@ -9,8 +9,6 @@
 
 namespace {
 
-using ::testing::IsEmpty;
-
 using Units = std::vector<unsigned short>;
 
 class LngPack : public VarnekTest {};

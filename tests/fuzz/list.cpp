@@ -39,7 +39,11 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
             : kind == 1 ? list_insertTail(&list, fresh)
             : kind < 4  ? list_insert(&list, fresh)
                         : list_insertAt(&list, position, fresh);
-            place < 0 ? free(fresh) : void(model.insert(model.begin() + std::min(place, count), fresh));
+            if (place < 0) {
+                free(fresh);
+            } else {
+                model.insert(model.begin() + std::min(place, count), fresh);
+            }
         } else if (kind < 10) {
             void *const removed = kind == 6   ? list_removeHead(&list)
                                   : kind == 7 ? list_removeTail(&list)
