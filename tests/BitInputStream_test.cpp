@@ -1,7 +1,5 @@
-// What a bit stream logs and owns, and how one without a source behaves. fuzz/bit_stream.cpp compares it with a model.
+// What a bit stream logs, and how one without a source behaves. fuzz/bit_stream.cpp compares it with a model.
 #include "Varnek_CBitInputStream.h"
-
-#include <memory>
 
 #include "support/VarnekTest.h"
 
@@ -39,27 +37,6 @@ TEST_F(BitInputStream, EveryRefusalHasItsLine) {
     for (const int count : {3, 6, -1, 9, 5, 1, 0}) {
         Noting("GetBits", [&](int bits) { return stream.GetBits(bits, flag); })(count);
     }
-}
-
-TEST_F(BitInputStream, CopiesOwnWhatTheirSourceOwns) {
-    unsigned char bytes[] = {0x12, 0x34, 0x56};
-    unsigned char flag = 1;
-    auto owner = std::make_unique<VarnekCBitInputStream>(bytes, 3u, 1);
-    VarnekCBitInputStream borrower(bytes, 3, 0), target(bytes, 3, 1), shared(bytes, 1, 1);
-    owner->ReadByte(4, flag);
-    VarnekCBitInputStream copy(*owner);
-    target = *owner;
-    const VarnekCBitInputStream &same = target;
-    target = same;
-    shared = borrower;
-    owner->ReadInt(20, flag);
-    owner.reset();
-    bytes[1] = 0xFF;
-    EXPECT_EQ(copy.ReadInt(20, flag), 0x23456u);
-    EXPECT_EQ(target.ReadInt(20, flag), 0x23456u);
-    EXPECT_EQ(borrower.ReadInt(24, flag), 0x12FF56u);
-    EXPECT_EQ(shared.ReadInt(24, flag), 0x12FF56u);
-    EXPECT_EQ(flag, 1);
 }
 
 }  // namespace

@@ -5,7 +5,6 @@
 
 #include "Varnek_Debug.h"
 
-extern "C" int LLVMFuzzerInitialize(int *argc, char ***argv);
 extern "C" const char *__asan_default_options();
 
 // A small quarantine for freed memory, because a large one, which is always cold, takes a third of a run.

@@ -11,6 +11,7 @@
 #include "support/Check.h"
 #include "support/Platform.h"
 
+extern "C" int LLVMFuzzerInitialize(int *argc, char ***argv);
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size);
 
 // Writes a file in place, since a new file each time would cost more than all the rest.

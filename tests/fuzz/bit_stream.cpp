@@ -1,5 +1,6 @@
 // The bit stream: a sequence of operations on borrowed and copied bytes, compared with a model that moves single bits.
 #include <algorithm>
+#include <memory>
 
 #include "Fuzz.h"
 #include "Varnek_CBitInputStream.h"
@@ -10,76 +11,44 @@ struct BitStreamModel {
     explicit BitStreamModel(const std::vector<unsigned char> &source) : bytes(source) {}
 
     std::vector<unsigned char> bytes;
-    int size = static_cast<int>(bytes.size());
-    int index = 0;
-    int consumed = 0;  // as counted; it differs from `taken` after a rewind from inside a byte
+    const int size = static_cast<int>(bytes.size());
+    int index = 0;     // of the current byte; `size` at the end of the stream
+    int consumed = 0;  // bits of the current byte, as counted; after a rewind from inside a byte, `taken` is less
     int taken = 0;
-    bool end = false;
 
-    static int64_t Fail(unsigned char &flag) { return flag = 0; }
-    int64_t GetBits(int num, unsigned char &flag) {
-        if (num > 8 - consumed || end || num < 0) {
-            return Fail(flag);
-        }
-        int64_t value = 0;
-        for (int i = 0; i < num; ++i, ++consumed) {
-            value = value * 2 + (bytes[static_cast<size_t>(index)] >> (7 - taken++) & 1);
-        }
-        end = consumed == 8 && index == size - 1;
-        if (consumed == 8 && !end) {
-            ++index;
-            consumed = taken = 0;
-        }
-        return value;
-    }
-    int64_t Pieces(int count, unsigned char &flag) {
-        int piece = std::min(count, 8 - consumed);
-        int64_t value = GetBits(piece, flag);
-        for (count -= piece; count > 0; count -= piece) {
-            piece = std::min(count, 8);
-            value = (value << piece & UINT32_MAX) | GetBits(piece, flag);
+    uint32_t Take(int count, unsigned char &flag) {
+        uint32_t value = 0;
+        for (; count > 0; --count) {
+            value <<= 1;
+            if (index == size) {
+                flag = 0;
+                continue;
+            }
+            value |= uint32_t{bytes[static_cast<size_t>(index)]} >> (7 - taken++) & 1;
+            if (++consumed == 8) {
+                ++index;
+                consumed = taken = 0;
+            }
         }
         return value;
     }
-    int64_t Read(int count, int largest, unsigned char &flag) {
-        return count < 0 || count > largest || end ? Fail(flag) : Pieces(count, flag);
+    uint32_t Read(int count, int largest, unsigned char &flag) {
+        return count < 0 || count > largest || index == size ? flag = 0 : Take(count, flag);
     }
-    int64_t ReadBit(unsigned char &flag) { return Read(1, 1, flag); }
-    int64_t ReadByte(int count, unsigned char &flag) { return Read(count, 8, flag); }
-    int64_t ReadShort(int count, unsigned char &flag) { return Read(count, 16, flag); }
-    int64_t ReadInt(int count, unsigned char &flag) { return Read(count, 32, flag); }
-    void Skip(int count) {
-        unsigned char flag;
-        if (count != 0 && !end) {
-            Pieces(count, flag);
+    int GetByteArray(std::vector<unsigned char> &dest, int count) {
+        if (index == size || consumed != 0 || count < 0 || count > size - index) {
+            return index == size ? VARNEK_BITS_END : consumed != 0 ? VARNEK_BITS_NOT_ALIGNED : VARNEK_BITS_TOO_FEW;
         }
-    }
-    int GetByteArray(unsigned char *dest, int count) {
-        if (end) {
-            return VARNEK_BITS_END;
-        }
-        if (consumed != 0) {
-            return VARNEK_BITS_NOT_ALIGNED;
-        }
-        if (count < 0 || count > size - index) {
-            return VARNEK_BITS_TOO_FEW;
-        }
-        std::copy_n(bytes.begin() + index, count, dest);
+        std::copy_n(bytes.begin() + index, count, dest.begin());
         index += count;
-        end = index == size;
         return 0;
     }
-    int RewindBytes(int count) {
-        const int target = (end ? size : index) - count;
-        if (target >= 0 && target < size) {
-            consumed = end ? 0 : consumed;
-            index = target;
+    void Rewind(int count) {
+        if (count <= index && index - count < size) {
+            index -= count;
             taken = 0;
-            end = false;
         }
-        return 0;
     }
-    int RwindToFirst() { return index = consumed = taken = end = 0; }
 };
 
 }  // namespace
@@ -92,31 +61,50 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         return 0;
     }
     BitStreamModel model(source);
-    VarnekCBitInputStream stream(source.data(), static_cast<unsigned int>(source.size()), mode % 2);
+    const auto length = static_cast<unsigned int>(source.size());
+    auto stream = std::make_unique<VarnekCBitInputStream>(source.data(), length, mode % 2);
     while (!input.Empty()) {
         const int kind = input.Below(10);
         // The model takes one step per bit, so counts stay small.
         const int count = input.Int() % 4096;
-        if (kind == 9) {
-            stream = VarnekCBitInputStream(stream);
-            continue;
-        }
-        const auto apply = [=](auto &target, unsigned char &flag, std::vector<unsigned char> &bytes) -> int64_t {
-            return kind == 0   ? target.ReadBit(flag)
-                   : kind == 1 ? target.GetBits(count, flag)
-                   : kind == 2 ? target.ReadByte(count, flag)
-                   : kind == 3 ? target.ReadShort(count, flag)
-                   : kind == 4 ? target.ReadInt(count, flag)
-                   : kind == 5 ? target.GetByteArray(bytes.data(), count)
-                   : kind == 6 ? target.RewindBytes(count)
-                   : kind == 7 ? target.RwindToFirst()
-                               : (target.Skip(count), int64_t{0});
-        };
-        const size_t room = kind == 5 && count > 0 ? static_cast<size_t>(count) : 0;
-        std::vector<unsigned char> bytes(room), expectedBytes(room);
         unsigned char flag = 1, expectedFlag = 1;
-        const int64_t expected = apply(model, expectedFlag, expectedBytes);
-        CHECK(apply(stream, flag, bytes) == expected && flag == expectedFlag && bytes == expectedBytes);
+        if (kind < 5) {
+            const int largest[] = {1, 8 - model.consumed, 8, 16, 32};
+            const uint32_t expected = model.Read(kind == 0 ? 1 : count, largest[kind], expectedFlag);
+            const uint32_t value = kind == 0   ? stream->ReadBit(flag)
+                                   : kind == 1 ? stream->GetBits(count, flag)
+                                   : kind == 2 ? stream->ReadByte(count, flag)
+                                   : kind == 3 ? stream->ReadShort(count, flag)
+                                               : stream->ReadInt(count, flag);
+            CHECK(value == expected && flag == expectedFlag);
+        } else if (kind == 5) {
+            std::vector<unsigned char> bytes(static_cast<size_t>(std::max(count, 0))), expected = bytes;
+            CHECK(stream->GetByteArray(bytes.data(), count) == model.GetByteArray(expected, count));
+            CHECK(bytes == expected);
+        } else if (kind == 6) {
+            CHECK(stream->RewindBytes(count) == 0);
+            model.Rewind(count);
+        } else if (kind == 7) {
+            CHECK(stream->RwindToFirst() == 0);
+            model.index = model.consumed = model.taken = 0;
+        } else if (kind == 8) {
+            stream->Skip(count);
+            model.Take(count, expectedFlag);
+        } else if (model.index != model.size - 1) {  // whose byte is loaded, so it could not change
+            // A copy owns its bytes if its source does.
+            auto copy = std::make_unique<VarnekCBitInputStream>(*stream);
+            if (count % 2 != 0) {
+                copy = std::make_unique<VarnekCBitInputStream>(source.data(), 1, 1);
+                *copy = *stream;
+                const VarnekCBitInputStream &same = *copy;
+                *copy = same;
+            }
+            stream = std::move(copy);
+            source.back() ^= 1;
+            if (mode % 2 == 0) {
+                model.bytes.back() ^= 1;
+            }
+        }
     }
     return 0;
 }

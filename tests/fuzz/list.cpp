@@ -27,48 +27,43 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     std::vector<void *> model;
     while (!input.Empty()) {
         const int kind = input.Below(12);
-        const int count = static_cast<int>(model.size());
-        int position = kind >= 4 ? input.Int() : 0;
+        const int count = list.count;
+        const int position = input.Int();
+        const int place = kind == 0 || kind == 6 ? 0 : kind < 4 ? count : kind == 7 ? count - 1 : position;
+        const bool inside = place >= 0 && place < count;
+        void *const present = inside ? model[static_cast<size_t>(place)] : nullptr;
+        CHECK(list_element(&list, place) == present);
         if (kind < 6) {
             void *const fresh = malloc(1);
-            if (kind < 4) {
-                (kind == 0 ? list_insertHead : kind == 1 ? list_insertTail : list_insert)(&list, fresh);
-            } else {
-                list_insertAt(&list, position, fresh);
-            }
-            position = kind == 0 || kind > 3 ? std::min(position, count) : count;
-            if (position < 0) {
+            kind == 0   ? list_insertHead(&list, fresh)
+            : kind == 1 ? list_insertTail(&list, fresh)
+            : kind < 4  ? list_insert(&list, fresh)
+                        : list_insertAt(&list, position, fresh);
+            if (place < 0) {
                 free(fresh);
             } else {
-                model.insert(model.begin() + position, fresh);
+                model.insert(model.begin() + std::min(place, count), fresh);
             }
-        } else if (kind == 11) {
-            if (position == 1) {
-                list_removeAll(&list);
-                model.clear();
+        } else if (kind < 10) {
+            void *const removed = kind == 6   ? list_removeHead(&list)
+                                  : kind == 7 ? list_removeTail(&list)
+                                              : list_remove(&list, position);
+            CHECK(removed == present);
+            free(removed);
+        } else if (kind == 10) {
+            list_node_t *node = list_head(&list);
+            while (node != nullptr && list_data(node) != present) {
+                node = list_next(node);
             }
-            list_insertTail(&list, nullptr);
+            list_remove_node(&list, node);
+        } else if (position == 1) {
+            list_removeAll(&list);
+            model.clear();
         } else {
-            position = kind == 6 ? 0 : kind == 7 ? count - 1 : position;
-            const bool inside = position >= 0 && position < count;
-            void *const expected = inside ? model[static_cast<size_t>(position)] : nullptr;
-            CHECK(list_element(&list, position) == expected);
-            if (kind == 10 && inside) {
-                list_node_t *node = list_head(&list);
-                for (int i = 0; i < position; ++i) {
-                    node = list_next(node);
-                }
-                list_remove_node(&list, node);
-            } else if (kind != 10) {
-                void *const removed = kind == 6   ? list_removeHead(&list)
-                                      : kind == 7 ? list_removeTail(&list)
-                                                  : list_remove(&list, position);
-                CHECK(removed == expected);
-                free(removed);
-            }
-            if (inside) {
-                model.erase(model.begin() + position);
-            }
+            list_insertTail(&list, nullptr);
+        }
+        if (inside && kind >= 6 && kind <= 10) {
+            model.erase(model.begin() + place);
         }
         CheckLinks(&list, model);
     }

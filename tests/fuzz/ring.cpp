@@ -1,4 +1,5 @@
-// The ring buffer: a sequence of operations, compared with a model that keeps the bytes written last.
+// The ring buffer: a sequence of operations, compared with a model that keeps the bytes written last. The loop counts
+// begin shortly before they wrap around.
 #include <algorithm>
 #include <cstdio>
 #include <deque>
@@ -10,32 +11,23 @@
 namespace {
 
 struct RingModel {
-    explicit RingModel(int ringSize) : size(ringSize), last(static_cast<size_t>(ringSize)) {}
+    explicit RingModel(int ringSize) { Reset(ringSize); }
 
-    int size;
+    int size = 0, unread = 0, written = 0;
     std::deque<unsigned char> last;  // the newest `size` bytes, where a ring that was never full has zeros
-    int unread = 0, written = 0;
 
-    int Flush() {
-        std::fill(last.begin(), last.end(), static_cast<unsigned char>(0));
-        return unread = written = 0;
-    }
+    int Flush() { return Reset(size); }
     int Reset(int newSize) {
         if (newSize < 1) {
             return VARNEK_RING_INVALID;
         }
-        last.resize(static_cast<size_t>(size = newSize));
-        return Flush();
+        size = newSize;
+        last.assign(static_cast<size_t>(size), 0);
+        return unread = written = 0;
     }
-    int GetSpaceReading() const { return unread; }
-    int GetSpaceWriting() const { return size - unread; }
-    int GetDistance() const { return unread * 100 / size; }
     int Write(const unsigned char *data, int n) {
-        if (n < 0 || n > size) {
-            return VARNEK_RING_INVALID;
-        }
-        if (n > size - unread) {
-            return VARNEK_RING_NO_SPACE;
+        if (n < 0 || n > size - unread) {
+            return n < 0 || n > size ? VARNEK_RING_INVALID : VARNEK_RING_NO_SPACE;
         }
         last.insert(last.end(), data, data + n);
         last.erase(last.begin(), last.begin() + n);
@@ -44,11 +36,8 @@ struct RingModel {
         return 0;
     }
     int Read(unsigned char *dest, int n) {
-        if (n < 0 || n > size) {
-            return VARNEK_RING_INVALID;
-        }
-        if (unread == 0 || n > unread) {
-            return VARNEK_RING_NO_DATA;
+        if (n < 0 || n > unread || unread == 0) {
+            return n < 0 || n > size ? VARNEK_RING_INVALID : VARNEK_RING_NO_DATA;
         }
         std::copy_n(last.end() - unread, n, dest);
         unread -= n;
@@ -78,15 +67,17 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
     Input input(data, size);
     RingModel model(input.Below(64) + 1);
     VarnekCRingBuffer ring(model.size);
-    const int32_t mutex = FieldsOf(ring).mutex;
     Zero(ring, model.size);
+    Fields state = FieldsOf(ring);
+    state.wl = state.rl = INT32_MAX - 1;
+    SetFields(ring, state);
     for (unsigned char next = 0; !input.Empty();) {
         const uint8_t kind = input.Byte();
         if (kind >= 245) {
             ring = VarnekCRingBuffer(ring);
             const VarnekCRingBuffer &same = ring;
             ring = same;
-            CHECK(FieldsOf(ring).mutex == mutex);
+            CHECK(FieldsOf(ring).mutex == state.mutex);
         }
         const int count = input.Int() % 512;
         const int operation = kind % 8;
@@ -103,8 +94,8 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         std::vector<unsigned char> expectedBytes = bytes;
         const int expected = apply(model, expectedBytes);
         CHECK(apply(ring, bytes) == expected && bytes == expectedBytes);
-        CHECK(ring.GetSpaceReading() == model.GetSpaceReading() && ring.GetSpaceWriting() == model.GetSpaceWriting());
-        CHECK(ring.GetDistance() == model.GetDistance());
+        CHECK(ring.GetSpaceReading() == model.unread && ring.GetSpaceWriting() == model.size - model.unread);
+        CHECK(ring.GetDistance() == model.unread * 100 / model.size);
         if (operation <= 1 && expected == 0) {
             Zero(ring, model.size);
         } else if (operation == 2 && kind / 8 % 4 == SEEK_SET && count == model.size) {
