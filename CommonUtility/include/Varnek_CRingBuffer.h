@@ -25,8 +25,8 @@
 ///     underflow                WL = RL, W < R; RL > WL          none           none
 ///     overflow                 WL = RL + 1, W > R; WL > RL + 1  none           none
 ///
-/// A ring whose size is invalid or whose storage cannot be allocated has size 0 and refuses
-/// everything until a Reset succeeds. Failures are traced.
+/// A ring whose size is invalid or whose storage cannot be allocated has size 0: it refuses to
+/// write, read and seek until a Reset succeeds. Failures are traced.
 ///
 /// Any number of threads may write and read one ring that has its mutex: no two writes mix, but the
 /// room that a query reported may be gone, so check the result. Reset, Flush, Seek, the queries,

@@ -41,7 +41,7 @@ static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
 
 /// Writes one line to the Android log if the configuration enables it, and preserves errno. Takes
 /// no lock once that is loaded; lines of different threads never mix.
-/// @param mask    level and module; without a module nothing is written
+/// @param mask    level and module; without either, nothing is written
 /// @param format  printf format; null shows "(null)". The text is cut to 2017 bytes, and to 2047
 ///                with the prefix
 VARNEK_API void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...)
@@ -63,7 +63,8 @@ VARNEK_API int32_t VarnekPGL_Panic(void);
 /// Returns the calling thread's errno.
 VARNEK_API int32_t VarnekPGL_SysGetLastErro(void);
 
-/// Lets every user read and write the working copies of the debug configuration and the settings.
+/// Lets every user read and write the debug configuration and the settings in the data directory,
+/// but leaves alone a link and a file that this process cannot read.
 VARNEK_API void VarnekPGL_changeModeForDebug(void);
 
 #ifdef __cplusplus

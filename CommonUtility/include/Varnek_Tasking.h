@@ -34,8 +34,8 @@ enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
 /// What becomes of an object that has the name: kReplace deletes it, unless it is a held mutex, and
 /// owns the new one; kUse never deletes, and finds or makes it in one step per shared library only.
 enum class Existing { kReplace, kUse };
-/// Milliseconds from any std::chrono duration, rounded up and kept within 0 and 49 days; only
-/// None() is for ever. Waits go by the wall clock; timers and Join do not.
+/// Milliseconds from any std::chrono duration, rounded up and kept within 0 and 49 days; only None()
+/// is for ever. Waits go by the wall clock, timers do not, and Join as std::condition_variable does.
 class Limit {
   public:
     /// From a duration, so that it can be given wherever a limit is wanted.
@@ -203,7 +203,7 @@ struct Semaphore
 };
 
 /// Sends a trivially copyable value of up to 40 bytes to a thread; with SendUrgent it overtakes all
-/// others. Returns false if the thread has no record, or there is too little memory.
+/// others. Returns false where VarnekPGL_SendMessage returns FALSE.
 template <typename Content, typename = detail::IfMessage<Content>>
 bool Send(int32_t hThread, const Content &content,
           BOOL (*send)(int32_t, const THREAD_MSG *) = VarnekPGL_SendMessage) {
