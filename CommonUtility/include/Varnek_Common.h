@@ -22,9 +22,9 @@ typedef int32_t BOOL;  ///< a truth value of 32 bits
 #endif
 
 /// Waits without limit. A wait of any other length is milliseconds by the wall clock, which a
-/// receiver sets from the broadcast: setting it forward ends waits early, setting it back prolongs them. If
-/// that matters, wait without limit and let a timer (Varnek_Timer.h), which does not follow the
-/// clock, signal or send.
+/// receiver sets from the broadcast: setting it forward ends waits early, setting it back prolongs
+/// them. If that matters, wait without limit and let a timer (Varnek_Timer.h), which does not
+/// follow the clock, signal or send.
 #define WAIT_FOREVER 0xFFFFFFFFu
 
 /// @name Levels and modules of a trace

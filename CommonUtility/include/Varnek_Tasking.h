@@ -34,8 +34,8 @@ enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
 /// What becomes of an object that has the name: kReplace deletes it, unless it is a held mutex, and
 /// owns the new one; kUse never deletes, and finds or makes it in one step per shared library only.
 enum class Existing { kReplace, kUse };
-/// Milliseconds from any std::chrono duration, rounded up and kept within 0 and 49 days; only None()
-/// is for ever. Waits go by the wall clock, timers do not, and Join as std::condition_variable does.
+/// Milliseconds from any std::chrono duration, rounded up, from 0 to 49 days; only None() is for
+/// ever. Waits go by the wall clock, timers do not, and Join as std::condition_variable does.
 class Limit {
   public:
     /// From a duration, so that it can be given wherever a limit is wanted.
