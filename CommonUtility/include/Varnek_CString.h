@@ -9,8 +9,8 @@
 #ifdef __cplusplus
 
 /// Owns a copy of a NUL-terminated text, or none: a null string, which differs from an empty one.
-/// Misuse is traced and changes nothing. Out of memory, constructing, assigning and summing give a
-/// null string, and appending changes nothing. Not thread-safe.
+/// Misuse is traced and changes nothing. If memory runs out, a string that is
+/// constructed, assigned or summed becomes null, and appending changes nothing. Not thread-safe.
 class VARNEK_API VarnekCString {
   public:
     /// Copies `text`; null gives a null string.

@@ -21,7 +21,7 @@ typedef int32_t BOOL;  ///< a truth value of 32 bits
 #define FALSE 0  ///< of a BOOL
 #endif
 
-/// Waits without limit. A wait of any other length is milliseconds by the wall clock, which a
+/// Waits without limit. Any other time-out is in milliseconds by the wall clock, which a
 /// receiver sets from the broadcast: setting it forward ends waits early, setting it back prolongs
 /// them. If that matters, wait without limit and let a timer (Varnek_Timer.h), which does not
 /// follow the clock, signal or send.

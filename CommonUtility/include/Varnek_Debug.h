@@ -27,10 +27,10 @@ static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
     __atomic_store_n(&gVarnekDbgLineNum, line, __ATOMIC_RELAXED);
 }
 
-/// Traces from the caller's file and line: one VARNEK_LEVEL_ bit or-ed with one VARNEK_MODULE_ bit,
-/// a printf format and its arguments. No line feed is added. Only the twelve module bits can be
-/// enabled, and a trace without one is dropped silently, so a new module uses the bit of the area
-/// it belongs to.
+/// Traces with the caller's file and line. The arguments are one VARNEK_LEVEL_ bit or-ed with one
+/// VARNEK_MODULE_ bit, a printf format and what it formats. No line feed is added. Only the twelve
+/// module bits can be enabled, and a trace without one is dropped silently, so a new module uses
+/// the bit of the area it belongs to.
 #define VARNEK_TRACE(mask, ...) \
     (VarnekDbg_StorePlace(__FILE__, __LINE__), VarnekPGL_TraceOut((mask), __VA_ARGS__))
 

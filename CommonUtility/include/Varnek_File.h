@@ -3,11 +3,11 @@
 /// move and change permissions.
 ///
 /// Most failures are logged at error priority under the tag "SBTVD_File", whatever the debug
-/// configuration says, and never through the trace. Not logged are streams that read or write too
-/// few bytes or have no known position or size, a null record, open flags and permissions that mean
-/// nothing, and, for large files, everything but failing opens and writes, negative descriptors and
-/// invalid seek bases. All calls are thread-safe, but only one thread at a time may use a handle. A
-/// null path fails like one that does not exist; a null buffer moves no bytes.
+/// configuration says, and never through the trace. The exceptions are streams that read or write
+/// too few bytes or have no known position or size, a null record, open flags and permissions that
+/// mean nothing, and, for large files, everything but failing opens and writes, negative
+/// descriptors and invalid seek bases. All calls are thread-safe, but only one thread at a time may
+/// use a handle. A null path fails like one that does not exist; a null buffer moves no bytes.
 /// @see [Guide: files](docs/guide/files.md)
 #ifndef VARNEK_FILE_H
 #define VARNEK_FILE_H
@@ -48,7 +48,7 @@ VARNEK_API int32_t VarnekPGL_CloseFile(PglFileHandle hFile);
 /// @return 0, even for no stream; VARNEK_FILE_INVALID_BASE for another base; -1 on failure
 VARNEK_API int32_t VarnekPGL_SeekFile(PglFileHandle hFile, int32_t offset, uint32_t base);
 
-/// Tells the position in bytes; -1 for no stream or if there is no such position.
+/// Returns the position in bytes; -1 for no stream or if there is no such position.
 VARNEK_API int32_t VarnekPGL_TellFile(PglFileHandle hFile);
 
 /// Hands buffered data to the system.
@@ -64,7 +64,7 @@ VARNEK_API uint32_t VarnekPGL_ReadFileByHandle(PglFileHandle hFile, void *buffer
 VARNEK_API uint32_t VarnekPGL_WriteFileByHandle(PglFileHandle hFile, const void *buffer,
                                                 uint32_t length);
 
-/// Tells the size of an open stream in bytes; -1 if it is not known. The position stays, but the
+/// Returns the size of an open stream in bytes; -1 if it is not known. The position stays, but the
 /// end-of-file state ends, so a reader can follow a file that grows.
 VARNEK_API int32_t VarnekPGL_GetFileSizeByHandle(PglFileHandle hFile);
 
@@ -80,7 +80,7 @@ VARNEK_API int32_t VarnekPGL_WriteFile(const char *path, const void *buffer, uin
 /// @return 0 once all bytes are stored, else -1; VARNEK_FILE_NOT_OPENED if it cannot be opened
 VARNEK_API int32_t VarnekPGL_AppendFile(const char *path, const void *buffer, uint32_t length);
 
-/// Tells a file's size in bytes; 0 if the file cannot be opened or its size is not known.
+/// Returns a file's size in bytes; 0 if the file cannot be opened or its size is not known.
 VARNEK_API int32_t VarnekPGL_GetFileSize(const char *path);
 
 /// Says whether a file can be opened for reading.
@@ -123,17 +123,17 @@ VARNEK_API int32_t VarnekPGL_WriteFileByHandle64Bits(int32_t hFile, const void *
 ///         descriptor
 VARNEK_API int32_t VarnekPGL_SeekFile64Bits(int32_t hFile, int64_t offset, uint32_t base);
 
-/// Tells the position in bytes; -1 if there is none; 0 for a negative descriptor.
+/// Returns the position in bytes; -1 if there is none; 0 for a negative descriptor.
 VARNEK_API int64_t VarnekPGL_TellFile64Bits(int32_t hFile);
 
 /// Forces data and metadata to the device.
 /// @return 0, even if that fails; -1 for a negative descriptor
 VARNEK_API int32_t VarnekPGL_FlushFile64Bits(int32_t hFile);
 
-/// Tells a file's size in bytes; 0 if the file cannot be opened or its size is not known.
+/// Returns a file's size in bytes; 0 if the file cannot be opened or its size is not known.
 VARNEK_API int64_t VarnekPGL_GetFileSize64Bits(const char *path);
 
-/// Tells an open file's size in bytes without moving the position; -1 if it is not known.
+/// Returns an open file's size in bytes without moving the position; -1 if it is not known.
 VARNEK_API int64_t VarnekPGL_GetFileSizeByHandle64Bits(int32_t hFile);
 /// @}
 /// @name Directories
@@ -217,7 +217,7 @@ VARNEK_API int32_t VarnekPGL_CopyFile(const char *source, const char *destinatio
 
 /// Moves or renames a file, replacing an existing one; into a directory it moves under its own
 /// name. Within one file system this is atomic, and so is the C library's rename, which starts no
-/// shell and is about ten times as fast.
+/// shell and is more than ten times as fast.
 /// @return 0, or -1
 VARNEK_API int32_t VarnekPGL_MoveFile(const char *source, const char *destination);
 

@@ -18,7 +18,8 @@ extern "C" {
 
 /// Converts Latin-15 to units. Control characters are dropped; the no-break space becomes a space.
 /// @param[out] pmszOutText  the units and a terminator
-/// @param outBufSize        room in units without the terminator, and most bytes of input
+/// @param outBufSize        room in units without the terminator; also the limit of the input in
+/// bytes
 /// @param szInText          the Latin-15 text
 /// @return TRUE; FALSE for a null pointer or too long an input
 VARNEK_API BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize,
@@ -44,14 +45,14 @@ VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInTex
 /// @param[out] pmszOutText  the units and a terminator
 /// @param outBufSize        room in bytes with the terminator, which always needs two
 /// @param szInText          the UTF-8 text
-/// @param length            most bytes of input
+/// @param length            bytes of input to convert at most
 /// @return TRUE, with an empty output for a `length` of 0; FALSE, and nothing written, for a null
 ///         pointer or too little room
 VARNEK_API BOOL WmConvertUTF2PCode(unsigned short *pmszOutText, int outBufSize,
                                    const char *szInText, int length);
 
-/// Tells the bytes, terminator included, that WmConvertUTF2PCode needs for this input; null counts
-/// as an empty text.
+/// Returns the bytes, terminator included, that WmConvertUTF2PCode needs for this input; null
+/// counts as an empty text.
 VARNEK_API int __WmLngStrlenByByte(const char *szText, int length);
 
 /// Says whether `OutBuffer` is at least `RequiredBufSize`, tracing a buffer that is too small under

@@ -1,9 +1,9 @@
 /// @file
 /// The tasking calls as C++17 objects, with or without exceptions and RTTI. C sees the C calls.
-/// Objects cannot be moved; any thread may use them. What a thread did before Send, Signal, unlock
-/// or starting a thread or timer is visible after the Receive, Wait or lock that follows, or in the
-/// callable; what a callable did, after Join. An object that could not be made, perhaps because its
-/// name (which is copied) is too long or has a NUL, is false, and its functions fail. Callables are
+/// Objects cannot be moved; any thread may use them. Send, Signal, unlock and starting a thread or
+/// timer make all that came before visible to the matching Receive, Wait, lock or callable; Join
+/// does so for what the callable did. An object that could not be made, perhaps because its name
+/// (which is copied) is too long or has a NUL, is false, and its functions fail. Callables are
 /// copied, as by std::bind; an exception from one ends the program. Never unload a module that uses
 /// them: threads and timers end in its code (-Wl,-z,nodelete).
 /// @see [Guide: tasking](docs/guide/tasking.md)
@@ -110,7 +110,7 @@ struct Calls {
         }
         return nullptr;
     }
-    // Drops the calls that have not begun, and returns what `stop` makes of whether there were any.
+    // Drops the calls that have not begun, tells `stop` whether there were any, returns its result.
     template <typename Stop>
     bool Drop(Stop stop) {
         decltype(Shared::calls) dropped;  // destroyed without the lock

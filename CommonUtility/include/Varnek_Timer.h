@@ -27,10 +27,10 @@ typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 
 /// Arms the timer for one expiry. Unless it is cancelled before that or deleted before the callback
-/// begins, a successful start calls back exactly once, with its own `callback` and `userData`:
+/// begins, `callback` runs exactly once for each successful call, with the `userData` of that call:
 /// never early, and as promptly as the system delivers an expiry, even if the timer has been
-/// started again meanwhile. Only if the system cannot create a thread for an expiry, which writes
-/// no log line, does its callback wait for the timer's next one.
+/// started again meanwhile. If the system cannot create a thread for an expiry, no log line says
+/// so, and the callback waits for the timer's next expiry.
 /// @param timer     handle from VarnekPGL_CreateTimer
 /// @param timeout   milliseconds from now, 1 or more; setting the wall clock does not change it
 /// @param callback  called once at the expiry

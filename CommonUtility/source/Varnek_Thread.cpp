@@ -50,9 +50,10 @@ Threads gThreadInfoArr;
 Lock gIdleLock;
 RunningThread *gIdle VARNEK_GUARDED_BY(gIdleLock) = nullptr;
 
-// The first thread creation makes the key and then the guard, whose handle publishes both. Threads
-// that the registry did not start need the acquire as well: one may have a value under a deleted
-// key of the same number, which the C library tells apart only if it sees this key being created.
+// Creating the first thread makes the key and then the guard, whose handle publishes both. Threads
+// that the registry did not start need the acquire as well: one may still hold a value of a deleted
+// key that had the same number, which the C library recognises as stale only if the thread also
+// sees that this key has been created.
 constexpr int32_t kNoGuard = HoldMutex::kNoMutex;
 OneAtATime gFirstCreation;
 pthread_key_t gSelfKey;
@@ -131,8 +132,8 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
         TRACE_ERROR("***** %s : Can't find thread info. thread handle = [%d]", operation, hThread);
         return FALSE;
     }
-    // From here on the slot is free for another thread: the queue is nobody's and empty, and what
-    // is left to do concerns neither.
+    // From here on the slot is free for another thread: its queue is empty and nobody's, and
+    // nothing below touches either.
     const MessageQueue::Closed closed = slot->info.queue.Close();
     const int32_t count = gThreadInfoArr.Withdraw(slot);
     hold.Release();

@@ -1,8 +1,9 @@
 // The timer service. One lock guards the table and every OS call for a slot; it is never held
 // during a callback. When a timer expires, the system calls on a thread of its own, perhaps late,
-// or not at all if the timer is armed again first. So a start that has expired but not called back
-// becomes an owed start when the next one comes, and a second OS timer, which serves owed starts
-// only, expires at once. Whichever timer calls, each start that is due is called back.
+// or not at all if the timer is armed again first. So if the
+// timer is started again before an expiry has been delivered, the earlier start becomes an owed
+// one, and a second OS timer, which serves only those, expires at once. Whichever timer calls, all
+// starts that are due get their callback.
 #include "Varnek_Timer.h"
 
 #include <signal.h>

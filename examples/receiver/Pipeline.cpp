@@ -49,7 +49,7 @@ class Channel {
     }
 
     // Calls `use(bytes, size)` for each buffer sent to the calling thread. It also returns if the
-    // thread is destroyed, as those of a pipeline that could not be completed are.
+    // thread is destroyed, which happens when a later part of the pipeline cannot be created.
     template <typename Use>
     void ForEach(Use use) {
         Message message{};
@@ -89,8 +89,7 @@ void Read(Pipeline *pipeline, int32_t demultiplexer) {
     }
 }
 
-// A buffer of sections has them one after the other, each behind its PID. Their own lengths
-// separate them.
+// A buffer holds sections back to back: each follows its PID and says its own length.
 void Demultiplex(Pipeline *pipeline, int32_t parser) {
     Channel &sections = pipeline->sections;
     Bytes *batch = &sections.Next();

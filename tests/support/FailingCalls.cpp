@@ -142,7 +142,8 @@ WRAP(int, (__real_closedir(directory), errno = gCall_closedir.error, -1), closed
 WRAP_POSIX(gettimeofday, (timeval * time, void *zone), time, zone)
 WRAP_POSIX(system, (const char *command), command)
 
-// Of these, the library uses operator new[](size_t, const std::nothrow_t &). Its mangled name depends on size_t.
+// The only operator new that the library uses is new[](size_t, const std::nothrow_t &). Its mangled name depends on
+// size_t.
 #if __SIZEOF_POINTER__ == 8
 #define NEW_ARRAY _ZnamRKSt9nothrow_t
 #else
