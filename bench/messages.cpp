@@ -126,7 +126,7 @@ class GLib {
 };
 #endif
 
-// Sends to the own queue and receives, while `waiting` other messages are in the queue.
+// Sends to its own queue and receives, while `waiting` other messages are in the queue.
 template <typename Queue, int waiting = 0>
 void SameThread(benchmark::State &state) {
     Queue queue;

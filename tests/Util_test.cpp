@@ -86,7 +86,7 @@ TEST_F(Util, FilesThatCannotCarryACrcAreRefused) {
     WriteAll(path, "123");
     NOTE(VarnekUtil_AppendCRC32ToFile)(path);
     EXPECT_EQ(ReadAll(path), "123");
-    // This file of the kernel claims a page and holds a line.
+    // The kernel reports the size of a page for this file, which has only a line.
     const char *line = "/sys/devices/system/cpu/online";
     if (access(line, R_OK) == 0) {
         for (const auto operation : {VarnekUtil_CheckFileCRC32, VarnekUtil_AppendCRC32ToFile}) {

@@ -64,7 +64,7 @@ class VARNEK_API VarnekCRingBuffer {
     /// inconsistent state, VARNEK_RING_OVERFLOW or VARNEK_RING_UNDERFLOW.
     int GetSpaceReading() const;
     int GetSpaceWriting() const;  ///< the bytes that fit
-    /// Returns the readable bytes in per cent of the size; in an inconsistent state, maybe a number
+    /// Returns the readable bytes as a percentage of the size; in an inconsistent state, it may be
     /// outside 0 to 100.
     int GetDistance() const;
 
@@ -74,7 +74,7 @@ class VARNEK_API VarnekCRingBuffer {
     /// VARNEK_RING_NO_DATA if there are too few bytes, or 0 bytes are read from an empty ring. In
     /// an inconsistent state both empty the ring and return VARNEK_RING_NO_SPACE for an overflow
     /// and VARNEK_RING_NO_DATA for an underflow, with two exceptions: a write that finds WL = RL
-    /// and W < R leaves the ring as it is, and with W <= R and WL > RL + 1 both take the writer as
+    /// and W < R leaves the ring as it is, and with W <= R and WL > RL + 1 both treat the writer as
     /// one lap ahead.
     int Write(const unsigned char *data, int writelen);
     int Read(unsigned char *dest, int readLen);  ///< copies out

@@ -9,8 +9,8 @@
 #ifdef __cplusplus
 
 /// Owns a copy of a NUL-terminated text, or none: a null string, which differs from an empty one.
-/// Misuse is traced and changes nothing. If memory runs out, a string that is
-/// constructed, assigned or summed becomes null, and appending changes nothing. Not thread-safe.
+/// Misuse is traced and changes nothing. If memory runs out, a string that is constructed, assigned
+/// or summed becomes null, and appending changes nothing. Not thread-safe.
 class VARNEK_API VarnekCString {
   public:
     /// Copies `text`; null gives a null string.
@@ -20,8 +20,8 @@ class VARNEK_API VarnekCString {
     /// Frees the text.
     ~VarnekCString();
 
-    /// Returns a new copy, which the caller frees with delete[]; null for a null string and without
-    /// memory.
+    /// Returns a new copy, which the caller frees with delete[]; null for a null string or if
+    /// memory runs out.
     char *String() const;
     /// Takes over a text in an array from new[]. Null is an error.
     void SetMemAllocedString(char *text);
@@ -30,8 +30,8 @@ class VARNEK_API VarnekCString {
     VarnekCString &operator=(const VarnekCString &other);
     VarnekCString &operator=(char const *text);  ///< copies likewise
 
-    /// Appends. A string object without bytes and a null text are errors; an empty text makes a
-    /// null string an empty one.
+    /// Appends. Appending a null or empty string object or a null text is an error; an empty text
+    /// turns a null string into an empty one.
     VarnekCString &operator+=(const VarnekCString &other);
     VarnekCString &operator+=(char const *text);                ///< appends
     VarnekCString operator+(const VarnekCString &other) const;  ///< a new string

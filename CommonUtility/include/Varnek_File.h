@@ -4,10 +4,11 @@
 ///
 /// Most failures are logged at error priority under the tag "SBTVD_File", whatever the debug
 /// configuration says, and never through the trace. The exceptions are streams that read or write
-/// too few bytes or have no known position or size, a null record, open flags and permissions that
-/// mean nothing, and, for large files, everything but failing opens and writes, negative
-/// descriptors and invalid seek bases. All calls are thread-safe, but only one thread at a time may
-/// use a handle. A null path fails like one that does not exist; a null buffer moves no bytes.
+/// too few bytes or have no known position or size, a null record, and open flags and permissions
+/// that mean nothing. Large files log only a failing VarnekPGL_OpenFile64Bits, failing writes,
+/// negative descriptors and invalid seek bases. All calls are thread-safe, but only one thread at a
+/// time may use a handle. A null path fails like one that does not exist; a null buffer moves no
+/// bytes.
 /// @see [Guide: files](docs/guide/files.md)
 #ifndef VARNEK_FILE_H
 #define VARNEK_FILE_H

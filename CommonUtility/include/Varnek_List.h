@@ -2,9 +2,10 @@
 /// A doubly linked list of untyped data pointers. The list owns its nodes but not the data, unless
 /// a call says otherwise. Not thread-safe: callers that share a list must guard it.
 ///
-/// With a null list every call does nothing and returns 0 or null. Positions count from 0 at the
-/// head. Null is never stored, so removing returns null only if nothing was removed. Without memory
-/// for a node, inserting leaves the list unchanged. Nothing is traced.
+/// With a null list every call does nothing, and returns null if it returns anything. Positions
+/// count from 0 at the head. Null is never stored, so removing returns null only if nothing was
+/// removed. If there is no memory for a node, inserting leaves the list unchanged. Nothing is
+/// traced.
 /// @see [Guide: lists](docs/guide/lists.md)
 #ifndef VARNEK_LIST_H
 #define VARNEK_LIST_H
@@ -50,7 +51,7 @@ VARNEK_API void *list_remove(list_t *list, int32_t position);  ///< likewise, at
 
 /// Removes all nodes and frees their data, which must come from malloc.
 VARNEK_API void list_removeAll(list_t *list);
-VARNEK_API void list_remove_node(list_t *list, list_node_t *node);  ///< likewise, one of this list
+VARNEK_API void list_remove_node(list_t *list, list_node_t *node);  ///< likewise, one of its nodes
 
 /// Starts a walk: read each node with list_data, and go on with list_next until it returns null.
 VARNEK_API list_node_t *list_head(list_t *list);

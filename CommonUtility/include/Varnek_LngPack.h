@@ -36,7 +36,7 @@ VARNEK_API BOOL WmConvertPCode2UTF(char *pszOutText, const unsigned short *mszIn
 /// @return the bytes written, without the terminator; -1 for a null pointer or an `nChar` of 0
 VARNEK_API int __WmLngUnicode2UTF(char *des, const unsigned short *src, int nChar);
 
-/// Converts a whole text of units to UTF-8, which takes up to three bytes for each and one more.
+/// Converts a whole text of units to UTF-8, which takes up to three bytes each and a terminator.
 /// @return TRUE; FALSE for a null pointer
 VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInText);
 

@@ -32,7 +32,7 @@ namespace varnek {
 /// no record, or there is no such semaphore.
 enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
 /// What becomes of an object that has the name: kReplace deletes it, unless it is a held mutex, and
-/// owns the new one; kUse never deletes, and finds or makes it in one step per shared library only.
+/// owns the new one; kUse finds or makes it, atomically within a shared library, and never deletes.
 enum class Existing { kReplace, kUse };
 /// Milliseconds from any std::chrono duration, rounded up, from 0 to 49 days; only None() is for
 /// ever. Waits go by the wall clock, timers do not, and Join as std::condition_variable does.
@@ -224,7 +224,7 @@ template <typename T, typename = detail::IfMessage<T>>
     THREAD_MSG message;
     int32_t left = 0;
     const auto wait = [&](uint32_t ms) { return VarnekPGL_ReceiveMessage(ms, &message, &left); };
-    const auto isGone = [] { return VarnekPGL_GetCurrentThread() == -1; };  // or peeking took it
+    const auto isGone = [] { return VarnekPGL_GetCurrentThread() == -1; };  // else it was peeked
     const Outcome outcome = detail::Await(limit, wait, isGone);
     if (outcome == Outcome::kSuccess) {
         std::memcpy(static_cast<void *>(&content), message.data, sizeof content);
@@ -237,7 +237,7 @@ template <typename T, typename = detail::IfMessage<T>>
 /// and unread messages are lost, and waits for the callable, unless that is what destroys it.
 class Thread {
   public:
-    /// Starts a thread, unless one has this name of 1 to 31 characters.
+    /// Starts a thread, whose name has 1 to 31 characters and must be free.
     template <typename... Callable>
     explicit Thread(std::string_view name, uint32_t stack, Callable &&...callable) {
         const auto start = [this, text = detail::Name(name), stack](void *call) {

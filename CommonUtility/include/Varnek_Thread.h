@@ -83,8 +83,8 @@ VARNEK_API BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *m
 ///         wait (EINTR), the thread has no record or lost it meanwhile, or a pointer is null, and
 ///         once for each message that was peeked
 /// @par Traces
-/// The message is taken before the second and third Low line are written, so a log function that
-/// receives while it writes them gets the next message.
+/// If a message is there, it is taken before the last two Low lines are written, so a log function
+/// that receives while it writes them gets the next message.
 VARNEK_API BOOL VarnekPGL_ReceiveMessage(uint32_t timeout, THREAD_MSG *message, int32_t *count);
 
 /// Takes the first message without waiting. The message leaves the queue but stays counted, so each

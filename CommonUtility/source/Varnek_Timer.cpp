@@ -1,9 +1,9 @@
 // The timer service. One lock guards the table and every OS call for a slot; it is never held
 // during a callback. When a timer expires, the system calls on a thread of its own, perhaps late,
-// or not at all if the timer is armed again first. So if the
-// timer is started again before an expiry has been delivered, the earlier start becomes an owed
-// one, and a second OS timer, which serves only those, expires at once. Whichever timer calls, all
-// starts that are due get their callback.
+// or not at all if the timer is armed again first. So if the timer is started again before an
+// expiry has been delivered, the earlier start becomes an owed one, and a second OS timer, which
+// serves only those, expires at once. Whichever timer calls, all starts that are due get their
+// callback.
 #include "Varnek_Timer.h"
 
 #include <signal.h>
@@ -160,9 +160,9 @@ int MakeTimer(uint32_t timer, timer_t *timerId) {
 }
 
 // Makes the last start, which has expired, an owed start, and lets the second timer call for it.
-// The second timer is not armed again while a call of it is to come, since that would cancel the
-// call. Returns false, after a line, when the system or memory forbids it; the last start then
-// stays where it is, and will be called back from there.
+// If others are owed already, the second timer's call is still to come, and arming it again would
+// cancel that. Returns false, after a line, when the system or memory forbids it; the last start
+// then stays where it is, and will be called back from there.
 bool OweLastStart(uint32_t timer, TIMER_MGR_INFO *info) {
     if (!info->isOwedTimerCreated) {
         const int result = MakeTimer(timer, &info->owedTimerId);

@@ -62,9 +62,9 @@ class EventTable {
 
     using Key = std::pair<uint16_t, uint16_t>;  // service_id, event_id
 
-    // Joins what the sections say about each event. Present and following are nearer to the truth
-    // than a schedule, and otherwise the section that came last. The others supply what that one
-    // leaves out, because tables describe an event in different detail.
+    // Joins what the sections say about each event. Present and following win over a schedule,
+    // and otherwise the section that came last. The others supply what the winner leaves out,
+    // because tables describe an event in different detail.
     std::map<Key, Event> Joined() const;
 
   private:

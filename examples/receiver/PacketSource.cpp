@@ -116,7 +116,7 @@ bool PacketSource::Search(bool at_end) {
 }
 
 // The look-ahead contains all sync bytes that are required, except near the end of the stream,
-// where the remaining ones are enough, or three if there is no other sign of packets.
+// where those that remain are enough, but at least three if nothing else points to packets.
 bool PacketSource::StartsPackets(size_t at, size_t distance) const {
     const uint64_t offset = pending_offset_ + at;
     const size_t room = pending_.size() - at;
