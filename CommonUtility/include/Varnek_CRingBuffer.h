@@ -30,9 +30,9 @@
 ///
 /// Any number of threads may write and read one ring that has its mutex: no two writes mix, but the
 /// room that a query reported may be gone, so check the result. Reset, Flush, Seek, the queries,
-/// Write and Read run one at a time, although one that finds the ring inconsistent releases the
-/// mutex for a moment before it empties the ring. Constructing, destroying and assigning (on either
-/// side) are not guarded. A copy has no mutex, so it is not thread-safe.
+/// Write and Read run one at a time; a Write or Read that finds the ring inconsistent, though,
+/// releases the mutex for a moment before it empties the ring. Constructing, destroying and
+/// assigning (on either side) are not guarded. A copy has no mutex, so it is not thread-safe.
 class VARNEK_API VarnekCRingBuffer {
   public:
     /// Creates an empty ring of `size` bytes, without a mutex if none is free.

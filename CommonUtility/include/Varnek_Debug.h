@@ -40,7 +40,7 @@ static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
      (void)VarnekPGL_Panic())
 
 /// Writes one line to the Android log if the configuration enables it, and preserves errno. Takes
-/// no lock once that is loaded; lines of different threads never mix.
+/// no lock once the configuration is loaded; lines of different threads never mix.
 /// @param mask    level and module; without either, nothing is written
 /// @param format  printf format; null shows "(null)". The text is cut to 2017 bytes, and to 2047
 ///                with the prefix

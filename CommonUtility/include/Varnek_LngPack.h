@@ -76,7 +76,7 @@ VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned 
 /// @param outputData   in: null or a block from malloc, which is freed; out: a block from malloc
 ///                     that the caller frees; unchanged on failure and if the result is empty
 /// @param szInput      the Latin-15 text, read up to its NUL, so copy a slice first
-/// @param szInputSize  its length n in bytes; up to 3 n + 1 bytes are accepted
+/// @param szInputSize  its length in bytes; a text of up to three times that and one is accepted
 /// @return TRUE; FALSE for a null pointer, a longer text or too little memory
 VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
                                                unsigned int szInputSize);

@@ -1,10 +1,11 @@
 /// @file
 /// Named mutexes and named counting semaphores, at most 40 of each in a process.
 ///
-/// Each family hands out the handles 1 to 2147483647 in order, never one twice, and creates nothing
-/// after the last. Names have 1 to 31 characters, are case-sensitive and are unique, unless two
-/// threads create objects of one name at the same time. All calls are thread-safe. Failures are
-/// traced at Error, but a time-out is not, and looking up a name traces nothing.
+/// Each family hands out the handles 1 to 2147483647 in order, never the same one twice, and
+/// creates nothing after the last. Names have 1 to 31 characters, are case-sensitive and are
+/// unique, unless two threads create objects of one name at the same time. All calls are
+/// thread-safe. Failures are traced at Error, but a time-out is not, and looking up a name traces
+/// nothing.
 /// @see [Guide: mutexes and semaphores](docs/guide/mutexes-and-semaphores.md)
 #ifndef VARNEK_SEMAPHORE_H
 #define VARNEK_SEMAPHORE_H

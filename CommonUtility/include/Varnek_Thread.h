@@ -20,8 +20,8 @@ extern "C" {
 /// @{
 
 /// Starts a thread; its record is visible before `function` runs. A record that already has this
-/// name is removed first, even if the other arguments are invalid, as by VarnekPGL_DeleteThread,
-/// except that the line which counts its unread messages has the level Low.
+/// name is removed first, as VarnekPGL_DeleteThread does, even if the other arguments are invalid;
+/// here, though, the line that counts its unread messages has the level Low.
 /// @param szThreadName  1 to 31 characters; the system shows the first 15
 /// @param priority      1 to 99; has no effect, because threads use the ordinary scheduling policy
 /// @param stackSize     bytes; the default replaces a size that the system refuses. A thread that

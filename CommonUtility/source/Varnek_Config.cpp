@@ -183,8 +183,8 @@ bool IsProtected(const struct stat64 &entry) {
 }
 
 // Whether a new file may replace what is at the path of the settings: nothing, or a file of this
-// user that may be written and has no second name. One that is just being replaced has no name at
-// all. Fills `*old`, with zeros if there is nothing.
+// user that may be written and has no second name. A file that another saver has just replaced has
+// no name left. Fills `*old`, with zeros if there is nothing.
 bool MayReplace(struct stat64 *old) {
     *old = {};
     if (lstat64(kSettingsPath, old) != 0) {

@@ -1,9 +1,9 @@
 // The timer service. One lock guards the table and every OS call for a slot; it is never held
-// during a callback. When a timer expires, the system calls on a thread of its own, perhaps late,
-// or not at all if the timer is armed again first. So if the timer is started again before an
-// expiry has been delivered, the earlier start becomes an owed one, and a second OS timer, which
-// serves only those, expires at once. Whichever timer calls, all starts that are due get their
-// callback.
+// during a callback. When a timer expires, the system runs the callback on a thread of its own,
+// perhaps late, or not at all if the timer is armed again first. So if the timer is started again
+// before an expiry has been delivered, the earlier start becomes an owed one, and a second OS
+// timer, which serves only those, expires at once. Whichever timer calls, all starts that are due
+// get their callback.
 #include "Varnek_Timer.h"
 
 #include <signal.h>

@@ -115,8 +115,8 @@ bool PacketSource::Search(bool at_end) {
     return false;
 }
 
-// The look-ahead contains all sync bytes that are required, except near the end of the stream,
-// where those that remain are enough, but at least three if nothing else points to packets.
+// The look-ahead contains all sync bytes that are required, but near the end of the stream
+// those that remain suffice, though it takes at least three if nothing else points to packets.
 bool PacketSource::StartsPackets(size_t at, size_t distance) const {
     const uint64_t offset = pending_offset_ + at;
     const size_t room = pending_.size() - at;

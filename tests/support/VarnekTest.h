@@ -34,7 +34,7 @@ struct LogLine {
     std::string Body() const;
 };
 
-// Returns what all threads have written since the last call, in that order.
+// Returns what all threads have written since the last call, in the order in which it was written.
 std::vector<LogLine> TakeLog();
 
 // Returns the bodies of all lines since the last call, or only of those with this tag and this priority.
