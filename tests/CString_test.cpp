@@ -52,13 +52,13 @@ TEST_F(String, BehavesLikeAnOptionalText) {
 }
 
 TEST_F(String, RefusalsHaveTheirLine) {
-    VarnekCString null(nullptr), text("text");
-    Noting("null == null", [&] { return null == null; })();
+    VarnekCString null(nullptr), other(nullptr), text("text");
+    Noting("null == null", [&] { return null == other; })();
     Noting("null == text", [&] { return null == text; })();
     Noting("text > null", [&] { return text > null; })();
     Noting("text < null", [&] { return text < null; })();
     Noting("null >= text", [&] { return null >= text; })();
-    Noting("null <= null", [&] { return null <= null; })();
+    Noting("null <= null", [&] { return null <= other; })();
     Noting("text += null", [&] { text += null; })();
     Noting("text +=", [&](const char *tail) { text += tail; })(nullptr);
     Noting("SetMemAllocedString", [&](char *array) { text.SetMemAllocedString(array); })(nullptr);
