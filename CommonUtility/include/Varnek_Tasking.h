@@ -3,9 +3,9 @@
 /// Objects cannot be moved; any thread may use them. Send, Signal, unlock and starting a thread or
 /// timer make all that came before visible to the matching Receive, Wait, lock or callable; Join
 /// does so for what the callable did. An object that could not be made, perhaps because its name
-/// (which is copied) is too long or has a NUL, is false, and its functions but Join fail. Callables
-/// are copied, as by std::bind; an exception from one ends the program. Never unload a module that
-/// uses them: threads and timers end in its code (-Wl,-z,nodelete).
+/// (which is copied) is too long or has a NUL, is false, and all its functions except Join fail.
+/// Callables are copied, as by std::bind; an exception from one ends the program. Never unload a
+/// module that uses them: threads and timers end in its code (-Wl,-z,nodelete).
 /// @see [Guide: tasking](docs/guide/tasking.md)
 #ifndef VARNEK_TASKING_H
 #define VARNEK_TASKING_H
@@ -234,7 +234,7 @@ template <typename T, typename = detail::IfMessage<T>>
 
 /// A registered thread that runs its own copy of a callable. To stop it, send it a message or set a
 /// flag that it reads, and Join. The destructor removes the record, so that Receive returns kGone
-/// and unread messages are lost, and waits for the callable, unless this destroys the Thread.
+/// and unread messages are lost, and waits for the callable, unless the callable destroys it.
 class Thread {
   public:
     /// Starts a thread, whose name has 1 to 31 characters and must be free.
@@ -266,7 +266,7 @@ class Thread {
 
 /// A one-shot timer that runs callables on threads of the system; its name, of 0 to 40 characters,
 /// must be free. Each start calls once, unless Cancel or the destructor comes first. The destructor
-/// waits for a running callable, unless this destroys the Timer, so hold no lock that it takes.
+/// waits for a running callable, unless the callable destroys it, so hold no lock that it takes.
 class Timer {
   public:
     /// Creates the timer; nothing is armed yet.
