@@ -68,7 +68,7 @@ class VARNEK_API VarnekCRingBuffer {
     /// outside 0 to 100.
     int GetDistance() const;
 
-    /// Copies `writelen` bytes in; Read copies `readLen` bytes out and returns the same. Returns 0;
+    /// Copies `writelen` bytes in; Read copies `readLen` bytes out. Both return 0;
     /// VARNEK_RING_INVALID for a length below 0 or above the size and, after a panic report, for a
     /// null pointer with a length above 0; VARNEK_RING_NO_SPACE if there is too little room;
     /// VARNEK_RING_NO_DATA if there are too few bytes, or 0 bytes are read from an empty ring. In

@@ -188,7 +188,7 @@ VARNEK_API int32_t VarnekPGL_ClearDir(const char *path);
 /// Opens a directory, which the caller closes; PGL_INVALID_DIR_HANDLE on failure.
 VARNEK_API void *VarnekPGL_OpenDir(const char *path);
 
-/// Closes a directory and returns TRUE, also for null and PGL_INVALID_DIR_HANDLE.
+/// Closes a directory and returns TRUE, even for null and PGL_INVALID_DIR_HANDLE.
 VARNEK_API BOOL VarnekPGL_CloseDir(void *hDir);
 
 /// Reads the next entry, in no particular order and including "." and "..". The end of the listing

@@ -78,7 +78,7 @@ VARNEK_API BOOL VarnekPGL_SendUrgentMessage(int32_t hThread, const THREAD_MSG *m
 /// @param timeout       milliseconds by the wall clock, or WAIT_FOREVER; 0 does not wait
 /// @param[out] message  the message
 /// @param[out] count    the number of messages left
-/// @return TRUE, also if a message comes just as the wait ends; FALSE, after an Error line and with
+/// @return TRUE, even if a message comes just as the wait ends; FALSE, after an Error line and with
 ///         `message` and `count` unchanged, if time ran out (errno ETIMEDOUT), a signal ended the
 ///         wait (EINTR), the thread has no record or lost it meanwhile, or a pointer is null, and
 ///         once for each message that was peeked

@@ -21,7 +21,7 @@ struct VarnekRingSteps {
         kOvertaken,  // both are in the same lap, and the reader is ahead of the writer
     };
 
-    // Returns the laps by which the writer is ahead, also when a loop count has wrapped around.
+    // Returns the laps by which the writer is ahead, even when a loop count has wrapped around.
     static int Ahead(const VarnekCRingBuffer &ring) {
         return static_cast<int>(static_cast<unsigned int>(ring.iWriteLoopCnt) -
                                 static_cast<unsigned int>(ring.iReadLoopCnt));

@@ -5,7 +5,7 @@
 #include <errno.h>
 #include <string.h>
 
-// Returns a text for a log line, also for null.
+// Returns a text for a log line, even for null.
 inline const char *Shown(const char *text) {
     return text != nullptr ? text : "(null)";
 }

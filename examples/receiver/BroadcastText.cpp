@@ -53,7 +53,7 @@ bool IsControl(char c) {
 }
 
 // Returns the number of bytes of a control function of ISDB with its parameters. Each of these is a
-// printable byte behind any intermediate bytes; a byte that cannot be one cuts the function short.
+// printable byte after any intermediate bytes; a byte that cannot be one cuts the function short.
 size_t ControlSize(const std::string &text, size_t at) {
     static const struct {
         const char *controls;

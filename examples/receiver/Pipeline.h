@@ -20,7 +20,7 @@ struct PipelineOptions {
 };
 
 // Reads an open file to its end, in bounded memory. The threads and their objects are gone when it
-// returns, also on failure. They have fixed names, so a process may run one call at a time.
+// returns, even on failure. They have fixed names, so a process may run one call at a time.
 //   report    out: the result; its settings do not change
 //   returns   empty, or the name of an object that could not be created; then nothing was read
 std::string RunPipeline(StreamFile &file, const PipelineOptions &options, Report &report);

@@ -42,7 +42,7 @@ bool Contains(const uint8_t (&tags)[Count], uint8_t tag) {
     return std::find(std::begin(tags), std::end(tags), tag) != std::end(tags);
 }
 
-// Enters a loop behind four other bits and its 12-bit length.
+// Enters a loop after four other bits and its 12-bit length.
 FieldReader EnterLoop(FieldReader &fields) {
     fields.Skip(4);
     return fields.Enter(fields.U16(12));
