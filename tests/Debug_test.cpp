@@ -121,6 +121,8 @@ TEST_F(DebugAlone, LoadsAndFailuresAreReported) {
         TakeLog();
     }
     std::filesystem::remove(kDebugFile);
+    WriteAll(kDebugFile, std::string(1 << 20, '#'));
+    EXPECT_THAT(load(), IsEmpty());
     WriteAll(kDebugFile, std::string((1 << 20) + 1, '#'));
     EXPECT_THAT(load(), ElementsAre("Debug Configuration File reading fail!\n")) << "more than 1 MiB";
     std::filesystem::remove(kDebugFile);

@@ -36,6 +36,9 @@ TEST_F(LngPack, Latin15BecomesUtf8) {
     EXPECT_STREQ(text, "€€€€");
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4", UINT32_MAX), TRUE);
     EXPECT_STREQ(text, "€");
+    const std::string much(5000, '\xA4');
+    EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, much.c_str(), 5000), TRUE);
+    EXPECT_EQ(strlen(text), 15000u);
     // A character of two bytes and one that is left out, at each place in a run of ASCII.
     for (size_t at = 0; at < 20; ++at) {
         std::string latin(22, 'a'), utf8(20, 'a');
