@@ -1,5 +1,5 @@
-// Uses mutexes and semaphores by handle and by name, in a full table and as the only one, and two
-// mutexes by two threads at the same time.
+// Uses mutexes and semaphores by handle and finds mutexes by name, one alone and one of 39, and
+// uses two mutexes in two threads at the same time.
 #include <pthread.h>
 #include <semaphore.h>
 

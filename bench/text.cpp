@@ -8,7 +8,7 @@
 
 namespace {
 
-// Has an accent or a euro sign in every tenth character.
+// Every tenth character is an accented letter or a euro sign.
 std::string Text(size_t length) {
     constexpr unsigned char kAccents[] = {0xE9, 0xE3, 0xE7, 0xED, 0xA4};
     std::string text(length, 'a');

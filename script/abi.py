@@ -80,7 +80,7 @@ readable = dict(zip(symbols, subprocess.run(["c++filt"], input="\n".join(symbols
                                             stdout=subprocess.PIPE).stdout.split("\n")))
 exports = set()
 for node in root.iter():
-    # A C function that another source calls may only be declared.
+    # Of a C function that another source calls, this may be only a declaration.
     symbol = node.get("elf-symbol-id") or node.get("name")
     if symbol not in readable:
         continue

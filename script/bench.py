@@ -27,7 +27,7 @@ class Row(NamedTuple):
     title: str
     peers: tuple = ()
     device: tuple | None = None  # instructions and barriers on ARM, at most; a row without it is only timed
-    turns: int = 4096  # a count is the average of so many operations
+    turns: int = 4096  # a count is the average of this many operations
     wall: bool = False  # wall-clock time counts, because the operation waits for another thread or a timer
 
 

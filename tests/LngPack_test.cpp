@@ -31,7 +31,7 @@ TEST_F(LngPack, Latin15BecomesUtf8) {
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\x09\x0A\x1B\x7F\x85", 5), TRUE);
     NOTE(VarnekPGL_ConvertLatin15toUTF8)(&text, "12345", 1);
     EXPECT_STREQ(text, "café");
-    // A little more than stated fits the work buffers, and so does the largest length.
+    // A little more than the stated length is accepted, and so is the largest stated length.
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4\xA4\xA4\xA4", 1), TRUE);
     EXPECT_STREQ(text, "€€€€");
     EXPECT_EQ(VarnekPGL_ConvertLatin15toUTF8(&text, "\xA4", UINT32_MAX), TRUE);

@@ -55,7 +55,8 @@ class VARNEK_API VarnekCBitInputStream {
     /// the end of the stream, VARNEK_BITS_NOT_ALIGNED inside a byte, and VARNEK_BITS_TOO_FEW if
     /// fewer bytes remain, for a negative count and for a null destination.
     int GetByteArray(unsigned char *dest, int count);
-    /// Skips `count` bits, at most to the end. Each byte's worth beyond it writes one trace.
+    /// Skips `count` bits, at most to the end. Each byte or part of one beyond it writes one trace,
+    /// unless the stream was at its end before.
     void Skip(int count);
     /// Moves back by `count` bytes, or not at all if that would leave the buffer. Call it on a byte
     /// boundary: inside a byte, the next reads take the top bits of the byte it moved to. Returns

@@ -35,7 +35,8 @@
 /// assigning (on either side) are not guarded. A copy has no mutex, so it is not thread-safe.
 class VARNEK_API VarnekCRingBuffer {
   public:
-    /// Creates an empty ring of `size` bytes, without a mutex if none is free.
+    /// Creates an empty ring of `size` bytes. It has no mutex, even after a Reset, if `size` is
+    /// invalid or no mutex can be created.
     explicit VarnekCRingBuffer(int size);
     /// Copies the state and the bytes, not the mutex; an assigned ring keeps its own.
     VarnekCRingBuffer(const VarnekCRingBuffer &other);

@@ -9,8 +9,9 @@
 #ifdef __cplusplus
 
 /// Owns a copy of a NUL-terminated text, or none: a null string, which differs from an empty one.
-/// Misuse is traced and changes nothing. If memory runs out, a string that is constructed, assigned
-/// or summed becomes null, and appending changes nothing. Not thread-safe.
+/// Misuse is traced and changes nothing. If memory runs out, a string that is constructed or
+/// assigned becomes null, appending changes nothing, and a sum is null or its left operand alone.
+/// Not thread-safe.
 class VARNEK_API VarnekCString {
   public:
     /// Copies `text`; null gives a null string.

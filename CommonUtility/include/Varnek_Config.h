@@ -40,8 +40,8 @@ VARNEK_API void VarnekCfg_LoadConfigFile(void);
 /// process or the power. The file keeps its mode and group, but not access control lists and other
 /// attributes. It is overwritten in place instead, and can then be caught half-written, if there is
 /// no room or permission for a draft, or if it is a symbolic link, has a second name (hard link),
-/// belongs to another user or is not a regular file. A write-protected file stays as it is, unless
-/// root saves over another user's.
+/// belongs to another user or to a group that a draft cannot be given, or is not a regular file. A
+/// write-protected file stays as it is, unless root saves over another user's.
 VARNEK_API void VarnekCfg_SaveConfigFile(void);
 
 /// Sets the standard type, and saves the record when the type changes.

@@ -41,7 +41,7 @@ static inline void VarnekDbg_StorePlace(const char *path, int32_t line) {
 
 /// Writes one line to the Android log if the configuration enables it, and preserves errno. Takes
 /// no lock once the configuration is loaded; lines of different threads never mix.
-/// @param mask    level and module; without either, nothing is written
+/// @param mask    level and module; unless it has both, nothing is written
 /// @param format  printf format; null shows "(null)". The text is cut to 2017 bytes, and to 2047
 ///                with the prefix
 VARNEK_API void VarnekPGL_TraceOut(uint32_t mask, const char *format, ...)

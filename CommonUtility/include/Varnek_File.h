@@ -3,12 +3,12 @@
 /// move and change permissions.
 ///
 /// Most failures are logged at error priority under the tag "SBTVD_File", whatever the debug
-/// configuration says, and never through the trace. The exceptions are streams that read or write
-/// too few bytes or have no known position or size, a null record, and open flags and permissions
-/// that mean nothing. Large files log only a failing VarnekPGL_OpenFile64Bits, failing writes,
-/// negative descriptors and invalid seek bases. All calls are thread-safe, but only one thread at a
-/// time may use a handle. A null path fails like one that does not exist; a null buffer moves no
-/// bytes.
+/// configuration says, and never through the trace. The exceptions are reading or writing too few
+/// bytes (except in VarnekPGL_AppendFile), an unknown position, a size of 2 GiB or more, a null
+/// record, and open flags and permissions that mean nothing. Large files log only a failing
+/// VarnekPGL_OpenFile64Bits, failing writes, negative descriptors and invalid seek bases. All calls
+/// are thread-safe, but only one thread at a time may use a handle. A null path fails like one that
+/// does not exist; a null buffer moves no bytes.
 /// @see [Guide: files](docs/guide/files.md)
 #ifndef VARNEK_FILE_H
 #define VARNEK_FILE_H

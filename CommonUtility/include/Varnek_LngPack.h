@@ -41,7 +41,8 @@ VARNEK_API int __WmLngUnicode2UTF(char *des, const unsigned short *src, int nCha
 VARNEK_API BOOL WmConvert2LCode(char *pszOutText, const unsigned short *mszInText);
 
 /// Converts at most `length` bytes of UTF-8 to units. A byte that starts no character becomes its
-/// low seven bits, and U+00A0 a space. Four-byte forms are not decoded.
+/// low seven bits (a terminator if these are 0), and U+00A0 a space. Of a four-byte form, the first
+/// three bytes become one wrong unit.
 /// @param[out] pmszOutText  the units and a terminator
 /// @param outBufSize        room in bytes with the terminator, which always needs two
 /// @param szInText          the UTF-8 text
@@ -76,7 +77,7 @@ VARNEK_API unsigned short __WmLngConvert3ByteChar(unsigned char first, unsigned 
 /// @param outputData   in: null or a block from malloc, which is freed; out: a block from malloc
 ///                     that the caller frees; unchanged on failure and if the result is empty
 /// @param szInput      the Latin-15 text, read up to its NUL, so copy a slice first
-/// @param szInputSize  its length in bytes; a text of up to three times that and one is accepted
+/// @param szInputSize  its length in bytes; up to three times as many, plus one, are accepted
 /// @return TRUE; FALSE for a null pointer, a longer text or too little memory
 VARNEK_API BOOL VarnekPGL_ConvertLatin15toUTF8(char **outputData, const char *szInput,
                                                unsigned int szInputSize);

@@ -35,7 +35,7 @@ enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
 /// owns the new one; kUse finds or makes it, atomically within a shared library, and never deletes.
 enum class Existing { kReplace, kUse };
 /// Milliseconds from any std::chrono duration, rounded up, from 0 to 49 days; only None() is for
-/// ever. Waits go by the wall clock, timers do not, and Join as std::condition_variable does.
+/// ever. Waits go by the wall clock, timers do not; Join waits as std::condition_variable does.
 class Limit {
   public:
     /// From a duration, so that it can be given wherever a limit is wanted.
@@ -234,7 +234,7 @@ template <typename T, typename = detail::IfMessage<T>>
 
 /// A registered thread that runs its own copy of a callable. To stop it, send it a message or set a
 /// flag that it reads, and Join. The destructor removes the record, so that Receive returns kGone
-/// and unread messages are lost, and waits for the callable, unless the callable destroys it.
+/// and unread messages are lost, and waits for the callable, unless that destroys the Thread.
 class Thread {
   public:
     /// Starts a thread, whose name has 1 to 31 characters and must be free.
@@ -266,7 +266,7 @@ class Thread {
 
 /// A one-shot timer that runs callables on threads of the system; its name, of 0 to 40 characters,
 /// must be free. Each start calls once, unless Cancel or the destructor comes first. The destructor
-/// waits for a running callable, unless the callable destroys it, so hold no lock that it takes.
+/// waits for a running callable, unless that destroys the Timer; hold no lock that it may take.
 class Timer {
   public:
     /// Creates the timer; nothing is armed yet.

@@ -1,6 +1,6 @@
 // The bit input stream. Nearly every field comes from the current byte or, if it ends beyond that,
 // from a word of the buffer. Near the end, and after rewinding from inside a byte, GetBits reads a
-// field piece by piece; it alone detects the end of the stream.
+// field piece by piece; no other way to read bits reaches the end of the stream.
 #include "Varnek_CBitInputStream.h"
 
 #include <limits.h>

@@ -281,8 +281,8 @@ bool WriteOver(int fd, const char *text, size_t length) {
     return false;
 }
 
-// Saves in place, where the file cannot be replaced. Creates a file only where a link points to:
-// if no new file could be stored, an empty one would only wipe the settings when next loaded.
+// Saves in place, where the file cannot be replaced. Creates a file only as the target of a
+// link: if no new file could be stored, an empty one would only wipe the settings when next loaded.
 void SaveInPlace(const struct stat64 &old, const char *text) {
     const int flags = O_RDWR | O_CLOEXEC | (S_ISLNK(old.st_mode) ? O_CREAT : 0);
     const int fd = IsProtected(old) ? -1 : open(kSettingsPath, flags, 0666);

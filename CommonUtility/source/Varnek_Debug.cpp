@@ -243,8 +243,9 @@ void LoadConfig() {
     gDebugState.store(StateOf(enabled), std::memory_order_relaxed);
 }
 
-// Loads the configuration if nobody has, and always with `again`; threads that come together load
-// it once. While it loads, the log function can neither trace nor load in this thread.
+// Loads the configuration if nobody has, so that threads that come together load it once; with
+// `again`, each of them loads it. Meanwhile the log function can neither trace nor load in this
+// thread.
 void LoadConfigOnce(bool again) {
     const ErrnoKeeper keeper;
     gDebugLoad.Do([again] {

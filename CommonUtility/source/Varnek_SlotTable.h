@@ -131,8 +131,8 @@ class SlotTable {
             if (!slot.Has(handle, std::memory_order_acquire)) {
                 continue;
             }
-            // Two live handles may share a hint: one that points to the other handle stays as it
-            // is, and one that points to neither is stale, so it is corrected.
+            // Two live handles may share a hint. A hint that points to the other one stays as it
+            // is; a hint that points to neither is stale, so it is corrected.
             const int32_t hinted = hint->handle.load(std::memory_order_relaxed);
             if (hinted == kFree || &HintOf(hinted) != &HintOf(handle)) {
                 HintOf(handle).store(static_cast<uint32_t>(NumberOf(&slot)),

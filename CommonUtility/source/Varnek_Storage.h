@@ -44,8 +44,8 @@ inline unsigned ShownHandle(intptr_t handle) {
 // a NUL after the `*count` bytes that were read; null when there is no memory.
 char *ReadText(PglFileHandle file, uint32_t size, uint32_t *count);
 
-// Reads a file of `size` bytes. Returns a block that the caller frees; null when there is no
-// memory, or the file has become shorter.
+// Reads a file of `size` bytes. Returns a block that the caller frees; null when it cannot be
+// opened, there is no memory, or it has become shorter.
 char *ReadWholeFile(const char *path, int32_t size);
 
 #endif

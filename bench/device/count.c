@@ -30,8 +30,8 @@ size_t qemu_plugin_insn_size(const struct qemu_plugin_insn *insn);
 
 enum Kind { INSTRUCTION, BARRIER, EXCLUSIVE, KINDS, MARK = KINDS };
 
-// The counts of all threads of the program. There is no lock, because only one thread may run at a
-// time.
+// The counts of all threads of the program. They have no lock, so the program must not run two
+// threads at the same time between its marks.
 static uint64_t executed[KINDS], atMark[2][KINDS];
 
 // Four-byte instructions as words in memory; in Thumb-2 the first halfword is the lower one. The

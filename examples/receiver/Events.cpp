@@ -32,7 +32,7 @@ void EventTable::Replace(const EventSection &section, uint8_t segment_last, uint
     };
     Erase(sections_.lower_bound(section), upper(section.number));
     Erase(upper(std::max(last, section.number)), upper(0xFF));
-    // A last section of the segment before this one is an error, and says nothing about the others.
+    // A segment_last below this section's own number is an error and says nothing about others.
     if (segment_last >= section.number) {
         const unsigned segment_end = section.number | 7u;
         Erase(upper(std::min<unsigned>(segment_last, segment_end)), upper(segment_end));

@@ -1,5 +1,5 @@
-// The content of a stream's tables, as far as they apply now and to this stream. The parser fills
-// it, and the report shows it. Times are those of the stream, not converted.
+// The content of a stream's tables, as far as they apply now. The parser fills it, and the report
+// shows it. Times are those of the stream, not converted.
 #ifndef RECEIVER_MODEL_H
 #define RECEIVER_MODEL_H
 

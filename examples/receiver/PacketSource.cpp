@@ -29,7 +29,7 @@ constexpr size_t Lead(size_t distance) {
 
 }  // namespace
 
-// Only a packet that spans two blocks is copied before it is passed on.
+// Once it has found packets, it passes them on in place, except those that span two blocks.
 void PacketSource::Feed(const unsigned char *bytes, size_t count) {
     counters_.bytes += count;
     if (locked_ && !pending_.empty()) {

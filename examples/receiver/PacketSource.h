@@ -17,9 +17,9 @@ struct PacketCounters {
     unsigned packet_size = 0;  // distance of the sync bytes, 0 until packets were found
 };
 
-// Turns blocks of bytes of any size into complete packets in order, and buffers about a thousand
-// bytes at most. After a loss it continues at the first sync byte that is followed by several
-// others at the packet distance. No byte belongs to two packets.
+// Turns blocks of bytes of any size into complete packets in order, and keeps about a thousand
+// bytes at most from one block to the next. After a loss it continues at the first sync byte that
+// is followed by several others at the packet distance. No byte belongs to two packets.
 class PacketSource {
   public:
     // Called with consecutive packets of 188 bytes, which are valid during the call.

@@ -24,8 +24,8 @@ class Paragraphs {
     Paragraphs(std::FILE *out, size_t width);
 
     // Writes `text` after `lead`, which is narrower than the minimum width. Lines break at spaces,
-    // or inside a word longer than a line, and are indented to the start of the text. Line breaks
-    // in the text count as spaces.
+    // or inside a word longer than a line, and are indented to the start of the text, but to half
+    // the width at most. Line breaks in the text count as spaces.
     void Add(const std::string &lead, const std::string &text);
     // Writes items with commas between them, and breaks none that fits a line.
     void AddList(const std::string &lead, const std::vector<std::string> &items);

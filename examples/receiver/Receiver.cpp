@@ -151,11 +151,8 @@ int RunReceiver(const std::vector<std::string> &arguments, const Surroundings &s
         DivertLog(surroundings.log_path);
     }
     StreamFile file;
-    errno = 0;
     if (!file.Open(options.path) && !IsStopped(surroundings)) {
-        // The library refuses some names without a system call.
-        return Fail(err, options.path,
-                    "cannot be opened" + (errno != 0 ? ": " + SystemText(errno) : ""));
+        return Fail(err, options.path, "cannot be opened: " + SystemText(errno));
     }
     if (file.IsQuietPipe() && !options.quiet) {
         std::fprintf(err, "receiver: %s: waiting for a program that writes to this pipe\n",

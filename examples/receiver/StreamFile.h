@@ -23,7 +23,7 @@ class StreamFile {
     // Waits briefly for a named pipe, and returns whether no bytes came.
     bool IsQuietPipe() const;
 
-    // Waits for bytes, or until `stop` is set unless it is null.
+    // Waits for bytes or, if `stop` is not null, until it is set.
     //   returns  the bytes read; 0 at the end, on an error, and when it was stopped
     size_t Read(unsigned char *buffer, size_t size, const std::atomic<bool> *stop);
 

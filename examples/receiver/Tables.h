@@ -22,14 +22,15 @@ struct SectionHeader {
 using Pat = std::vector<Program>;
 
 // Reads the programs from a PAT section with a correct CRC, without the entry for the network.
-//   returns  false when the section does not apply now, or is too short for its header
+//   returns  false when ReadHeader does
 bool ParsePat(const unsigned char *section, size_t size, SectionHeader &header, Pat &pat);
 
 // Reads a PMT from the fields that follow the header of its section. `pmt_pid` stays 0.
 ProgramMap ParsePmt(FieldReader &fields);
 
 // Reads the header of a section. `fields` then contains the fields between header and CRC.
-//   returns  false when the section does not apply now, or is too short
+//   returns  false when the section does not apply now, is too short, or is numbered beyond the
+//   last
 bool ReadHeader(FieldReader &fields, SectionHeader &header);
 
 // Fills a model from sections, in the order of their arrival. Unknown tables are ignored. A loop

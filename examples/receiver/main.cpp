@@ -25,8 +25,8 @@ void CatchInterrupt() {
     sigaction(SIGINT, &action, nullptr);
 }
 
-// Opens /dev/null in place of closed standard descriptors, whose numbers other files would get, and
-// for the opposite direction, so that reads and writes fail.
+// Opens /dev/null in place of closed standard descriptors, because other files would get their
+// numbers: stdin only for writing and the others only for reading, so that using them fails.
 void TakeStandardDescriptors() {
     for (int descriptor = STDIN_FILENO; descriptor <= STDERR_FILENO; ++descriptor) {
         if (fcntl(descriptor, F_GETFD) < 0) {

@@ -19,13 +19,14 @@ Bytes operator+(Bytes left, const Bytes &right);
 Bytes U8(unsigned value);
 Bytes U16(unsigned value);
 Bytes U24(unsigned value);
-// Return the bytes of a text, and the same after their number.
+// Return the bytes of a text, and the same preceded by their number.
 Bytes Raw(const std::string &text);
 Bytes Counted(const std::string &text);
 // Return a time of day or a duration as six decimal digits, and a day with a time in seconds.
 Bytes Bcd(int seconds);
 Bytes MakeDateTime(unsigned mjd, int seconds);
-// Return a descriptor, and a loop behind its 12-bit length, with `flags` in the four bits above.
+// Return a descriptor, and a loop preceded by its 12-bit length, with `flags` in the four bits
+// above.
 Bytes Descriptor(unsigned tag, const Bytes &body);
 Bytes Loop(unsigned flags, const Bytes &content);
 

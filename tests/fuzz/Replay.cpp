@@ -1,5 +1,5 @@
 // Stands in for libFuzzer where a fuzz target is run as a test, whatever the compiler, processor or sanitizer.
-//   fuzz_TARGET CORPUS COUNT    runs the corpus, then COUNT inputs made of it, which are the same in each run
+//   fuzz_TARGET CORPUS COUNT    runs the corpus, then COUNT inputs derived from it, the same in each run
 #include <algorithm>
 #include <filesystem>
 #include <fstream>
