@@ -73,7 +73,7 @@ TEST_F(ConfigAlone, AnyFileLoads) {
         {type + "7\n" + good, good},
         {"", none},
         {type.substr(0, 19), none},
-        {area + many('x', 100000), File(cut, 0, 0, 0, 0, "BRA")},
+        {type + "5\n" + area + many('x', 100), File(cut, 5, 0, 0, 0, "BRA")},
         {nation + many('x', 100000) + "\n" + type + "4", File("", 4, 0, 0, 0, cut)},
         // Only 254 characters of a line are read.
         {many('x', 233) + type + "51", ofType(5)},
