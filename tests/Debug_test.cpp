@@ -53,7 +53,8 @@ TEST_F(DebugAlone, EveryLevelAndModuleHasItsPriorityAndTag) {
     StartClean();
     VarnekPGL_InitializeDebug();
     TakeLog();
-    // Each module with one level or several, two modules, and masks that lack a known level or module: no trace.
+    // Each module with one level or several, two modules at once, then masks that trace nothing, because they have no
+    // known level or module.
     const uint32_t error = VARNEK_LEVEL_ERROR, common = VARNEK_MODULE_COMMON;
     for (const uint32_t mask :
          {error | common, VARNEK_LEVEL_HIGH | VARNEK_MODULE_JNI, VARNEK_LEVEL_MID | VARNEK_MODULE_MAIN_CONTROL,

@@ -41,7 +41,7 @@ class Fault : public VarnekTest {
         return text;
     }
 
-    // Runs an operation that leaves nothing behind while the first, second, ... call of each function fails, until no
+    // While the first, second, ... call of each function fails, runs an operation that leaves nothing behind, until no
     // call is left to fail. Notes what the operation returns and traces, and then, for each other outcome, the calls
     // whose failures lead to it and the errors it adds, unless these depend on the order of a directory's entries.
     void Force(const std::string &name, const std::function<std::string()> &run, bool ordered = true) {

@@ -534,7 +534,7 @@ TEST_F(Receiver, AnswersEveryInput) {
     }
 }
 
-// A terminal with so many columns, which passes on what is written to it.
+// A terminal of this width, which passes on what is written to it.
 struct Terminal {
     explicit Terminal(unsigned short columns) {
         termios raw{};

@@ -35,7 +35,7 @@ TEST_F(Mutex, HandlesRiseAndNeverComeBack) {
 }
 
 TEST_F(Mutex, NamesThatResembleEachOther) {
-    // They differ in their first or last word only, or begin alike, and a slot keeps the end of an earlier longer name.
+    // Some begin alike, four end in the same word, that of the terminator, and a slot keeps the end of a longer name.
     const char *const names[] = {"aaaazaaa", "baaa[aaa", "aaaazaaabbbb", "aaaa", "aaa"};
     EXPECT_TRUE(VarnekPGL_DeleteMutex(VarnekPGL_CreateMutex("baaa[aaabbbbcccc")));
     for (const char *name : names) {

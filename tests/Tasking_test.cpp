@@ -213,6 +213,12 @@ TEST_F(Tasking, ATimersCallablesFindNothingThatIsGone) {
     own->emplace("own");
     EXPECT_TRUE((*own)->Start(1ms, [own] { own->reset(); }));
     EXPECT_TRUE(Eventually([&] { return own.use_count() == 1; }));
+    // Where pointers have 32 bits, the numbers of calls begin again, and this thread's is the next.
+    int number = 0;
+    const varnek::Thread waits("waits", kStack, [&number] { (void)varnek::Receive(number); });
+    --varnek::detail::Shared::Get().number;
+    EXPECT_TRUE(timer.Start(1ms, [&called] { ++called; }));
+    EXPECT_TRUE(Eventually([&] { return called == 2; }));
 }
 
 // Timers that are destroyed while they expire, and threads whose owners end before or after them.

@@ -56,7 +56,7 @@ TEST_F(Time, TheCalendarIsTheCLibrarys) {
 
 TEST_F(Time, SpansCountFromZero) {
     const struct {
-        int span[3], end[3];  // years, months and days, and the date that long after 1970 begins
+        int span[3], end[3];  // years, months and days, and the date that much later than 1970-01-01
     } rows[] = {
         {{0, 0, 0}, {1970, 1, 1}},   {{0, 1, 30}, {1970, 2, 31}},   {{0, 0, 40}, {1970, 1, 41}},
         {{0, 1, 31}, {1970, 3, 1}},  {{0, 2, 27}, {1970, 3, 28}},   {{2, 2, 28}, {1972, 4, 1}},

@@ -38,8 +38,8 @@ class VARNEK_API VarnekCString {
     VarnekCString operator+(const VarnekCString &other) const;  ///< a new string
     VarnekCString operator+(char const *text) const;            ///< a new string
 
-    /// Compares as strcmp does and returns 1 or 0. Two null strings are equal; any other comparison
-    /// with one gives 0. Null strings are traced.
+    /// Compares as strcmp does and returns 1 or 0. Two null strings are ==; every other comparison
+    /// in which a string is null gives 0, even >= or <= of two. Null strings are traced.
     int operator==(const VarnekCString &other) const;
     int operator>(const VarnekCString &other) const;   ///< compares
     int operator>=(const VarnekCString &other) const;  ///< compares

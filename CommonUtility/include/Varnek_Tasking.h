@@ -1,11 +1,10 @@
 /// @file
-/// The tasking calls as C++17 objects, with or without exceptions and RTTI. C sees the C calls.
-/// Objects cannot be moved; any thread may use them. Send, Signal, unlock and starting a thread or
-/// timer make all that came before visible to the matching Receive, Wait, lock or callable; Join
-/// does so for what the callable did. An object that could not be made, perhaps because its name
-/// (which is copied) is too long or has a NUL, is false, and all its functions except Join fail.
-/// Callables are copied, as by std::bind; an exception from one ends the program. Never unload a
-/// module that uses them: threads and timers end in its code (-Wl,-z,nodelete).
+/// The tasking calls as C++17 objects; C sees the C calls. Objects cannot be moved; any thread may
+/// use them. Send, Signal, unlock and starting a thread or timer make all that came before visible
+/// to the matching Receive, Wait, lock or callable; Join does so for what the callable did. An
+/// object that could not be made, perhaps because its name (which is copied) is too long or has a
+/// NUL, is false, and all its functions except Join fail. Callables are copied, as by std::bind; an
+/// exception from one ends the program. Never unload a module that uses them (-Wl,-z,nodelete).
 /// @see [Guide: tasking](docs/guide/tasking.md)
 #ifndef VARNEK_TASKING_H
 #define VARNEK_TASKING_H
@@ -29,7 +28,7 @@
 
 namespace varnek {
 /// How a wait ended. Without a limit it goes on after a POSIX signal. kGone: the calling thread has
-/// no record, or there is no such semaphore.
+/// no record, or there is no such semaphore. Waiting changes errno.
 enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
 /// What becomes of an object that has the name: kReplace deletes it, unless it is a held mutex, and
 /// owns the new one; kUse finds or makes it, atomically within a shared library, and never deletes.
@@ -71,7 +70,8 @@ struct Shared {
     std::mutex lock;  // also makes finding and creating an object one step
     std::condition_variable ended;
     std::map<uintptr_t, Call> calls;   // that wait or run
-    std::atomic<uintptr_t> number{0};  // of the last call or owner; an address could be reused
+    std::atomic<uintptr_t> owners{0};  // the number of the last; an address could be reused
+    uintptr_t number = 0;              // of the last call
     static Shared &Get() {
         static Shared *const shared = new Shared;
         return *shared;
@@ -81,15 +81,16 @@ struct Shared {
 // The calls of one thread or timer.
 struct Calls {
     Shared &shared = Shared::Get();
-    const uintptr_t owner = ++shared.number;
-
+    const uintptr_t owner = ++shared.owners;
     // `start` takes the argument for Run, and says whether it succeeded.
     template <typename Start, typename... Parts>
     bool Add(Start start, Parts &&...parts) {
         decltype(Shared::calls) failed;  // destroyed without the lock
         Shared::Call call{std::bind(std::forward<Parts>(parts)...), owner, {}};
         const std::lock_guard<std::mutex> hold(shared.lock);
-        const auto added = shared.calls.emplace(++shared.number, std::move(call)).first;
+        while (shared.calls.count(++shared.number) != 0) {  // 32 bits wrap
+        }
+        const auto added = shared.calls.emplace(shared.number, std::move(call)).first;
         if (!start(reinterpret_cast<void *>(added->first))) {
             failed.insert(shared.calls.extract(added));
         }
@@ -178,8 +179,7 @@ using IfMessage = std::enable_if_t<std::is_trivially_copyable_v<T> && sizeof(T) 
 /// even where it could throw, because no section may run unprotected.
 struct Mutex : detail::Own<VarnekPGL_GetMutexByName, VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex> {
     Mutex(std::string_view name, Existing old) : Own(name, old) {}  ///< see Existing
-    /// Waits without limit.
-    void lock() {
+    void lock() {                                                   ///< waits without limit
         if (VarnekPGL_AcquireMutex(Handle()) == FALSE) {
             VARNEK_PANIC();
             std::abort();
@@ -277,7 +277,7 @@ class Timer {
         calls_.Wait(Limit::None());
     }
     explicit operator bool() const { return handle_ != -1u; }  ///< whether it was created
-    /// Starts the timer for at least a millisecond; false if it is armed. A callable may call this.
+    /// Starts it for 1 ms to 49 days (None(), too); false if it is armed. A callable may call this.
     template <typename... Callable>
     [[nodiscard]] bool Start(Limit delay, Callable &&...callable) {
         const uint32_t ms = std::max(delay.Milliseconds(), 1u);

@@ -17,9 +17,9 @@ extern "C" {
 
 /// The callback of a timer. It runs on a thread of the OS timer service, with no lock held, maybe
 /// at the same time as other callbacks, even of the same timer, and sees all that the starting
-/// thread did before. It may use the timer and start it again. Once the timer has expired, it may
-/// begin after the timer is cancelled or deleted, so `pUserData` should be a number, a handle, or
-/// memory that outlives the timer.
+/// thread did before. It may use the timer and start it again. Once the timer has expired, the
+/// callback may begin even after the timer is cancelled or deleted, so `pUserData` should be a
+/// number, a handle, or memory that outlives the timer.
 typedef void (*TimerCallbackFunc)(uint32_t hTimer, void *pUserData);
 
 /// Creates a timer in the lowest free slot. The first start creates the OS timer.

@@ -7,8 +7,8 @@
 
 #include <limits>
 
-// Converts seconds to the system's type. If that has 32 bits, later times than it can hold become
-// its last one, of 19 January 2038.
+// Converts seconds to the system's type. If that has 32 bits, times beyond its range become the
+// last one that it can hold, on 19 January 2038.
 inline time_t SystemSeconds(int64_t seconds) {
     constexpr time_t kLast = std::numeric_limits<time_t>::max();
     return seconds < kLast ? static_cast<time_t>(seconds) : kLast;

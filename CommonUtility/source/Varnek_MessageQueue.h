@@ -1,7 +1,7 @@
-// A thread's message queue, guarded by a leaf lock: no trace, wait or other lock comes under it. A
-// count of permits is all there is: sending adds one, receiving uses one up. The semaphore on which
-// the owner waits carries no count; a post only tells it to look again, so one that comes late or
-// twice is harmless. Private.
+// A thread's message queue, guarded by a leaf lock: no trace, wait or other lock comes under it.
+// Whether the owner has to wait depends only on a count of permits: sending adds one, receiving
+// uses one up. The semaphore on which it waits carries no count; a post only tells it to look
+// again, so one that comes late or twice is harmless. Private.
 #ifndef VARNEK_SOURCE_MESSAGEQUEUE_H
 #define VARNEK_SOURCE_MESSAGEQUEUE_H
 

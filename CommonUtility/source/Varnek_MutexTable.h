@@ -11,7 +11,7 @@ struct MUTEX_MGR_INFO {
     pthread_mutex_t linuxMutex;
 };
 using Mutexes = SlotTable<MUTEX_MGR_INFO, MAX_MUTEX_MGR_INFO_ARR_SIZE>;
-// Hidden, and not an inline variable: either saves loading the table's address.
+// Hidden and not inline: otherwise the table's address would have to be loaded first.
 extern __attribute__((visibility("hidden"))) Mutexes gMutexArr;
 
 #endif

@@ -1,5 +1,5 @@
-// Named mutexes and named semaphores. They share no code because their messages, trace points and
-// deletion rules differ.
+// Named mutexes and named semaphores. They share the kind of table but no operation, because their
+// messages, trace points and deletion rules differ.
 #include "Varnek_Semaphore.h"
 
 #include <pthread.h>

@@ -126,8 +126,8 @@ Demultiplexer::Header Demultiplexer::ParseHeader(const unsigned char *packet) {
     return header;
 }
 
-// Says how a packet follows the one before it on its PID. Only packets with a payload count. They
-// may be sent twice, and a counter may jump if the packet announces it.
+// Says how a packet follows the one before it on its PID. The counter rises only at packets with a
+// payload. They may be sent twice, and a counter may jump if the packet announces it.
 Demultiplexer::Order Demultiplexer::CheckContinuity(const Header &header, PidState &state) {
     const int last = std::exchange(state.last, header.counter);
     const bool repeatable = std::exchange(state.repeatable, header.has_payload);

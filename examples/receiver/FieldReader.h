@@ -26,8 +26,8 @@ class FieldReader {
     std::string Bytes(int count);
 
     // Returns a reader for the next `count` bytes, which this one skips. If fewer are left, the new
-    // reader gets those, and this one is no longer Ok(), so the entries before the overrun are
-    // used.
+    // reader gets those, so that the entries before the overrun are used, but this one is no longer
+    // Ok().
     FieldReader Enter(int count);
 
     bool Ok() const { return success_ != 0; }

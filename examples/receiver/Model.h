@@ -30,7 +30,7 @@ struct Component {  // a PMT entry
     uint8_t descriptor;          // the one that says what kind of data it is, 0 for none
     uint8_t audio_type;          // of ISO/IEC 13818-1, 0 when it is not defined
     std::optional<uint8_t> tag;  // component_tag
-    Code languages[2];           // the second one only of audio
+    Code languages[2];           // empty for none
 
     // Whether it carries application information tables.
     bool IsAit() const {

@@ -1,5 +1,4 @@
 // Each table is a text of entries "|code name|", with the code in two or more hexadecimal digits.
-// Codes that have no name are shown as numbers.
 #include "Names.h"
 
 #include <cstdarg>

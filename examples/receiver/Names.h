@@ -21,7 +21,7 @@ std::string NameOfServiceType(uint8_t type);
 // Returns what a component is for, such as "captions", "superimposed text", "AIT" or a kind of
 // audio; empty if its codes do not say.
 std::string RoleOfComponent(const Component &component);
-// Returns a component's name by its stream_type and descriptors, with the languages of audio.
+// Returns a component's name by its stream_type and descriptors, with its languages.
 std::string NameOfComponent(const Component &component);
 // Returns "1/16", for example; empty for a code beyond two bits.
 std::string NameOfGuardInterval(uint8_t code);

@@ -64,8 +64,8 @@ struct ListedEvent {
 // events of other streams that this stream does not describe itself.
 std::vector<ListedEvent> ListEvents(const Model &model, bool others);
 
-// Converts the stream's times, which are in UTC except in Brazil, where they and the local offsets
-// are relative to the official time of Brasilia.
+// Converts the stream's times. It takes them for UTC except in Brazil, where they and the local
+// offsets are relative to the official time of Brasilia.
 class StreamClock {
   public:
     explicit StreamClock(const Report &report);

@@ -226,7 +226,8 @@ class Multiplex {
     const Bytes &Stream() const { return writer_.Stream(); }
 
   private:
-    // Writes packets for video, audio, captions and the carousel, of which only headers differ.
+    // Writes a packet for video, audio, captions, the carousel or nobody. Its payload means
+    // nothing.
     void SendFiller(int slot) {
         constexpr uint16_t kPids[] = {kPidVideo, kPidVideo,       kPidAudio, kPidVideo,
                                       kPidVideo, kPidOneSegVideo, kPidNull,  kPidVideo,
