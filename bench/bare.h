@@ -1,4 +1,5 @@
-// The least code that drops a trace, in a shared library of its own as the library's is.
+// The least code that drops a trace, in a shared library, so that calls reach it as they reach
+// ours.
 #ifndef VARNEK_BENCH_BARE_H
 #define VARNEK_BENCH_BARE_H
 

@@ -146,8 +146,8 @@ void SameThread(benchmark::State &state) {
     }
 }
 
-// A thread on its own core that sends one answer for `every` messages, until the first byte of one
-// says that it is the last.
+// A thread on core `core` that answers the last of every `every` messages, until the first byte of
+// one says that no more will come.
 template <typename Queue>
 struct Partner {
     Partner(int core, int every)

@@ -80,7 +80,7 @@ readable = dict(zip(symbols, subprocess.run(["c++filt"], input="\n".join(symbols
                                             stdout=subprocess.PIPE).stdout.split("\n")))
 exports = set()
 for node in root.iter():
-    # Of a C function that another source calls, this may be only a declaration.
+    # If another source calls a C function, the node may be a mere declaration, without a symbol.
     symbol = node.get("elf-symbol-id") or node.get("name")
     if symbol not in readable:
         continue

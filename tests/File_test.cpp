@@ -95,7 +95,7 @@ TEST_F(File, FailuresHaveTheirLineAndResult) {
     NOTE(VarnekPGL_DeleteFile)(none);
     NOTE(VarnekPGL_WriteFile)(Path("w"), nullptr, 1);
     NOTE(VarnekPGL_AppendFile)(Path("w"), nullptr, 1);
-    // A full disk is not reported as stored. Fault_test.cpp shows the other failures of the system's calls.
+    // Data for a full disk is not reported as stored. Fault_test.cpp shows the other failures of the system's calls.
     NOTE(VarnekPGL_WriteFile)("/dev/full", "abc", 3);
     EXPECT_EQ(VarnekPGL_AppendFile("/dev/full", std::vector<char>(100000).data(), 100000), -1);
     VarnekPGL_CloseFile(writer);

@@ -1,4 +1,5 @@
-// What the families of named objects share: registries that can be full, and handles that never come back.
+// What the families of named objects share: registries that can be full and, except for timers, handles that never come
+// back.
 #include "../CommonUtility/source/Varnek_SlotTable.h"
 #include "support/Families.h"
 #include "support/VarnekTest.h"

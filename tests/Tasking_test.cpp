@@ -213,7 +213,7 @@ TEST_F(Tasking, ATimersCallablesFindNothingThatIsGone) {
     own->emplace("own");
     EXPECT_TRUE((*own)->Start(1ms, [own] { own->reset(); }));
     EXPECT_TRUE(Eventually([&] { return own.use_count() == 1; }));
-    // Where pointers have 32 bits, the numbers of calls begin again, and this thread's is the next.
+    // Where pointers have 32 bits, the numbers of calls wrap around, perhaps to that of a call that still runs.
     int number = 0;
     const varnek::Thread waits("waits", kStack, [&number] { (void)varnek::Receive(number); });
     --varnek::detail::Shared::Get().number;

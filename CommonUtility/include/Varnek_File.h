@@ -37,7 +37,8 @@ extern "C" {
 /// Opens a stream.
 /// @param path   at most 255 characters
 /// @param flags  PGL_FILE_MODE_ bits: the first of APPEND, CREATE_RW, WRITE and READ that is set
-///               counts, so READ | WRITE truncates. Other bits alone open nothing
+///               counts; CREATE_RW and WRITE empty the file, so READ | WRITE does, too. Other bits
+///               alone open nothing
 /// @return the handle, which the caller closes; -1 on failure
 VARNEK_API PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags);
 

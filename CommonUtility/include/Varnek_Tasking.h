@@ -277,7 +277,7 @@ class Timer {
         calls_.Wait(Limit::None());
     }
     explicit operator bool() const { return handle_ != -1u; }  ///< whether it was created
-    /// Starts it for 1 ms to 49 days (None(), too); false if it is armed. A callable may call this.
+    /// Starts it for 1 ms to 49 days (as None() is here); false if armed. A callable may call this.
     template <typename... Callable>
     [[nodiscard]] bool Start(Limit delay, Callable &&...callable) {
         const uint32_t ms = std::max(delay.Milliseconds(), 1u);

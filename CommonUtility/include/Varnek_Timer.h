@@ -30,7 +30,7 @@ VARNEK_API int32_t VarnekPGL_CreateTimer(const char *szTmName);
 /// begins, `callback` runs exactly once for each successful call, with the `userData` of that call:
 /// never early, and as promptly as the system delivers an expiry, even if the timer has been
 /// started again meanwhile. If the system cannot create a thread for an expiry, no log line says
-/// so, and the callback waits for the timer's next expiry.
+/// so, and the callback does not run until the timer is started again.
 /// @param timer     handle from VarnekPGL_CreateTimer
 /// @param timeout   milliseconds from now, 1 or more; setting the wall clock does not change it
 /// @param callback  called once at the expiry

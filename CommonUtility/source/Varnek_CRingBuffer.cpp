@@ -72,7 +72,8 @@ struct VarnekRingSteps {
         Empty(ring);
     }
 
-    // Sets the reader to a position in the writer's lap, or in the lap before if that is ahead.
+    // Sets the reader to a position: in the writer's lap or, if the position is ahead of the
+    // writer's, in the lap before.
     static void SetReader(VarnekCRingBuffer *ring, int pos) {
         ring->iReadPos = pos;
         ring->iReadLoopCnt = AddLaps(ring->iWriteLoopCnt, ring->iWritePos < pos ? -1 : 0);

@@ -106,7 +106,7 @@ class MessageQueue {
 
   private:
     static constexpr int32_t kNoOwner = 0;  // no thread has this handle
-    // A thread that only peeks leaves all permits, so that they can reach a maximum.
+    // A thread that only peeks uses up no permits, so their number can reach this limit.
     static constexpr int32_t kMostPermits = SEM_VALUE_MAX;
 
     int Wake(int32_t owner, sem_t *waiter);

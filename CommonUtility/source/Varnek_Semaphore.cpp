@@ -122,8 +122,7 @@ BOOL VarnekPGL_DeleteMutex(int32_t hMutex) {
 
 namespace {
 
-// Failures of acquiring and releasing. Out of line, so that a success, which every ring operation
-// waits for, pays nothing for them.
+// Failures of acquiring and releasing. Out of line, so that a success pays nothing for them.
 __attribute__((noinline, cold)) BOOL NoSuchMutex(const char *operation, int32_t hMutex) {
     return VARNEK_FAIL(FALSE, "***** %s : Can't find mutex info. mutex handle = [%d]", operation,
                        hMutex);

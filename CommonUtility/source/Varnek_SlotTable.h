@@ -33,7 +33,8 @@ class SlotTable {
 
     // Returns the slot of a live handle, null for none: one read if the hint is right, else a scan.
     // Acquire pairs with the release in Publish and makes the Info visible as it was published;
-    // relaxed is for a caller that sees it already, as a thread sees its own record.
+    // relaxed is for a caller that sees it already, as a thread sees its own record, or that uses
+    // only what a lock in the Info guards, as a sender does.
     Slot *Find(int32_t handle, std::memory_order order = std::memory_order_acquire) {
         if (handle <= kFree) {
             return nullptr;

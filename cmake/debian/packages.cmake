@@ -33,7 +33,7 @@ broadcast code: bit stream, ring buffer, CRC-32, text conversion and
 configuration.")
 package(debug libvarnekutils-ltn-dbg debug "debug information of libvarnekutils-ltn
 With this package, gdb shows the functions and variables of the library,
-and its script gdb.py lists the live objects of a process.")
+and gdb.py of libvarnekutils-ltn-dev lists the live objects of a process.")
 package(standins libvarnekutils-ltn-standins libs "PC stand-ins for a device's log and feature store
 libvarnekutils-ltn loads these libraries. The log writes to standard error
 as logcat does. The feature store answers from a text file.")

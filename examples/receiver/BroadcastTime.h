@@ -9,7 +9,7 @@
 namespace receiver {
 
 // Seconds since the start of Modified Julian Day 0, in the zone that the stream uses. Unlike the
-// library's calendar, which ends with 2030, it covers every date that a stream can express.
+// library's calendar, which ends with 2030, it covers every later date that a stream can express.
 using DateTime = int64_t;
 
 // Decodes a time of day or a duration: six decimal digits hhmmss.

@@ -41,7 +41,7 @@ struct Demultiplexer::Header {
     uint8_t counter;
     bool discontinuity;
     const unsigned char *pcr;  // null for none
-    size_t payload;            // offset, kPacketSize when there is none or it cannot be found
+    size_t payload;            // offset if there is one; kPacketSize when it cannot be found
 };
 
 Demultiplexer::Demultiplexer(Handler handler) : handler_(std::move(handler)), pids_(kPidCount) {

@@ -53,7 +53,7 @@ struct NetworkStream {  // an entry of the NIT, about a transport stream
     std::string name;
     std::optional<uint16_t> area_code;
     std::optional<uint8_t> guard_interval;
-    bool dvb;                                // uses a delivery system that only DVB has
+    bool dvb;                                // uses a delivery system that ISDB-T does not have
     std::vector<uint16_t> one_seg_services;  // service_ids
 };
 

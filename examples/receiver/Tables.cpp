@@ -34,7 +34,7 @@ constexpr uint8_t kDescriptorEmergency = 0xFC;
 // subtitles, sound codings, application signalling, data component.
 constexpr uint8_t kDescriptorsOfContent[] = {0x56, 0x59, 0x6A, kDescriptorApplicationSignalling,
                                              0x7A, 0x7B, 0x7C, kDescriptorDataComponent};
-// The delivery systems that only DVB has: satellite, cable and terrestrial.
+// The delivery systems that ISDB-T does not have: satellite, cable and DVB's terrestrial one.
 constexpr uint8_t kDescriptorsOfDvb[] = {0x43, 0x44, 0x5A};
 
 template <size_t Count>

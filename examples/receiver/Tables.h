@@ -34,7 +34,7 @@ ProgramMap ParsePmt(FieldReader &fields);
 bool ReadHeader(FieldReader &fields, SectionHeader &header);
 
 // Fills a model from sections, in the order of their arrival. Unknown tables are ignored. A loop
-// that claims to be longer than its section ends with the section.
+// that claims to be longer than its section ends with the section; that of a TOT is ignored.
 class TableParser {
   public:
     // The model must outlive the parser. `language` is preferred for an event's texts.

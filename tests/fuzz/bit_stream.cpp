@@ -90,7 +90,7 @@ int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
         } else if (kind == 8) {
             stream->Skip(count);
             model.Take(count, expectedFlag);
-        } else if (model.index != model.size - 1) {  // whose byte is loaded, so it could not change
+        } else if (model.index != model.size - 1) {  // once loaded, the last byte cannot change
             // A copy owns its bytes if its source does.
             auto copy = std::make_unique<VarnekCBitInputStream>(*stream);
             if (count % 2 != 0) {

@@ -91,7 +91,7 @@ WRAP_POSIX(sem_init, (sem_t * s, int shared, unsigned value), s, shared, value)
 WRAP_POSIX(sem_destroy, (sem_t * s), s)
 WRAP_POSIX(sem_post, (sem_t * s), s)
 WRAP_POSIX(sem_wait, (sem_t * s), s)
-// If it is made to time out, it is posted at that very moment.
+// If it is made to time out, it does so at the moment when the semaphore is posted.
 WRAP(int, Missed(s, errno), sem_timedwait, (sem_t * s, const timespec *time), s, time)
 WRAP_POSIX(clock_gettime, (clockid_t clock, timespec *time), clock, time)
 WRAP_POSIX(timer_create, (clockid_t clock, sigevent *event, timer_t *id), clock, Droppable(event), id)

@@ -124,8 +124,8 @@ class VarnekTest : public ::testing::Test {
     void Note(const std::string &call, const std::string &result);
     bool notesLow_ = true;  // a test of failures may leave out the Low lines if another test shows them
 
-    // Replaces a text that differs from run to run by `name` in the transcript. The system's handles are always hidden,
-    // and its errors have their names instead of its numbers and words.
+    // Replaces a text that differs from run to run with `name` in the transcript. The system's handles are always
+    // hidden, and its errors have their names instead of its numbers and words.
     void Show(const std::string &text, const std::string &name) { names_.emplace_back(text, name); }
 
     // What the transcript shows for a result: its name, if the test has given it one, or else the number.
