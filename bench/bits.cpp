@@ -3,8 +3,8 @@
 #include "Varnek_CBitInputStream.h"
 
 #ifdef HAVE_GSTREAMER
-// Calls the peer's exported functions instead of the inlined ones, as callers in other languages
-// and with unusual widths do.
+// Calls the peer's exported functions, as callers in other languages do, instead of the inlined
+// ones that C and C++ get by default.
 #define GST_BIT_READER_DISABLE_INLINES
 #include <gst/base/gstbitreader.h>
 #endif

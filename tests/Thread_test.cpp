@@ -88,8 +88,8 @@ TEST_F(Thread, AThreadWithAnEndedThreadsSystemIdIsUnknown) {
     }
 }
 
-// A thread keeps its block for one round of thread-specific destructors after the library's own. So a key that is older
-// than the library's, whose destructor therefore runs before it, finds the block in the second round too.
+// A thread keeps its block for one round of thread-specific destructors after the library's own. So the destructor
+// of an older key, which runs before the library's, finds the block in the second round too.
 TEST_F(Thread, AThreadKnowsItselfInTheFirstDestructorsOfOtherKeys) {
     struct Key {
         pthread_key_t key;

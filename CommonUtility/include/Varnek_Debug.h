@@ -3,7 +3,7 @@
 ///
 /// A trace reaches the Android log only if the debug configuration ("debug_ltn.ini" in the data
 /// directory, loaded by the first trace) enables the output, its level and its module. The summary
-/// of a loaded configuration, failed file operations and assertion reports are always logged.
+/// of a loaded configuration, most failed file operations and assertion reports are always logged.
 /// @see [Guide: trace](docs/guide/trace.md)
 #ifndef VARNEK_DEBUG_H
 #define VARNEK_DEBUG_H

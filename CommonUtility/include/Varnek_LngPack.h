@@ -1,6 +1,6 @@
 /// @file
 /// Text conversion between ISO/IEC 8859-15 bytes ("Latin-15"), 16-bit Unicode units ("PCode") and
-/// UTF-8 as in RFC 3629 ("LCode").
+/// UTF-8 ("LCode"), of which RFC 3629's forms of up to three bytes are known.
 ///
 /// Every text ends in a 0 byte or unit. A unit is one character from U+0001 to U+FFFF; surrogates
 /// are not paired. The caller provides the output buffers, except that of
@@ -18,8 +18,7 @@ extern "C" {
 
 /// Converts Latin-15 to units. Control characters are dropped; the no-break space becomes a space.
 /// @param[out] pmszOutText  the units and a terminator
-/// @param outBufSize        room in units without the terminator; also the limit of the input in
-/// bytes
+/// @param outBufSize        room in units without the terminator; also the most bytes of input
 /// @param szInText          the Latin-15 text
 /// @return TRUE; FALSE for a null pointer or too long an input
 VARNEK_API BOOL WmConvertLatin15Code2PCode(unsigned short *pmszOutText, int outBufSize,

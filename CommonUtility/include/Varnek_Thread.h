@@ -64,7 +64,7 @@ typedef struct THREAD_MSG {
 } __attribute__((aligned(8))) THREAD_MSG;
 
 /// Appends a message to a thread's queue. This also succeeds after the thread's function has
-/// returned: its queue then grows without end until the record is deleted.
+/// returned: nobody empties the queue then, so it grows until the record is deleted.
 /// @return TRUE once the message is queued and its reader signalled; FALSE for an unknown handle, a
 ///         null message or too little memory, and if the reader cannot be signalled (the message
 ///         then stays queued)

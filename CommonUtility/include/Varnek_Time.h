@@ -36,7 +36,8 @@ struct VarnekCDateTime
 
 #ifdef __cplusplus
     /// Returns the seconds of this point or span, tracing an invalid year. In a span, days that
-    /// fill month number `iMonth` count as one more month, and 12 months as one more year.
+    /// fill month number `iMonth` count as one more month, and 12 months or more as one more year;
+    /// the rest is dropped.
     uint32_t GetElapsedSeconds() const;
 
     /// Adds the seconds of the other record, modulo 2^32. Subtracting too much is traced and

@@ -78,7 +78,8 @@ class StreamClock {
     // user names no region. Null for none.
     const LocalOffset *Offset() const { return offset_; }
 
-    // Convert a time of the stream, the latter by the offset that applies at that time.
+    // Convert a time of the stream to UTC and to local time, the latter by the offset that applies
+    // at that time.
     std::optional<DateTime> Utc(const std::optional<DateTime> &time) const;
     std::optional<DateTime> Local(const std::optional<DateTime> &time) const;
 
