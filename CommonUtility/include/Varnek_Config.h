@@ -52,8 +52,8 @@ VARNEK_API int32_t VarnekCfg_GetStandard(void);
 VARNEK_API uint8_t VarnekCfg_GetTSCaptueEnable(void);     ///< as VarnekCfg_GetStandard
 VARNEK_API uint8_t VarnekCfg_GetTSFileSimulEnable(void);  ///< as VarnekCfg_GetStandard
 
-/// Returns the nation, never empty. If the record has none, it is set from the platform's feature
-/// store first, or else to "BRA".
+/// Returns the nation, never empty. If the record has none, this first sets it to the one in the
+/// platform's feature store or, without one there, to "BRA".
 VARNEK_API const char *VarnekCfg_GetSupportNation(void);
 
 /// Says whether the receiver shows BML data broadcasts: TRUE if the nation is "PHL".

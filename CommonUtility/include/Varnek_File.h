@@ -4,8 +4,8 @@
 ///
 /// Most failures are logged at error priority under the tag "SBTVD_File", whatever the debug
 /// configuration says, and never through the trace. The exceptions are reading or writing too few
-/// bytes (except in VarnekPGL_AppendFile), an unknown position, a size of 2 GiB or more, a null
-/// record, and open flags and permissions that mean nothing. Large files log only a failing
+/// bytes (except in VarnekPGL_AppendFile), an unknown position, a size of 2 GiB or more, null
+/// attributes, and open flags and permissions that mean nothing. Large files log only a failing
 /// VarnekPGL_OpenFile64Bits, failing writes, negative descriptors and invalid seek bases. All calls
 /// are thread-safe, but only one thread at a time may use a handle. A null path fails like one that
 /// does not exist; a null buffer moves no bytes.
@@ -217,9 +217,9 @@ VARNEK_API BOOL VarnekPGL_FmGetFileAttributes(const char *path, PglFmFileAttribu
 /// @return 0, or -1
 VARNEK_API int32_t VarnekPGL_CopyFile(const char *source, const char *destination);
 
-/// Moves or renames a file, replacing an existing one; into a directory it moves under its own
-/// name. Within one file system this is atomic, and so is the C library's rename, which starts no
-/// shell and is more than ten times as fast.
+/// Moves or renames a file, replacing an existing one; if the destination is a directory, the file
+/// moves into it and keeps its name. Within one file system this is atomic, and so is the C
+/// library's rename, which starts no shell and is more than ten times as fast.
 /// @return 0, or -1
 VARNEK_API int32_t VarnekPGL_MoveFile(const char *source, const char *destination);
 

@@ -1,6 +1,7 @@
 /// @file
-/// Text conversion between ISO/IEC 8859-15 bytes ("Latin-15"), 16-bit Unicode units ("PCode") and
-/// UTF-8 ("LCode"), of which RFC 3629's forms of up to three bytes are known.
+/// Text conversion from ISO/IEC 8859-15 bytes ("Latin-15") to 16-bit Unicode units ("PCode") or
+/// UTF-8 ("LCode"), and between these two. Of UTF-8, only RFC 3629's forms of up to three bytes are
+/// supported.
 ///
 /// Every text ends in a 0 byte or unit. A unit is one character from U+0001 to U+FFFF; surrogates
 /// are not paired. The caller provides the output buffers, except that of

@@ -1,6 +1,6 @@
 /// @file
-/// Helpers for NUL-terminated texts: searching and comparing without case, numbers, substrings,
-/// case and trimming.
+/// Helpers for NUL-terminated texts: searching and comparing while ignoring case, numbers,
+/// substrings, converting case and trimming.
 ///
 /// Only ASCII letters have case. Whitespace is space, tab, line feed, vertical tab, form feed and
 /// carriage return. The caller provides all buffers. Thread-safe. A null text counts as an empty
@@ -15,7 +15,7 @@
 extern "C" {
 #endif
 
-/// Searches without case.
+/// Searches, ignoring case.
 /// @return where `needle` first occurs in `haystack`; `haystack` for an empty needle; else null
 VARNEK_API char *VarnekPGL_Stristr(const char *haystack, const char *needle);
 
@@ -33,11 +33,11 @@ VARNEK_API char *VarnekPGL_Itoa(uint32_t value, char *buffer, uint32_t radix);
 /// @return `buffer`
 VARNEK_API char *VarnekPGL_Ltoa(int32_t value, char *buffer, uint32_t radix);
 
-/// Compares without case.
+/// Compares, ignoring case.
 /// @return the difference of the first two bytes that differ, in lower case and unsigned; else 0
 VARNEK_API int32_t VarnekPGL_Stricmp(const char *a, const char *b);
 
-/// Compares at most `count` bytes without case; a count of 0 compares equal.
+/// Compares at most `count` bytes, ignoring case; a count of 0 compares equal.
 VARNEK_API int32_t VarnekPGL_Strnicmp(const char *a, const char *b, uint32_t count);
 
 /// Copies a part of a text as strncpy does: exactly `count` bytes, padded with NULs, and without a

@@ -30,8 +30,8 @@ namespace varnek {
 /// How a wait ended. Without a limit it goes on after a POSIX signal. kGone: the calling thread has
 /// no record, or there is no such semaphore. Waiting changes errno.
 enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
-/// What becomes of an object that has the name: kReplace deletes it, unless it is a held mutex, and
-/// owns the new one; kUse finds or makes it, atomically within a shared library, and never deletes.
+/// What becomes of an object that has the name: kReplace deletes it and owns the new one, but fails
+/// for a held mutex; kUse finds or makes it, atomically in a shared library, and never deletes.
 enum class Existing { kReplace, kUse };
 /// Milliseconds from any std::chrono duration, rounded up, from 0 to 49 days; only None() is for
 /// ever. Waits go by the wall clock, timers do not; Join waits as std::condition_variable does.
@@ -277,7 +277,7 @@ class Timer {
         calls_.Wait(Limit::None());
     }
     explicit operator bool() const { return handle_ != -1u; }  ///< whether it was created
-    /// Starts it for 1 ms to 49 days (as None() is here); false if armed. A callable may call this.
+    /// Starts it for 1 ms to 49 days (None() is 49 days); false if armed. A callable may call this.
     template <typename... Callable>
     [[nodiscard]] bool Start(Limit delay, Callable &&...callable) {
         const uint32_t ms = std::max(delay.Milliseconds(), 1u);

@@ -38,8 +38,8 @@ struct VarnekRingSteps {
         return ring.iReadPos < ring.iWritePos ? kOverflow : kInOrder;
     }
 
-    // Returns the bytes that can be read from a ring in order; a writer several laps ahead counts
-    // as one lap ahead.
+    // Returns how many bytes can be read from a ring whose order is kInOrder; a writer several laps
+    // ahead counts as one lap ahead.
     static int Used(const VarnekCRingBuffer &ring) {
         return ring.iWritePos - ring.iReadPos + (Ahead(ring) > 0 ? ring.iRingSize : 0);
     }

@@ -1,6 +1,6 @@
 // The masked trace, the debug configuration that masks it, and the assertion report. One atomic
-// word says what is enabled, so a trace that is off only loads and tests that word. Each call
-// composes its line on its stack and holds no lock meanwhile.
+// word says what is enabled, so a trace that is off only stores its file and line, and loads and
+// tests that word. Each call composes its line on its stack and holds no lock meanwhile.
 #include "Varnek_Debug.h"
 
 #include <errno.h>
@@ -195,7 +195,7 @@ void LogSummary(uint32_t enabled) {
     }
 }
 
-// Copies the shipped configuration to the data directory. Returns whether that can be read now.
+// Copies the shipped configuration to the data directory. Returns whether the copy can be read.
 bool SeedConfig() {
     if (!IsReadable(kShippedDebugPath)) {
         LogFailure("Default Log Configuration file doesn't exit! File Path=[" VARNEK_SYSTEM_DIR

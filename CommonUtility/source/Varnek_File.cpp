@@ -60,7 +60,7 @@ PglFileHandle VarnekPGL_OpenFile(const char *path, int32_t flags) {
     return reinterpret_cast<PglFileHandle>(stream);
 }
 
-// Not inlined: g++ would warn that the number in the line is a pointer to a closed stream.
+// Not inlined, because g++ would warn that the log line uses the pointer of a closed stream.
 __attribute__((noinline)) int32_t VarnekPGL_CloseFile(PglFileHandle hFile) {
     FILE *stream = StreamOf(hFile);
     if (stream == nullptr) {
@@ -92,7 +92,7 @@ int32_t VarnekPGL_TellFile(PglFileHandle hFile) {
     if (stream == nullptr) {
         return FILE_FAIL(-1, "%s : NULL file pointer", __func__);
     }
-    // A position beyond 32 bits, such as the "end" of a directory, counts as no position.
+    // A position that does not fit the result, such as the "end" of a directory, counts as none.
     const int64_t position = ftell(stream);
     return position <= INT32_MAX ? static_cast<int32_t>(position) : -1;
 }

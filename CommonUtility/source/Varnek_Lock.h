@@ -25,8 +25,8 @@ struct VARNEK_THREAD_SAFETY(capability("mutex")) Lock {
     void Release() VARNEK_THREAD_SAFETY(release_capability()) { pthread_mutex_unlock(&mutex); }
 };
 
-// Holds a lock until the end of the scope, or until Release, which callers use before a callback
-// and before the last line of a success. After that it may be acquired again.
+// Holds a lock until the end of the scope, or until Release, for what must not or need not run
+// under it, such as a callback, a wait or a trace. After that it may be acquired again.
 class VARNEK_THREAD_SAFETY(scoped_lockable) Hold {
   public:
     explicit Hold(Lock &lock) VARNEK_THREAD_SAFETY(acquire_capability(lock)) : lock_(lock) {

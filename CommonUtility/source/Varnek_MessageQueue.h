@@ -27,7 +27,7 @@ class MessageQueue {
 
     struct Pushed {
         bool isOpen;      // whether the queue belongs to the handle; if not, nothing has happened
-        int error;        // of the post that should have woken the owner, 0 for none
+        int error;        // the post's, or EOVERFLOW if no permit could be added; 0 for none
         int32_t permits;  // with the one for this message
     };
 

@@ -33,7 +33,7 @@ class ErrnoKeeper {
     int kept_;
 };
 
-// Stores the error that a pthread call returns in errno, because the traces read it there. Returns
+// Stores in errno the error that a pthread call returns, because the traces read it there. Returns
 // the error, 0 for none.
 inline int SetErrno(int error) {
     if (__builtin_expect(error != 0, 0)) {

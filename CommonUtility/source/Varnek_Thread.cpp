@@ -132,11 +132,11 @@ BOOL RemoveRecord(int32_t hThread, const char *operation, uint32_t unreadMask) {
         TRACE_ERROR("***** %s : Can't find thread info. thread handle = [%d]", operation, hThread);
         return FALSE;
     }
-    // From here on the slot is free for another thread: its queue is empty and nobody's, and
-    // nothing below touches either.
     const MessageQueue::Closed closed = slot->info.queue.Close();
     const int32_t count = gThreadInfoArr.Withdraw(slot);
     hold.Release();
+    // From here on the slot is free for another thread: its queue is empty and nobody's, and
+    // nothing below touches either.
     if (closed.waiter != nullptr) {
         sem_post(closed.waiter);
     }

@@ -93,7 +93,7 @@ int SetTime(timer_t timerId, const timespec &time) {
     return timer_settime(timerId, 0, &expiry, nullptr);
 }
 
-// Removes the oldest start that is due from the record, and returns it. The callback of the result
+// Takes the oldest start that is due out of the record, and returns it. The callback of the result
 // is null if none is due.
 OwedStart TakeDue(TIMER_MGR_INFO *info) {
     if (OwedStart *oldest = info->owed) {
@@ -150,7 +150,7 @@ void TimerCallbackEntry(sigval value) {
     }
 }
 
-// Creates the OS timer of a slot. Returns the result of the OS call.
+// Creates an OS timer for a slot. Returns the result of the OS call.
 int MakeTimer(uint32_t timer, timer_t *timerId) {
     sigevent event = {};
     event.sigev_notify = SIGEV_THREAD;
@@ -161,8 +161,8 @@ int MakeTimer(uint32_t timer, timer_t *timerId) {
 
 // Makes the last start, which has expired, an owed start, and lets the second timer call for it.
 // If others are owed already, the second timer's call is still to come, and arming it again would
-// cancel that. Returns false, after a line, when the system or memory forbids it; the last start
-// then stays where it is, and will be called back from there.
+// cancel that. Returns false, after a line, when the system refuses or there is no memory; the last
+// start then stays where it is, and gets its callback from there.
 bool OweLastStart(uint32_t timer, TIMER_MGR_INFO *info) {
     if (!info->isOwedTimerCreated) {
         const int result = MakeTimer(timer, &info->owedTimerId);

@@ -16,7 +16,7 @@ namespace {
 constexpr uint32_t kPolynomial = 0x04C11DB7u;
 constexpr uint32_t kInitial = 0xFFFFFFFFu;
 constexpr int32_t kTrailer = 4;     // bytes of a stored CRC
-constexpr int32_t kMinPayload = 4;  // minimum of bytes that a stored CRC covers
+constexpr int32_t kMinPayload = 4;  // the fewest bytes that a stored CRC covers
 
 // On the 32-bit target, 16 tables of 1 KiB would fill half of the first-level cache, which does not
 // pay for sections of a few hundred bytes at one or two megabytes a second.

@@ -179,7 +179,7 @@ void Demultiplexer::OnSection(uint16_t pid, bool claimed, const unsigned char *s
 }
 
 // A PID that is no longer named may carry anything, so its unfinished section is dropped. New uses
-// are added before old ones are removed, so that a PID that stays named keeps it.
+// are added before old ones are removed, so that a PID that stays named keeps its section.
 void Demultiplexer::FollowNames(const unsigned char *section, size_t size) {
     constexpr size_t kHeaderAndCrc = 12;
     if (size < kHeaderAndCrc) {

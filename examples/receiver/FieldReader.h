@@ -1,6 +1,6 @@
 // Reads fields from borrowed bytes with the library's bit stream. A reader knows where its fields
-// end, so no length in a stream makes it read outside the section, and remembers whether every read
-// so far was inside.
+// end, so no length in a stream makes it read outside the section; it also remembers whether every
+// read so far was inside.
 #ifndef RECEIVER_FIELDREADER_H
 #define RECEIVER_FIELDREADER_H
 

@@ -1,5 +1,5 @@
-// Finds the packets in a stream of bytes: of 188, of 192 with a four-byte time stamp in front, or
-// of 204 with 16 parity bytes at the end. The distance of the sync bytes tells which.
+// Finds the packets in a stream of bytes. A packet has 188 bytes, 192 with a four-byte time stamp
+// in front, or 204 with 16 parity bytes at the end; the distance of the sync bytes tells which.
 #ifndef RECEIVER_PACKETSOURCE_H
 #define RECEIVER_PACKETSOURCE_H
 
@@ -14,7 +14,7 @@ struct PacketCounters {
     uint64_t bytes = 0;        // all bytes that were fed
     uint64_t packets = 0;      // complete packets, without one that the end of the stream cuts off
     uint64_t sync_losses = 0;  // bytes before the first packet count as one loss
-    unsigned packet_size = 0;  // distance of the sync bytes, 0 until packets were found
+    unsigned packet_size = 0;  // distance of the sync bytes, 0 until packets are found
 };
 
 // Turns blocks of bytes of any size into complete packets in order, and keeps about a thousand

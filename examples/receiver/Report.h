@@ -74,8 +74,9 @@ class StreamClock {
     // otherwise the first in the TOT; empty for a DVB stream whose TOT names none.
     const Code &Nation() const { return nation_; }
 
-    // The offset for local times: that of the receiver's nation and region, or the first one if the
-    // user names no region. Null for none.
+    // The offset for local times: the first of the receiver's nation, in the region that the user
+    // names, if any. If the user names none and the TOT does not name the nation, it is the first
+    // in the TOT. Null for none.
     const LocalOffset *Offset() const { return offset_; }
 
     // Convert a time of the stream to UTC and to local time, the latter by the offset that applies

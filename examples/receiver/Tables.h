@@ -29,8 +29,8 @@ bool ParsePat(const unsigned char *section, size_t size, SectionHeader &header, 
 ProgramMap ParsePmt(FieldReader &fields);
 
 // Reads the header of a section. `fields` then contains the fields between header and CRC.
-//   returns  false when the section does not apply now, is too short, or is numbered beyond the
-//   last
+//   returns  false when the section does not apply now, is too short, or has a number beyond that
+//            of the last one
 bool ReadHeader(FieldReader &fields, SectionHeader &header);
 
 // Fills a model from sections, in the order of their arrival. Unknown tables are ignored. A loop

@@ -22,7 +22,7 @@ constexpr uint16_t kPidSdt = 0x0011;
 constexpr uint16_t kPidEit = 0x0012;
 constexpr uint16_t kPidTime = 0x0014;
 constexpr uint16_t kPidEitMobile = 0x0026;  // events of portable reception
-constexpr uint16_t kPidEitOneSeg = 0x0027;  // the same, of one segment
+constexpr uint16_t kPidEitOneSeg = 0x0027;  // events of one-seg reception
 constexpr uint16_t kPidOneSegPmt = 0x1FC8;  // PMTs of one-seg services, to 0x1FCF
 constexpr uint16_t kPidNull = 0x1FFF;
 

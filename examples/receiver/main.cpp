@@ -35,7 +35,7 @@ void TakeStandardDescriptors() {
     }
 }
 
-// Opens the destination of stderr again, because descriptor 2 is redirected for the log.
+// Duplicates stderr for the messages, because descriptor 2 is redirected for the log.
 std::FILE *OpenMessages() {
     const int descriptor = fcntl(STDERR_FILENO, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
     std::FILE *messages = descriptor < 0 ? nullptr : fdopen(descriptor, "w");

@@ -22,7 +22,8 @@ Bytes U24(unsigned value);
 // Return the bytes of a text, and the same preceded by their number.
 Bytes Raw(const std::string &text);
 Bytes Counted(const std::string &text);
-// Return a time of day or a duration as six decimal digits, and a day with a time in seconds.
+// Take seconds, and return them as a time of day or a duration of six decimal digits, and as a time
+// of that form on a day.
 Bytes Bcd(int seconds);
 Bytes MakeDateTime(unsigned mjd, int seconds);
 // Return a descriptor, and a loop preceded by its 12-bit length, with `flags` in the four bits
@@ -42,7 +43,7 @@ struct Place {
 // Returns a section with the usual header.
 Bytes MakeSection(unsigned table, unsigned extension, const Bytes &body, const Place &place = {});
 
-// Return tables. Their loops consist of entries, which may be concatenated with +.
+// Return tables, or what their loops consist of, which may be concatenated with +.
 Bytes MakePat(unsigned stream, const std::vector<std::pair<unsigned, unsigned>> &pids,
               const Place &place = {});  // by service_id
 Bytes MakeComponent(unsigned stream_type, unsigned pid, const Bytes &descriptors = {});

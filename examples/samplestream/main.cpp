@@ -167,7 +167,7 @@ std::vector<Bytes> PresentFollowing(uint16_t service, int now) {
     return sections;
 }
 
-// Returns the whole evening of a service, with an event without a time at the end.
+// Returns the whole evening of a service, followed by an event whose time is not known.
 Bytes Schedule(uint16_t service) {
     Bytes entries;
     for (const Programme &programme : kProgrammes) {
@@ -211,7 +211,7 @@ class Multiplex {
         }
     }
 
-    // Writes packets, of which at most every third is a queued one; the others are filler.
+    // Writes packets. At most one in three is taken from the queue; the others are filler.
     void Run(int packets) {
         for (int slot = 0; slot < packets; ++slot) {
             if (slot % 3 == 0 && !queue_.empty()) {

@@ -1,6 +1,6 @@
 // trailer FILE: appends the CRC-32 of a file to it, which is how data carousels are stored.
 // trailer --check FILE: exits with 1 unless a file ends in its CRC-32.
-// Files may have any size from 4 bytes on, because they are read in pieces.
+// Files are read in pieces, so they may have any size of 4 bytes or more.
 #include <algorithm>
 #include <cstdio>
 #include <cstring>

@@ -1,6 +1,6 @@
-// POSIX timers with thread notification on ordinary threads, one for each timer. A program that
-// runs under ThreadSanitizer, which cannot handle the C library's timers, compiles this file to
-// replace the timer_ functions. It supports only relative times and one-shot timers, because
+// POSIX timers with thread notification, made of ordinary threads, one for each timer. A program
+// that runs under ThreadSanitizer, which cannot handle the C library's timers, compiles this file
+// to replace the timer_ functions. It supports only relative times and one-shot timers, because
 // varnekutils_ltn uses no others.
 #include <signal.h>
 #include <time.h>

@@ -61,7 +61,7 @@ struct Worker {
 };
 Worker gWorkers[kThreads];
 
-// Who made each handle, found by the handle's low bits: the handle and, in three bits of its own, the worker.
+// Who made each handle: the handle times 8 plus the worker, at the place that the handle's low bits give.
 std::atomic<int64_t> gMakers[3][4096];
 
 void SetMaker(int family, int32_t handle, const Worker &maker) {

@@ -1,5 +1,5 @@
 // The part of Google Benchmark's interface that the benchmarks use, for counting instructions. Runs
-// the benchmark that the command line names for TURNS iterations, between two marks that the plugin
+// TURNS iterations of the benchmark that the command line names, between two marks that the plugin
 // (count.c) knows.
 //   PROGRAM ROW:CONTENDER TURNS
 #ifndef VARNEK_BENCH_DEVICE_BENCHMARK_H
