@@ -146,8 +146,8 @@ void SameThread(benchmark::State &state) {
     }
 }
 
-// A thread on core `core` that answers the last of every `every` messages, until the first byte of
-// one says that no more will come.
+// A thread on core `core` that answers one message in `every`, the last of each such group. It ends
+// at a message whose first byte is not 0.
 template <typename Queue>
 struct Partner {
     Partner(int core, int every)

@@ -54,11 +54,11 @@ class VARNEK_API VarnekCRingBuffer {
     /// Moves the reader to the index `aOffset` (origin 0), forward by `aOffset` bytes (1), or to
     /// the start of the last `aOffset` bytes written (2). Origins 0 and 2 do not check that those
     /// bytes are unread or were ever written. With 2, an offset of the whole size leaves nothing to
-    /// read. With 0, an index equal to the size leaves the reader past the end until it reads or
-    /// seeks forward, if only by 0, which has to come before the next write. Returns 0;
-    /// VARNEK_RING_NO_SPACE for an offset that is negative, beyond the size or, with origin 1,
-    /// beyond the readable bytes, for a ring without storage and, with origin 1, for an
-    /// inconsistent one; VARNEK_RING_INVALID for another origin.
+    /// read. With 0, an index equal to the size leaves the reader past the end: before the next
+    /// write it has to read, or to seek forward, if only by 0. Returns 0; VARNEK_RING_NO_SPACE for
+    /// an offset that is negative, beyond the size or, with origin 1, beyond the readable bytes,
+    /// for a ring without storage and, with origin 1, for an inconsistent one; VARNEK_RING_INVALID
+    /// for another origin.
     int Seek(int aOffset, int origin);
 
     /// Returns how many bytes can be read now, and GetSpaceWriting how many can be written; in an

@@ -31,7 +31,7 @@ namespace varnek {
 /// no record, or there is no such semaphore. Waiting changes errno.
 enum class Outcome { kSuccess, kTimeout, kInterrupted, kGone };
 /// What becomes of an object that has the name: kReplace deletes it and owns the new one, but fails
-/// for a held mutex; kUse finds or makes it, atomically in a shared library, and never deletes.
+/// for a held mutex; kUse finds or makes it, atomically within one module, and never deletes.
 enum class Existing { kReplace, kUse };
 /// Milliseconds from any std::chrono duration, rounded up, from 0 to 49 days; only None() is for
 /// ever. Waits go by the wall clock, timers do not; Join waits as std::condition_variable does.
@@ -155,7 +155,7 @@ class Own {
     int32_t Handle() const { return handle_; }
 
   private:
-    const bool isOwned_;  // const, so that nothing assigns an owner
+    const bool isOwned_;  // const, which rules out assignment
     int32_t handle_ = -1;
 };
 template <typename Wait, typename IsGone>

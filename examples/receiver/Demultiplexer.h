@@ -81,7 +81,8 @@ class Demultiplexer {
     // kPmtKey. A repeated section, which has the same CRC, is not parsed again.
     struct Naming {
         uint32_t crc;
-        std::vector<Program> programs;  // of a PAT; an AIT has the service_id of its PMT
+        // The programs of a PAT; or the AITs of a PMT, each with the PMT's service_id and its PID.
+        std::vector<Program> programs;
     };
     static constexpr uint32_t kPmtKey = 0x10000;
     std::map<uint32_t, Naming> namings_;

@@ -20,7 +20,7 @@ class StreamFile {
     //   returns  false if it cannot be opened; errno says why
     bool Open(const std::string &path);
 
-    // Waits briefly for a named pipe, and returns whether no bytes came.
+    // Returns whether the input is a named pipe from which no bytes come, after waiting briefly.
     bool IsQuietPipe() const;
 
     // Waits for bytes or, if `stop` is not null, until it is set.
