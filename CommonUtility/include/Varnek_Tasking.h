@@ -152,8 +152,7 @@ class Own {
     ~Own() { (void)(isOwned_ && *this && kDelete(handle_)); }
     Own(const Own &) = delete;
     explicit operator bool() const { return handle_ != -1; }
-    int32_t Handle() const { return handle_; }
-
+    int32_t Handle() const { return handle_; }  // -1 for none
   private:
     const bool isOwned_;  // const, which rules out assignment
     int32_t handle_ = -1;
@@ -179,7 +178,8 @@ using IfMessage = std::enable_if_t<std::is_trivially_copyable_v<T> && sizeof(T) 
 /// even where it could throw, because no section may run unprotected.
 struct Mutex : detail::Own<VarnekPGL_GetMutexByName, VarnekPGL_CreateMutex, VarnekPGL_DeleteMutex> {
     Mutex(std::string_view name, Existing old) : Own(name, old) {}  ///< see Existing
-    void lock() {                                                   ///< waits without limit
+    /// Waits without limit.
+    void lock() {
         if (VarnekPGL_AcquireMutex(Handle()) == FALSE) {
             VARNEK_PANIC();
             std::abort();
